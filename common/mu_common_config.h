@@ -1,0 +1,168 @@
+/// The per-user configuration: the projects that the user works with.
+///
+/// Nothing here takes a lock, but the creation of the process-wide factory is safe. Loading, writing and the release of
+/// one configuration belong to one thread.
+#pragma once
+
+#include "common/mu_common_expected.h"
+#include "common/mu_common_export.h"
+#include "common/mu_common_io_utils.h"
+
+#include "platform/sdk/OdString.h"
+#include "platform/ut/FileName.h"
+
+#include <functional>
+#include <map>
+#include <memory>
+#include <set>
+
+namespace common {
+
+/// The folder of a configuration, as it was given: "a" and "a/" are two folders. A plain value.
+class MU_COMMON_EXPORT ConfigPath {
+public:
+    /// Takes `path` without looking at the disk.
+    explicit ConfigPath(OdString const& path);
+
+    /// Checks `path` and makes the folder when it is missing, with its parents. The configuration file is not made.
+    /// Errors: `path` is empty; none of its parents exists; the nearest one that exists may not be written; the folder
+    /// cannot be made.
+    static Expected<ConfigPath> get(OdString const& path);
+
+    /// Path of the configuration file in `folder`.
+    static OdString configFile(OdString const& folder);
+    /// Path of the configuration file in this folder.
+    OdString configFile() const;
+    /// The folder as it was given.
+    OdString path() const;
+
+private:
+    OdString path_;
+};
+
+/// Orders configuration folders by the characters of their paths.
+struct MU_COMMON_EXPORT ConfigPathOrder {
+    /// Whether `a` comes before `b`.
+    bool operator()(ConfigPath const& a, ConfigPath const& b) const;
+};
+
+/// What is known of a project beside its path.
+struct ProjectInfo {
+    OdString name;  ///< shown to the user
+    OdString cloud; ///< its identifier on the server
+};
+
+/// The content of a configuration.
+struct MU_COMMON_EXPORT ConfigData {
+    std::map<OdString, ProjectInfo> projects; ///< by the path of the working folder
+
+    /// Adds a project, or replaces what is known of one.
+    void add(OdString const& path, OdString const& name, OdString const& cloud);
+    /// Drops a project, if it is there.
+    void remove(OdString const& path);
+};
+
+/// What the host implements to hear of changes. Registered by address: it removes itself before it is destroyed.
+class MU_COMMON_EXPORT ConfigListener {
+public:
+    /// Called after a writer of the configuration has gone. An exception from here ends the process.
+    virtual void configChanged() = 0;
+
+protected:
+    ConfigListener() = default;
+    ConfigListener(ConfigListener const&) = default;
+    ConfigListener& operator=(ConfigListener const&) = default;
+    ~ConfigListener() = default;
+};
+
+/// Orders listeners by their addresses.
+struct MU_COMMON_EXPORT ListenerOrder {
+    /// Whether `a` lies before `b`.
+    bool operator()(
+        std::reference_wrapper<ConfigListener> const& a, std::reference_wrapper<ConfigListener> const& b) const;
+};
+
+/// The listeners of a configuration, which it does not own.
+using ConfigListeners = std::set<std::reference_wrapper<ConfigListener>, ListenerOrder>;
+
+/// Access for writing, for as long as it lives. Then it tells all listeners, in ascending order of addresses, whether or
+/// not anything was changed. A listener may add and remove listeners meanwhile: removed ones are not told any more.
+class MU_COMMON_EXPORT WriteConfigData {
+public:
+    /// Keeps both by reference.
+    WriteConfigData(ConfigData& data, ConfigListeners& listeners);
+    WriteConfigData(WriteConfigData const&) = delete;
+    WriteConfigData& operator=(WriteConfigData const&) = delete;
+    ~WriteConfigData();
+
+    /// The content, valid as long as the configuration.
+    ///@{
+    ConfigData* operator->() const { return &data_; }
+    ConfigData& operator*() const { return data_; }
+    ///@}
+
+private:
+    ConfigData& data_;
+    ConfigListeners& listeners_;
+};
+
+/// The configuration of one folder. Held by `std::shared_ptr`; it reaches the disk only when the last owner lets go.
+class MU_COMMON_EXPORT Config {
+public:
+    class Factory;
+
+    /// `io` is kept by address and must outlive the configuration.
+    Config(ConfigPath const& path, ConfigData data, IoInterface const& io);
+    /// Starts without projects.
+    Config(ConfigPath const& path, IoInterface const& io);
+    Config(Config const&) = delete;
+    Config& operator=(Config const&) = delete;
+    /// If `write` was ever called, replaces the configuration file as a whole and reports the outcome to the host, once.
+    /// Errors reported: the document cannot be built; the file cannot be written, which leaves the old one.
+    ~Config();
+
+    /// The configuration of `folder`, which is made when it is missing. While one lives that was read from a file, every
+    /// caller gets that same one, as it is in memory; without a file every caller gets one of its own, without projects.
+    /// Errors: those of `ConfigPath::get`; the file is not JSON or not of the expected shape.
+    static Expected<std::shared_ptr<Config>> load(OdString const& folder, IoInterface const& io);
+
+    /// The process's table of living configurations.
+    static Factory& factory();
+
+    /// The content, for reading, valid as long as the configuration.
+    ConfigData const& read() const { return data_; }
+    /// The content, for writing; the configuration is saved at its end from here on. It must outlive the result.
+    WriteConfigData write();
+
+    /// Registers `listener`, once.
+    void addListener(ConfigListener& listener);
+    /// Takes back a registration; does nothing for a listener that is not registered.
+    void removeListener(ConfigListener& listener);
+
+    /// The folder.
+    ConfigPath path() const { return path_; }
+
+private:
+    WriteOutcome save() const;
+
+    ConfigListeners listeners_;
+    ut::FileName configFile_;
+    ConfigPath path_;
+    bool modified_ = false;
+    ConfigData data_;
+    IoInterface const* io_;
+};
+
+/// Remembers living configurations by their folder, without keeping them alive.
+class MU_COMMON_EXPORT Config::Factory {
+public:
+    /// The living configuration of `path`, as it is; `data` and `io` are dropped then. Else a new one of `data`.
+    std::shared_ptr<Config> get(ConfigPath const& path, ConfigData data, IoInterface const& io);
+    /// Forgets the configuration of `path`, which lives on with its owners.
+    void erase(ConfigPath const& path);
+
+private:
+    std::map<ConfigPath, std::weak_ptr<Config>, ConfigPathOrder> living_;
+};
+
+} // namespace common

@@ -1,0 +1,151 @@
+#include "common/mu_common_diff.h"
+
+#include "common/mu_common_pattern.h"
+#include "common/mu_common_translate.h"
+
+#include "platform/ut/FileName.h"
+
+#include <algorithm>
+#include <set>
+#include <string_view>
+#include <unordered_map>
+#include <utility>
+
+namespace common {
+
+namespace {
+
+struct CandidateHash {
+    std::size_t operator()(StagedFile const* file) const
+    {
+        std::wstring_view const path(file->path.c_str(), file->path.getLength());
+        return std::hash<std::wstring_view>()(path) * 3 + static_cast<std::size_t>(file->change);
+    }
+};
+
+struct CandidateEqual {
+    bool operator()(StagedFile const* a, StagedFile const* b) const { return *a == *b; }
+};
+
+std::vector<StagedFile> candidatesOf(RepoChanges const& changes)
+{
+    std::vector<StagedFile> candidates;
+    candidates.reserve(changes.modified.size() + changes.untracked.size());
+    for (Versions<File, VersionedFile> const& file : changes.modified) {
+        candidates.emplace_back(file.working.path, FileChange::modified);
+    }
+    for (Versions<File, void> const& file : changes.untracked) {
+        candidates.emplace_back(file.working.path, FileChange::added);
+    }
+    return candidates;
+}
+
+} // namespace
+
+struct RepoFileExplorer::Pimpl {
+    Pimpl(RepoChanges const& changes, RootPath const& repository)
+        : removed(changes.removed)
+        , candidates(candidatesOf(changes))
+        , unchanged(changes.unchanged)
+        , root(repository)
+    {
+        positions.reserve(candidates.size());
+        for (std::size_t i = 0; i < candidates.size(); ++i) {
+            positions.emplace(&candidates[i], i); // Keeps the first of several equal ones.
+        }
+    }
+
+    std::vector<Versions<void, VersionedFile>> removed;
+    std::vector<StagedFile> candidates;
+    std::set<std::size_t> staged;
+    std::vector<VersionedFile> unchanged;
+    RootPath root;
+    /// Candidates by what they are: searching the list for each of many would take quadratic time.
+    std::unordered_map<StagedFile const*, std::size_t, CandidateHash, CandidateEqual> positions;
+};
+
+RepoFileExplorer::RepoFileExplorer(RepoChanges const& changes, RootPath const& root)
+    : pimpl_(std::make_unique<Pimpl>(changes, root))
+{
+}
+
+RepoFileExplorer::RepoFileExplorer(RepoFileExplorer&& other) noexcept = default;
+
+RepoFileExplorer& RepoFileExplorer::operator=(RepoFileExplorer&& other) noexcept = default;
+
+RepoFileExplorer::~RepoFileExplorer() = default;
+
+bool RepoFileExplorer::hasFilesToStage() const
+{
+    return pimpl_->staged.size() < pimpl_->candidates.size();
+}
+
+bool RepoFileExplorer::stage(StagedFile const& file)
+{
+    auto const position = pimpl_->positions.find(&file);
+    return position != pimpl_->positions.end() && pimpl_->staged.insert(position->second).second;
+}
+
+Expected<std::vector<StatusRef>> RepoFileExplorer::stagedFiles() const
+{
+    if (pimpl_->staged.empty()) {
+        if (pimpl_->removed.empty()) {
+            return ErrorMessage(translate(L"There are no modified or untracked files for commit."));
+        }
+        return std::vector<StatusRef>();
+    }
+    std::vector<StatusRef> files = possibleStageFiles();
+    for (std::size_t const position : pimpl_->staged) {
+        files[position].selected = true;
+    }
+    return files;
+}
+
+std::vector<StatusRef> RepoFileExplorer::possibleStageFiles() const
+{
+    std::vector<StatusRef> files;
+    files.reserve(pimpl_->candidates.size());
+    for (StagedFile const& candidate : pimpl_->candidates) {
+        files.emplace_back(candidate.path, candidate.change);
+    }
+    return files;
+}
+
+std::variant<StagedFile, std::monostate, ErrorMessage> RepoFileExplorer::findForStaging(OdString const& name) const
+{
+    std::regex const pattern = filePattern(name);
+    StagedFile const* found = nullptr;
+    for (StagedFile const& candidate : pimpl_->candidates) {
+        if (!matchesWhole(pattern, candidate.path.ansi_str())) {
+            continue;
+        }
+        if (found) {
+            return ErrorMessage(translate(L"More that one file found with name %ls.\n"), name.c_str());
+        }
+        found = &candidate;
+    }
+    if (!found) {
+        return std::monostate{};
+    }
+    return *found;
+}
+
+OdString RepoFileExplorer::findUnchanged(OdString const& name) const
+{
+    std::regex const pattern = filePattern(name);
+    auto const match = std::find_if(
+        pimpl_->unchanged.begin(), pimpl_->unchanged.end(),
+        [&](VersionedFile const& file) { return matchesWhole(pattern, file.path.ansi_str()); });
+    return match == pimpl_->unchanged.end() ? OdString() : match->path;
+}
+
+std::regex filePattern(OdString const& name)
+{
+    OdString pattern = OdString(L".*") + name;
+    if (!ut::FileName(name).hasExt()) {
+        pattern += LR"((\.[a-zA-Z]+)+$)";
+    }
+    return compilePattern(pattern);
+}
+
+} // namespace common

@@ -1,0 +1,19 @@
+/// Documents on the disk: reading one whole, and replacing one whole. Internal to the library.
+#pragma once
+
+#include "common/mu_common_expected.h"
+
+#include "json/json_value.h"
+#include "platform/sdk/OdString.h"
+
+namespace common {
+
+/// The object that the file `path` holds. Throws `OdError` when the file cannot be read, is not JSON or holds something
+/// else than an object.
+kutils::json::Value readDocument(OdString const& path);
+
+/// Replaces the content of the file `path` by `document`, in the pretty layout. Error: the file cannot be written; it
+/// holds then what it held before.
+WriteOutcome writeDocument(OdString const& path, kutils::json::Value const& document);
+
+} // namespace common

@@ -1,0 +1,58 @@
+/// Walking folders: the files of a repository, its conflicted drawings, and any folder by name patterns.
+///
+/// Everything here reads the disk without locks: files that come or go during a walk may or may not be listed. Folders
+/// that cannot be opened are skipped silently at any depth, and links to folders are not followed.
+#pragma once
+
+#include "common/mu_common_expected.h"
+#include "common/mu_common_export.h"
+#include "common/mu_common_repo_files.h"
+#include "common/mu_common_repo_prop.h"
+#include "common/mu_common_versions.h"
+
+#include "platform/sdk/OdString.h"
+
+#include <cstdint>
+#include <memory>
+#include <regex>
+#include <vector>
+
+namespace common {
+
+/// How to walk a folder.
+struct MU_COMMON_EXPORT CollectOptions {
+    /// Stores the choices.
+    CollectOptions(bool relativePaths, bool collectDirs, bool includeHidden, std::vector<std::regex> excludes);
+
+    bool relativePaths;             ///< results are relative to the walked folder, else they begin with it
+    bool collectDirs;               ///< folders are listed too
+    std::int32_t enumerationFlags;  ///< 4 when hidden entries are listed, else 0
+    /// An entry whose bare name, in its narrow form, is covered as a whole by one of these is skipped, a folder with all
+    /// that is in it.
+    std::vector<std::regex> excludes;
+};
+
+/// What a walk found.
+struct DirContents {
+    std::vector<OdString> files; ///< in the order of the walk
+    std::vector<OdString> dirs;  ///< likewise; empty unless folders were asked for
+};
+
+/// Sets the access and modification time of the file `path` to now. A file that is missing stays missing, and failure
+/// is not reported.
+MU_COMMON_EXPORT void touch(OdString const& path);
+
+/// Lists what is in `folder`, sub-folders included: the files of a folder before anything of its sub-folders, those
+/// depth first, names in byte order.
+MU_COMMON_EXPORT DirContents collectDirContents(OdString const& folder, CollectOptions const& options);
+
+/// The files under version control, relative to the working folder: what lies in it, hidden entries and what the ignore
+/// rules match excepted, then the files of the properties folder, which travel with the repository.
+/// Error: the properties folder is not below the working folder. Throws `std::regex_error` for an invalid ignore rule
+/// (see `RepoIgnore`).
+MU_COMMON_EXPORT Expected<std::vector<File>> collectRepoFiles(RootPath const& root);
+
+/// The drawings of which other versions lie in the conflict folder, in ascending order of their paths.
+MU_COMMON_EXPORT std::vector<std::unique_ptr<ConflictInfo>> collectConflictPaths(RootPath const& root);
+
+} // namespace common

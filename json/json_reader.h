@@ -1,0 +1,137 @@
+/// Reading JSON text into a value.
+#pragma once
+
+#include "platform/sdk/OdString.h"
+#include "json/json_export.h"
+#include "json/json_value.h"
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace kutils::json {
+
+/// Reads one JSON value from the characters of `text` into `out`. True on success; false on a syntax error, and then
+/// `out` is as it was. Neither position nor reason is kept. Throws only what allocation throws.
+///
+/// Text after the value is not looked at. Beyond the JSON standard a comma may precede a closing bracket, the fraction
+/// of a number may be empty (`1.`), vertical tab and form feed are blanks, and strings may hold control characters. Of
+/// several members with one key the last counts. An integer without a minus sign becomes an unsigned 64-bit integer;
+/// numbers out of range become the nearest number of their kind, reals infinity. A `\u` escape makes one character
+/// each: halves of a surrogate pair stay halves. A NUL outside a string is taken for the end of the text, except
+/// directly behind a number, where it counts for nothing.
+///
+/// The text may be nested as deep as memory allows. The same text reads the same under every locale.
+KUTILS_JSON_EXPORT bool read_string(Value& out, OdString const& text);
+
+namespace detail {
+
+enum class Token_kind : std::int32_t {
+    open_array,
+    close_array,
+    open_object,
+    close_object,
+    colon,
+    comma,
+    null_value,
+    true_value,
+    false_value,
+    signed_integer,
+    unsigned_integer,
+    real,
+    string,
+    end,
+    invalid,
+};
+
+template <class String>
+struct Token {
+    Token_kind kind = Token_kind::end;
+    String text;              ///< of a string, without quotes and escapes; free to be moved from
+    std::uint64_t number = 0; ///< of a number: its 64 bits, read according to the kind
+};
+
+/// Cuts a range of characters into tokens. The range must outlive the scanner.
+///
+/// The range is read as if the character 0 followed it for ever. A character that turns out not to belong to a token
+/// is put back for the next one, except the character 0: as a mark for the end of a number it is used up.
+template <class String, class Iterator>
+class KUTILS_JSON_EXPORT Scanner {
+public:
+    using Char = typename String::value_type;
+
+    Scanner(Iterator begin, Iterator end) : at_(begin), end_(end) {}
+
+    /// The next token; it lives until the next call.
+    Token<String>& nextToken();
+
+    /// Read on behind the character that a token starts with.
+    Token<String>& readNumber(Char first);
+    Token<String>& readString();
+    Token<String>& readTrue();
+    Token<String>& readFalse();
+    Token<String>& readNull();
+
+    /// Where the next character is read.
+    Iterator position() const { return at_; }
+
+private:
+    Char next() { return at_ == end_ ? Char() : *at_++; }
+    void putBack(Char c)
+    {
+        if (c != Char()) {
+            --at_;
+        }
+    }
+
+    void skipBlanks();
+    Token<String>& readReal(Char first, Iterator rest, Char c);
+    Token<String>& readWord(Char const* rest, Token_kind kind);
+    bool readEscape();
+    bool readHexEscape();
+
+    Token<String>& give(Token_kind kind, std::uint64_t number = 0);
+    Token<String>& refuse(Char c);
+
+    Iterator at_;
+    Iterator end_;
+    Token<String> token_;
+};
+
+/// Builds values from the tokens of a range. The range must outlive the parser.
+template <class Value, class Iterator>
+class KUTILS_JSON_EXPORT Parser {
+public:
+    /// A syntax error.
+    struct Error {};
+
+    Parser(Iterator begin, Iterator end) : scanner_(begin, end) {}
+
+    /// Reads one value into `out` and moves `begin` behind the last character that was used. False on a syntax error or
+    /// an empty range; `out` is then as it was.
+    static bool parse(Iterator& begin, Iterator end, Value& out);
+
+    /// Reads the next value into `out`. False if there was a `]` instead and `closeAllowed` is set; throws `Error` on
+    /// anything else that is no value. `out` changes only when a whole value was read.
+    bool get(Value& out, bool closeAllowed);
+
+private:
+    using Object = typename Value::Object;
+    using Array = typename Value::Array;
+
+    void place(Value& slot, Token<typename Value::String>& token);
+    void open(Value& slot, Value container);
+    void readItem();
+    bool readElement(Array& array);
+    bool readMember(Object& object);
+    Token<typename Value::String>& nextItem(bool isFirst, Token_kind close);
+
+    Scanner<typename Value::String, Iterator> scanner_;
+    std::vector<Value*> open_; ///< The containers being read, each the last item of the one before.
+};
+
+extern template class Scanner<std::wstring, wchar_t const*>;
+extern template class Parser<Value, wchar_t const*>;
+
+} // namespace detail
+} // namespace kutils::json

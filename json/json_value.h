@@ -1,0 +1,187 @@
+/// The value that every document is read into and written from: null, a scalar, a string, an array or an object.
+#pragma once
+
+#include "json/json_export.h"
+
+#include <cstdint>
+#include <map>
+#include <stdexcept>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace kutils::json {
+
+/// What a value holds. The numbers appear in the texts of `ValueError`.
+enum class Value_type : std::int32_t { object, array, string, boolean, integer, real, null };
+
+/// A value was asked for something that it does not hold. The text is "value type is 2 not 0" for a string that was
+/// asked for an object.
+class KUTILS_JSON_EXPORT ValueError : public std::runtime_error {
+public:
+    using std::runtime_error::runtime_error;
+};
+
+/// The containers of a value whose texts are of type `S`. Objects are ordered by plain comparison of the characters of
+/// their keys, so a value knows nothing of the order in which members were read or added.
+template <class S>
+struct KUTILS_JSON_EXPORT Config_map {
+    using String = S;
+    template <class Value>
+    using Object = std::map<String, Value>;
+    template <class Value>
+    using Array = std::vector<Value>;
+};
+
+/// A JSON value. A plain value: copies are deep and independent, and any thread may use its own.
+///
+/// Values may be nested as deep as memory allows: copying, comparing, assigning and destroying never go down the call
+/// stack, whether that is done to a value or to a bare `Object` or `Array` of values. Destroying and moving need no
+/// memory and never throw; the other operations throw what allocation throws, and then leave nothing behind.
+template <class Config>
+class KUTILS_JSON_EXPORT Value_impl {
+public:
+    using String = typename Config::String;
+    using Object = typename Config::template Object<Value_impl>;
+    using Array = typename Config::template Array<Value_impl>;
+
+    /// A null value.
+    Value_impl() noexcept = default;
+    Value_impl(Value_impl const& other);
+    /// Takes what `other` holds and leaves it null.
+    Value_impl(Value_impl&& other) noexcept
+        : type_(std::exchange(other.type_, Value_type::null))
+        , is_uint64_(std::exchange(other.is_uint64_, false))
+        , payload_(other.payload_)
+    {
+    }
+    Value_impl(Object object);
+    /// Compilers do not agree whether `Array{Array{1}}` is an array in an array or a copy; `Array{Value(Array{1})}` is
+    /// the former.
+    Value_impl(Array array);
+    Value_impl(String string);
+    /// Copies `string` up to its NUL; null gives the empty string.
+    Value_impl(typename String::value_type const* string);
+    /// Only a bool makes a bool, not any pointer that happens to come by.
+    template <class T>
+    Value_impl(T const*) = delete;
+    Value_impl(bool value) noexcept : type_(Value_type::boolean) { payload_.boolean = value; }
+    Value_impl(int value) noexcept : Value_impl(std::int64_t{value}) {}
+    Value_impl(std::int64_t value) noexcept : type_(Value_type::integer)
+    {
+        payload_.integer = static_cast<std::uint64_t>(value);
+    }
+    Value_impl(std::uint64_t value) noexcept : type_(Value_type::integer), is_uint64_(true)
+    {
+        payload_.integer = value;
+    }
+    Value_impl(double value) noexcept : type_(Value_type::real) { payload_.real = value; }
+
+    /// `other` may be a part of this value, as in `value = value.get_array()[0]`.
+    Value_impl& operator=(Value_impl const& other)
+    {
+        Value_impl copy(other);
+        swap(copy);
+        return *this;
+    }
+    /// As above; `other` is null afterwards, unless it is this value itself.
+    Value_impl& operator=(Value_impl&& other) noexcept
+    {
+        Value_impl taken(std::move(other));
+        swap(taken);
+        return *this;
+    }
+    ~Value_impl()
+    {
+        if (type_ <= Value_type::string) {
+            destroy();
+        }
+    }
+
+    void swap(Value_impl& other) noexcept
+    {
+        std::swap(type_, other.type_);
+        std::swap(is_uint64_, other.is_uint64_);
+        std::swap(payload_, other.payload_);
+    }
+
+    Value_type type() const noexcept { return type_; }
+    /// Whether an integer was made or read as an unsigned one; false for every other type. The reader takes each
+    /// integer without a minus sign for unsigned.
+    bool is_uint64() const noexcept { return is_uint64_; }
+
+    /// Throws `ValueError` unless the value is of type `expected`. Each of the accessors below checks its type first;
+    /// the references they return live as long as the value is neither assigned to nor moved from.
+    void check_type(Value_type expected) const
+    {
+        if (type_ != expected) {
+            throw_type_error(expected);
+        }
+    }
+
+    Object const& get_object() const { return check_type(Value_type::object), payload_.object->content; }
+    Object& get_object() { return check_type(Value_type::object), payload_.object->content; }
+    Array const& get_array() const { return check_type(Value_type::array), payload_.array->content; }
+    Array& get_array() { return check_type(Value_type::array), payload_.array->content; }
+    String const& get_string() const { return check_type(Value_type::string), *payload_.string; }
+    String& get_string() { return check_type(Value_type::string), *payload_.string; }
+    bool get_bool() const { return check_type(Value_type::boolean), payload_.boolean; }
+    /// The low 32 bits of an integer, whatever the others are.
+    std::int32_t get_int() const { return static_cast<std::int32_t>(get_uint64()); }
+    /// The 64 bits of an integer, whether it is a signed or an unsigned one.
+    std::int64_t get_int64() const { return static_cast<std::int64_t>(get_uint64()); }
+    std::uint64_t get_uint64() const { return check_type(Value_type::integer), payload_.integer; }
+    /// A real, or an integer converted to one.
+    double get_real() const;
+
+    /// Whether both are of one type and hold the same. Integers are compared as numbers: a signed and an unsigned 5 are
+    /// equal, since both are written `5`; -1 and 18446744073709551615 are not. An integer never equals a real. Reals
+    /// are compared as doubles, so NaN equals nothing.
+    friend bool operator==(Value_impl const& a, Value_impl const& b) { return a.equals(b); }
+    friend bool operator!=(Value_impl const& a, Value_impl const& b) { return !a.equals(b); }
+
+private:
+    /// A container on the heap. The link serves only for taking a document apart without memory.
+    template <class Container>
+    struct Box {
+        Container content;
+        Box* next = nullptr;
+    };
+    union Payload {
+        Box<Object>* object;
+        Box<Array>* array;
+        String* string;
+        bool boolean;
+        std::uint64_t integer;
+        double real;
+    };
+    struct CopyTask {
+        Value_impl const* from;
+        Value_impl* to;
+    };
+    struct ComparisonTask {
+        Value_impl const* a;
+        Value_impl const* b;
+    };
+    class Wreckage;
+
+    [[noreturn]] void throw_type_error(Value_type expected) const;
+    void destroy() noexcept;
+    static void copy_content(CopyTask task, std::vector<CopyTask>& pending);
+    static void copy_elements(CopyTask task, std::vector<CopyTask>& pending);
+    bool equals(Value_impl const& other) const;
+    static bool same_content(ComparisonTask task, std::vector<ComparisonTask>& pending);
+    static bool same_elements(ComparisonTask task, std::vector<ComparisonTask>& pending);
+
+    Value_type type_ = Value_type::null;
+    bool is_uint64_ = false;
+    Payload payload_{};
+};
+
+extern template class Value_impl<Config_map<std::wstring>>;
+
+using Value = Value_impl<Config_map<std::wstring>>;
+using Object = Value::Object;
+using Array = Value::Array;
+
+} // namespace kutils::json

@@ -1,0 +1,125 @@
+/// Writing a value as JSON text.
+#pragma once
+
+#include "json/json_export.h"
+#include "json/json_value.h"
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <cwctype>
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace kutils::json {
+
+/// The text of `value`, without a line feed at its end. Throws only what allocation throws.
+///
+/// Members stand in ascending order of their keys. Reals are written in fixed notation with 16 decimals, so only those
+/// that have no more read back as they were; infinity and NaN become `inf` and `nan`, which do not read back at all.
+/// With `pretty` each item stands on a line of its own, four spaces further in than its container, and a key is
+/// followed by ` : `; without, there are no spaces and no line feeds.
+///
+/// A character that is not printable is written as `\u` and the four hexadecimal digits of its low 16 bits. Which
+/// characters are printable is for the C library to say, by the current locale of the process: in the "C" locale no
+/// character beyond ASCII is. A character above U+FFFF that is not printable therefore loses its upper bits. Nothing
+/// else depends on any locale.
+///
+/// The value may be nested as deep as memory allows, but mind that the indentation of the pretty layout grows with the
+/// square of the depth.
+KUTILS_JSON_EXPORT std::wstring write_string(Value const& value, bool pretty);
+
+namespace detail {
+
+/// `text` with everything escaped that cannot stand in a string as it is.
+KUTILS_JSON_EXPORT std::wstring add_esc_chars(std::wstring const& text);
+
+/// If `c` has an escape of two characters, appends that to `text` and returns true: backspace, tab, line feed, form
+/// feed, carriage return, quote and backslash. The slash has none.
+KUTILS_JSON_EXPORT bool add_esc_char(wchar_t c, std::wstring& text);
+
+/// `\u` and four upper-case hexadecimal digits for the low 16 bits of `c`.
+KUTILS_JSON_EXPORT std::wstring non_printable_to_string(unsigned c);
+
+/// The characters that stand in a string as they are: the printable ones that need no escape, by the locale that was
+/// current when the object was made and, beyond ASCII, by the one that is current when it is asked.
+class KUTILS_JSON_EXPORT Plain_chars {
+public:
+    Plain_chars();
+
+    bool contains(wchar_t c) const
+    {
+        auto const code = static_cast<std::uint32_t>(c);
+        return code < ascii_.size() ? ascii_[code] : std::iswprint(code) != 0;
+    }
+
+private:
+    std::array<bool, 128> ascii_;
+};
+
+/// Writes to a stream, one text behind the other. The stream must outlive the generator. When an operation throws, the
+/// stream has got a part of the text, and the generator is of no further use.
+template <class Value, class Stream>
+class KUTILS_JSON_EXPORT Generator {
+public:
+    using String = typename Value::String;
+    using Char = typename String::value_type;
+    using Object = typename Value::Object;
+    using Array = typename Value::Array;
+    using Member = typename Object::value_type;
+
+    Generator(Stream& stream, bool pretty);
+
+    void output(Value const& value);
+    void output(String const& text);
+    void output(bool value);
+    void output(Member const& member);
+    /// Writes an `Array` or `Object` between the given brackets.
+    template <class Container>
+    void output_array_or_obj(Container const& container, Char open, Char close);
+
+private:
+    /// An open container, one of the two, and the item that is due.
+    struct Level {
+        Array const* array;
+        Object const* object;
+        typename Array::const_iterator element;
+        typename Object::const_iterator member;
+        Char close;
+    };
+
+    void place(Value const& value);
+    void place(String const& text);
+    void place(bool value);
+    void place(Member const& member);
+    void placeReal(double value);
+    void enter(Array const& array, Char open, Char close);
+    void enter(Object const& object, Char open, Char close);
+    void placeItem();
+    void leave();
+    void startLine();
+    void finish();
+
+    void append(Char c)
+    {
+        *room(1) = c;
+        ++used_;
+    }
+    void append(Char const* text, std::size_t length);
+    void append(char const* begin, char const* end);
+    Char* room(std::size_t length);
+    void flush();
+
+    Stream& stream_;
+    bool const pretty_;
+    Plain_chars const plain_;
+    std::vector<Level> levels_;
+    String buffer_; ///< Its first `used_` characters are still to go to the stream.
+    std::size_t used_ = 0;
+};
+
+extern template class Generator<Value, std::wostringstream>;
+
+} // namespace detail
+} // namespace kutils::json

@@ -1,0 +1,34 @@
+/// The calls of the operating system that change the disk, and those that an open file needs, in one table.
+#pragma once
+
+#include "platform/mu_platform_export.h"
+
+#include <cstddef>
+#include <sys/types.h>
+
+namespace os {
+
+/// One entry per call, named after it and with its parameters: the result is -1 with `errno` set when it fails.
+/// Whoever writes to the disk goes through this table, so that a test can stand in for any call and make it fail.
+struct Calls {
+    int (*openat)(int folder, char const* path, int flags, mode_t mode);
+    ssize_t (*read)(int file, void* buffer, std::size_t count);
+    ssize_t (*write)(int file, void const* bytes, std::size_t count);
+    int (*fsync)(int file);
+    int (*close)(int file);
+    int (*flock)(int file, int operation);
+    int (*fchown)(int file, uid_t owner, gid_t group);
+    int (*fchmod)(int file, mode_t mode);
+    int (*fsetxattr)(int file, char const* name, void const* value, std::size_t size, int flags);
+    int (*fremovexattr)(int file, char const* name);
+    int (*linkat)(int fromFolder, char const* from, int toFolder, char const* to, int flags);
+    int (*renameat)(int fromFolder, char const* from, int toFolder, char const* to);
+    int (*renameat2)(int fromFolder, char const* from, int toFolder, char const* to, unsigned flags);
+    int (*unlinkat)(int folder, char const* path, int flags);
+    int (*mkdir)(char const* path, mode_t mode);
+};
+
+/// The process's table. Only tests change it, while no other thread uses it.
+MU_PLATFORM_EXPORT Calls& calls() noexcept;
+
+} // namespace os

@@ -1,0 +1,75 @@
+#include "platform/os/os_lock.h"
+
+#include "platform/os/os_calls.h"
+#include "platform/os/os_files.h"
+
+#include <cerrno>
+#include <fcntl.h>
+#include <sys/file.h>
+#include <thread>
+#include <utility>
+
+namespace os {
+namespace {
+
+constexpr std::chrono::milliseconds kPause(20);
+
+std::error_code lastError()
+{
+    return {errno, std::generic_category()};
+}
+
+bool lockWithin(int file, std::chrono::milliseconds patience)
+{
+    auto const end = std::chrono::steady_clock::now() + patience;
+    while (calls().flock(file, LOCK_EX | LOCK_NB) == -1) {
+        if (errno != EINTR && (errno != EWOULDBLOCK || std::chrono::steady_clock::now() >= end)) {
+            return false;
+        }
+        std::this_thread::sleep_for(kPause);
+    }
+    return true;
+}
+
+} // namespace
+
+FileLock::FileLock(FileLock&& other) noexcept : file_(std::exchange(other.file_, -1)) {}
+
+FileLock& FileLock::operator=(FileLock&& other) noexcept
+{
+    std::swap(file_, other.file_);
+    return *this;
+}
+
+FileLock::~FileLock()
+{
+    if (file_ != -1) {
+        calls().close(file_);
+    }
+}
+
+std::error_code FileLock::acquire(std::string const& path, std::string const& note, std::chrono::milliseconds patience)
+{
+    FileLock lock;
+    lock.file_ = calls().openat(AT_FDCWD, path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC, 0666);
+    if (lock.file_ == -1 || !lockWithin(lock.file_, patience)) {
+        return lastError();
+    }
+    // Only the first line counts, so a longer note of before need not be cut off. A disk too full for the note is no
+    // reason to refuse the lock.
+    std::string const line = note + "\n";
+    [[maybe_unused]] auto const written = calls().write(lock.file_, line.data(), line.size());
+    *this = std::move(lock);
+    return {};
+}
+
+std::string FileLock::holder(std::string const& path)
+{
+    std::string content;
+    if (readFile(path, content)) {
+        return {};
+    }
+    return content.substr(0, content.find('\n'));
+}
+
+} // namespace os

@@ -1,0 +1,33 @@
+/// Advisory locks on files, held by one process at a time.
+#pragma once
+
+#include "platform/mu_platform_export.h"
+
+#include <chrono>
+#include <string>
+#include <system_error>
+
+namespace os {
+
+/// A lock on a file that serves for nothing else. The system lets go of it when the process ends, however it ends.
+class MU_PLATFORM_EXPORT FileLock {
+public:
+    FileLock() = default;
+    FileLock(FileLock&& other) noexcept;
+    FileLock& operator=(FileLock&& other) noexcept;
+    /// Lets go of the lock. The file stays: removing it would let two processes lock two files of one name.
+    ~FileLock();
+
+    /// Makes the file `path` if need be, waits up to `patience` for its lock, and writes `note` into it, one line that
+    /// tells others who holds it. `std::errc::operation_would_block` when another process held it all the time.
+    [[nodiscard]] std::error_code
+    acquire(std::string const& path, std::string const& note, std::chrono::milliseconds patience);
+
+    /// The note of the process that holds the lock on `path`, or held it last; empty when there is none.
+    static std::string holder(std::string const& path);
+
+private:
+    int file_ = -1;
+};
+
+} // namespace os

@@ -1,0 +1,16 @@
+/// Moving files and folders to names that are free.
+#pragma once
+
+#include "platform/mu_platform_export.h"
+
+#include <string>
+#include <system_error>
+
+namespace os {
+
+/// Gives the file or folder `from` the name `to` on the same file system and waits until both folders are safe on the
+/// disk. `std::errc::file_exists`, with nothing changed, when `to` is taken: nothing is ever replaced.
+/// An error of flushing leaves the entry under its new name.
+[[nodiscard]] MU_PLATFORM_EXPORT std::error_code moveEntry(std::string const& from, std::string const& to);
+
+} // namespace os

@@ -1,0 +1,56 @@
+#include "tests/json/scarce_memory.h"
+
+#include <cstddef>
+#include <cstdlib>
+#include <new>
+
+namespace {
+
+thread_local long remaining = -1; // Negative while there is no limit.
+thread_local long used = 0;
+
+} // namespace
+
+void* operator new(std::size_t size)
+{
+    void* const block = remaining == 0 ? nullptr : std::malloc(size > 0 ? size : 1);
+    if (!block) {
+        throw std::bad_alloc();
+    }
+    remaining -= remaining > 0;
+    ++used;
+    return block;
+}
+
+void operator delete(void* block) noexcept
+{
+    used -= block != nullptr;
+    std::free(block);
+}
+
+void operator delete(void* block, std::size_t) noexcept
+{
+    operator delete(block);
+}
+
+namespace scarce_memory {
+
+long usedBlocks()
+{
+    return used;
+}
+
+bool worksWithin(long limit, std::function<void()> const& operation)
+{
+    remaining = limit;
+    try {
+        operation();
+    } catch (std::bad_alloc const&) {
+        remaining = -1;
+        return false;
+    }
+    remaining = -1;
+    return true;
+}
+
+} // namespace scarce_memory

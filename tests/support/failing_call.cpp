@@ -1,0 +1,120 @@
+#include "tests/support/failing_call.h"
+
+#include "platform/os/os_calls.h"
+
+#include <cerrno>
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <limits>
+#include <type_traits>
+
+namespace support {
+namespace {
+
+struct Plan {
+    bool active = false;
+    int failing = 0; // the number of the call that fails
+    int error = 0;
+    int count = 0; // calls so far
+    char const* failed = nullptr;
+};
+
+Plan plan;
+os::Calls real;
+
+bool mustFail(char const* name)
+{
+    if (plan.count++ != plan.failing) {
+        return false;
+    }
+    if (plan.error == FailingCall::kKillProcess) {
+        std::raise(SIGKILL);
+    }
+    plan.failed = name;
+    return true;
+}
+
+template <auto Member>
+struct StandIn;
+
+template <class Result, class... Arguments, Result (*os::Calls::*Member)(Arguments...)>
+struct StandIn<Member> {
+    static inline char const* name = nullptr;
+
+    static Result call(Arguments... arguments)
+    {
+        if (!mustFail(name)) {
+            return (real.*Member)(arguments...);
+        }
+        if constexpr (std::is_same_v<StandIn, StandIn<&os::Calls::close>>) {
+            real.close(arguments...);
+        }
+        errno = plan.error;
+        return -1;
+    }
+};
+
+template <auto Member>
+void standInFor(char const* name)
+{
+    StandIn<Member>::name = name;
+    os::calls().*Member = StandIn<Member>::call;
+}
+
+void standInForAll()
+{
+    standInFor<&os::Calls::openat>("openat");
+    standInFor<&os::Calls::read>("read");
+    standInFor<&os::Calls::write>("write");
+    standInFor<&os::Calls::fsync>("fsync");
+    standInFor<&os::Calls::close>("close");
+    standInFor<&os::Calls::flock>("flock");
+    standInFor<&os::Calls::fchown>("fchown");
+    standInFor<&os::Calls::fchmod>("fchmod");
+    standInFor<&os::Calls::fsetxattr>("fsetxattr");
+    standInFor<&os::Calls::fremovexattr>("fremovexattr");
+    standInFor<&os::Calls::linkat>("linkat");
+    standInFor<&os::Calls::renameat>("renameat");
+    standInFor<&os::Calls::renameat2>("renameat2");
+    standInFor<&os::Calls::unlinkat>("unlinkat");
+    standInFor<&os::Calls::mkdir>("mkdir");
+}
+
+} // namespace
+
+FailingCall::FailingCall(int n, int error)
+{
+    if (plan.active) {
+        std::fputs("FailingCall: one is active already\n", stderr);
+        std::abort();
+    }
+    plan = {true, n, error, 0, nullptr};
+    real = os::calls();
+    standInForAll();
+}
+
+FailingCall::~FailingCall()
+{
+    os::calls() = real;
+    plan.active = false;
+}
+
+bool FailingCall::hasFailed() const
+{
+    return plan.failed != nullptr;
+}
+
+std::string FailingCall::name() const
+{
+    return hasFailed() ? std::to_string(plan.failing) + ": " + plan.failed : "no call";
+}
+
+int countCalls(std::function<void()> const& operation)
+{
+    FailingCall const watching(std::numeric_limits<int>::max(), 0);
+    operation();
+    return plan.count;
+}
+
+} // namespace support
