@@ -1,0 +1,90 @@
+#include "host/cli/commands.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/repository/changes.h"
+#include "host/repository/last_commit.h"
+#include "host/repository/lock.h"
+#include "host/repository/names.h"
+#include "host/repository/open.h"
+#include "host/repository/staging.h"
+#include "host/repository/working_state.h"
+
+#include <algorithm>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace tav {
+
+namespace {
+
+struct Options {
+    std::vector<std::string> names;
+    bool all = false;
+};
+
+[[noreturn]] void failForUnknown(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
+{
+    OdString const path = pathInRepository(root, name);
+    for (auto const& file : changes.removed) {
+        if (file.committed.path == path) {
+            throw Failure("'" + name + "' has been removed.", "The next commit takes that without staging.");
+        }
+    }
+    auto const isPath = [&](common::VersionedFile const& file) { return file.path == path; };
+    bool const isUnchanged = std::any_of(changes.unchanged.begin(), changes.unchanged.end(), isPath);
+    if (isUnchanged || !findUnchanged(name, changes, root).isEmpty()) {
+        throw Failure("'" + name + "' is as it was committed.", "There is nothing to stage of it.");
+    }
+    throw Failure("No changed file matches '" + name + "'.", "Run 'tav status --ignored' to see what there is.");
+}
+
+std::vector<common::StagedFile> chosenFiles(
+    Options const& options, common::RepoChanges const& changes, common::RootPath const& root)
+{
+    NameFinder const finder(changes, root);
+    std::vector<common::StagedFile> chosen;
+    if (options.all) {
+        return finder.all();
+    }
+    for (std::string const& name : options.names) {
+        std::vector<common::StagedFile> const found = finder.find(name);
+        if (found.empty()) {
+            failForUnknown(name, changes, root);
+        }
+        chosen.insert(chosen.end(), found.begin(), found.end());
+    }
+    return chosen;
+}
+
+void addFilesToStage(Options const& options)
+{
+    common::RootPath const root = openRepository("");
+    os::FileLock const lock = lockRepository(root, "add");
+    std::size_t count = 0;
+    changeState(root, [&](common::Cache& cache) {
+        common::RepoChanges const changes = compare(root, lastCommitFiles(root), cache.read());
+        count = stage(chosenFiles(options, changes, root), cache.write());
+    });
+    print(count == 0 ? "Nothing new to stage.\n" : "Staged " + std::to_string(count) + (count == 1 ? " file.\n" : " files.\n"));
+}
+
+} // namespace
+
+void addAdd(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("add", "Stage changed and new files for the next commit");
+    auto const options = std::make_shared<Options>();
+    CLI::Option* const names = command->add_option("NAME", options->names,
+        "Paths of files or folders, or a part of a path that only one changed file matches");
+    CLI::Option* const all = command->add_flag("--all", options->all, "Stage every changed and new file");
+    names->excludes(all);
+    command->callback([options] {
+        if (options->names.empty() && !options->all) {
+            throw CLI::RequiredError("NAME or --all");
+        }
+        addFilesToStage(*options);
+    });
+}
+
+} // namespace tav

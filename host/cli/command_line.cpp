@@ -1,0 +1,160 @@
+#include "host/cli/command_line.h"
+
+#include "host/cli/commands.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+
+#include "platform/sdk/OdError.h"
+
+#include <unistd.h>
+
+#include <algorithm>
+#include <clocale>
+#include <csignal>
+#include <exception>
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace tav {
+
+namespace {
+
+void prepareProcess()
+{
+    // Documents hold characters as they are when the locale knows them to be printable, and characters beyond 16 bits
+    // survive only so. Under the plain C locale no character beyond ASCII is printable.
+    if (!std::setlocale(LC_CTYPE, "C.UTF-8")) {
+        std::setlocale(LC_CTYPE, "");
+    }
+    // A write beyond the size that files may have then fails like one to a full disk, instead of ending the process.
+    std::signal(SIGXFSZ, SIG_IGN);
+}
+
+std::string chosenCommand(CLI::App const& app)
+{
+    auto const chosen = app.get_subcommands();
+    return chosen.empty() ? "tav" : "tav " + chosen.front()->get_name();
+}
+
+// CLI11 takes an argument like "[old]" or "[a,b]" apart as a list of names. A mark in front keeps it whole until its
+// option takes it over.
+constexpr char kMark = '\x01';
+
+std::string marked(std::string const& argument)
+{
+    bool const isEndangered = !argument.empty() && (argument.front() == '[' || argument.front() == kMark);
+    return isEndangered ? kMark + argument : argument;
+}
+
+std::string unmarked(std::string const& argument)
+{
+    return !argument.empty() && argument.front() == kMark ? argument.substr(1) : argument;
+}
+
+void takeMarksOff(CLI::App& command)
+{
+    for (CLI::Option* const option : command.get_options()) {
+        if (option->get_items_expected_max() > 0) {
+            option->transform(unmarked);
+        }
+    }
+}
+
+/// In reverse order, which the parser wants.
+std::vector<std::string> markedArguments(int argc, char** argv)
+{
+    std::vector<std::string> arguments;
+    for (int i = argc - 1; i > 0; --i) {
+        arguments.push_back(marked(argv[i]));
+    }
+    return arguments;
+}
+
+std::string complaint(CLI::App const& app, CLI::ParseError const& error)
+{
+    std::vector<std::string> const surplus = app.remaining();
+    bool const isUnknownCommand = app.get_subcommands().empty() && !surplus.empty();
+    std::string what = isUnknownCommand ? "The following argument was not expected: " + surplus.front() : error.what();
+    what.erase(std::remove(what.begin(), what.end(), kMark), what.end());
+    return what;
+}
+
+/// Runs the command, or prints the help that was asked for.
+void parse(CLI::App& app, int argc, char** argv)
+{
+    try {
+        app.parse(markedArguments(argc, argv));
+    } catch (CLI::Success const& wish) {
+        std::ostringstream help;
+        app.exit(wish, help, help);
+        print(help.str());
+    }
+}
+
+void enterFolder(std::string const& folder)
+{
+    if (chdir(folder.c_str()) == -1) {
+        throw Failure("The folder '" + folder + "' cannot be entered.", "Check its name and your rights to it.");
+    }
+}
+
+void addCommands(CLI::App& app)
+{
+    app.require_subcommand(1);
+    app.set_help_flag("-h,--help", "Show this help and do nothing else");
+    app.add_option_function<std::string>("-C", enterFolder, "Work as if started in FOLDER")
+        ->type_name("FOLDER")
+        ->trigger_on_parse();
+    addInit(app);
+    addStatus(app);
+    addAdd(app);
+    addUnstage(app);
+    addMv(app);
+    addRm(app);
+    addFiles(app);
+    addIgnore(app);
+    takeMarksOff(app);
+    for (CLI::App* const command : app.get_subcommands({})) {
+        takeMarksOff(*command);
+    }
+}
+
+int runCommand(CLI::App& app, int argc, char** argv)
+{
+    try {
+        parse(app, argc, argv);
+        if (!flushOutput()) {
+            throw Failure("The output could not be written.", "Check the disk or the program that reads it.");
+        }
+        return kDone;
+    } catch (CLI::ParseError const& error) {
+        printError(complaint(app, error), "Run '" + chosenCommand(app) + " --help' to see how it is used.");
+        return kMisused;
+    } catch (Failure const& failure) {
+        printError(failure.what, failure.next);
+        for (std::string const& detail : failure.details) {
+            printErrorDetail(detail);
+        }
+    } catch (OdError const& error) {
+        printError(error.what(), "Check the file that the message speaks of.");
+    } catch (std::bad_alloc const&) {
+        printError("Out of memory.", "Close other programs and try again.");
+    } catch (std::exception const& error) {
+        printError(std::string("Internal error: ") + error.what(), "Please report it with the command that you ran.");
+    }
+    flushOutput();
+    return kFailed;
+}
+
+} // namespace
+
+int run(int argc, char** argv)
+{
+    prepareProcess();
+    CLI::App app("Keeps the versions of a folder of drawings.", "tav");
+    addCommands(app);
+    return runCommand(app, argc, argv);
+}
+
+} // namespace tav

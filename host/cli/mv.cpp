@@ -1,0 +1,124 @@
+#include "host/cli/commands.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/repository/changes.h"
+#include "host/repository/file_moves.h"
+#include "host/repository/lock.h"
+#include "host/repository/names.h"
+#include "host/repository/open.h"
+#include "host/repository/staging.h"
+#include "host/repository/working_state.h"
+
+#include "platform/ut/Dir.h"
+#include "platform/ut/FileName.h"
+
+#include <filesystem>
+#include <memory>
+#include <regex>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace tav {
+
+namespace {
+
+bool isInTav(OdString const& path)
+{
+    return (path + L"/").left(5) == OdString(L".tav/");
+}
+
+/// Into a folder that exists, a file keeps its name.
+OdString targetOf(OdString const& from, std::string const& typed, common::RootPath const& root)
+{
+    OdString const to = pathInRepository(root, typed);
+    OdString const full = to.isEmpty() ? root.path() : root.pathTo(to);
+    if (!ut::Dir::exists(full)) {
+        if (typed.back() == '/' && !ut::Dir::exists(root.pathTo(from))) {
+            throw Failure("There is no folder '" + typed + "'.", "Make it first.");
+        }
+        return to;
+    }
+    std::string const name = std::filesystem::path(from.ansi_str()).filename().string();
+    OdString const wideName(name.data(), name.size(), CP_UTF_8);
+    return to.isEmpty() ? wideName : to + L"/" + wideName;
+}
+
+/// A scan does not follow links to folders, so what lies behind one would be lost to the repository.
+void checkFolders(OdString const& to, common::RootPath const& root)
+{
+    std::filesystem::path folder = root.path().ansi_str();
+    for (auto const& part : std::filesystem::path(to.ansi_str()).parent_path()) {
+        folder /= part;
+        if (std::filesystem::is_symlink(std::filesystem::symlink_status(folder))) {
+            throw Failure("The repository would not keep '" + to.ansi_str() + "': '" + folder.string() + "' is a link.",
+                "Choose another folder.");
+        }
+    }
+}
+
+void checkTarget(OdString const& to, common::RootPath const& root)
+{
+    auto const rules = common::RepoIgnore(root).expressions();
+    for (auto const& part : std::filesystem::path(to.ansi_str())) {
+        std::string const name = part.string();
+        bool isLeftOut = name.front() == '.';
+        for (std::regex const& rule : rules) {
+            isLeftOut = isLeftOut || std::regex_match(name, rule);
+        }
+        if (isLeftOut) {
+            throw Failure("The repository would not keep '" + to.ansi_str() + "': its name is hidden or ignored.",
+                "Choose another name, or see 'tav ignore'.");
+        }
+    }
+}
+
+/// The files that move when `from` becomes `to`: itself, or all that lie in it.
+std::vector<Move> movesOf(OdString const& from, OdString const& to, std::vector<common::File> const& files)
+{
+    std::vector<Move> moves;
+    OdString const prefix = from + L"/";
+    for (common::File const& file : files) {
+        if (file.path == from) {
+            moves.push_back({from, to});
+        } else if (file.path.left(prefix.getLength()) == prefix) {
+            moves.push_back({file.path, to + L"/" + file.path.mid(prefix.getLength())});
+        }
+    }
+    return moves;
+}
+
+void moveFiles(std::string const& typedFrom, std::string const& typedTo)
+{
+    common::RootPath const root = openRepository("");
+    os::FileLock const lock = lockRepository(root, "mv");
+    OdString const from = pathInRepository(root, typedFrom);
+    OdString const to = targetOf(from, typedTo, root);
+    std::vector<Move> const moves = movesOf(from, to, scan(root));
+    if (moves.empty()) {
+        throw Failure("'" + typedFrom + "' is no file or folder of the repository.", "Run 'tav files' to see those.");
+    }
+    if (isInTav(from)) {
+        throw Failure("'" + typedFrom + "' belongs to the repository itself.", "It has to stay where it is.");
+    }
+    checkTarget(to, root);
+    checkFolders(to, root);
+    FileMoves onDisk;
+    onDisk.move(root.pathTo(from).ansi_str(), root.pathTo(to).ansi_str());
+    changeState(root, [&](common::Cache& cache) { stageMoves(moves, cache.write()); });
+    onDisk.keep();
+    print("Renamed '" + shown(from) + "' to '" + shown(to) + "'.\n");
+}
+
+} // namespace
+
+void addMv(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("mv", "Rename a file or folder, and stage that");
+    auto const names = std::make_shared<std::pair<std::string, std::string>>();
+    command->add_option("OLD", names->first, "Path of a file or folder of the repository")->required();
+    command->add_option("NEW", names->second, "Its new path, or an existing folder to move it into")->required();
+    command->callback([names] { moveFiles(names->first, names->second); });
+}
+
+} // namespace tav

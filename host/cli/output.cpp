@@ -1,0 +1,130 @@
+#include "host/cli/output.h"
+
+#include "json/json_writer.h"
+
+#include <unistd.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <string_view>
+
+namespace tav {
+
+namespace {
+
+bool isTerminal()
+{
+    static bool const is = isatty(STDOUT_FILENO) == 1;
+    return is;
+}
+
+bool isControl(wchar_t c)
+{
+    return c < 0x20 || (c >= 0x7F && c < 0xA0);
+}
+
+/// A byte of a name that is not valid UTF-8. A terminal of another character set may take it for a control character.
+bool isStrayByte(wchar_t c)
+{
+    return c >= 0xDC80 && c <= 0xDCFF;
+}
+
+OdString withControlsEscaped(OdString const& text)
+{
+    OdString escaped;
+    for (std::size_t i = 0; i < text.getLength(); ++i) {
+        wchar_t const c = text.getAt(i);
+        if (isControl(c) || isStrayByte(c)) {
+            escaped += OdString().format(L"\\x%02X", static_cast<unsigned>(c) & 0xFF);
+        } else {
+            escaped += c;
+        }
+    }
+    return escaped;
+}
+
+OdString fromUtf8(std::string const& text)
+{
+    return OdString(text.data(), text.size(), CP_UTF_8);
+}
+
+/// Messages of several lines become one; whatever else could move the cursor is escaped.
+std::string onOneLine(std::string text)
+{
+    while (!text.empty() && text.back() == '\n') {
+        text.pop_back();
+    }
+    for (char& c : text) {
+        c = c == '\n' || c == '\t' ? ' ' : c;
+    }
+    return withControlsEscaped(fromUtf8(text)).ansi_str();
+}
+
+std::string asSentence(std::string const& text)
+{
+    bool const isEnded = !text.empty() && std::string_view(".!?:").find(text.back()) != std::string_view::npos;
+    return isEnded ? text : text + ".";
+}
+
+} // namespace
+
+void print(std::string const& text)
+{
+    std::fwrite(text.data(), 1, text.size(), stdout);
+}
+
+void printJson(kutils::json::Value const& document)
+{
+    std::wstring const text = kutils::json::write_string(document, true);
+    print(OdString(text.c_str(), text.size()).ansi_str() + "\n");
+}
+
+void printError(std::string const& what, std::string const& next)
+{
+    std::string const line = "tav: " + asSentence(onOneLine(what)) + " " + onOneLine(next) + "\n";
+    std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
+void printErrorDetail(std::string const& detail)
+{
+    std::string const line = "  " + onOneLine(detail) + "\n";
+    std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
+bool flushOutput()
+{
+    return std::fflush(stdout) == 0 && std::ferror(stdout) == 0;
+}
+
+std::string shown(OdString const& name)
+{
+    return (isTerminal() ? withControlsEscaped(name) : name).ansi_str();
+}
+
+std::string coloured(Colour colour, std::string const& text)
+{
+    static char const* const noColour = std::getenv("NO_COLOR");
+    bool const isWanted = isTerminal() && (!noColour || !*noColour);
+    if (!isWanted || colour == Colour::none) {
+        return text;
+    }
+    return (colour == Colour::red ? "\x1b[31m" : "\x1b[32m") + text + "\x1b[m";
+}
+
+kutils::json::Value jsonText(OdString const& text)
+{
+    std::wstring units;
+    units.reserve(text.getLength());
+    for (std::size_t i = 0; i < text.getLength(); ++i) {
+        auto const c = static_cast<std::uint32_t>(text.getAt(i));
+        if (c <= 0xFFFF) {
+            units += static_cast<wchar_t>(c);
+        } else {
+            units += static_cast<wchar_t>(0xD800 + ((c - 0x10000) >> 10));
+            units += static_cast<wchar_t>(0xDC00 + ((c - 0x10000) & 0x3FF));
+        }
+    }
+    return units;
+}
+
+} // namespace tav

@@ -1,0 +1,33 @@
+/// What commands print: names, documents and errors.
+#pragma once
+
+#include "json/json_value.h"
+#include "platform/sdk/OdString.h"
+
+#include <string>
+
+namespace tav {
+
+/// Prints `text`, in UTF-8, as it stands.
+void print(std::string const& text);
+/// Prints a document for programs, with a line feed after it.
+void printJson(kutils::json::Value const& document);
+/// Prints "tav: <what> <next>" as one line on the error stream.
+void printError(std::string const& what, std::string const& next);
+/// Prints a line of details that follows an error, indented.
+void printErrorDetail(std::string const& detail);
+/// Hands over what was printed; false when anything could not be written.
+bool flushOutput();
+
+/// A file name as people see it: on a terminal control characters are escaped, since a name may hold any of them and a
+/// terminal obeys them. Elsewhere the bytes of the name.
+std::string shown(OdString const& name);
+enum class Colour { none, red, green };
+
+/// `text` in that colour where people see it: on a terminal, unless the environment sets NO_COLOR.
+std::string coloured(Colour colour, std::string const& text);
+
+/// A text as a member of a document. Characters beyond 16 bits become surrogate pairs, which JSON asks for in escapes.
+kutils::json::Value jsonText(OdString const& text);
+
+} // namespace tav

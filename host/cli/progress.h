@@ -1,0 +1,35 @@
+/// A progress bar for long work.
+#pragma once
+
+#include <chrono>
+#include <cstdint>
+#include <string>
+
+namespace tav {
+
+/// Shows on the error stream how far a work has come, once it has taken half a second. Shows nothing where that stream
+/// is no terminal. The line is wiped when the work is over.
+class Progress {
+public:
+    /// `total` is counted in the unit of `advance`; `what` names it ("files").
+    Progress(std::string what, std::uint64_t total);
+    Progress(Progress const&) = delete;
+    Progress& operator=(Progress const&) = delete;
+    ~Progress();
+
+    void advance(std::uint64_t count = 1);
+
+private:
+    using Clock = std::chrono::steady_clock;
+
+    void draw() const;
+
+    std::string what_;
+    std::uint64_t total_;
+    std::uint64_t done_ = 0;
+    bool enabled_;
+    bool drawn_ = false;
+    Clock::time_point next_;
+};
+
+} // namespace tav

@@ -1,0 +1,106 @@
+#include "host/cli/commands.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/repository/changes.h"
+#include "host/repository/file_moves.h"
+#include "host/repository/last_commit.h"
+#include "host/repository/lock.h"
+#include "host/repository/names.h"
+#include "host/repository/open.h"
+#include "host/repository/staging.h"
+#include "host/repository/working_state.h"
+
+#include "platform/os/os_files.h"
+
+#include <algorithm>
+#include <filesystem>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace tav {
+
+namespace {
+
+template <class List, class PathOf>
+bool holds(List const& list, OdString const& path, PathOf const& pathOf)
+{
+    return std::any_of(list.begin(), list.end(), [&](auto const& item) { return pathOf(item) == path; });
+}
+
+/// The path of the committed file that `name` means. Only content that a commit keeps may be removed.
+OdString removablePath(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
+{
+    OdString const typed = pathInRepository(root, name);
+    auto const workingPath = [](auto const& file) { return file.working.path; };
+    auto const committedPath = [](auto const& file) { return file.committed.path; };
+    if (holds(changes.untracked, typed, workingPath)) {
+        throw Failure("'" + name + "' is in no commit: removing it would lose it.",
+            "Use 'tav unstage' if it is staged, and delete it yourself if you do not need it.");
+    }
+    if (holds(changes.modified, typed, workingPath)) {
+        throw Failure("'" + name + "' has changes that are in no commit.", "Commit them first.");
+    }
+    if (holds(changes.removed, typed, committedPath)) {
+        return typed;
+    }
+    if (holds(changes.unchanged, typed, [](auto const& file) { return file.path; })) {
+        return typed;
+    }
+    OdString const found = findUnchanged(name, changes, root);
+    if (found.isEmpty()) {
+        throw Failure("No committed file matches '" + name + "'.", "Run 'tav status' to see what there is.");
+    }
+    return found;
+}
+
+/// Where a removed file waits until the new state is safe. A command that was killed may have left such files.
+std::string waitingName(common::RootPath const& root, std::size_t number)
+{
+    std::string const prefix = (root.tavPath() + L"/removed-").ansi_str();
+    while (std::filesystem::exists(std::filesystem::symlink_status(prefix + std::to_string(number)))) {
+        ++number;
+    }
+    return prefix + std::to_string(number);
+}
+
+void removeFiles(std::vector<std::string> const& names)
+{
+    common::RootPath const root = openRepository("");
+    os::FileLock const lock = lockRepository(root, "rm");
+    FileMoves moves;
+    std::vector<std::string> waiting;
+    std::size_t count = 0;
+    changeState(root, [&](common::Cache& cache) {
+        common::RepoChanges const changes = compare(root, lastCommitFiles(root), cache.read());
+        std::vector<common::StagedFile> staged;
+        for (std::string const& name : names) {
+            OdString const path = removablePath(name, changes, root);
+            staged.emplace_back(path, common::FileChange::removed);
+            if (ut::FileName::fileExists(root.pathTo(path))) {
+                waiting.push_back(waitingName(root, waiting.size()));
+                moves.move(root.pathTo(path).ansi_str(), waiting.back());
+            }
+        }
+        count = stage(staged, cache.write());
+    });
+    moves.keep();
+    for (std::string const& file : waiting) {
+        if (std::error_code const error = os::removeFile(file)) {
+            printError("'" + file + "' is left over: " + error.message() + ".", "Delete it yourself.");
+        }
+    }
+    print("Removed " + std::to_string(count) + (count == 1 ? " file" : " files") + "; the next commit takes that.\n");
+}
+
+} // namespace
+
+void addRm(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("rm", "Remove committed files, and stage that");
+    auto const names = std::make_shared<std::vector<std::string>>();
+    command->add_option("NAME", *names, "Paths of files, or a part of a path")->required();
+    command->callback([names] { removeFiles(*names); });
+}
+
+} // namespace tav

@@ -1,0 +1,161 @@
+#include "host/cli/commands.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/repository/open.h"
+#include "host/repository/status.h"
+
+#include <memory>
+#include <string>
+
+namespace tav {
+
+namespace {
+
+struct Options {
+    bool ignored = false;
+    bool json = false;
+};
+
+kutils::json::Array documentOf(std::vector<OdString> const& paths)
+{
+    kutils::json::Array array;
+    array.reserve(paths.size());
+    for (OdString const& path : paths) {
+        array.push_back(jsonText(path));
+    }
+    return array;
+}
+
+kutils::json::Array documentOf(std::vector<common::ConflictInfo> const& conflicts)
+{
+    kutils::json::Array array;
+    for (common::ConflictInfo const& conflict : conflicts) {
+        kutils::json::Object object;
+        object[L"path"] = jsonText(conflict.path);
+        object[L"theirs"] = jsonText(conflict.theirsPath);
+        object[L"base"] = jsonText(conflict.basePath);
+        array.emplace_back(std::move(object));
+    }
+    return array;
+}
+
+kutils::json::Array documentOf(std::vector<StagedEntry> const& entries)
+{
+    kutils::json::Array array;
+    array.reserve(entries.size());
+    for (StagedEntry const& entry : entries) {
+        kutils::json::Object object;
+        object[L"path"] = jsonText(entry.path);
+        object[L"change"] = jsonText(valueOrFail(common::toString(entry.change), "Mend '.tav/tav.state'."));
+        object[L"missing"] = entry.isMissing;
+        if (!entry.previousPath.isEmpty()) {
+            object[L"previous"] = jsonText(entry.previousPath);
+        }
+        array.emplace_back(std::move(object));
+    }
+    return array;
+}
+
+void printDocument(Status const& status, bool withIgnored)
+{
+    kutils::json::Object object;
+    object[L"branch"] = jsonText(status.branch);
+    object[L"conflicts"] = documentOf(status.conflicts);
+    object[L"staged"] = documentOf(status.staged);
+    object[L"modified"] = documentOf(status.modified);
+    object[L"untracked"] = documentOf(status.untracked);
+    object[L"removed"] = documentOf(status.removed);
+    if (withIgnored) {
+        object[L"ignored"] = documentOf(status.ignored);
+    }
+    printJson(std::move(object));
+}
+
+void printGroup(char const* title, char const* hint, char const* label, Colour colour, std::vector<OdString> const& paths)
+{
+    if (paths.empty()) {
+        return;
+    }
+    print(std::string(title) + "\n");
+    if (*hint) {
+        print("  (" + std::string(hint) + ")\n");
+    }
+    for (OdString const& path : paths) {
+        print("        " + coloured(colour, label + shown(path)) + "\n");
+    }
+    print("\n");
+}
+
+void printConflicts(std::vector<common::ConflictInfo> const& conflicts)
+{
+    std::vector<OdString> paths;
+    for (common::ConflictInfo const& conflict : conflicts) {
+        paths.push_back(conflict.path);
+    }
+    printGroup("Drawings in conflict:", "the other versions lie in '.tav/conflict'", "", Colour::red, paths);
+}
+
+std::string lineOf(StagedEntry const& entry)
+{
+    if (entry.isMissing) {
+        return "gone:     " + shown(entry.path);
+    }
+    if (!entry.previousPath.isEmpty()) {
+        return "renamed:  " + shown(entry.previousPath) + " -> " + shown(entry.path);
+    }
+    switch (entry.change) {
+    case common::FileChange::added: return "new:      " + shown(entry.path);
+    case common::FileChange::modified: return "modified: " + shown(entry.path);
+    case common::FileChange::removed: return "removed:  " + shown(entry.path);
+    }
+    return shown(entry.path);
+}
+
+void printStaged(std::vector<StagedEntry> const& entries)
+{
+    if (entries.empty()) {
+        return;
+    }
+    print("Staged for the next commit:\n  (use 'tav unstage NAME' to take a file out)\n");
+    for (StagedEntry const& entry : entries) {
+        print("        " + coloured(entry.isMissing ? Colour::red : Colour::green, lineOf(entry)) + "\n");
+    }
+    print("\n");
+}
+
+void printForPeople(Status const& status)
+{
+    print("On branch " + shown(status.branch) + "\n\n");
+    printConflicts(status.conflicts);
+    printStaged(status.staged);
+    printGroup("Modified, not staged:", "use 'tav add NAME' to stage a file", "modified: ", Colour::red, status.modified);
+    printGroup("Removed:", "the next commit takes these without staging", "removed:  ", Colour::red, status.removed);
+    printGroup("New, not staged:", "use 'tav add NAME' or 'tav add --all' to stage", "", Colour::red, status.untracked);
+    printGroup("Ignored:", "see 'tav ignore' for the rules", "", Colour::none, status.ignored);
+    if (status.isClean()) {
+        print("Nothing has changed since the last commit.\n");
+    }
+}
+
+void showStatus(Options const& options)
+{
+    Status const status = statusOf(openRepository(""), options.ignored);
+    if (options.json) {
+        printDocument(status, options.ignored);
+    } else {
+        printForPeople(status);
+    }
+}
+
+} // namespace
+
+void addStatus(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("status", "Show what has changed and what is staged");
+    auto const options = std::make_shared<Options>();
+    command->add_flag("--ignored", options->ignored, "Show the files that the ignore rules keep out, too");
+    command->add_flag("--json", options->json, "Print a document for programs");
+    command->callback([options] { showStatus(*options); });
+}
+
+} // namespace tav

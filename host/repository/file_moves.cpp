@@ -1,0 +1,48 @@
+#include "host/repository/file_moves.h"
+
+#include "host/failure.h"
+
+#include "platform/os/os_move.h"
+
+#include <filesystem>
+
+namespace tav {
+
+namespace {
+
+bool entryExists(std::string const& path)
+{
+    std::error_code error;
+    return std::filesystem::exists(std::filesystem::symlink_status(path, error));
+}
+
+} // namespace
+
+FileMoves::~FileMoves()
+{
+    for (auto move = done_.rbegin(); move != done_.rend(); ++move) {
+        // Nobody is left to tell; the file lies whole under its new name.
+        [[maybe_unused]] std::error_code const ignored = os::moveEntry(move->second, move->first);
+    }
+}
+
+void FileMoves::move(std::string const& from, std::string const& to)
+{
+    bool const wasThere = entryExists(from);
+    done_.emplace_back(from, to);
+    std::error_code const error = os::moveEntry(from, to);
+    if (!error) {
+        return;
+    }
+    bool const hasMovedUnflushed = wasThere && !entryExists(from);
+    if (!hasMovedUnflushed) {
+        done_.pop_back();
+    }
+    if (error == std::errc::file_exists) {
+        throw Failure("'" + to + "' exists already.", "Choose another name, or move that one away first.");
+    }
+    throw Failure("'" + from + "' cannot be moved to '" + to + "': " + error.message() + ".",
+        "Check that the folder exists and that you may write there.");
+}
+
+} // namespace tav

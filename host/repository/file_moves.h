@@ -1,0 +1,26 @@
+/// Moves of working files that are undone unless the command succeeds.
+#pragma once
+
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace tav {
+
+/// Moves entries, and moves them back in reverse order when it goes without `keep`. Paths are full, in bytes.
+class FileMoves {
+public:
+    FileMoves() = default;
+    FileMoves(FileMoves const&) = delete;
+    FileMoves& operator=(FileMoves const&) = delete;
+    ~FileMoves();
+
+    /// Throws `Failure` when `to` is taken or the system refuses.
+    void move(std::string const& from, std::string const& to);
+    void keep() { done_.clear(); }
+
+private:
+    std::vector<std::pair<std::string, std::string>> done_;
+};
+
+} // namespace tav

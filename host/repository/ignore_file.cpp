@@ -1,0 +1,105 @@
+#include "host/repository/ignore_file.h"
+
+#include "host/failure.h"
+
+#include "platform/ut/FileName.h"
+#include "platform/ut/TextFile.h"
+#include "platform/ut/text.h"
+
+#include <algorithm>
+#include <regex>
+
+namespace tav {
+
+namespace {
+
+constexpr char const* kCheckDisk = "Check the free space and your rights in '.tav'.";
+
+void checkRule(OdString const& rule)
+{
+    bool const holdsLineEnd = rule != OdString(rule.c_str()) || rule.ansi_str().find_first_of("\r\n") != std::string::npos;
+    if (rule.isEmpty() || holdsLineEnd) {
+        throw Failure("A rule is one line that is not empty.", "Give one rule at a time.");
+    }
+    try {
+        common::RepoIgnore::compile(rule);
+    } catch (std::regex_error const&) {
+        throw Failure("'" + rule.ansi_str() + "' is no regular expression that can be used.",
+            "Rules match whole names: write '^.*\\.tmp$' for all names that end in '.tmp'.");
+    }
+}
+
+OdString pathOf(common::RootPath const& root)
+{
+    return root.propertiesPath() + ut::FileName::getPathSeparator() + L"ignore";
+}
+
+/// Where the list of rules ends in the text of an ignore file: at its first empty line, or its end.
+std::size_t endOfRules(OdString const& text)
+{
+    std::size_t lineStart = 0;
+    for (std::size_t i = 0; i < text.getLength(); ++i) {
+        if (text.getAt(i) != L'\n') {
+            continue;
+        }
+        OdString const line = text.mid(lineStart, i - lineStart);
+        if (line.isEmpty() || line == OdString(L"\r")) {
+            return lineStart;
+        }
+        lineStart = i + 1;
+    }
+    return text.getLength();
+}
+
+OdString withRule(OdString const& text, OdString const& rule)
+{
+    std::size_t const end = endOfRules(text);
+    OdString changed = text.left(end);
+    if (end > 0 && text.getAt(end - 1) != L'\n') {
+        changed += L'\n';
+    }
+    changed += rule;
+    if (end < text.getLength()) {
+        changed += L'\n';
+    }
+    return changed + text.mid(end);
+}
+
+} // namespace
+
+std::vector<OdString> ignoreRules(common::RootPath const& root)
+{
+    try {
+        return common::RepoIgnore(root).rules();
+    } catch (std::regex_error const&) {
+        throw Failure("The ignore file '" + pathOf(root).ansi_str() + "' has a rule that is no regular expression that can be used.", "Mend or remove it there.");
+    }
+}
+
+void makeIgnoreFile(common::RootPath const& root)
+{
+    if (!ut::FileName::mkdir(root.propertiesPath(), 0777, ut::FileName::kFullPath)) {
+        throw Failure("The folder '" + root.propertiesPath().ansi_str() + "' cannot be made.", kCheckDisk);
+    }
+    valueOrFail(common::RepoIgnore::write(root), kCheckDisk);
+}
+
+bool addIgnoreRule(common::RootPath const& root, OdString const& rule)
+{
+    checkRule(rule);
+    makeIgnoreFile(root);
+    std::vector<OdString> const rules = ignoreRules(root);
+    if (std::find(rules.begin(), rules.end(), rule) != rules.end()) {
+        return false;
+    }
+    OdString const path = pathOf(root);
+    ut::TextFile file(path);
+    file.create();
+    file.addLine(withRule(ut::readEntireFile(path), rule));
+    if (!file.write()) {
+        throw Failure("The ignore file '" + path.ansi_str() + "' cannot be written.", kCheckDisk);
+    }
+    return true;
+}
+
+} // namespace tav

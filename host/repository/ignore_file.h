@@ -1,0 +1,24 @@
+/// Changing the ignore rules of a repository.
+#pragma once
+
+#include "common/mu_common_repo_prop.h"
+
+#include <string>
+#include <vector>
+
+namespace tav {
+
+/// The rules in effect, in order: those of the ignore file, or the defaults when there is none.
+std::vector<OdString> ignoreRules(common::RootPath const& root);
+
+/// Makes the properties folder and the ignore file with the default rules, as far as they are missing.
+/// Throws `Failure` when one cannot be made.
+void makeIgnoreFile(common::RootPath const& root);
+
+/// Adds `rule` behind the last rule in effect, making the ignore file first when there is none. What stands behind an
+/// empty line in the file is out of effect and stays behind the new rule. False when the rule is there already.
+/// Throws `Failure` for a rule that is no valid expression or would not be read back, and when the file cannot be
+/// written; the file is untouched then.
+bool addIgnoreRule(common::RootPath const& root, OdString const& rule);
+
+} // namespace tav

@@ -1,0 +1,40 @@
+#include "host/repository/lock.h"
+
+#include "host/failure.h"
+
+#include <unistd.h>
+
+#include <array>
+#include <chrono>
+
+namespace tav {
+
+namespace {
+
+constexpr std::chrono::milliseconds kPatience(2000);
+
+std::string hostName()
+{
+    std::array<char, 256> name{};
+    return gethostname(name.data(), name.size() - 1) == 0 ? name.data() : "this machine";
+}
+
+} // namespace
+
+os::FileLock lockRepository(common::RootPath const& root, std::string const& name)
+{
+    std::string const path = (root.tavPath() + L"/tav.lock").ansi_str();
+    std::string const note = "'tav " + name + "', process " + std::to_string(getpid()) + " on " + hostName();
+    os::FileLock lock;
+    std::error_code const error = lock.acquire(path, note, kPatience);
+    if (error == std::errc::operation_would_block) {
+        throw Failure(os::FileLock::holder(path) + ", is changing the repository.", "Run the command again when that is done.");
+    }
+    if (error) {
+        throw Failure("The repository cannot be locked: " + error.message() + ".",
+            "Check your rights to '" + root.tavPath().ansi_str() + "'.");
+    }
+    return lock;
+}
+
+} // namespace tav

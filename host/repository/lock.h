@@ -1,0 +1,15 @@
+/// One changing command at a time.
+#pragma once
+
+#include "common/mu_common_repo_prop.h"
+#include "platform/os/os_lock.h"
+
+#include <string>
+
+namespace tav {
+
+/// Takes the lock of the repository for the command `name`, waiting shortly for another command to end. Held as long as
+/// the result lives. Throws `Failure` that says who holds it.
+os::FileLock lockRepository(common::RootPath const& root, std::string const& name);
+
+} // namespace tav

@@ -1,0 +1,110 @@
+#include "host/repository/staging.h"
+
+#include "host/failure.h"
+
+#include <algorithm>
+#include <cwctype>
+#include <map>
+#include <set>
+#include <utility>
+
+namespace tav {
+
+namespace {
+
+/// Documents hold a character that is not printable by its low 16 bits only.
+bool isStorable(OdString const& path)
+{
+    for (std::size_t i = 0; i < path.getLength(); ++i) {
+        wchar_t const c = path.getAt(i);
+        if (c > 0xFFFF && !std::iswprint(static_cast<std::wint_t>(c))) {
+            return false;
+        }
+    }
+    return true;
+}
+
+void checkStorable(OdString const& path)
+{
+    if (!isStorable(path)) {
+        throw Failure("The name '" + path.ansi_str() + "' holds a character that cannot be recorded.",
+            "Rename the file and try again.");
+    }
+}
+
+using Paths = std::set<OdString>;
+
+std::size_t dropStaged(Paths const& paths, common::State& state)
+{
+    auto& staged = state.stagedFiles;
+    std::size_t const before = staged.size();
+    auto const isListed = [&](common::StagedFile const& file) { return paths.count(file.path) > 0; };
+    staged.erase(std::remove_if(staged.begin(), staged.end(), isListed), staged.end());
+    return before - staged.size();
+}
+
+/// The path that a file had before its first move.
+OdString takeFirstPath(OdString const& path, common::State& state)
+{
+    auto const rename = state.renames.find(path);
+    if (rename == state.renames.end()) {
+        return path;
+    }
+    OdString const first = rename->second;
+    state.renames.erase(rename);
+    return first;
+}
+
+} // namespace
+
+std::size_t stage(std::vector<common::StagedFile> const& files, common::State& state)
+{
+    std::map<OdString, std::size_t> positions;
+    for (std::size_t i = 0; i < state.stagedFiles.size(); ++i) {
+        positions.emplace(state.stagedFiles[i].path, i);
+    }
+    std::size_t count = 0;
+    for (common::StagedFile const& file : files) {
+        checkStorable(file.path);
+        auto const [position, isNew] = positions.emplace(file.path, state.stagedFiles.size());
+        if (isNew) {
+            state.stagedFiles.push_back(file);
+            ++count;
+        } else {
+            state.stagedFiles[position->second].change = file.change;
+        }
+    }
+    return count;
+}
+
+std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state)
+{
+    Paths paths;
+    for (common::StagedFile const& file : files) {
+        paths.insert(file.path);
+        state.renames.erase(file.path);
+    }
+    return dropStaged(paths, state);
+}
+
+void stageMoves(std::vector<Move> const& moves, common::State& state)
+{
+    Paths left;
+    std::vector<common::StagedFile> moved;
+    for (Move const& move : moves) {
+        left.insert(move.from);
+        OdString const first = takeFirstPath(move.from, state);
+        if (first == move.to) {
+            left.insert(move.to);
+            continue;
+        }
+        moved.emplace_back(move.to, common::FileChange::added);
+        if (isStorable(first)) { // No commit holds a file of any other name: it is new, not renamed.
+            state.renames[move.to] = first;
+        }
+    }
+    dropStaged(left, state);
+    stage(moved, state);
+}
+
+} // namespace tav

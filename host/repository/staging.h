@@ -1,0 +1,28 @@
+/// What the commands change in the working state.
+#pragma once
+
+#include "common/mu_common_state.h"
+
+#include <cstddef>
+#include <vector>
+
+namespace tav {
+
+/// Stages `files` behind what is staged already; what is staged under the same path gets the new change in its place.
+/// Returns how many were not staged before. Throws `Failure` for a path that the state file cannot hold.
+std::size_t stage(std::vector<common::StagedFile> const& files, common::State& state);
+
+/// Takes `files` out of the staged ones, with what was noted of their renames. Returns how many were staged.
+std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state);
+
+/// A file of the repository that has a new path.
+struct Move {
+    OdString from;
+    OdString to;
+};
+
+/// Notes that files have moved, and stages them where they are now. One that moved before keeps the path that it had
+/// first; one that is back at that path is no rename any more.
+void stageMoves(std::vector<Move> const& moves, common::State& state);
+
+} // namespace tav

@@ -1,0 +1,108 @@
+#include "host/repository/status.h"
+
+#include "host/repository/changes.h"
+#include "host/repository/last_commit.h"
+#include "host/repository/working_state.h"
+
+#include "common/mu_common_file_utils.h"
+
+#include <algorithm>
+#include <set>
+#include <utility>
+
+namespace tav {
+
+namespace {
+
+using Paths = std::set<OdString>;
+
+template <class List, class PathOf>
+std::vector<OdString> sortedWithout(Paths const& left, List const& list, PathOf const& pathOf)
+{
+    std::vector<OdString> paths;
+    paths.reserve(list.size());
+    for (auto const& item : list) {
+        if (left.count(pathOf(item)) == 0) {
+            paths.push_back(pathOf(item));
+        }
+    }
+    std::sort(paths.begin(), paths.end());
+    return paths;
+}
+
+StagedEntry entryOf(common::StagedFile const& file, common::State const& state, common::RootPath const& root)
+{
+    StagedEntry entry{file.path, file.change, OdString(), false};
+    auto const rename = state.renames.find(file.path);
+    if (rename != state.renames.end()) {
+        entry.previousPath = rename->second;
+    }
+    entry.isMissing = file.change != common::FileChange::removed && !ut::FileName::fileExists(root.pathTo(file.path));
+    return entry;
+}
+
+std::vector<StagedEntry> stagedEntries(common::State const& state, common::RootPath const& root)
+{
+    std::vector<StagedEntry> entries;
+    for (common::StagedFile const& file : state.stagedFiles) {
+        entries.push_back(entryOf(file, state, root));
+    }
+    auto const byPath = [](StagedEntry const& a, StagedEntry const& b) { return a.path < b.path; };
+    std::stable_sort(entries.begin(), entries.end(), byPath);
+    return entries;
+}
+
+Paths stagedPaths(common::State const& state)
+{
+    Paths paths;
+    for (common::StagedFile const& file : state.stagedFiles) {
+        paths.insert(file.path);
+    }
+    return paths;
+}
+
+/// Committed files that are accounted for when they are missing: staged as removed, or renamed.
+Paths pathsLeft(common::State const& state)
+{
+    Paths paths = stagedPaths(state);
+    for (auto const& [path, previous] : state.renames) {
+        paths.insert(previous);
+    }
+    return paths;
+}
+
+std::vector<common::ConflictInfo> conflictsOf(common::RootPath const& root)
+{
+    std::vector<common::ConflictInfo> conflicts;
+    for (auto const& conflict : common::collectConflictPaths(root)) {
+        conflicts.push_back(*conflict);
+    }
+    return conflicts;
+}
+
+} // namespace
+
+Status statusOf(common::RootPath const& root, bool withIgnored)
+{
+    auto const cache = readState(root);
+    common::State const& state = cache->read();
+    common::RepoChanges const changes = compare(root, lastCommitFiles(root), state);
+    Paths const staged = stagedPaths(state);
+    auto const workingPath = [](auto const& file) -> OdString const& { return file.working.path; };
+    auto const committedPath = [](auto const& file) -> OdString const& { return file.committed.path; };
+
+    Status status;
+    status.branch = state.head;
+    status.conflicts = conflictsOf(root);
+    status.staged = stagedEntries(state, root);
+    status.modified = sortedWithout(staged, changes.modified, workingPath);
+    status.untracked = sortedWithout(staged, changes.untracked, workingPath);
+    status.removed = sortedWithout(pathsLeft(state), changes.removed, committedPath);
+    if (withIgnored) {
+        status.ignored = ignoredFiles(root);
+        std::sort(status.ignored.begin(), status.ignored.end());
+    }
+    return status;
+}
+
+} // namespace tav

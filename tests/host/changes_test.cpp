@@ -1,0 +1,202 @@
+#include "host/failure.h"
+#include "host/repository/changes.h"
+
+#include "tests/support/temp_repository.h"
+
+#include <gmock/gmock.h>
+
+#include <string>
+
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+class Compare : public testing::Test {
+protected:
+    /// Writes a file as it stands in the commit.
+    void commit(std::string const& name)
+    {
+        std::string const content = "committed " + name;
+        repo.write(name, content);
+        committed_.push_back({wide(name), OdString(L"po#") + generateSha(content.data(), static_cast<int>(content.size()))});
+    }
+
+    void index(std::string const& name, bool modified)
+    {
+        state_.index[wide(name)] = {common::modifyTime(wide(name), repo.root()), modified};
+    }
+
+    common::RepoChanges compare() const { return tav::compare(repo.root(), committed_, state_); }
+
+    static OdString wide(std::string const& name) { return OdString(name.data(), name.size(), CP_UTF_8); }
+
+    static std::vector<std::string> unchanged(common::RepoChanges const& changes)
+    {
+        std::vector<std::string> names;
+        for (auto const& file : changes.unchanged) {
+            names.push_back(file.path.ansi_str());
+        }
+        return names;
+    }
+
+    static std::vector<std::string> modified(common::RepoChanges const& changes)
+    {
+        std::vector<std::string> names;
+        for (auto const& file : changes.modified) {
+            EXPECT_EQ(file.working.path, file.committed.path);
+            names.push_back(file.working.path.ansi_str());
+        }
+        return names;
+    }
+
+    static std::vector<std::string> untracked(common::RepoChanges const& changes)
+    {
+        std::vector<std::string> names;
+        for (auto const& file : changes.untracked) {
+            names.push_back(file.working.path.ansi_str());
+        }
+        return names;
+    }
+
+    static std::vector<std::string> removed(common::RepoChanges const& changes)
+    {
+        std::vector<std::string> names;
+        for (auto const& file : changes.removed) {
+            names.push_back(file.committed.path.ansi_str());
+        }
+        return names;
+    }
+
+    support::TempRepository const repo;
+    std::vector<common::VersionedFile> committed_;
+    common::State state_;
+};
+
+TEST_F(Compare, FindsNothingInAnEmptyFolder)
+{
+    common::RepoChanges const changes = compare();
+    EXPECT_THAT(unchanged(changes), IsEmpty());
+    EXPECT_THAT(modified(changes), IsEmpty());
+    EXPECT_THAT(untracked(changes), IsEmpty());
+    EXPECT_THAT(removed(changes), IsEmpty());
+}
+
+TEST_F(Compare, SortsEveryFileIntoOneList)
+{
+    commit("same.dwg");
+    commit("changed.dwg");
+    repo.write("changed.dwg", "other");
+    commit("gone.dwg");
+    unlink(repo.pathTo("gone.dwg").c_str());
+    repo.add({"new.dwg"});
+    common::RepoChanges const changes = compare();
+    EXPECT_THAT(unchanged(changes), ElementsAre("same.dwg"));
+    EXPECT_THAT(modified(changes), ElementsAre("changed.dwg"));
+    EXPECT_THAT(untracked(changes), ElementsAre("new.dwg"));
+    EXPECT_THAT(removed(changes), ElementsAre("gone.dwg"));
+}
+
+TEST_F(Compare, KeepsTheOrderOfTheScanAndOfTheCommit)
+{
+    for (char const* const name : {"b/z.dwg", "y.dwg", "a/x.dwg"}) {
+        commit(name);
+        repo.write(name, "other");
+        committed_.push_back({wide("gone/" + std::string(name)), L"po#"});
+    }
+    repo.add({"b/new.dwg", "new.dwg"});
+    common::RepoChanges const changes = compare();
+    EXPECT_THAT(modified(changes), ElementsAre("y.dwg", "a/x.dwg", "b/z.dwg"));
+    EXPECT_THAT(untracked(changes), ElementsAre("new.dwg", "b/new.dwg"));
+    EXPECT_THAT(removed(changes), ElementsAre("gone/b/z.dwg", "gone/y.dwg", "gone/a/x.dwg"));
+}
+
+TEST_F(Compare, TakesAFileForRemovedThatIsIgnoredOrHiddenByNow)
+{
+    commit("a.old");
+    commit(".hidden.dwg");
+    repo.ignore("^.*\\.old$");
+    common::RepoChanges const changes = compare();
+    EXPECT_THAT(removed(changes), ElementsAre("a.old", ".hidden.dwg"));
+    EXPECT_THAT(untracked(changes), ElementsAre(".tav/properties/ignore"));
+}
+
+TEST_F(Compare, TrustsTheIndexForAFileOfUnchangedTime)
+{
+    commit("a.dwg");
+    repo.write("a.dwg", "other");
+    index("a.dwg", false);
+    EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg"));
+}
+
+TEST_F(Compare, ReadsAFileOfAnotherTimeThanInTheIndex)
+{
+    commit("a.dwg");
+    commit("b.dwg");
+    index("a.dwg", false);
+    index("b.dwg", false);
+    repo.write("b.dwg", "other");
+    --state_.index[L"a.dwg"].lastChecked;
+    --state_.index[L"b.dwg"].lastChecked;
+    EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg"));
+    EXPECT_THAT(modified(compare()), ElementsAre("b.dwg"));
+}
+
+TEST_F(Compare, ReadsAFileThatIsMarkedInTheIndex)
+{
+    commit("a.dwg");
+    commit("b.dwg");
+    repo.write("b.dwg", "other");
+    index("a.dwg", true);
+    index("b.dwg", true);
+    EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg"));
+    EXPECT_THAT(modified(compare()), ElementsAre("b.dwg"));
+}
+
+TEST_F(Compare, AsksTheIndexOnlyAboutCommittedFiles)
+{
+    repo.add({"new.dwg"});
+    index("new.dwg", false);
+    EXPECT_THAT(untracked(compare()), ElementsAre("new.dwg"));
+}
+
+TEST_F(Compare, TakesAFileForModifiedThatIsRecordedByItsStorageOnly)
+{
+    commit("a.dwg");
+    committed_.back().storagePath = L"tf:a.dwg#1";
+    EXPECT_THAT(modified(compare()), ElementsAre("a.dwg"));
+}
+
+TEST_F(Compare, ComparesNamesExactly)
+{
+    commit("a.dwg");
+    committed_.back().path = L"A.dwg";
+    common::RepoChanges const changes = compare();
+    EXPECT_THAT(untracked(changes), ElementsAre("a.dwg"));
+    EXPECT_THAT(removed(changes), ElementsAre("A.dwg"));
+}
+
+TEST_F(Compare, FailsForRulesThatCannotBeUsed)
+{
+    repo.ignore("(");
+    try {
+        compare();
+        FAIL() << "no failure";
+    } catch (tav::Failure const& failure) {
+        EXPECT_EQ(failure.what, "The ignore file has a rule that is no regular expression that can be used.");
+        EXPECT_EQ(failure.next, "Mend '.tav/properties/ignore'.");
+    }
+}
+
+TEST_F(Compare, ListsIgnoredFilesInTheOrderOfTheScan)
+{
+    repo.add({"b.bak", "a.bak", "c/d.bak", "c/e.dwg", "old/f.dwg", ".hidden.bak"});
+    repo.ignore("^.*\\.bak$\n^old$");
+    std::vector<std::string> names;
+    for (OdString const& path : tav::ignoredFiles(repo.root())) {
+        names.push_back(path.ansi_str());
+    }
+    EXPECT_THAT(names, ElementsAre("a.bak", "b.bak", "c/d.bak", "old/f.dwg"));
+}
+
+} // namespace

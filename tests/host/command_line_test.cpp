@@ -1,0 +1,311 @@
+#include "tests/host/tav_test.h"
+
+namespace host_tests {
+namespace {
+
+using CommandLine = TavTest;
+
+struct HelpRow {
+    char const* name;
+    Arguments arguments;
+    char const* text;
+};
+
+constexpr char const* kMainHelp = R"(Keeps the versions of a folder of drawings.
+Usage: tav [OPTIONS] SUBCOMMAND
+
+Options:
+  -h,--help                   Show this help and do nothing else
+  -C FOLDER                   Work as if started in FOLDER
+
+Subcommands:
+  init                        Make a folder of drawings a repository, or complete one
+  status                      Show what has changed and what is staged
+  add                         Stage changed and new files for the next commit
+  unstage                     Take files out of the next commit; they stay as they are
+  mv                          Rename a file or folder, and stage that
+  rm                          Remove committed files, and stage that
+  files                       List the files that the repository keeps
+  ignore                      Show the rules for names to ignore, or add one
+
+)";
+
+constexpr char const* kInitHelp = R"(Make a folder of drawings a repository, or complete one
+Usage: tav init [OPTIONS] [FOLDER]
+
+Positionals:
+  FOLDER TEXT=.               The folder of your drawings; it is made when it is missing
+
+Options:
+  -h,--help                   Show this help and do nothing else
+
+)";
+
+constexpr char const* kStatusHelp = R"(Show what has changed and what is staged
+Usage: tav status [OPTIONS]
+
+Options:
+  -h,--help                   Show this help and do nothing else
+  --ignored                   Show the files that the ignore rules keep out, too
+  --json                      Print a document for programs
+
+)";
+
+constexpr char const* kAddHelp = R"(Stage changed and new files for the next commit
+Usage: tav add [OPTIONS] [NAME...]
+
+Positionals:
+  NAME TEXT ... Excludes: --all
+                              Paths of files or folders, or a part of a path that only one changed file matches
+
+Options:
+  -h,--help                   Show this help and do nothing else
+  --all Excludes: NAME        Stage every changed and new file
+
+)";
+
+constexpr char const* kUnstageHelp = R"(Take files out of the next commit; they stay as they are
+Usage: tav unstage [OPTIONS] [NAME...]
+
+Positionals:
+  NAME TEXT ... Excludes: --all
+                              Paths of files or folders, or a part of a path that only one staged file matches
+
+Options:
+  -h,--help                   Show this help and do nothing else
+  --all Excludes: NAME        Take every staged file out
+
+)";
+
+constexpr char const* kMvHelp = R"(Rename a file or folder, and stage that
+Usage: tav mv [OPTIONS] OLD NEW
+
+Positionals:
+  OLD TEXT REQUIRED           Path of a file or folder of the repository
+  NEW TEXT REQUIRED           Its new path, or an existing folder to move it into
+
+Options:
+  -h,--help                   Show this help and do nothing else
+
+)";
+
+constexpr char const* kRmHelp = R"(Remove committed files, and stage that
+Usage: tav rm [OPTIONS] NAME...
+
+Positionals:
+  NAME TEXT ... REQUIRED      Paths of files, or a part of a path
+
+Options:
+  -h,--help                   Show this help and do nothing else
+
+)";
+
+constexpr char const* kFilesHelp = R"(List the files that the repository keeps
+Usage: tav files [OPTIONS] [FOLDER]
+
+Positionals:
+  FOLDER TEXT                 The folder of a repository; by default the one you are in
+
+Options:
+  -h,--help                   Show this help and do nothing else
+  --hash                      Show the SHA-256 digest of each file, in the form of sha256sum
+  --json                      Print a document for programs
+
+)";
+
+constexpr char const* kIgnoreHelp = R"(Show the rules for names to ignore, or add one
+Usage: tav ignore [OPTIONS]
+
+Options:
+  -h,--help                   Show this help and do nothing else
+  --add PATTERN Excludes: --json
+                              A regular expression; files and folders whose whole name matches it are ignored
+  --json Excludes: --add      Print a document for programs
+
+)";
+
+class Help : public TavTest, public testing::WithParamInterface<HelpRow> {};
+
+TEST_P(Help, TellsHowTheCommandIsUsedAndDoesNothingElse)
+{
+    EXPECT_EQ(tavIn("/", GetParam().arguments), done(GetParam().text));
+}
+
+INSTANTIATE_TEST_SUITE_P(Levels, Help,
+    testing::Values(HelpRow{"Main", {"--help"}, kMainHelp}, HelpRow{"MainShort", {"-h"}, kMainHelp},
+        HelpRow{"Init", {"init", "--help"}, kInitHelp}, HelpRow{"InitShort", {"init", "-h"}, kInitHelp},
+        HelpRow{"BeforeTheCommand", {"-h", "init"}, kInitHelp}, HelpRow{"BesideNames", {"add", "x", "--help"}, kAddHelp},
+        HelpRow{"Status", {"status", "--help"}, kStatusHelp}, HelpRow{"Add", {"add", "--help"}, kAddHelp},
+        HelpRow{"Unstage", {"unstage", "--help"}, kUnstageHelp}, HelpRow{"Mv", {"mv", "--help"}, kMvHelp},
+        HelpRow{"Rm", {"rm", "--help"}, kRmHelp}, HelpRow{"Files", {"files", "--help"}, kFilesHelp},
+        HelpRow{"Ignore", {"ignore", "--help"}, kIgnoreHelp}),
+    rowName<HelpRow>);
+
+struct MisuseRow {
+    char const* name;
+    Arguments arguments;
+    char const* message;
+};
+
+class Misuse : public TavTest, public testing::WithParamInterface<MisuseRow> {};
+
+TEST_P(Misuse, IsToldInOneLineAndChangesNothing)
+{
+    repo.add({"a.dwg"});
+    std::vector<std::string> const before = repo.list();
+    EXPECT_EQ(tav(GetParam().arguments), misused(GetParam().message));
+    EXPECT_EQ(repo.list(), before);
+    EXPECT_EQ(state(), kFreshState);
+}
+
+INSTANTIATE_TEST_SUITE_P(Cases, Misuse,
+    testing::Values(
+        MisuseRow{"NoCommand", {}, "tav: A subcommand is required. Run 'tav --help' to see how it is used.\n"},
+        MisuseRow{"UnknownCommand", {"statsu", "--json"},
+            "tav: The following argument was not expected: statsu. Run 'tav --help' to see how it is used.\n"},
+        MisuseRow{"UnknownCommandInBrackets", {"[status]"},
+            "tav: The following argument was not expected: [status]. Run 'tav --help' to see how it is used.\n"},
+        MisuseRow{"TwoCommands", {"status", "files"},
+            "tav: The following argument was not expected: files. Run 'tav status --help' to see how it is used.\n"},
+        MisuseRow{"UnknownOption", {"add", "a.dwg", "--frob"},
+            "tav: The following argument was not expected: --frob. Run 'tav add --help' to see how it is used.\n"},
+        MisuseRow{"UnknownOptionWithEscapes", {"add", "a.dwg", "--\x1b[31m\n\xff"},
+            "tav: The following argument was not expected: --\\x1B[31m \\xFF. Run 'tav add --help' to see how it is "
+            "used.\n"},
+        MisuseRow{"SurplusNameInBrackets", {"init", "x", "[y]"},
+            "tav: The following argument was not expected: [y]. Run 'tav init --help' to see how it is used.\n"},
+        MisuseRow{"FolderMissingAfterC", {"-C"}, "tav: -C: 1 required FOLDER missing. Run 'tav --help' to see how it is used.\n"},
+        MisuseRow{"AddNothing", {"add"}, "tav: NAME or --all is required. Run 'tav add --help' to see how it is used.\n"},
+        MisuseRow{"AddNamesAndAll", {"add", "a.dwg", "--all"},
+            "tav: NAME excludes --all. Run 'tav add --help' to see how it is used.\n"},
+        MisuseRow{"UnstageNothing", {"unstage"},
+            "tav: NAME or --all is required. Run 'tav unstage --help' to see how it is used.\n"},
+        MisuseRow{"UnstageNamesAndAll", {"unstage", "a.dwg", "--all"},
+            "tav: NAME excludes --all. Run 'tav unstage --help' to see how it is used.\n"},
+        MisuseRow{"MvOneName", {"mv", "a.dwg"}, "tav: NEW is required. Run 'tav mv --help' to see how it is used.\n"},
+        MisuseRow{"MvThreeNames", {"mv", "a.dwg", "b.dwg", "c.dwg"},
+            "tav: The following argument was not expected: c.dwg. Run 'tav mv --help' to see how it is used.\n"},
+        MisuseRow{"RmNothing", {"rm"}, "tav: NAME is required. Run 'tav rm --help' to see how it is used.\n"},
+        MisuseRow{"FilesTwoFolders", {"files", ".", "x"},
+            "tav: The following argument was not expected: x. Run 'tav files --help' to see how it is used.\n"},
+        MisuseRow{"StatusName", {"status", "a.dwg"},
+            "tav: The following argument was not expected: a.dwg. Run 'tav status --help' to see how it is used.\n"},
+        MisuseRow{"IgnoreAddWithoutRule", {"ignore", "--add"},
+            "tav: --add: 1 required PATTERN missing. Run 'tav ignore --help' to see how it is used.\n"},
+        MisuseRow{"IgnoreAddAsDocument", {"ignore", "--add", "x", "--json"},
+            "tav: --add excludes --json. Run 'tav ignore --help' to see how it is used.\n"}),
+    rowName<MisuseRow>);
+
+TEST_F(CommandLine, WorksInTheFolderOfTheOptionC)
+{
+    repo.add({"a.dwg"});
+    EXPECT_EQ(tavIn("/", {"-C", repo.path(), "files"}), done("a.dwg\n"));
+}
+
+TEST_F(CommandLine, TakesNamesAndFoldersFromTheFolderOfTheOptionC)
+{
+    repo.add({"plans/roof.dwg"});
+    EXPECT_EQ(tav({"-C", "plans", "add", "roof.dwg"}), done("Staged 1 file.\n"));
+    EXPECT_EQ(tav({"-C", "plans", "files", ".."}), done("plans/roof.dwg\n"));
+}
+
+TEST_F(CommandLine, GoesOnFromTheFolderOfAnEarlierOptionC)
+{
+    repo.makeFolder("a/b");
+    EXPECT_EQ(tavIn("/", {"-C", repo.path(), "-C", "a", "-C", "b", "init", "c"}), done("Made a repository in 'c'.\n"));
+    EXPECT_TRUE(repo.has("a/b/c/.tav"));
+}
+
+TEST_F(CommandLine, FailsWhenTheFolderOfTheOptionCCannotBeEntered)
+{
+    EXPECT_EQ(tav({"-C", "no\nwhere", "status"}),
+        failed("tav: The folder 'no where' cannot be entered. Check its name and your rights to it.\n"));
+    EXPECT_EQ(
+        tav({"-C", "", "status"}), failed("tav: The folder '' cannot be entered. Check its name and your rights to it.\n"));
+}
+
+TEST_F(CommandLine, TakesNamesThatReadLikeCommandsForNames)
+{
+    repo.add({"status", "add"});
+    EXPECT_EQ(tav({"add", "status", "add"}), done("Staged 2 files.\n"));
+    EXPECT_EQ(state(), stateWithAdded({"status", "add"}));
+}
+
+TEST_F(CommandLine, TakesNamesThatReadLikeOptionsBehindTwoDashes)
+{
+    repo.add({"--all", "-C"});
+    EXPECT_EQ(tav({"add", "--", "--all"}), done("Staged 1 file.\n"));
+    EXPECT_EQ(state(), stateWithAdded({"--all"}));
+}
+
+TEST_F(CommandLine, TakesNamesInBracketsWhole)
+{
+    repo.add({"[a,b]", "[old]/plan.dwg", "{}", "%%", "[]"});
+    EXPECT_EQ(tav({"add", "[old]", "[a,b]", "{}", "%%", "[]"}), done("Staged 5 files.\n"));
+    EXPECT_EQ(state(), stateWithAdded({"[old]/plan.dwg", "[a,b]", "{}", "%%", "[]"}));
+    EXPECT_EQ(tav({"mv", "[a,b]", "[c]"}), done("Renamed '[a,b]' to '[c]'.\n"));
+    EXPECT_EQ(tav({"unstage", "[c]", "[old]"}), done("Took 2 files out of the next commit.\n"));
+    EXPECT_EQ(tav({"init", "[d]"}), done("Made a repository in '[d]'.\n"));
+    EXPECT_EQ(tav({"-C", "[d]", "files"}), done(".tav/properties/ignore\n"));
+    EXPECT_EQ(tav({"files", "[d]"}), done(".tav/properties/ignore\n"));
+}
+
+TEST_F(CommandLine, TakesNamesThatBeginWithAControlCharacterWhole)
+{
+    repo.add({"\x01", "\x01[a]"});
+    EXPECT_EQ(tav({"add", "\x01", "\x01[a]"}), done("Staged 2 files.\n"));
+    EXPECT_EQ(state(), stateWithAdded({"\\u0001", "\\u0001[a]"}));
+}
+
+TEST_F(CommandLine, FailsOutsideOfARepository)
+{
+    support::TempFolder const elsewhere;
+    std::string const message = "tav: Path: " + elsewhere.path()
+        + " is not a tav directory. Run 'tav init' in the folder of your drawings to make it one.\n";
+    for (Arguments const& arguments :
+        {Arguments{"status"}, {"add", "a"}, {"unstage", "a"}, {"mv", "a", "b"}, {"rm", "a"}, {"files"}, {"ignore"}}) {
+        EXPECT_EQ(tavIn(elsewhere.path(), arguments), failed(message)) << arguments.front();
+    }
+    EXPECT_TRUE(elsewhere.list().empty());
+}
+
+TEST_F(CommandLine, FindsTheRepositoryFromAnyFolderInIt)
+{
+    repo.add({"a/b/c.dwg"});
+    EXPECT_EQ(tavIn(repo.pathTo("a/b"), {"files"}), done("a/b/c.dwg\n"));
+    EXPECT_EQ(tavIn(repo.pathTo(".tav"), {"files"}), done("a/b/c.dwg\n"));
+}
+
+TEST_F(CommandLine, TakesTheInnermostRepository)
+{
+    repo.add({"a/b.dwg", "c.dwg"});
+    repo.makeFolder("a/.tav");
+    EXPECT_EQ(tavIn(repo.pathTo("a"), {"files"}), done("b.dwg\n"));
+}
+
+struct FullDiskRow {
+    char const* name;
+    Arguments arguments;
+};
+
+class FullDisk : public TavTest, public testing::WithParamInterface<FullDiskRow> {};
+
+TEST_P(FullDisk, MakesACommandFailWhoseOutputIsLost)
+{
+    repo.add({"a.dwg", "b.dwg"});
+    EXPECT_EQ(tavInto("/dev/full", GetParam().arguments),
+        failed("tav: The output could not be written. Check the disk or the program that reads it.\n"));
+}
+
+INSTANTIATE_TEST_SUITE_P(Commands, FullDisk,
+    testing::Values(FullDiskRow{"Help", {"--help"}}, FullDiskRow{"HelpOfACommand", {"init", "--help"}},
+        FullDiskRow{"Init", {"init"}}, FullDiskRow{"Status", {"status"}},
+        FullDiskRow{"StatusAsDocument", {"status", "--json"}}, FullDiskRow{"Add", {"add", "a.dwg"}},
+        FullDiskRow{"Unstage", {"unstage", "--all"}}, FullDiskRow{"Mv", {"mv", "a.dwg", "c.dwg"}},
+        FullDiskRow{"Files", {"files"}}, FullDiskRow{"FilesWithDigests", {"files", "--hash"}},
+        FullDiskRow{"FilesAsDocument", {"files", "--json"}}, FullDiskRow{"Ignore", {"ignore"}},
+        FullDiskRow{"IgnoreAdd", {"ignore", "--add", "x"}}),
+    rowName<FullDiskRow>);
+
+} // namespace
+} // namespace host_tests

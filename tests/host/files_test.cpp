@@ -1,0 +1,209 @@
+#include "tests/host/tav_test.h"
+
+#include "common/mu_common_versions.h"
+
+namespace host_tests {
+namespace {
+
+using Files = TavTest;
+
+constexpr char const* kDigestOfNothing = "e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca495991b7852b855";
+constexpr char const* kDigestOfAbc = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad";
+
+TEST_F(Files, ListsTheFilesOfAFolderBeforeThoseOfItsFoldersAndThePropertiesLast)
+{
+    repo.add({"b/z.dwg", "b/a/y.dwg", "c.dwg", "Z.txt", "b.bak", ".hidden", ".folder/x.dwg", "c.DWL"});
+    repo.ignore("^.*\\.bak$");
+    EXPECT_EQ(tav({"files"}), done("Z.txt\nc.DWL\nc.dwg\nb/z.dwg\nb/a/y.dwg\n.tav/properties/ignore\n"));
+}
+
+TEST_F(Files, ListsNothingOfAnEmptyRepository)
+{
+    EXPECT_EQ(tav({"files"}), done(""));
+    EXPECT_EQ(tav({"files", "--hash"}), done(""));
+    EXPECT_EQ(tav({"files", "--json"}), done("[\n]\n"));
+}
+
+TEST_F(Files, TakesTheFolderOfARepository)
+{
+    repo.add({"a.dwg"});
+    EXPECT_EQ(tavIn("/", {"files", repo.path() + "/"}), done("a.dwg\n"));
+}
+
+TEST_F(Files, FailsForAFolderInsideOfARepository)
+{
+    repo.add({"a/b.dwg"});
+    EXPECT_EQ(tav({"files", "a"}),
+        failed("tav: Path: a is not a tav directory. Run 'tav init' in the folder of your drawings to make it one.\n"));
+}
+
+TEST_F(Files, NeedsNoState)
+{
+    repo.add({"a.dwg"});
+    repo.write(".tav/tav.state", "broken");
+    EXPECT_EQ(tav({"files"}), done("a.dwg\n"));
+}
+
+TEST_F(Files, FollowsLinksToFilesButNotToFolders)
+{
+    repo.add({"a.dwg", "b/c.dwg"});
+    repo.makeLink("link.dwg", "a.dwg");
+    repo.makeLink("folder", "b");
+    repo.makeLink("dangling.dwg", "nowhere");
+    repo.makeLink("b/up", "..");
+    EXPECT_EQ(tav({"files"}), done("a.dwg\nlink.dwg\nb/c.dwg\n"));
+}
+
+TEST_F(Files, ShowsDigests)
+{
+    repo.add({"empty.dwg"});
+    repo.write("letters.dwg", "abc");
+    EXPECT_EQ(tav({"files", "--hash"}),
+        done(std::string(kDigestOfNothing) + "  empty.dwg\n" + kDigestOfAbc + "  letters.dwg\n"));
+}
+
+TEST_F(Files, DigestsLargeFilesWhole)
+{
+    std::string const content(std::size_t{3} << 20, 'x');
+    repo.write("large.dwg", content);
+    std::string const digest = generateSha(content.data(), static_cast<int>(content.size())).ansi_str();
+    EXPECT_EQ(tav({"files", "--hash"}), done(digest + "  large.dwg\n"));
+}
+
+TEST_F(Files, ShowsADocument)
+{
+    repo.add({"empty.dwg"});
+    repo.write("a/letters.dwg", "abc");
+    EXPECT_EQ(tav({"files", "--json"}), done(R"([
+    {
+        "path" : "empty.dwg"
+    },
+    {
+        "path" : "a/letters.dwg"
+    }
+]
+)"));
+    EXPECT_EQ(tav({"files", "--json", "--hash"}), done(std::string(R"([
+    {
+        "path" : "empty.dwg",
+        "sha256" : ")") + kDigestOfNothing + R"("
+    },
+    {
+        "path" : "a/letters.dwg",
+        "sha256" : ")" + kDigestOfAbc + R"("
+    }
+]
+)"));
+}
+
+/// Names that terminals, documents or lists of digests may stumble over.
+class FilesWithOddNames : public TavTest {
+protected:
+    FilesWithOddNames()
+    {
+        repo.add({"a b.dwg", "back\\slash", "bell\a", "c1\xc2\x9b.dwg", "carriage\rreturn", "esc\x1b[31m.dwg", "line\nfeed",
+            "not\xff\xfeutf8.dwg", "План.dwg", "図面.dwg", "\xf0\x9f\x8f\xa0.dwg"});
+    }
+};
+
+TEST_F(FilesWithOddNames, AreShownWholeInPipes)
+{
+    EXPECT_EQ(tav({"files"}),
+        done("a b.dwg\nback\\slash\nbell\a\nc1\xc2\x9b.dwg\ncarriage\rreturn\nesc\x1b[31m.dwg\nline\nfeed\n"
+             "not\xff\xfeutf8.dwg\nПлан.dwg\n図面.dwg\n\xf0\x9f\x8f\xa0.dwg\n"));
+}
+
+TEST_F(FilesWithOddNames, AreEscapedOnATerminal)
+{
+    EXPECT_EQ(tavOnTerminal({"files"}),
+        done("a b.dwg\nback\\slash\nbell\\x07\nc1\\x9B.dwg\ncarriage\\x0Dreturn\nesc\\x1B[31m.dwg\nline\\x0Afeed\n"
+             "not\\xFF\\xFEutf8.dwg\nПлан.dwg\n図面.dwg\n\xf0\x9f\x8f\xa0.dwg\n"));
+}
+
+TEST_F(FilesWithOddNames, AreEscapedOnATerminalBehindDigestsToo)
+{
+    std::string const output = tavOnTerminal({"files", "--hash"}).out;
+    EXPECT_NE(output.find("  esc\\x1B[31m.dwg\n"), std::string::npos);
+    EXPECT_EQ(output.find('\x1b'), std::string::npos);
+}
+
+TEST_F(FilesWithOddNames, AreWholeInDocuments)
+{
+    EXPECT_EQ(tav({"files", "--json"}), done(R"([
+    {
+        "path" : "a b.dwg"
+    },
+    {
+        "path" : "back\\slash"
+    },
+    {
+        "path" : "bell\u0007"
+    },
+    {
+        "path" : "c1\u009B.dwg"
+    },
+    {
+        "path" : "carriage\rreturn"
+    },
+    {
+        "path" : "esc\u001B[31m.dwg"
+    },
+    {
+        "path" : "line\nfeed"
+    },
+    {
+        "path" : "not\uDCFF\uDCFEutf8.dwg"
+    },
+    {
+        "path" : "План.dwg"
+    },
+    {
+        "path" : "図面.dwg"
+    },
+    {
+        "path" : "\uD83C\uDFE0.dwg"
+    }
+]
+)"));
+}
+
+TEST_F(FilesWithOddNames, AreListedSoThatSha256sumCanCheckThem)
+{
+    support::TempFolder const aside;
+    aside.write("list", tav({"files", "--hash"}).out);
+    Setting sha256sum = setting();
+    sha256sum.program = "/usr/bin/sha256sum";
+    EXPECT_EQ(run(sha256sum, {"--check", "--strict", "--quiet", aside.pathTo("list")}), done(""));
+    repo.write("line\nfeed", "changed");
+    EXPECT_EQ(run(sha256sum, {"--check", "--status", aside.pathTo("list")}), failed(""));
+}
+
+TEST_F(Files, PrintsTheSameUnderEveryLocale)
+{
+    repo.add({"План.dwg", "\xf0\x9f\x8f\xa0.dwg"});
+    std::string const document = tav({"files", "--json"}).out;
+    for (char const* const locale : {"LC_ALL=C", "LC_ALL=C.UTF-8", "LC_ALL=nonsense", "LC_ALL="}) {
+        Setting other = setting();
+        other.environment = {locale};
+        EXPECT_EQ(run(other, {"files"}), done("План.dwg\n\xf0\x9f\x8f\xa0.dwg\n")) << locale;
+        EXPECT_EQ(run(other, {"files", "--json"}), done(document)) << locale;
+    }
+}
+
+TEST_F(Files, FailsForAnIgnoreFileThatCannotBeUsed)
+{
+    repo.ignore("[");
+    EXPECT_EQ(tav({"files"}),
+        failed("tav: The ignore file has a rule that is no regular expression that can be used. "
+               "Mend '.tav/properties/ignore'.\n"));
+}
+
+TEST_F(Files, MakesNothing)
+{
+    std::vector<std::string> const before = repo.list();
+    tav({"files", "--hash"});
+    EXPECT_EQ(repo.list(), before);
+}
+
+} // namespace
+} // namespace host_tests

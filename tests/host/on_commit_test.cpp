@@ -1,0 +1,338 @@
+#include "tests/host/tav_test.h"
+
+#include "common/mu_common_versions.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace host_tests {
+namespace {
+
+/// Runs the commands on a last commit that is not empty.
+class OnCommit : public TavTest {
+protected:
+    Outcome tav(Arguments const& arguments, std::string const& folder = {}) const
+    {
+        Setting onCommit = setting();
+        onCommit.program = TAV_ON_COMMIT_PROGRAM;
+        onCommit.folder = folder.empty() ? repo.path() : folder;
+        return run(onCommit, arguments);
+    }
+
+    /// Writes files and makes them those of the last commit, beside the ones that are.
+    void commit(std::initializer_list<std::string_view> names)
+    {
+        for (std::string_view const name : names) {
+            std::string const content = "committed " + std::string(name);
+            repo.write(name, content);
+            commit_ += "po#" + generateSha(content.data(), static_cast<int>(content.size())).ansi_str() + " ";
+            commit_.append(name).append("\n");
+        }
+        repo.write(".tav/last_commit", commit_);
+    }
+
+    void remove(std::string_view name) const { ASSERT_EQ(unlink(repo.pathTo(name).c_str()), 0); }
+
+    /// What status shows below the line of the branch.
+    std::string status() const { return tav({"status"}).out.substr(std::string("On branch master\n\n").size()); }
+
+    std::vector<std::string> filesOfTheUser() const
+    {
+        std::vector<std::string> names;
+        for (std::string const& name : repo.list()) {
+            if (name.compare(0, 4, ".tav") != 0) {
+                names.push_back(name);
+            }
+        }
+        return names;
+    }
+
+private:
+    std::string commit_;
+};
+
+using StatusOnCommit = OnCommit;
+
+TEST_F(StatusOnCommit, ShowsNothingOfUnchangedFiles)
+{
+    commit({"a.dwg", "plans/b.dwg"});
+    EXPECT_EQ(status(), "Nothing has changed since the last commit.\n");
+}
+
+TEST_F(StatusOnCommit, ShowsModifiedRemovedAndNewFiles)
+{
+    commit({"m2.dwg", "plans/m1.dwg", "r2.dwg", "plans/r1.dwg", "same.dwg"});
+    repo.write("m2.dwg", "changed");
+    repo.write("plans/m1.dwg", "changed");
+    remove("r2.dwg");
+    remove("plans/r1.dwg");
+    repo.add({"new.dwg"});
+    EXPECT_EQ(status(), R"(Modified, not staged:
+  (use 'tav add NAME' to stage a file)
+        modified: m2.dwg
+        modified: plans/m1.dwg
+
+Removed:
+  (the next commit takes these without staging)
+        removed:  plans/r1.dwg
+        removed:  r2.dwg
+
+New, not staged:
+  (use 'tav add NAME' or 'tav add --all' to stage)
+        new.dwg
+
+)");
+    EXPECT_EQ(tav({"status", "--json"}), done(R"({
+    "branch" : "master",
+    "conflicts" : [
+    ],
+    "modified" : [
+        "m2.dwg",
+        "plans/m1.dwg"
+    ],
+    "removed" : [
+        "plans/r1.dwg",
+        "r2.dwg"
+    ],
+    "staged" : [
+    ],
+    "untracked" : [
+        "new.dwg"
+    ]
+}
+)"));
+}
+
+TEST_F(StatusOnCommit, ShowsARenamedFileOnce)
+{
+    commit({"a.dwg"});
+    tav({"mv", "a.dwg", "b.dwg"});
+    EXPECT_EQ(status(), R"(Staged for the next commit:
+  (use 'tav unstage NAME' to take a file out)
+        renamed:  a.dwg -> b.dwg
+
+)");
+    tav({"unstage", "b.dwg"});
+    EXPECT_EQ(status(), R"(Removed:
+  (the next commit takes these without staging)
+        removed:  a.dwg
+
+New, not staged:
+  (use 'tav add NAME' or 'tav add --all' to stage)
+        b.dwg
+
+)");
+}
+
+TEST_F(StatusOnCommit, ShowsANewFileUnderTheFormerNameOfARenamedOne)
+{
+    commit({"a.dwg"});
+    tav({"mv", "a.dwg", "b.dwg"});
+    repo.write("a.dwg", "another drawing");
+    EXPECT_EQ(status(), R"(Staged for the next commit:
+  (use 'tav unstage NAME' to take a file out)
+        renamed:  a.dwg -> b.dwg
+
+Modified, not staged:
+  (use 'tav add NAME' to stage a file)
+        modified: a.dwg
+
+)");
+}
+
+TEST_F(StatusOnCommit, TrustsTheIndexForAFileOfUnchangedTime)
+{
+    commit({"a.dwg"});
+    repo.write("a.dwg", "changed");
+    timespec const second = {1700000000, 7};
+    timespec const times[] = {second, second};
+    ASSERT_EQ(utimensat(AT_FDCWD, repo.pathTo("a.dwg").c_str(), times, 0), 0);
+    auto const stateWithIndex = [](std::string const& ticks, std::string const& modified) {
+        return R"({ "head" : { "reference" : "master" }, "index" : [ { "path" : "a.dwg", "data" : { "last_checked" : )" + ticks
+            + R"(, "modified" : )" + modified + " } } ] }";
+    };
+    repo.write(".tav/tav.state", stateWithIndex("1700000000000000007", "false"));
+    EXPECT_EQ(status(), "Nothing has changed since the last commit.\n");
+    repo.write(".tav/tav.state", stateWithIndex("1700000000000000007", "true"));
+    EXPECT_EQ(status().substr(0, 9), "Modified,");
+    repo.write(".tav/tav.state", stateWithIndex("1700000000000000008", "false"));
+    EXPECT_EQ(status().substr(0, 9), "Modified,");
+}
+
+using AddOnCommit = OnCommit;
+
+TEST_F(AddOnCommit, StagesModifiedAndNewFiles)
+{
+    commit({"b.dwg", "same.dwg"});
+    repo.write("b.dwg", "changed");
+    repo.add({"a.dwg"});
+    EXPECT_EQ(tav({"add", "--all"}), done("Staged 2 files.\n"));
+    EXPECT_EQ(status(), R"(Staged for the next commit:
+  (use 'tav unstage NAME' to take a file out)
+        new:      a.dwg
+        modified: b.dwg
+
+)");
+}
+
+TEST_F(AddOnCommit, FailsForUnchangedAndRemovedFiles)
+{
+    commit({"a (1).dwg", "plans/ground.dwg", "r.dwg"});
+    remove("r.dwg");
+    repo.add({"new.dwg"});
+    for (std::string const name : {"a (1).dwg", "plans/ground.dwg", "ground"}) {
+        EXPECT_EQ(
+            tav({"add", "new.dwg", name}), failed("tav: '" + name + "' is as it was committed. There is nothing to stage of it.\n"));
+    }
+    EXPECT_EQ(tav({"add", "new.dwg", "r.dwg"}),
+        failed("tav: 'r.dwg' has been removed. The next commit takes that without staging.\n"));
+    EXPECT_EQ(state(), kFreshState);
+}
+
+TEST_F(AddOnCommit, ListsModifiedAndNewFilesThatAnAmbiguousNameMatches)
+{
+    commit({"plans/roof.dwg"});
+    repo.write("plans/roof.dwg", "changed");
+    repo.add({"annex/roof.dwg"});
+    EXPECT_EQ(tav({"add", "roof"}), failed("tav: More that one file found with name roof. Type more of the path of the one "
+                                           "you mean:\n"
+                                           "  annex/roof.dwg\n"
+                                           "  plans/roof.dwg\n"));
+}
+
+TEST_F(AddOnCommit, StagesAgainAFileThatWasStagedAsRemoved)
+{
+    commit({"a.dwg"});
+    EXPECT_EQ(tav({"rm", "a.dwg"}), done("Removed 1 file; the next commit takes that.\n"));
+    repo.write("a.dwg", "another drawing");
+    EXPECT_EQ(tav({"add", "a.dwg"}), done("Nothing new to stage.\n"));
+    EXPECT_EQ(status(), R"(Staged for the next commit:
+  (use 'tav unstage NAME' to take a file out)
+        modified: a.dwg
+
+)");
+}
+
+using RmOnCommit = OnCommit;
+
+TEST_F(RmOnCommit, RemovesFilesAndStagesThat)
+{
+    commit({"a.dwg", "plans/b.dwg", "plans/roof.dwg", "c.dwg"});
+    EXPECT_EQ(tav({"rm", "../a.dwg", "b.dwg", "oof"}, repo.pathTo("plans")),
+        done("Removed 3 files; the next commit takes that.\n"));
+    EXPECT_EQ(filesOfTheUser(), (std::vector<std::string>{"c.dwg", "plans/"}));
+    EXPECT_EQ(status(), R"(Staged for the next commit:
+  (use 'tav unstage NAME' to take a file out)
+        removed:  a.dwg
+        removed:  plans/b.dwg
+        removed:  plans/roof.dwg
+
+)");
+    EXPECT_FALSE(repo.has(".tav/removed-0"));
+}
+
+TEST_F(RmOnCommit, StagesTheRemovalOfAFileThatIsGone)
+{
+    commit({"a.dwg", "b.dwg"});
+    remove("a.dwg");
+    EXPECT_EQ(tav({"rm", "a.dwg", "b.dwg", "b.dwg"}), done("Removed 2 files; the next commit takes that.\n"));
+    EXPECT_TRUE(filesOfTheUser().empty());
+}
+
+TEST_F(RmOnCommit, TakesNamesWithTheCharactersOfExpressionsAsTheyStand)
+{
+    commit({"a (1).dwg", "[b]", "a 1.dwg"});
+    EXPECT_EQ(tav({"rm", "a (1).dwg", "[b]"}), done("Removed 2 files; the next commit takes that.\n"));
+    EXPECT_EQ(filesOfTheUser(), std::vector<std::string>{"a 1.dwg"});
+}
+
+TEST_F(RmOnCommit, RemovesNothingWhenOneOfItsFilesIsInNoCommit)
+{
+    commit({"a.dwg", "b.dwg"});
+    repo.write("b.dwg", "changed");
+    repo.add({"new.dwg"});
+    std::vector<std::string> const before = filesOfTheUser();
+    EXPECT_EQ(tav({"rm", "a.dwg", "new.dwg"}),
+        failed("tav: 'new.dwg' is in no commit: removing it would lose it. Use 'tav unstage' if it is staged, and delete it "
+               "yourself if you do not need it.\n"));
+    EXPECT_EQ(tav({"rm", "a.dwg", "b.dwg"}), failed("tav: 'b.dwg' has changes that are in no commit. Commit them first.\n"));
+    EXPECT_EQ(tav({"rm", "a.dwg", "nothing"}),
+        failed("tav: No committed file matches 'nothing'. Run 'tav status' to see what there is.\n"));
+    EXPECT_EQ(tav({"rm", "a.dwg", "("}).code, 1);
+    EXPECT_EQ(filesOfTheUser(), before);
+    EXPECT_EQ(repo.read("a.dwg"), "committed a.dwg");
+    EXPECT_EQ(state(), kFreshState);
+    EXPECT_FALSE(repo.has(".tav/removed-0"));
+}
+
+TEST_F(RmOnCommit, StepsAroundWhatAKilledCommandLeft)
+{
+    commit({"a.dwg", "b.dwg"});
+    repo.write(".tav/removed-0", "left over");
+    EXPECT_EQ(tav({"rm", "a.dwg", "b.dwg"}), done("Removed 2 files; the next commit takes that.\n"));
+    EXPECT_EQ(repo.read(".tav/removed-0"), "left over");
+    EXPECT_FALSE(repo.has(".tav/removed-1"));
+    EXPECT_FALSE(repo.has(".tav/removed-2"));
+}
+
+using MvOnCommit = OnCommit;
+
+TEST_F(MvOnCommit, LeavesARenamedFileThatIsBackAsItWasCommitted)
+{
+    commit({"a.dwg"});
+    tav({"mv", "a.dwg", "b.dwg"});
+    tav({"mv", "b.dwg", "a.dwg"});
+    EXPECT_EQ(status(), "Nothing has changed since the last commit.\n");
+    EXPECT_EQ(state(), kFreshState);
+}
+
+TEST_F(MvOnCommit, PutsAFileInThePlaceOfARemovedOne)
+{
+    commit({"a.dwg", "b.dwg"});
+    tav({"rm", "b.dwg"});
+    EXPECT_EQ(tav({"mv", "a.dwg", "b.dwg"}), done("Renamed 'a.dwg' to 'b.dwg'.\n"));
+    EXPECT_EQ(repo.read("b.dwg"), "committed a.dwg");
+    EXPECT_EQ(status(), R"(Staged for the next commit:
+  (use 'tav unstage NAME' to take a file out)
+        renamed:  a.dwg -> b.dwg
+
+)");
+}
+
+using Rm = TavTest;
+
+TEST_F(Rm, RefusesFilesThatAreInNoCommit)
+{
+    repo.write("a.dwg", "drawing");
+    repo.write("b.dwg", "drawing");
+    tav({"add", "b.dwg"});
+    std::string const before = state();
+    for (std::string const name : {"a.dwg", "b.dwg"}) {
+        EXPECT_EQ(tav({"rm", name}),
+            failed("tav: '" + name
+                + "' is in no commit: removing it would lose it. Use 'tav unstage' if it is staged, and delete it yourself if "
+                  "you do not need it.\n"));
+    }
+    EXPECT_EQ(repo.read("a.dwg") + repo.read("b.dwg"), "drawingdrawing");
+    EXPECT_EQ(state(), before);
+}
+
+TEST_F(Rm, FailsForNamesOfNoCommittedFile)
+{
+    repo.add({"plans/a.dwg"});
+    for (std::string const name : {"nothing", "plans", "."}) {
+        EXPECT_EQ(tav({"rm", name}),
+            failed("tav: No committed file matches '" + name + "'. Run 'tav status' to see what there is.\n"));
+    }
+    EXPECT_EQ(tav({"rm", "/x"}),
+        failed("tav: '/x' is not located in the current repository. Name a file below '" + repo.path() + "'.\n"));
+    EXPECT_EQ(tav({"rm", ""}), failed("tav: An empty name names no file. Type '.' for the folder that you are in.\n"));
+    EXPECT_EQ(tav({"rm", "("}),
+        failed("tav: No file is named '(', and it is no expression that can be used. Type the path of a file as 'tav status' "
+               "shows it.\n"));
+    EXPECT_TRUE(repo.has("plans/a.dwg"));
+}
+
+} // namespace
+} // namespace host_tests
