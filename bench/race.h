@@ -12,10 +12,7 @@ namespace bench {
 class Race {
 public:
     /// `name` says what is done and how much of it.
-    explicit Race(std::string name)
-        : name_(std::move(name))
-    {
-    }
+    explicit Race(std::string name) : name_(std::move(name)) {}
 
     void ours(std::string const& name, std::function<void()> const& run);
     void peer(std::string const& name, std::function<void()> const& run);

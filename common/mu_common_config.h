@@ -78,15 +78,15 @@ protected:
 /// Orders listeners by their addresses.
 struct MU_COMMON_EXPORT ListenerOrder {
     /// Whether `a` lies before `b`.
-    bool operator()(
-        std::reference_wrapper<ConfigListener> const& a, std::reference_wrapper<ConfigListener> const& b) const;
+    bool
+    operator()(std::reference_wrapper<ConfigListener> const& a, std::reference_wrapper<ConfigListener> const& b) const;
 };
 
 /// The listeners of a configuration, which it does not own.
 using ConfigListeners = std::set<std::reference_wrapper<ConfigListener>, ListenerOrder>;
 
-/// Access for writing, for as long as it lives. Then it tells all listeners, in ascending order of addresses, whether or
-/// not anything was changed. A listener may add and remove listeners meanwhile: removed ones are not told any more.
+/// Access for writing, for as long as it lives. Then it tells all listeners, in ascending order of addresses, whether
+/// or not anything was changed. A listener may add and remove listeners meanwhile: removed ones are not told any more.
 class MU_COMMON_EXPORT WriteConfigData {
 public:
     /// Keeps both by reference.
@@ -117,13 +117,13 @@ public:
     Config(ConfigPath const& path, IoInterface const& io);
     Config(Config const&) = delete;
     Config& operator=(Config const&) = delete;
-    /// If `write` was ever called, replaces the configuration file as a whole and reports the outcome to the host, once.
-    /// Errors reported: the document cannot be built; the file cannot be written, which leaves the old one.
+    /// If `write` was ever called, replaces the configuration file as a whole and reports the outcome to the host,
+    /// once. Errors reported: the document cannot be built; the file cannot be written, which leaves the old one.
     ~Config();
 
-    /// The configuration of `folder`, which is made when it is missing. While one lives that was read from a file, every
-    /// caller gets that same one, as it is in memory; without a file every caller gets one of its own, without projects.
-    /// Errors: those of `ConfigPath::get`; the file is not JSON or not of the expected shape.
+    /// The configuration of `folder`, which is made when it is missing. While one lives that was read from a file,
+    /// every caller gets that same one, as it is in memory; without a file every caller gets one of its own, without
+    /// projects. Errors: those of `ConfigPath::get`; the file is not JSON or not of the expected shape.
     static Expected<std::shared_ptr<Config>> load(OdString const& folder, IoInterface const& io);
 
     /// The process's table of living configurations.

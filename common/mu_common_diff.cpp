@@ -133,9 +133,9 @@ std::variant<StagedFile, std::monostate, ErrorMessage> RepoFileExplorer::findFor
 OdString RepoFileExplorer::findUnchanged(OdString const& name) const
 {
     std::regex const pattern = filePattern(name);
-    auto const match = std::find_if(
-        pimpl_->unchanged.begin(), pimpl_->unchanged.end(),
-        [&](VersionedFile const& file) { return matchesWhole(pattern, file.path.ansi_str()); });
+    auto const match = std::find_if(pimpl_->unchanged.begin(), pimpl_->unchanged.end(), [&](VersionedFile const& file) {
+        return matchesWhole(pattern, file.path.ansi_str());
+    });
     return match == pimpl_->unchanged.end() ? OdString() : match->path;
 }
 

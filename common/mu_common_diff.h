@@ -18,15 +18,16 @@ namespace common {
 
 /// How the working folder differs from the last commit. The host fills it in.
 struct RepoChanges {
-    std::vector<File> files;                              ///< carried along; the explorer does not use them
-    std::vector<VersionedFile> unchanged;                 ///< as committed
-    std::vector<Versions<File, VersionedFile>> modified;  ///< in both, with different contents
-    std::vector<Versions<File, void>> untracked;          ///< only in the working folder
-    std::vector<Versions<void, VersionedFile>> removed;   ///< only in the commit
+    std::vector<File> files;                             ///< carried along; the explorer does not use them
+    std::vector<VersionedFile> unchanged;                ///< as committed
+    std::vector<Versions<File, VersionedFile>> modified; ///< in both, with different contents
+    std::vector<Versions<File, void>> untracked;         ///< only in the working folder
+    std::vector<Versions<void, VersionedFile>> removed;  ///< only in the commit
 };
 
-/// A selection of files to stage, made over the changes of one moment. It keeps its choices to itself: writing them into
-/// the working state is the host's business. Movable; a moved-from explorer may only be destroyed. One thread at a time.
+/// A selection of files to stage, made over the changes of one moment. It keeps its choices to itself: writing them
+/// into the working state is the host's business. Movable; a moved-from explorer may only be destroyed. One thread at a
+/// time.
 ///
 /// Candidates are the modified files and then the new ones, each in the order of the changes. Removed files are never
 /// candidates: they are committed without staging.
@@ -63,10 +64,9 @@ private:
 };
 
 /// The expression by which a name that the user typed is matched against whole paths: anything may stand before the
-/// name, and when the name has no extension, any chain of alphabetic ones must follow it. The characters of the name are
-/// not escaped: a dot in it matches any character, and expressions may be typed.
-/// Throws `std::regex_error` for a name that makes no valid expression, or one that is too deep or too large (see
-/// `RepoIgnore`).
+/// name, and when the name has no extension, any chain of alphabetic ones must follow it. The characters of the name
+/// are not escaped: a dot in it matches any character, and expressions may be typed. Throws `std::regex_error` for a
+/// name that makes no valid expression, or one that is too deep or too large (see `RepoIgnore`).
 MU_COMMON_EXPORT std::regex filePattern(OdString const& name);
 
 } // namespace common

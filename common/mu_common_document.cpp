@@ -3,10 +3,10 @@
 #include "common/mu_common_json.h"
 #include "common/mu_common_translate.h"
 
-#include "json/json_reader.h"
-#include "json/json_writer.h"
 #include "platform/ut/TextFile.h"
 #include "platform/ut/text.h"
+#include "json/json_reader.h"
+#include "json/json_writer.h"
 
 #include <string>
 

@@ -3,8 +3,8 @@
 
 #include "common/mu_common_expected.h"
 
-#include "json/json_value.h"
 #include "platform/sdk/OdString.h"
+#include "json/json_value.h"
 
 namespace common {
 

@@ -56,8 +56,9 @@ public:
     /// here to keep what they own. Aggregates are built as well.
     template <class First, class... Rest>
     Expected(std::in_place_t, First&& first, Rest&&... rest)
-        : Expected(AfterTemporaries{}, (passThroughTemporary(std::forward<Rest>(rest)), ..., 0),
-                   std::forward<First>(first), std::forward<Rest>(rest)...)
+        : Expected(
+              AfterTemporaries{}, (passThroughTemporary(std::forward<Rest>(rest)), ..., 0), std::forward<First>(first),
+              std::forward<Rest>(rest)...)
     {
     }
 
@@ -89,7 +90,8 @@ private:
     struct AfterTemporaries {};
 
     template <class... Args>
-    Expected(AfterTemporaries, int, Args&&... args) : content_(std::in_place_index<1>, build(std::forward<Args>(args)...))
+    Expected(AfterTemporaries, int, Args&&... args)
+        : content_(std::in_place_index<1>, build(std::forward<Args>(args)...))
     {
     }
 

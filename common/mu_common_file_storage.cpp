@@ -24,8 +24,8 @@ bool isObjectUrl(OdString const& url)
     return url.left(2) == OdString(L"po");
 }
 
-/// The forms of "tf" URLs are ".*#(.*)" and "tf:(.*?)#.*" in the narrow text, where a dot stands for any byte but a line
-/// end. Looking for the '#' answers the same without a matcher that recurses through a long URL.
+/// The forms of "tf" URLs are ".*#(.*)" and "tf:(.*?)#.*" in the narrow text, where a dot stands for any byte but a
+/// line end. Looking for the '#' answers the same without a matcher that recurses through a long URL.
 bool hasLineEnd(std::string_view url)
 {
     return url.find_first_of("\r\n") != url.npos;

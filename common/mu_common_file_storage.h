@@ -54,9 +54,9 @@ public:
     /// Whether the content that `url` names is kept.
     virtual Expected<bool> contains(RootPath const& root, OdString const& url) = 0;
 
-    /// Merges through `mergeFromStorage`, given `fourth` and `second`, if the host accepts `first`; a host that declines
-    /// has success at once. `third` is not used.
-    /// Errors: that of `mergeFromStorage`, unchanged; `second` is not in the storage.
+    /// Merges through `mergeFromStorage`, given `fourth` and `second`, if the host accepts `first`; a host that
+    /// declines has success at once. `third` is not used. Errors: that of `mergeFromStorage`, unchanged; `second` is
+    /// not in the storage.
     virtual WriteOutcome merge(
         OdString const& first, OdString const& second, OdString const& third, OdString fourth, RootPath const& root,
         IoInterface const& io);

@@ -24,11 +24,11 @@ struct MU_COMMON_EXPORT CollectOptions {
     /// Stores the choices.
     CollectOptions(bool relativePaths, bool collectDirs, bool includeHidden, std::vector<std::regex> excludes);
 
-    bool relativePaths;             ///< results are relative to the walked folder, else they begin with it
-    bool collectDirs;               ///< folders are listed too
-    std::int32_t enumerationFlags;  ///< 4 when hidden entries are listed, else 0
-    /// An entry whose bare name, in its narrow form, is covered as a whole by one of these is skipped, a folder with all
-    /// that is in it.
+    bool relativePaths;            ///< results are relative to the walked folder, else they begin with it
+    bool collectDirs;              ///< folders are listed too
+    std::int32_t enumerationFlags; ///< 4 when hidden entries are listed, else 0
+    /// An entry whose bare name, in its narrow form, is covered as a whole by one of these is skipped, a folder with
+    /// all that is in it.
     std::vector<std::regex> excludes;
 };
 

@@ -12,9 +12,9 @@
 #include "common/mu_common_expected.h"
 #include "common/mu_common_export.h"
 
-#include "json/json_value.h"
 #include "platform/sdk/OdError.h"
 #include "platform/sdk/OdString.h"
+#include "json/json_value.h"
 
 #include <cstdint>
 #include <functional>
@@ -43,36 +43,36 @@ MU_COMMON_EXPORT void checkType(
 
 /// The member of any type; throws when it is missing. So do all the accessors below, and also when it is of another
 /// type than the one they name.
-MU_COMMON_EXPORT kutils::json::Value const& getValue(
-    kutils::json::Object const& object, OdString const& key, OdString const& context);
+MU_COMMON_EXPORT kutils::json::Value const&
+getValue(kutils::json::Object const& object, OdString const& key, OdString const& context);
 /// The object of the member.
-MU_COMMON_EXPORT kutils::json::Object const& getObjectValue(
-    kutils::json::Object const& object, OdString const& key, OdString const& context);
+MU_COMMON_EXPORT kutils::json::Object const&
+getObjectValue(kutils::json::Object const& object, OdString const& key, OdString const& context);
 /// The array of the member.
-MU_COMMON_EXPORT kutils::json::Array const& getArrayValue(
-    kutils::json::Object const& object, OdString const& key, OdString const& context);
+MU_COMMON_EXPORT kutils::json::Array const&
+getArrayValue(kutils::json::Object const& object, OdString const& key, OdString const& context);
 /// The text of the member.
-MU_COMMON_EXPORT OdString getStringValue(
-    kutils::json::Object const& object, OdString const& key, OdString const& context);
+MU_COMMON_EXPORT OdString
+getStringValue(kutils::json::Object const& object, OdString const& key, OdString const& context);
 /// The text of a value that is a string.
 MU_COMMON_EXPORT OdString getStringValue(kutils::json::Value const& value);
 /// The low 32 bits of an integer, as a signed number; the range is not checked.
 MU_COMMON_EXPORT int getIntValue(kutils::json::Object const& object, OdString const& key, OdString const& context);
 /// The 64 bits of an integer, as a signed number.
-MU_COMMON_EXPORT std::int64_t getInt64Value(
-    kutils::json::Object const& object, OdString const& key, OdString const& context);
+MU_COMMON_EXPORT std::int64_t
+getInt64Value(kutils::json::Object const& object, OdString const& key, OdString const& context);
 /// The 64 bits of an integer, as an unsigned number: -1 gives 18446744073709551615.
-MU_COMMON_EXPORT std::uint64_t getUInt64Value(
-    kutils::json::Object const& object, OdString const& key, OdString const& context);
+MU_COMMON_EXPORT std::uint64_t
+getUInt64Value(kutils::json::Object const& object, OdString const& key, OdString const& context);
 /// The truth value of the member.
 MU_COMMON_EXPORT bool getBoolValue(kutils::json::Object const& object, OdString const& key, OdString const& context);
 /// A number with fraction or exponent. One without (2) is an integer and is rejected: 2.0 and 2e0 are reals.
-MU_COMMON_EXPORT double getDoubleValue(
-    kutils::json::Object const& object, OdString const& key, OdString const& context);
+MU_COMMON_EXPORT double
+getDoubleValue(kutils::json::Object const& object, OdString const& key, OdString const& context);
 
 /// The error of a value that is of another type than expected; `whileDoing` says in words what was being done.
-MU_COMMON_EXPORT ErrorMessage composeMessage(
-    kutils::json::Value const& found, kutils::json::Value_type expected, OdString const& whileDoing);
+MU_COMMON_EXPORT ErrorMessage
+composeMessage(kutils::json::Value const& found, kutils::json::Value_type expected, OdString const& whileDoing);
 
 namespace cpp20 {
 
@@ -111,8 +111,8 @@ Expected<std::vector<T>> convertElements(kutils::json::Array const& array, Conve
 
 /// The same for an array of the caller's own and a function.
 template <class T>
-Expected<std::vector<T>> fromJsonVector(
-    kutils::json::Array array, Expected<T> (*convert)(kutils::json::Object const& object))
+Expected<std::vector<T>>
+fromJsonVector(kutils::json::Array array, Expected<T> (*convert)(kutils::json::Object const& object))
 {
     return convertElements<T>(array, convert);
 }

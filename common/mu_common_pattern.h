@@ -21,8 +21,8 @@ std::regex compilePattern(OdString const& expression);
 /// followed through a text too long for it.
 bool matchesWhole(std::regex const& expression, std::string const& text);
 
-/// Names to leave out of a scan. A large folder asks for every name, so rules of the common shapes (a fixed name, a fixed
-/// ending, beginning or middle) are decided without running their expression, wherever the answer is the same.
+/// Names to leave out of a scan. A large folder asks for every name, so rules of the common shapes (a fixed name, a
+/// fixed ending, beginning or middle) are decided without running their expression, wherever the answer is the same.
 class NameFilter {
 public:
     /// Compiles `rules` as `compilePattern` does.

@@ -130,8 +130,8 @@ struct MU_COMMON_EXPORT Versions<VersionedFile, std::shared_ptr<File>> {
     Versions(VersionedFile current, std::unique_ptr<File> previous, std::unique_ptr<MetaInfo> metaInfo);
 
     std::shared_ptr<MetaInfo> metaInfo; ///< may be null
-    VersionedFile current;          ///< as the commit has it
-    std::shared_ptr<File> previous; ///< previous path of a renamed file; may be null
+    VersionedFile current;              ///< as the commit has it
+    std::shared_ptr<File> previous;     ///< previous path of a renamed file; may be null
 };
 
 /// Appends the line "<local time> - <text>" to the log file of `root`, in UTF-8, creating the file if need be.

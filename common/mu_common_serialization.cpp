@@ -277,9 +277,10 @@ Expected<Commit> deserializeCommit(Object const& object)
             return parents.error();
         }
     }
-    Expected<std::vector<ReceivedFile>> files = convertElements<ReceivedFile>(
-        getArrayValue(object, s_files, OdString::kEmpty),
-        [&](Object const& file) { return deserializeRepoFile(file, parents.value()); });
+    Expected<std::vector<ReceivedFile>> files =
+        convertElements<ReceivedFile>(getArrayValue(object, s_files, OdString::kEmpty), [&](Object const& file) {
+            return deserializeRepoFile(file, parents.value());
+        });
     if (!files.hasValue()) {
         return files.error();
     }
@@ -349,15 +350,14 @@ Expected<FetchData> deserializeFetchData(Object const& object)
         }
         return data;
     }
-    auto references = convertElements<Reference>(
-        getArrayValue(object, json::s_references, OdString::kEmpty), deserializeReference);
+    auto references =
+        convertElements<Reference>(getArrayValue(object, json::s_references, OdString::kEmpty), deserializeReference);
     if (!references.hasValue()) {
         return references.error();
     }
     data.references = take(references);
     if (hasCommits) {
-        auto commits =
-            convertElements<Commit>(getArrayValue(object, s_commits, OdString::kEmpty), deserializeCommit);
+        auto commits = convertElements<Commit>(getArrayValue(object, s_commits, OdString::kEmpty), deserializeCommit);
         if (!commits.hasValue()) {
             return commits.error();
         }

@@ -15,9 +15,9 @@
 #include "common/mu_common_repo_files.h"
 #include "common/mu_common_versions.h"
 
-#include "json/json_value.h"
 #include "platform/sdk/OdString.h"
 #include "platform/sdk/OdTimeStamp.h"
+#include "json/json_value.h"
 
 #include <boost/optional.hpp>
 
@@ -32,7 +32,7 @@ enum class EType : std::int32_t { branch = 0, tag = 1 };
 
 /// Who made a commit, when, and why.
 struct Annotation {
-    OdString author; ///< as the server reports it
+    OdString author;  ///< as the server reports it
     OdString message; ///< empty when the document has none
     OdTimeStamp date; ///< in universal time
 };
@@ -44,9 +44,9 @@ struct MU_COMMON_EXPORT Reference {
         OdString const& name, OdString const& commitHash, EType type,
         boost::optional<Annotation> const& annotation = boost::none);
 
-    OdString name;       ///< of the branch or tag
-    OdString commitHash; ///< hash of the commit that it points to
-    EType type;          ///< branch or tag
+    OdString name;                          ///< of the branch or tag
+    OdString commitHash;                    ///< hash of the commit that it points to
+    EType type;                             ///< branch or tag
     boost::optional<Annotation> annotation; ///< only the host sets one: no document that is read or written carries it
 };
 
@@ -109,8 +109,8 @@ struct CommitNumberPair {
 /// The kind that `text` names, letter case counting. Error: any other text than "branch" and "tag"; not translated.
 MU_COMMON_EXPORT Expected<EType> toType(OdString const& text);
 
-/// Reads a reference: "commitHash", "name" and "refType" are required and checked in this order. An "annotation" that is
-/// an object is read and dropped: its missing members do no harm, but one of a wrong type throws.
+/// Reads a reference: "commitHash", "name" and "refType" are required and checked in this order. An "annotation" that
+/// is an object is read and dropped: its missing members do no harm, but one of a wrong type throws.
 MU_COMMON_EXPORT Expected<Reference> deserializeReference(kutils::json::Object const& object);
 /// Reads the text of an array of references.
 MU_COMMON_EXPORT Expected<std::vector<Reference>> deserializeReferences(OdString const& text);
@@ -127,16 +127,16 @@ MU_COMMON_EXPORT Expected<std::vector<RepoData>> deserializeRepoDatas(OdString c
 /// gives, counts as 0.
 MU_COMMON_EXPORT Expected<Annotation> deserializeAnnotation(kutils::json::Object const& object);
 /// Writes an annotation. `date` is text here: what is written is not in the form that is read.
-MU_COMMON_EXPORT kutils::json::Object serializeAnnotation(
-    OdString const& author, OdString const& date, OdString const& message);
+MU_COMMON_EXPORT kutils::json::Object
+serializeAnnotation(OdString const& author, OdString const& date, OdString const& message);
 
 /// Reads an array of hashes. Error: an element that is no string.
 MU_COMMON_EXPORT Expected<std::vector<OdString>> deserializeParentHashes(kutils::json::Array const& array);
 
-/// Reads a file of a commit: "storagePath" and "path" are required and checked in this order. A "previousPath" must be a
-/// text or null; it leaves no trace in the result, and neither do `parentHashes`.
-MU_COMMON_EXPORT Expected<ReceivedFile> deserializeRepoFile(
-    kutils::json::Object const& object, std::vector<OdString> const& parentHashes);
+/// Reads a file of a commit: "storagePath" and "path" are required and checked in this order. A "previousPath" must be
+/// a text or null; it leaves no trace in the result, and neither do `parentHashes`.
+MU_COMMON_EXPORT Expected<ReceivedFile>
+deserializeRepoFile(kutils::json::Object const& object, std::vector<OdString> const& parentHashes);
 
 /// Reads a commit, its members in this order: "annotation", "parentsHashes" (which may be absent), "files", "hash",
 /// "commitNo". A missing "annotation" or "files" throws.

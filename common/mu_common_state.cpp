@@ -110,7 +110,7 @@ std::pair<OdString, IndexData> deserializeIndexEntry(Object object)
     Object const& record = getObjectValue(object, s_index_map_data, OdString::kEmpty);
     OdString path = getStringValue(object, s_index_map_path, OdString::kEmpty);
     IndexData data;
-    // Written unsigned, read signed: what is beyond 63 bits does not come back as the same number.
+    // Written unsigned, read signed: beyond 63 bits the number is a negative one on its way, and its bits come back.
     data.lastChecked = static_cast<std::uint64_t>(getInt64Value(record, s_index_map_last_checked, OdString::kEmpty));
     data.modified = getBoolValue(record, s_index_map_modified, OdString::kEmpty);
     return {std::move(path), data};
@@ -275,8 +275,8 @@ void removeIndex(OdString const& path, Cache& cache)
     cache.write().index.erase(path);
 }
 
-std::map<OdString, IndexData>::iterator openForWrite(
-    std::map<OdString, IndexData>::const_iterator const& position, Cache& cache)
+std::map<OdString, IndexData>::iterator
+openForWrite(std::map<OdString, IndexData>::const_iterator const& position, Cache& cache)
 {
     return cache.write().index.erase(position, position); // Erases nothing: the standard way to lift the const.
 }

@@ -1,7 +1,7 @@
 /// The working state of a repository: what belongs to the working folder but not yet to a commit.
 ///
-/// No operation here takes a lock. A cache and its transactions belong to one thread at a time; caches of one repository
-/// share nothing but the file, and the one destroyed last wins.
+/// No operation here takes a lock. A cache and its transactions belong to one thread at a time; caches of one
+/// repository share nothing but the file, and the one destroyed last wins.
 #pragma once
 
 #include "common/mu_common_expected.h"
@@ -33,8 +33,8 @@ struct IndexData {
 /// The working state. Paths are relative to the working folder.
 struct State {
     OdString head = s_defaultMaster; ///< the branch that HEAD points to
-    /// A commit that the host keeps with HEAD. A state file that holds one is not read back: the reader looks the number
-    /// up under another name than the writer gives it.
+    /// A commit that the host keeps with HEAD. A state file that holds one is not read back: the reader looks the
+    /// number up under another name than the writer gives it.
     std::optional<std::uint64_t> headCommit;
     std::vector<StagedFile> stagedFiles;  ///< what the next commit takes, in staging order
     std::map<OdString, OdString> renames; ///< new path of a file that moved, and its previous one
@@ -119,7 +119,7 @@ MU_COMMON_EXPORT void updateIndex(Cache& cache, RootPath const& root);
 MU_COMMON_EXPORT void removeIndex(OdString const& path, Cache& cache);
 
 /// Makes a position in the index of `cache.read()` writable; the cache counts as changed from here on.
-MU_COMMON_EXPORT std::map<OdString, IndexData>::iterator openForWrite(
-    std::map<OdString, IndexData>::const_iterator const& position, Cache& cache);
+MU_COMMON_EXPORT std::map<OdString, IndexData>::iterator
+openForWrite(std::map<OdString, IndexData>::const_iterator const& position, Cache& cache);
 
 } // namespace common

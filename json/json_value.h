@@ -26,9 +26,11 @@ public:
 /// their keys, so a value knows nothing of the order in which members were read or added.
 template <class S>
 struct KUTILS_JSON_EXPORT Config_map {
-    using String = S;
+    using String = S; ///< texts and keys
+    /// An object of values.
     template <class Value>
     using Object = std::map<String, Value>;
+    /// An array of values.
     template <class Value>
     using Array = std::vector<Value>;
 };
@@ -41,9 +43,9 @@ struct KUTILS_JSON_EXPORT Config_map {
 template <class Config>
 class KUTILS_JSON_EXPORT Value_impl {
 public:
-    using String = typename Config::String;
-    using Object = typename Config::template Object<Value_impl>;
-    using Array = typename Config::template Array<Value_impl>;
+    using String = typename Config::String;                      ///< texts and keys
+    using Object = typename Config::template Object<Value_impl>; ///< members by their keys
+    using Array = typename Config::template Array<Value_impl>;   ///< elements in order
 
     /// A null value.
     Value_impl() noexcept = default;
@@ -55,10 +57,12 @@ public:
         , payload_(other.payload_)
     {
     }
+    /// Takes over what it is given.
     Value_impl(Object object);
     /// Compilers do not agree whether `Array{Array{1}}` is an array in an array or a copy; `Array{Value(Array{1})}` is
     /// the former.
     Value_impl(Array array);
+    /// Takes over what it is given.
     Value_impl(String string);
     /// Copies `string` up to its NUL; null gives the empty string.
     Value_impl(typename String::value_type const* string);
@@ -66,15 +70,19 @@ public:
     template <class T>
     Value_impl(T const*) = delete;
     Value_impl(bool value) noexcept : type_(Value_type::boolean) { payload_.boolean = value; }
+    /// A signed integer.
     Value_impl(int value) noexcept : Value_impl(std::int64_t{value}) {}
+    /// A signed integer.
     Value_impl(std::int64_t value) noexcept : type_(Value_type::integer)
     {
         payload_.integer = static_cast<std::uint64_t>(value);
     }
+    /// An unsigned integer.
     Value_impl(std::uint64_t value) noexcept : type_(Value_type::integer), is_uint64_(true)
     {
         payload_.integer = value;
     }
+    /// A real.
     Value_impl(double value) noexcept : type_(Value_type::real) { payload_.real = value; }
 
     /// `other` may be a part of this value, as in `value = value.get_array()[0]`.
@@ -98,6 +106,7 @@ public:
         }
     }
 
+    /// Exchanges what both hold.
     void swap(Value_impl& other) noexcept
     {
         std::swap(type_, other.type_);
@@ -105,6 +114,7 @@ public:
         std::swap(payload_, other.payload_);
     }
 
+    /// What the value holds.
     Value_type type() const noexcept { return type_; }
     /// Whether an integer was made or read as an unsigned one; false for every other type. The reader takes each
     /// integer without a minus sign for unsigned.
@@ -119,6 +129,8 @@ public:
         }
     }
 
+    /// What the value holds, by reference where it is large.
+    ///@{
     Object const& get_object() const { return check_type(Value_type::object), payload_.object->content; }
     Object& get_object() { return check_type(Value_type::object), payload_.object->content; }
     Array const& get_array() const { return check_type(Value_type::array), payload_.array->content; }
@@ -126,10 +138,12 @@ public:
     String const& get_string() const { return check_type(Value_type::string), *payload_.string; }
     String& get_string() { return check_type(Value_type::string), *payload_.string; }
     bool get_bool() const { return check_type(Value_type::boolean), payload_.boolean; }
+    ///@}
     /// The low 32 bits of an integer, whatever the others are.
     std::int32_t get_int() const { return static_cast<std::int32_t>(get_uint64()); }
     /// The 64 bits of an integer, whether it is a signed or an unsigned one.
     std::int64_t get_int64() const { return static_cast<std::int64_t>(get_uint64()); }
+    /// The 64 bits of an integer, likewise.
     std::uint64_t get_uint64() const { return check_type(Value_type::integer), payload_.integer; }
     /// A real, or an integer converted to one.
     double get_real() const;
@@ -138,6 +152,7 @@ public:
     /// equal, since both are written `5`; -1 and 18446744073709551615 are not. An integer never equals a real. Reals
     /// are compared as doubles, so NaN equals nothing.
     friend bool operator==(Value_impl const& a, Value_impl const& b) { return a.equals(b); }
+    /// The opposite.
     friend bool operator!=(Value_impl const& a, Value_impl const& b) { return !a.equals(b); }
 
 private:
@@ -180,8 +195,8 @@ private:
 
 extern template class Value_impl<Config_map<std::wstring>>;
 
-using Value = Value_impl<Config_map<std::wstring>>;
-using Object = Value::Object;
-using Array = Value::Array;
+using Value = Value_impl<Config_map<std::wstring>>; ///< the one instance
+using Object = Value::Object;                       ///< of the one instance
+using Array = Value::Array;                         ///< of the one instance
 
 } // namespace kutils::json

@@ -21,10 +21,7 @@ constexpr std::size_t kKiB = 1024;
 /// Bytes as little compressible as those of a drawing (Marsaglia's xorshift, 64 bits).
 class Noise {
 public:
-    explicit Noise(std::uint64_t seed)
-        : state_(seed * 0x9E3779B97F4A7C15U + 1)
-    {
-    }
+    explicit Noise(std::uint64_t seed) : state_(seed * 0x9E3779B97F4A7C15U + 1) {}
 
     std::uint64_t next()
     {
@@ -42,11 +39,7 @@ private:
 
 class Sample {
 public:
-    explicit Sample(fs::path folder)
-        : folder_(std::move(folder))
-    {
-        fs::create_directories(folder_);
-    }
+    explicit Sample(fs::path folder) : folder_(std::move(folder)) { fs::create_directories(folder_); }
 
     void write(std::string const& name, std::string_view start, std::size_t size)
     {

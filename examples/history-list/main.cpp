@@ -5,8 +5,8 @@
 #include "common/mu_common_history.h"
 #include "common/mu_common_serialization.h"
 
-#include "json/json_reader.h"
 #include "platform/ut/text.h"
+#include "json/json_reader.h"
 
 #include <QAbstractListModel>
 #include <QApplication>

@@ -23,7 +23,8 @@ struct Options {
     bool all = false;
 };
 
-[[noreturn]] void failForUnknown(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
+[[noreturn]] void
+failForUnknown(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
 {
     OdString const path = pathInRepository(root, name);
     for (auto const& file : changes.removed) {
@@ -39,8 +40,8 @@ struct Options {
     throw Failure("No changed file matches '" + name + "'.", "Run 'tav status --ignored' to see what there is.");
 }
 
-std::vector<common::StagedFile> chosenFiles(
-    Options const& options, common::RepoChanges const& changes, common::RootPath const& root)
+std::vector<common::StagedFile>
+chosenFiles(Options const& options, common::RepoChanges const& changes, common::RootPath const& root)
 {
     NameFinder const finder(changes, root);
     std::vector<common::StagedFile> chosen;
@@ -66,7 +67,9 @@ void addFilesToStage(Options const& options)
         common::RepoChanges const changes = compare(root, lastCommitFiles(root), cache.read());
         count = stage(chosenFiles(options, changes, root), cache.write());
     });
-    print(count == 0 ? "Nothing new to stage.\n" : "Staged " + std::to_string(count) + (count == 1 ? " file.\n" : " files.\n"));
+    print(
+        count == 0 ? "Nothing new to stage.\n"
+                   : "Staged " + std::to_string(count) + (count == 1 ? " file.\n" : " files.\n"));
 }
 
 } // namespace
@@ -75,8 +78,8 @@ void addAdd(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("add", "Stage changed and new files for the next commit");
     auto const options = std::make_shared<Options>();
-    CLI::Option* const names = command->add_option("NAME", options->names,
-        "Paths of files or folders, or a part of a path that only one changed file matches");
+    CLI::Option* const names = command->add_option(
+        "NAME", options->names, "Paths of files or folders, or a part of a path that only one changed file matches");
     CLI::Option* const all = command->add_flag("--all", options->all, "Stage every changed and new file");
     names->excludes(all);
     command->callback([options] {

@@ -88,7 +88,8 @@ void failForUnread(std::vector<Listed> const& list)
         }
     }
     if (unread > 0) {
-        throw Failure(std::to_string(unread) + " of " + std::to_string(list.size()) + " files could not be read.",
+        throw Failure(
+            std::to_string(unread) + " of " + std::to_string(list.size()) + " files could not be read.",
             "Mend that and run the command again.");
     }
 }

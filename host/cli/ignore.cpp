@@ -21,8 +21,9 @@ void addRule(common::RootPath const& root, std::string const& rule)
 {
     os::FileLock const lock = lockRepository(root, "ignore");
     OdString const wide(rule.data(), rule.size(), CP_UTF_8);
-    print(addIgnoreRule(root, wide) ? "Names that match '" + shown(wide) + "' are ignored from now on.\n"
-                                    : "The rule '" + shown(wide) + "' was there already.\n");
+    print(
+        addIgnoreRule(root, wide) ? "Names that match '" + shown(wide) + "' are ignored from now on.\n"
+                                  : "The rule '" + shown(wide) + "' was there already.\n");
 }
 
 void listRules(common::RootPath const& root, bool json)
@@ -46,8 +47,8 @@ void addIgnore(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("ignore", "Show the rules for names to ignore, or add one");
     auto const options = std::make_shared<Options>();
-    CLI::Option* const add = command->add_option("--add", options->rule,
-        "A regular expression; files and folders whose whole name matches it are ignored");
+    CLI::Option* const add = command->add_option(
+        "--add", options->rule, "A regular expression; files and folders whose whole name matches it are ignored");
     command->add_flag("--json", options->json, "Print a document for programs")->excludes(add);
     add->type_name("PATTERN");
     command->callback([options, add] {

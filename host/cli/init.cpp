@@ -21,8 +21,9 @@ void init(std::string const& folder)
     os::FileLock const lock = lockRepository(root, "init");
     makeIgnoreFile(root);
     makeState(root);
-    print(existed ? "The repository in '" + shown(path) + "' was there already; it is complete.\n"
-                  : "Made a repository in '" + shown(path) + "'.\n");
+    print(
+        existed ? "The repository in '" + shown(path) + "' was there already; it is complete.\n"
+                : "Made a repository in '" + shown(path) + "'.\n");
 }
 
 } // namespace

@@ -51,7 +51,8 @@ void checkFolders(OdString const& to, common::RootPath const& root)
     for (auto const& part : std::filesystem::path(to.ansi_str()).parent_path()) {
         folder /= part;
         if (std::filesystem::is_symlink(std::filesystem::symlink_status(folder))) {
-            throw Failure("The repository would not keep '" + to.ansi_str() + "': '" + folder.string() + "' is a link.",
+            throw Failure(
+                "The repository would not keep '" + to.ansi_str() + "': '" + folder.string() + "' is a link.",
                 "Choose another folder.");
         }
     }
@@ -67,7 +68,8 @@ void checkTarget(OdString const& to, common::RootPath const& root)
             isLeftOut = isLeftOut || std::regex_match(name, rule);
         }
         if (isLeftOut) {
-            throw Failure("The repository would not keep '" + to.ansi_str() + "': its name is hidden or ignored.",
+            throw Failure(
+                "The repository would not keep '" + to.ansi_str() + "': its name is hidden or ignored.",
                 "Choose another name, or see 'tav ignore'.");
         }
     }

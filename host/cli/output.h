@@ -1,8 +1,8 @@
 /// What commands print: names, documents and errors.
 #pragma once
 
-#include "json/json_value.h"
 #include "platform/sdk/OdString.h"
+#include "json/json_value.h"
 
 #include <string>
 

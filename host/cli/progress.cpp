@@ -46,7 +46,8 @@ void Progress::draw() const
 {
     std::uint64_t const filled = std::min(kWidth, done_ * kWidth / total_);
     std::string const bar = std::string(filled, '#') + std::string(kWidth - filled, '.');
-    std::fprintf(stderr, "\r[%s] %llu of %llu %s", bar.c_str(), static_cast<unsigned long long>(done_),
+    std::fprintf(
+        stderr, "\r[%s] %llu of %llu %s", bar.c_str(), static_cast<unsigned long long>(done_),
         static_cast<unsigned long long>(total_), what_.c_str());
     std::fflush(stderr);
 }

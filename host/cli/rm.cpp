@@ -35,7 +35,8 @@ OdString removablePath(std::string const& name, common::RepoChanges const& chang
     auto const workingPath = [](auto const& file) { return file.working.path; };
     auto const committedPath = [](auto const& file) { return file.committed.path; };
     if (holds(changes.untracked, typed, workingPath)) {
-        throw Failure("'" + name + "' is in no commit: removing it would lose it.",
+        throw Failure(
+            "'" + name + "' is in no commit: removing it would lose it.",
             "Use 'tav unstage' if it is staged, and delete it yourself if you do not need it.");
     }
     if (holds(changes.modified, typed, workingPath)) {

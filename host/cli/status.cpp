@@ -1,8 +1,8 @@
+#include "host/repository/status.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
 #include "host/repository/open.h"
-#include "host/repository/status.h"
 
 #include <memory>
 #include <string>
@@ -71,7 +71,8 @@ void printDocument(Status const& status, bool withIgnored)
     printJson(std::move(object));
 }
 
-void printGroup(char const* title, char const* hint, char const* label, Colour colour, std::vector<OdString> const& paths)
+void printGroup(
+    char const* title, char const* hint, char const* label, Colour colour, std::vector<OdString> const& paths)
 {
     if (paths.empty()) {
         return;
@@ -128,7 +129,8 @@ void printForPeople(Status const& status)
     print("On branch " + shown(status.branch) + "\n\n");
     printConflicts(status.conflicts);
     printStaged(status.staged);
-    printGroup("Modified, not staged:", "use 'tav add NAME' to stage a file", "modified: ", Colour::red, status.modified);
+    printGroup(
+        "Modified, not staged:", "use 'tav add NAME' to stage a file", "modified: ", Colour::red, status.modified);
     printGroup("Removed:", "the next commit takes these without staging", "removed:  ", Colour::red, status.removed);
     printGroup("New, not staged:", "use 'tav add NAME' or 'tav add --all' to stage", "", Colour::red, status.untracked);
     printGroup("Ignored:", "see 'tav ignore' for the rules", "", Colour::none, status.ignored);

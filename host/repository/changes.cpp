@@ -18,12 +18,13 @@ using Committed = std::map<OdString, common::VersionedFile const*>;
 bool isUntouched(OdString const& path, common::RootPath const& root, common::State const& state)
 {
     auto const record = state.index.find(path);
-    return record != state.index.end() && !record->second.modified
-        && record->second.lastChecked == common::modifyTime(path, root);
+    return record != state.index.end() && !record->second.modified &&
+           record->second.lastChecked == common::modifyTime(path, root);
 }
 
 /// Sorts one working file in. A committed one is taken out of `committed`, which keeps what is missing in the folder.
-void sortIn(common::File const& file, Committed& committed, common::RootPath const& root, common::State const& state,
+void sortIn(
+    common::File const& file, Committed& committed, common::RootPath const& root, common::State const& state,
     common::RepoChanges& changes)
 {
     auto const match = committed.find(file.path);
@@ -47,13 +48,14 @@ std::vector<common::File> scan(common::RootPath const& root)
     try {
         return valueOrFail(common::collectRepoFiles(root), "Check the path of the repository.");
     } catch (std::regex_error const&) {
-        throw Failure("The ignore file has a rule that is no regular expression that can be used.",
+        throw Failure(
+            "The ignore file has a rule that is no regular expression that can be used.",
             "Mend '.tav/properties/ignore'.");
     }
 }
 
-common::RepoChanges compare(
-    common::RootPath const& root, std::vector<common::VersionedFile> const& committed, common::State const& state)
+common::RepoChanges
+compare(common::RootPath const& root, std::vector<common::VersionedFile> const& committed, common::State const& state)
 {
     Committed missing;
     for (common::VersionedFile const& file : committed) {

@@ -41,7 +41,8 @@ void FileMoves::move(std::string const& from, std::string const& to)
     if (error == std::errc::file_exists) {
         throw Failure("'" + to + "' exists already.", "Choose another name, or move that one away first.");
     }
-    throw Failure("'" + from + "' cannot be moved to '" + to + "': " + error.message() + ".",
+    throw Failure(
+        "'" + from + "' cannot be moved to '" + to + "': " + error.message() + ".",
         "Check that the folder exists and that you may write there.");
 }
 

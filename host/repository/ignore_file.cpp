@@ -17,14 +17,16 @@ constexpr char const* kCheckDisk = "Check the free space and your rights in '.ta
 
 void checkRule(OdString const& rule)
 {
-    bool const holdsLineEnd = rule != OdString(rule.c_str()) || rule.ansi_str().find_first_of("\r\n") != std::string::npos;
+    bool const holdsLineEnd =
+        rule != OdString(rule.c_str()) || rule.ansi_str().find_first_of("\r\n") != std::string::npos;
     if (rule.isEmpty() || holdsLineEnd) {
         throw Failure("A rule is one line that is not empty.", "Give one rule at a time.");
     }
     try {
         common::RepoIgnore::compile(rule);
     } catch (std::regex_error const&) {
-        throw Failure("'" + rule.ansi_str() + "' is no regular expression that can be used.",
+        throw Failure(
+            "'" + rule.ansi_str() + "' is no regular expression that can be used.",
             "Rules match whole names: write '^.*\\.tmp$' for all names that end in '.tmp'.");
     }
 }
@@ -72,7 +74,10 @@ std::vector<OdString> ignoreRules(common::RootPath const& root)
     try {
         return common::RepoIgnore(root).rules();
     } catch (std::regex_error const&) {
-        throw Failure("The ignore file '" + pathOf(root).ansi_str() + "' has a rule that is no regular expression that can be used.", "Mend or remove it there.");
+        throw Failure(
+            "The ignore file '" + pathOf(root).ansi_str() +
+                "' has a rule that is no regular expression that can be used.",
+            "Mend or remove it there.");
     }
 }
 

@@ -28,10 +28,12 @@ os::FileLock lockRepository(common::RootPath const& root, std::string const& nam
     os::FileLock lock;
     std::error_code const error = lock.acquire(path, note, kPatience);
     if (error == std::errc::operation_would_block) {
-        throw Failure(os::FileLock::holder(path) + ", is changing the repository.", "Run the command again when that is done.");
+        throw Failure(
+            os::FileLock::holder(path) + ", is changing the repository.", "Run the command again when that is done.");
     }
     if (error) {
-        throw Failure("The repository cannot be locked: " + error.message() + ".",
+        throw Failure(
+            "The repository cannot be locked: " + error.message() + ".",
             "Check your rights to '" + root.tavPath().ansi_str() + "'.");
     }
     return lock;

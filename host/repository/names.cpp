@@ -26,7 +26,8 @@ fs::path normalized(fs::path const& path)
 
 Failure noExpression(std::string const& name)
 {
-    return Failure("No file is named '" + name + "', and it is no expression that can be used.",
+    return Failure(
+        "No file is named '" + name + "', and it is no expression that can be used.",
         "Type the path of a file as 'tav status' shows it.");
 }
 
@@ -54,7 +55,8 @@ OdString pathInRepository(common::RootPath const& root, std::string const& typed
     }
     auto const relative = absolute.relativePathTo(path);
     if (!relative.hasValue()) {
-        throw Failure("'" + typed + "' is not located in the current repository.",
+        throw Failure(
+            "'" + typed + "' is not located in the current repository.",
             "Name a file below '" + absolute.path().ansi_str() + "'.");
     }
     return relative.value();

@@ -27,7 +27,8 @@ bool isStorable(OdString const& path)
 void checkStorable(OdString const& path)
 {
     if (!isStorable(path)) {
-        throw Failure("The name '" + path.ansi_str() + "' holds a character that cannot be recorded.",
+        throw Failure(
+            "The name '" + path.ansi_str() + "' holds a character that cannot be recorded.",
             "Rename the file and try again.");
     }
 }

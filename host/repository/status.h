@@ -25,7 +25,10 @@ struct Status {
     std::vector<OdString> removed;   ///< gone from the working folder; the next commit takes that without staging
     std::vector<OdString> ignored;   ///< filled in when it is asked for
 
-    bool isClean() const { return conflicts.empty() && staged.empty() && modified.empty() && untracked.empty() && removed.empty(); }
+    bool isClean() const
+    {
+        return conflicts.empty() && staged.empty() && modified.empty() && untracked.empty() && removed.empty();
+    }
 };
 
 Status statusOf(common::RootPath const& root, bool withIgnored);

@@ -11,7 +11,8 @@ namespace tav {
 namespace {
 
 constexpr char const* kHowToComplete = "Run 'tav init' if '.tav/tav.state' is missing; mend it if not.";
-constexpr char const* kOldStateStands = "The old state still stands; check the free space and your rights, and try again.";
+constexpr char const* kOldStateStands =
+    "The old state still stands; check the free space and your rights, and try again.";
 
 /// Keeps what a cache reported about saving itself.
 class SaveReport final : public common::IoInterface {

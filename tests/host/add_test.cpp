@@ -115,7 +115,9 @@ struct PathRow {
     std::vector<std::string> staged;
 };
 
-class AddPaths : public TavTest, public testing::WithParamInterface<PathRow> {};
+class AddPaths
+    : public TavTest
+    , public testing::WithParamInterface<PathRow> {};
 
 TEST_P(AddPaths, AreTakenFromTheCurrentFolder)
 {
@@ -132,16 +134,22 @@ TEST_P(AddPaths, AreTakenFromTheCurrentFolder)
     EXPECT_EQ(status.substr(start, status.find("\n\n", start) + 1 - start), expected);
 }
 
-INSTANTIATE_TEST_SUITE_P(Folders, AddPaths,
-    testing::Values(PathRow{"Here", ".", {"a.dwg"}, {"a.dwg"}}, PathRow{"InSubFolder", "plans", {"a.dwg"}, {"plans/a.dwg"}},
-        PathRow{"Above", "plans", {"../a.dwg"}, {"a.dwg"}}, PathRow{"TwiceAbove", "plans/north", {"../../a.dwg"}, {"a.dwg"}},
+INSTANTIATE_TEST_SUITE_P(
+    Folders, AddPaths,
+    testing::Values(
+        PathRow{"Here", ".", {"a.dwg"}, {"a.dwg"}}, PathRow{"InSubFolder", "plans", {"a.dwg"}, {"plans/a.dwg"}},
+        PathRow{"Above", "plans", {"../a.dwg"}, {"a.dwg"}},
+        PathRow{"TwiceAbove", "plans/north", {"../../a.dwg"}, {"a.dwg"}},
         PathRow{"Beside", "plans/north", {"../b.dwg"}, {"plans/b.dwg"}},
         PathRow{"WithDots", ".", {"./plans/.././plans/north/a.dwg"}, {"plans/north/a.dwg"}},
         PathRow{"ThroughAFolderThatIsNot", ".", {"nowhere/../a.dwg"}, {"a.dwg"}},
         PathRow{"DoubledSlashes", ".", {"plans//north///a.dwg"}, {"plans/north/a.dwg"}},
         PathRow{"CurrentFolder", "plans", {"."}, {"plans/a.dwg", "plans/b.dwg", "plans/north/a.dwg"}},
         PathRow{"WorkingFolder", ".", {"."}, {"a.dwg", "plans/a.dwg", "plans/b.dwg", "plans/north/a.dwg"}},
-        PathRow{"WorkingFolderFromInside", "plans/north", {"../.."},
+        PathRow{
+            "WorkingFolderFromInside",
+            "plans/north",
+            {"../.."},
             {"a.dwg", "plans/a.dwg", "plans/b.dwg", "plans/north/a.dwg"}},
         PathRow{"FolderWithSlash", ".", {"plans/north/"}, {"plans/north/a.dwg"}},
         PathRow{"FolderAbove", "plans/north", {".."}, {"plans/a.dwg", "plans/b.dwg", "plans/north/a.dwg"}},
@@ -176,7 +184,8 @@ TEST_F(Add, FailsForAnEmptyName)
 TEST_F(Add, FailsForNamesOfNoChangedFile)
 {
     repo.add({"a.dwg", "x.bak", ".hidden", "empty/.keep"});
-    for (std::string const name : {"nothing.dwg", "x.bak", ".hidden", "empty", ".tav/tav.state", "A.dwg", "a.dwg.dwg"}) {
+    for (std::string const name :
+         {"nothing.dwg", "x.bak", ".hidden", "empty", ".tav/tav.state", "A.dwg", "a.dwg.dwg"}) {
         EXPECT_EQ(tav({"add", name}), unknown(name));
     }
     EXPECT_EQ(tav({"add", "no\n\x1b\xff"}), unknown("no \\x1B\\xFF"));
@@ -196,21 +205,23 @@ TEST_F(Add, ListsTheFilesThatAnAmbiguousNameMatches)
 {
     repo.add({"drawings/plan.dwg", "drawings/floorplan.dwg", "roof.dwg", "plan.old.dwg", "plan"});
     EXPECT_EQ(tav({"add", "drawings/plan"}), done("Staged 1 file.\n"));
-    EXPECT_EQ(tav({"add", "lan"}), failed("tav: More that one file found with name lan. Type more of the path of the one "
-                                          "you mean:\n"
-                                          "  drawings/floorplan.dwg\n"
-                                          "  drawings/plan.dwg\n"
-                                          "  plan.old.dwg\n"));
+    EXPECT_EQ(
+        tav({"add", "lan"}), failed("tav: More that one file found with name lan. Type more of the path of the one "
+                                    "you mean:\n"
+                                    "  drawings/floorplan.dwg\n"
+                                    "  drawings/plan.dwg\n"
+                                    "  plan.old.dwg\n"));
     EXPECT_EQ(state(), stateWithAdded({"drawings/plan.dwg"}));
 }
 
 TEST_F(Add, EscapesTheFilesThatAnAmbiguousNameMatches)
 {
     repo.add({"a\t\xff/plan.dwg", "b\x1b[31m/plan.dwg"});
-    EXPECT_EQ(tav({"add", "plan.dwg"}), failed("tav: More that one file found with name plan.dwg. Type more of the path of "
-                                               "the one you mean:\n"
-                                               "  a \\xFF/plan.dwg\n"
-                                               "  b\\x1B[31m/plan.dwg\n"));
+    EXPECT_EQ(
+        tav({"add", "plan.dwg"}), failed("tav: More that one file found with name plan.dwg. Type more of the path of "
+                                         "the one you mean:\n"
+                                         "  a \\xFF/plan.dwg\n"
+                                         "  b\\x1B[31m/plan.dwg\n"));
 }
 
 TEST_F(Add, PrefersTheFileOfExactlyThatPath)
@@ -230,17 +241,22 @@ TEST_F(Add, PrefersAFolderToPartOfAPath)
 TEST_F(Add, TakesNamesWithTheCharactersOfExpressionsAsTheyStand)
 {
     repo.add({"a (1).dwg", "b[2].dwg", "c+.dwg", "(", "[", "*", "d\\e.dwg", "^f$", "{g/h.dwg"});
-    EXPECT_EQ(tav({"add", "a (1).dwg", "b[2].dwg", "c+.dwg", "(", "[", "*", "d\\e.dwg", "^f$", "{g"}), done("Staged 9 files.\n"));
-    EXPECT_EQ(state(), stateWithAdded({"a (1).dwg", "b[2].dwg", "c+.dwg", "(", "[", "*", "d\\\\e.dwg", "^f$", "{g/h.dwg"}));
+    EXPECT_EQ(
+        tav({"add", "a (1).dwg", "b[2].dwg", "c+.dwg", "(", "[", "*", "d\\e.dwg", "^f$", "{g"}),
+        done("Staged 9 files.\n"));
+    EXPECT_EQ(
+        state(), stateWithAdded({"a (1).dwg", "b[2].dwg", "c+.dwg", "(", "[", "*", "d\\\\e.dwg", "^f$", "{g/h.dwg"}));
 }
 
 TEST_F(Add, FailsForANameThatIsNeitherAFileNorAnExpression)
 {
     repo.add({"a.dwg"});
     for (std::string const name : {"[", "a (1.dwg", "(a*)*b("}) {
-        EXPECT_EQ(tav({"add", name}),
-            failed("tav: No file is named '" + name
-                + "', and it is no expression that can be used. Type the path of a file as 'tav status' shows it.\n"));
+        EXPECT_EQ(
+            tav({"add", name}),
+            failed(
+                "tav: No file is named '" + name +
+                "', and it is no expression that can be used. Type the path of a file as 'tav status' shows it.\n"));
     }
     EXPECT_EQ(state(), kFreshState);
 }
@@ -254,19 +270,22 @@ TEST_F(Add, AnswersForAnExpressionThatCouldTakeForEver)
 TEST_F(Add, StagesNamesOfEveryScriptAndOfNone)
 {
     repo.add({"План.dwg", "図面.dwg", "\xf0\x9f\x8f\xa0.dwg", "\xff\xfe.dwg", "a\nb.dwg", "c\x1b.dwg"});
-    EXPECT_EQ(tav({"add", "План.dwg", "図面.dwg", "\xf0\x9f\x8f\xa0.dwg", "\xff\xfe.dwg", "a\nb.dwg", "c\x1b.dwg"}),
+    EXPECT_EQ(
+        tav({"add", "План.dwg", "図面.dwg", "\xf0\x9f\x8f\xa0.dwg", "\xff\xfe.dwg", "a\nb.dwg", "c\x1b.dwg"}),
         done("Staged 6 files.\n"));
-    EXPECT_EQ(state(), stateWithAdded({"План.dwg", "図面.dwg", "\xf0\x9f\x8f\xa0.dwg", "\\uDCFF\\uDCFE.dwg", "a\\nb.dwg",
-                           "c\\u001B.dwg"}));
+    EXPECT_EQ(
+        state(),
+        stateWithAdded(
+            {"План.dwg", "図面.dwg", "\xf0\x9f\x8f\xa0.dwg", "\\uDCFF\\uDCFE.dwg", "a\\nb.dwg", "c\\u001B.dwg"}));
     EXPECT_EQ(tav({"unstage", "\xff\xfe.dwg", "\xf0\x9f\x8f\xa0.dwg"}), done("Took 2 files out of the next commit.\n"));
 }
 
 TEST_F(Add, FailsForNamesThatTheStateCannotHold)
 {
     repo.add({"a.dwg", "\xf0\x9f\xbf\xbe.dwg"}); // No character: its code is set apart for ever.
-    Outcome const refused =
-        failed("tav: The name '\xf0\x9f\xbf\xbe.dwg' holds a character that cannot be recorded. Rename the file and try "
-               "again.\n");
+    Outcome const refused = failed(
+        "tav: The name '\xf0\x9f\xbf\xbe.dwg' holds a character that cannot be recorded. Rename the file and try "
+        "again.\n");
     EXPECT_EQ(tav({"add", "--all"}), refused);
     EXPECT_EQ(tav({"add", "\xf0\x9f\xbf\xbe.dwg"}), refused);
     EXPECT_EQ(state(), kFreshState);
@@ -300,7 +319,8 @@ TEST_F(Add, CountsBothOfTwoCommandsAtTheSameTime)
         Process second(setting(), {"add", "b.dwg"});
         EXPECT_EQ(first.wait(), done("Staged 1 file.\n"));
         EXPECT_EQ(second.wait(), done("Staged 1 file.\n"));
-        EXPECT_THAT((std::vector<std::string>{stateWithAdded({"a.dwg", "b.dwg"}), stateWithAdded({"b.dwg", "a.dwg"})}),
+        EXPECT_THAT(
+            (std::vector<std::string>{stateWithAdded({"a.dwg", "b.dwg"}), stateWithAdded({"b.dwg", "a.dwg"})}),
             testing::Contains(state()));
     }
 }
@@ -323,7 +343,9 @@ TEST_F(Unstage, TakesFoldersPartsOfPathsAndEverything)
     repo.add({"plans/a.dwg", "plans/b.dwg", "roof.dwg", "notes.txt", "x.dwg"});
     tav({"add", "--all"});
     EXPECT_EQ(tavIn(repo.pathTo("plans"), {"unstage", "."}), done("Took 2 files out of the next commit.\n"));
-    EXPECT_EQ(tav({"unstage", "roo"}), failed("tav: No staged file matches 'roo'. Run 'tav status' to see what is staged.\n"));
+    EXPECT_EQ(
+        tav({"unstage", "roo"}),
+        failed("tav: No staged file matches 'roo'. Run 'tav status' to see what is staged.\n"));
     EXPECT_EQ(tav({"unstage", "oof"}), done("Took 1 file out of the next commit.\n"));
     EXPECT_EQ(tav({"unstage", "--all"}), done("Took 2 files out of the next commit.\n"));
     EXPECT_EQ(tav({"unstage", "--all"}), done("Took 0 files out of the next commit.\n"));
@@ -357,10 +379,11 @@ TEST_F(Unstage, ForgetsThatAFileWasRenamed)
 TEST_F(Unstage, ListsTheFilesThatAnAmbiguousNameMatches)
 {
     repo.write(".tav/tav.state", stateWithAdded({"plans/b.dwg", "plans/a/b.dwg", "c.dwg"}));
-    EXPECT_EQ(tav({"unstage", "b"}), failed("tav: More that one file found with name b. Type more of the path of the one you "
-                                            "mean:\n"
-                                            "  plans/a/b.dwg\n"
-                                            "  plans/b.dwg\n"));
+    EXPECT_EQ(
+        tav({"unstage", "b"}), failed("tav: More that one file found with name b. Type more of the path of the one you "
+                                      "mean:\n"
+                                      "  plans/a/b.dwg\n"
+                                      "  plans/b.dwg\n"));
 }
 
 TEST_F(Unstage, ChangesNothingWhenOneOfItsNamesIsBad)
@@ -368,13 +391,16 @@ TEST_F(Unstage, ChangesNothingWhenOneOfItsNamesIsBad)
     std::string const before = stateWithAdded({"a.dwg", "b.dwg"});
     repo.write(".tav/tav.state", before);
     repo.add({"c.dwg"});
-    EXPECT_EQ(tav({"unstage", "a.dwg", "c.dwg"}),
+    EXPECT_EQ(
+        tav({"unstage", "a.dwg", "c.dwg"}),
         failed("tav: No staged file matches 'c.dwg'. Run 'tav status' to see what is staged.\n"));
     EXPECT_EQ(tav({"unstage", "a.dwg", "/x"}), outside("/x", repo.path()));
-    EXPECT_EQ(tav({"unstage", "a.dwg", "("}),
-        failed("tav: No file is named '(', and it is no expression that can be used. Type the path of a file as 'tav status' "
-               "shows it.\n"));
-    EXPECT_EQ(tav({"unstage", "a.dwg", ""}),
+    EXPECT_EQ(
+        tav({"unstage", "a.dwg", "("}), failed("tav: No file is named '(', and it is no expression that can be used. "
+                                               "Type the path of a file as 'tav status' "
+                                               "shows it.\n"));
+    EXPECT_EQ(
+        tav({"unstage", "a.dwg", ""}),
         failed("tav: An empty name names no file. Type '.' for the folder that you are in.\n"));
     EXPECT_EQ(state(), before);
 }

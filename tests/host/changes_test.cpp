@@ -19,7 +19,8 @@ protected:
     {
         std::string const content = "committed " + name;
         repo.write(name, content);
-        committed_.push_back({wide(name), OdString(L"po#") + generateSha(content.data(), static_cast<int>(content.size()))});
+        committed_.push_back(
+            {wide(name), OdString(L"po#") + generateSha(content.data(), static_cast<int>(content.size()))});
     }
 
     void index(std::string const& name, bool modified)

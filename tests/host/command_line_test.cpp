@@ -124,21 +124,25 @@ Options:
 
 )";
 
-class Help : public TavTest, public testing::WithParamInterface<HelpRow> {};
+class Help
+    : public TavTest
+    , public testing::WithParamInterface<HelpRow> {};
 
 TEST_P(Help, TellsHowTheCommandIsUsedAndDoesNothingElse)
 {
     EXPECT_EQ(tavIn("/", GetParam().arguments), done(GetParam().text));
 }
 
-INSTANTIATE_TEST_SUITE_P(Levels, Help,
-    testing::Values(HelpRow{"Main", {"--help"}, kMainHelp}, HelpRow{"MainShort", {"-h"}, kMainHelp},
+INSTANTIATE_TEST_SUITE_P(
+    Levels, Help,
+    testing::Values(
+        HelpRow{"Main", {"--help"}, kMainHelp}, HelpRow{"MainShort", {"-h"}, kMainHelp},
         HelpRow{"Init", {"init", "--help"}, kInitHelp}, HelpRow{"InitShort", {"init", "-h"}, kInitHelp},
-        HelpRow{"BeforeTheCommand", {"-h", "init"}, kInitHelp}, HelpRow{"BesideNames", {"add", "x", "--help"}, kAddHelp},
-        HelpRow{"Status", {"status", "--help"}, kStatusHelp}, HelpRow{"Add", {"add", "--help"}, kAddHelp},
-        HelpRow{"Unstage", {"unstage", "--help"}, kUnstageHelp}, HelpRow{"Mv", {"mv", "--help"}, kMvHelp},
-        HelpRow{"Rm", {"rm", "--help"}, kRmHelp}, HelpRow{"Files", {"files", "--help"}, kFilesHelp},
-        HelpRow{"Ignore", {"ignore", "--help"}, kIgnoreHelp}),
+        HelpRow{"BeforeTheCommand", {"-h", "init"}, kInitHelp},
+        HelpRow{"BesideNames", {"add", "x", "--help"}, kAddHelp}, HelpRow{"Status", {"status", "--help"}, kStatusHelp},
+        HelpRow{"Add", {"add", "--help"}, kAddHelp}, HelpRow{"Unstage", {"unstage", "--help"}, kUnstageHelp},
+        HelpRow{"Mv", {"mv", "--help"}, kMvHelp}, HelpRow{"Rm", {"rm", "--help"}, kRmHelp},
+        HelpRow{"Files", {"files", "--help"}, kFilesHelp}, HelpRow{"Ignore", {"ignore", "--help"}, kIgnoreHelp}),
     rowName<HelpRow>);
 
 struct MisuseRow {
@@ -147,7 +151,9 @@ struct MisuseRow {
     char const* message;
 };
 
-class Misuse : public TavTest, public testing::WithParamInterface<MisuseRow> {};
+class Misuse
+    : public TavTest
+    , public testing::WithParamInterface<MisuseRow> {};
 
 TEST_P(Misuse, IsToldInOneLineAndChangesNothing)
 {
@@ -158,41 +164,74 @@ TEST_P(Misuse, IsToldInOneLineAndChangesNothing)
     EXPECT_EQ(state(), kFreshState);
 }
 
-INSTANTIATE_TEST_SUITE_P(Cases, Misuse,
+INSTANTIATE_TEST_SUITE_P(
+    Cases, Misuse,
     testing::Values(
         MisuseRow{"NoCommand", {}, "tav: A subcommand is required. Run 'tav --help' to see how it is used.\n"},
-        MisuseRow{"UnknownCommand", {"statsu", "--json"},
+        MisuseRow{
+            "UnknownCommand",
+            {"statsu", "--json"},
             "tav: The following argument was not expected: statsu. Run 'tav --help' to see how it is used.\n"},
-        MisuseRow{"UnknownCommandInBrackets", {"[status]"},
+        MisuseRow{
+            "UnknownCommandInBrackets",
+            {"[status]"},
             "tav: The following argument was not expected: [status]. Run 'tav --help' to see how it is used.\n"},
-        MisuseRow{"TwoCommands", {"status", "files"},
+        MisuseRow{
+            "TwoCommands",
+            {"status", "files"},
             "tav: The following argument was not expected: files. Run 'tav status --help' to see how it is used.\n"},
-        MisuseRow{"UnknownOption", {"add", "a.dwg", "--frob"},
+        MisuseRow{
+            "UnknownOption",
+            {"add", "a.dwg", "--frob"},
             "tav: The following argument was not expected: --frob. Run 'tav add --help' to see how it is used.\n"},
-        MisuseRow{"UnknownOptionWithEscapes", {"add", "a.dwg", "--\x1b[31m\n\xff"},
+        MisuseRow{
+            "UnknownOptionWithEscapes",
+            {"add", "a.dwg", "--\x1b[31m\n\xff"},
             "tav: The following argument was not expected: --\\x1B[31m \\xFF. Run 'tav add --help' to see how it is "
             "used.\n"},
-        MisuseRow{"SurplusNameInBrackets", {"init", "x", "[y]"},
+        MisuseRow{
+            "SurplusNameInBrackets",
+            {"init", "x", "[y]"},
             "tav: The following argument was not expected: [y]. Run 'tav init --help' to see how it is used.\n"},
-        MisuseRow{"FolderMissingAfterC", {"-C"}, "tav: -C: 1 required FOLDER missing. Run 'tav --help' to see how it is used.\n"},
-        MisuseRow{"AddNothing", {"add"}, "tav: NAME or --all is required. Run 'tav add --help' to see how it is used.\n"},
-        MisuseRow{"AddNamesAndAll", {"add", "a.dwg", "--all"},
+        MisuseRow{
+            "FolderMissingAfterC",
+            {"-C"},
+            "tav: -C: 1 required FOLDER missing. Run 'tav --help' to see how it is used.\n"},
+        MisuseRow{
+            "AddNothing", {"add"}, "tav: NAME or --all is required. Run 'tav add --help' to see how it is used.\n"},
+        MisuseRow{
+            "AddNamesAndAll",
+            {"add", "a.dwg", "--all"},
             "tav: NAME excludes --all. Run 'tav add --help' to see how it is used.\n"},
-        MisuseRow{"UnstageNothing", {"unstage"},
+        MisuseRow{
+            "UnstageNothing",
+            {"unstage"},
             "tav: NAME or --all is required. Run 'tav unstage --help' to see how it is used.\n"},
-        MisuseRow{"UnstageNamesAndAll", {"unstage", "a.dwg", "--all"},
+        MisuseRow{
+            "UnstageNamesAndAll",
+            {"unstage", "a.dwg", "--all"},
             "tav: NAME excludes --all. Run 'tav unstage --help' to see how it is used.\n"},
         MisuseRow{"MvOneName", {"mv", "a.dwg"}, "tav: NEW is required. Run 'tav mv --help' to see how it is used.\n"},
-        MisuseRow{"MvThreeNames", {"mv", "a.dwg", "b.dwg", "c.dwg"},
+        MisuseRow{
+            "MvThreeNames",
+            {"mv", "a.dwg", "b.dwg", "c.dwg"},
             "tav: The following argument was not expected: c.dwg. Run 'tav mv --help' to see how it is used.\n"},
         MisuseRow{"RmNothing", {"rm"}, "tav: NAME is required. Run 'tav rm --help' to see how it is used.\n"},
-        MisuseRow{"FilesTwoFolders", {"files", ".", "x"},
+        MisuseRow{
+            "FilesTwoFolders",
+            {"files", ".", "x"},
             "tav: The following argument was not expected: x. Run 'tav files --help' to see how it is used.\n"},
-        MisuseRow{"StatusName", {"status", "a.dwg"},
+        MisuseRow{
+            "StatusName",
+            {"status", "a.dwg"},
             "tav: The following argument was not expected: a.dwg. Run 'tav status --help' to see how it is used.\n"},
-        MisuseRow{"IgnoreAddWithoutRule", {"ignore", "--add"},
+        MisuseRow{
+            "IgnoreAddWithoutRule",
+            {"ignore", "--add"},
             "tav: --add: 1 required PATTERN missing. Run 'tav ignore --help' to see how it is used.\n"},
-        MisuseRow{"IgnoreAddAsDocument", {"ignore", "--add", "x", "--json"},
+        MisuseRow{
+            "IgnoreAddAsDocument",
+            {"ignore", "--add", "x", "--json"},
             "tav: --add excludes --json. Run 'tav ignore --help' to see how it is used.\n"}),
     rowName<MisuseRow>);
 
@@ -218,10 +257,12 @@ TEST_F(CommandLine, GoesOnFromTheFolderOfAnEarlierOptionC)
 
 TEST_F(CommandLine, FailsWhenTheFolderOfTheOptionCCannotBeEntered)
 {
-    EXPECT_EQ(tav({"-C", "no\nwhere", "status"}),
+    EXPECT_EQ(
+        tav({"-C", "no\nwhere", "status"}),
         failed("tav: The folder 'no where' cannot be entered. Check its name and your rights to it.\n"));
     EXPECT_EQ(
-        tav({"-C", "", "status"}), failed("tav: The folder '' cannot be entered. Check its name and your rights to it.\n"));
+        tav({"-C", "", "status"}),
+        failed("tav: The folder '' cannot be entered. Check its name and your rights to it.\n"));
 }
 
 TEST_F(CommandLine, TakesNamesThatReadLikeCommandsForNames)
@@ -260,10 +301,11 @@ TEST_F(CommandLine, TakesNamesThatBeginWithAControlCharacterWhole)
 TEST_F(CommandLine, FailsOutsideOfARepository)
 {
     support::TempFolder const elsewhere;
-    std::string const message = "tav: Path: " + elsewhere.path()
-        + " is not a tav directory. Run 'tav init' in the folder of your drawings to make it one.\n";
+    std::string const message =
+        "tav: Path: " + elsewhere.path() +
+        " is not a tav directory. Run 'tav init' in the folder of your drawings to make it one.\n";
     for (Arguments const& arguments :
-        {Arguments{"status"}, {"add", "a"}, {"unstage", "a"}, {"mv", "a", "b"}, {"rm", "a"}, {"files"}, {"ignore"}}) {
+         {Arguments{"status"}, {"add", "a"}, {"unstage", "a"}, {"mv", "a", "b"}, {"rm", "a"}, {"files"}, {"ignore"}}) {
         EXPECT_EQ(tavIn(elsewhere.path(), arguments), failed(message)) << arguments.front();
     }
     EXPECT_TRUE(elsewhere.list().empty());
@@ -288,17 +330,22 @@ struct FullDiskRow {
     Arguments arguments;
 };
 
-class FullDisk : public TavTest, public testing::WithParamInterface<FullDiskRow> {};
+class FullDisk
+    : public TavTest
+    , public testing::WithParamInterface<FullDiskRow> {};
 
 TEST_P(FullDisk, MakesACommandFailWhoseOutputIsLost)
 {
     repo.add({"a.dwg", "b.dwg"});
-    EXPECT_EQ(tavInto("/dev/full", GetParam().arguments),
+    EXPECT_EQ(
+        tavInto("/dev/full", GetParam().arguments),
         failed("tav: The output could not be written. Check the disk or the program that reads it.\n"));
 }
 
-INSTANTIATE_TEST_SUITE_P(Commands, FullDisk,
-    testing::Values(FullDiskRow{"Help", {"--help"}}, FullDiskRow{"HelpOfACommand", {"init", "--help"}},
+INSTANTIATE_TEST_SUITE_P(
+    Commands, FullDisk,
+    testing::Values(
+        FullDiskRow{"Help", {"--help"}}, FullDiskRow{"HelpOfACommand", {"init", "--help"}},
         FullDiskRow{"Init", {"init"}}, FullDiskRow{"Status", {"status"}},
         FullDiskRow{"StatusAsDocument", {"status", "--json"}}, FullDiskRow{"Add", {"add", "a.dwg"}},
         FullDiskRow{"Unstage", {"unstage", "--all"}}, FullDiskRow{"Mv", {"mv", "a.dwg", "c.dwg"}},

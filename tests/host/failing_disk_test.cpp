@@ -22,7 +22,9 @@ struct CommandRow {
 };
 
 /// Every row changes the file "a.dwg" or the state, or both.
-class FailingDisk : public TavTest, public testing::WithParamInterface<CommandRow> {
+class FailingDisk
+    : public TavTest
+    , public testing::WithParamInterface<CommandRow> {
 protected:
     FailingDisk() { begin(); }
 
@@ -84,7 +86,8 @@ TEST_P(FailingDisk, LeavesAWholeStateAndAWholeDrawingWhenTheProcessDies)
             break;
         }
         EXPECT_EQ(outcome.code, -SIGKILL);
-        EXPECT_TRUE(state() == stateBefore_ || state() == GetParam().stateAfter) << "dead in call " << n << ": " << state();
+        EXPECT_TRUE(state() == stateBefore_ || state() == GetParam().stateAfter)
+            << "dead in call " << n << ": " << state();
         EXPECT_TRUE(hasFile("a.dwg") || hasFile("b.dwg")) << "dead in call " << n;
         Process next(setting(), [] { return runHere({"unstage", "--all"}); });
         EXPECT_EQ(next.wait().code, 0) << "after death in call " << n;
@@ -114,8 +117,10 @@ std::string const kRenamed = R"({
     ]
 })";
 
-INSTANTIATE_TEST_SUITE_P(Commands, FailingDisk,
-    testing::Values(CommandRow{"Add", {"add", "a.dwg"}, "a.dwg", stateWithAdded({"z.dwg", "a.dwg"})},
+INSTANTIATE_TEST_SUITE_P(
+    Commands, FailingDisk,
+    testing::Values(
+        CommandRow{"Add", {"add", "a.dwg"}, "a.dwg", stateWithAdded({"z.dwg", "a.dwg"})},
         CommandRow{"Unstage", {"unstage", "z.dwg"}, "a.dwg", kFreshState},
         CommandRow{"Mv", {"mv", "a.dwg", "b.dwg"}, "b.dwg", kRenamed}),
     rowName<CommandRow>);
@@ -163,9 +168,15 @@ New, not staged:
 TEST_F(WithoutRights, CannotChangeAnything)
 {
     std::string const refused = text(failed(
-        "tav: The repository cannot be locked: Permission denied. Check your rights to '" + repo.pathTo(".tav") + "'.\n"));
-    for (Arguments const& arguments : {Arguments{"init", repo.path()}, {"add", "a.dwg"}, {"unstage", "--all"}, {"mv", "a.dwg", "b.dwg"},
-             {"rm", "a.dwg"}, {"ignore", "--add", "x"}}) {
+        "tav: The repository cannot be locked: Permission denied. Check your rights to '" + repo.pathTo(".tav") +
+        "'.\n"));
+    for (Arguments const& arguments :
+         {Arguments{"init", repo.path()},
+          {"add", "a.dwg"},
+          {"unstage", "--all"},
+          {"mv", "a.dwg", "b.dwg"},
+          {"rm", "a.dwg"},
+          {"ignore", "--add", "x"}}) {
         EXPECT_EQ(asOrdinaryUser(arguments), refused) << arguments.front();
     }
 }
@@ -176,9 +187,11 @@ TEST_F(WithoutRights, MovesTheFileBackWhenTheStateCannotBeWritten)
     chmod(repo.pathTo(".tav").c_str(), 0555);
     repo.write(".tav/tav.lock", "");
     chmod(repo.pathTo(".tav/tav.lock").c_str(), 0666);
-    EXPECT_EQ(asOrdinaryUser({"mv", "a.dwg", "b.dwg"}),
-        text(failed("tav: Error writing to file '" + repo.pathTo(".tav/tav.state")
-            + "'. The old state still stands; check the free space and your rights, and try again.\n")));
+    EXPECT_EQ(
+        asOrdinaryUser({"mv", "a.dwg", "b.dwg"}),
+        text(failed(
+            "tav: Error writing to file '" + repo.pathTo(".tav/tav.state") +
+            "'. The old state still stands; check the free space and your rights, and try again.\n")));
     EXPECT_EQ(repo.read("a.dwg"), "drawing");
     EXPECT_FALSE(repo.has("b.dwg"));
     EXPECT_EQ(state(), kFreshState);
@@ -189,9 +202,11 @@ TEST_F(WithoutRights, CannotMoveAFileInAFolderOfSomebodyElse)
     for (char const* const name : {".tav", ".tav/tav.state"}) {
         chmod(repo.pathTo(name).c_str(), 0777);
     }
-    EXPECT_EQ(asOrdinaryUser({"mv", "a.dwg", "b.dwg"}),
-        text(failed("tav: '" + repo.pathTo("a.dwg") + "' cannot be moved to '" + repo.pathTo("b.dwg")
-            + "': Permission denied. Check that the folder exists and that you may write there.\n")));
+    EXPECT_EQ(
+        asOrdinaryUser({"mv", "a.dwg", "b.dwg"}),
+        text(failed(
+            "tav: '" + repo.pathTo("a.dwg") + "' cannot be moved to '" + repo.pathTo("b.dwg") +
+            "': Permission denied. Check that the folder exists and that you may write there.\n")));
     EXPECT_EQ(state(), kFreshState);
 }
 
@@ -208,7 +223,8 @@ TEST_F(WithoutRights, ReportsEveryFileThatCannotBeDigested)
                                "tav: 2 of 4 files could not be read. Mend that and run the command again.\n";
     std::string const answer = asOrdinaryUser({"files", "--hash"});
     EXPECT_EQ(answer.substr(answer.find("--- err ---\n")), "--- err ---\n" + errors + "---");
-    EXPECT_NE(answer.find("--- out ---\nba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad  c.dwg\n"),
+    EXPECT_NE(
+        answer.find("--- out ---\nba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad  c.dwg\n"),
         std::string::npos);
     EXPECT_EQ(answer.substr(0, 7), "code 1\n");
 }
@@ -217,16 +233,19 @@ TEST_F(WithoutRights, LeavesTheDigestOutOfADocumentWhereAFileCannotBeRead)
 {
     chmod(repo.pathTo("a.dwg").c_str(), 0);
     chmod(repo.pathTo(".tav/properties").c_str(), 0);
-    EXPECT_EQ(asOrdinaryUser({"files", "--hash", "--json"}), text({1, R"([
+    EXPECT_EQ(
+        asOrdinaryUser({"files", "--hash", "--json"}),
+        text(
+            {1, R"([
     {
         "path" : "a.dwg",
         "sha256" : null
     }
 ]
 )",
-                                                                "tav: 'a.dwg' cannot be read. Check your rights to it.\n"
-                                                                "tav: 1 of 1 files could not be read. Mend that and run the "
-                                                                "command again.\n"}));
+             "tav: 'a.dwg' cannot be read. Check your rights to it.\n"
+             "tav: 1 of 1 files could not be read. Mend that and run the "
+             "command again.\n"}));
 }
 
 TEST_F(WithoutRights, CannotMakeARepository)
@@ -239,9 +258,11 @@ TEST_F(WithoutRights, CannotMakeARepository)
         Process process(there, [] { return runHere({"init", "north/wing"}); });
         return testing::PrintToString(process.wait());
     });
-    EXPECT_EQ(answer,
-        text(failed("tav: Not able to create the version control folder: north/wing. Check that the folder is one and that "
-                    "you may write there.\n")));
+    EXPECT_EQ(
+        answer,
+        text(failed(
+            "tav: Not able to create the version control folder: north/wing. Check that the folder is one and that "
+            "you may write there.\n")));
     EXPECT_TRUE(place.list().empty());
 }
 

@@ -86,8 +86,9 @@ TEST_F(FileMoves, FailWithTheReasonOfTheSystem)
             move(moves, "nothing", "y");
             FAIL() << "no failure";
         } catch (tav::Failure const& failure) {
-            EXPECT_EQ(failure.what,
-                "'" + place.pathTo("nothing") + "' cannot be moved to '" + place.pathTo("y") + "': No such file or directory.");
+            EXPECT_EQ(
+                failure.what, "'" + place.pathTo("nothing") + "' cannot be moved to '" + place.pathTo("y") +
+                                  "': No such file or directory.");
             EXPECT_EQ(failure.next, "Check that the folder exists and that you may write there.");
         }
     }

@@ -33,7 +33,8 @@ TEST_F(Files, TakesTheFolderOfARepository)
 TEST_F(Files, FailsForAFolderInsideOfARepository)
 {
     repo.add({"a/b.dwg"});
-    EXPECT_EQ(tav({"files", "a"}),
+    EXPECT_EQ(
+        tav({"files", "a"}),
         failed("tav: Path: a is not a tav directory. Run 'tav init' in the folder of your drawings to make it one.\n"));
 }
 
@@ -58,7 +59,8 @@ TEST_F(Files, ShowsDigests)
 {
     repo.add({"empty.dwg"});
     repo.write("letters.dwg", "abc");
-    EXPECT_EQ(tav({"files", "--hash"}),
+    EXPECT_EQ(
+        tav({"files", "--hash"}),
         done(std::string(kDigestOfNothing) + "  empty.dwg\n" + kDigestOfAbc + "  letters.dwg\n"));
 }
 
@@ -101,21 +103,24 @@ class FilesWithOddNames : public TavTest {
 protected:
     FilesWithOddNames()
     {
-        repo.add({"a b.dwg", "back\\slash", "bell\a", "c1\xc2\x9b.dwg", "carriage\rreturn", "esc\x1b[31m.dwg", "line\nfeed",
-            "not\xff\xfeutf8.dwg", "План.dwg", "図面.dwg", "\xf0\x9f\x8f\xa0.dwg"});
+        repo.add(
+            {"a b.dwg", "back\\slash", "bell\a", "c1\xc2\x9b.dwg", "carriage\rreturn", "esc\x1b[31m.dwg", "line\nfeed",
+             "not\xff\xfeutf8.dwg", "План.dwg", "図面.dwg", "\xf0\x9f\x8f\xa0.dwg"});
     }
 };
 
 TEST_F(FilesWithOddNames, AreShownWholeInPipes)
 {
-    EXPECT_EQ(tav({"files"}),
+    EXPECT_EQ(
+        tav({"files"}),
         done("a b.dwg\nback\\slash\nbell\a\nc1\xc2\x9b.dwg\ncarriage\rreturn\nesc\x1b[31m.dwg\nline\nfeed\n"
              "not\xff\xfeutf8.dwg\nПлан.dwg\n図面.dwg\n\xf0\x9f\x8f\xa0.dwg\n"));
 }
 
 TEST_F(FilesWithOddNames, AreEscapedOnATerminal)
 {
-    EXPECT_EQ(tavOnTerminal({"files"}),
+    EXPECT_EQ(
+        tavOnTerminal({"files"}),
         done("a b.dwg\nback\\slash\nbell\\x07\nc1\\x9B.dwg\ncarriage\\x0Dreturn\nesc\\x1B[31m.dwg\nline\\x0Afeed\n"
              "not\\xFF\\xFEutf8.dwg\nПлан.dwg\n図面.dwg\n\xf0\x9f\x8f\xa0.dwg\n"));
 }
@@ -193,9 +198,9 @@ TEST_F(Files, PrintsTheSameUnderEveryLocale)
 TEST_F(Files, FailsForAnIgnoreFileThatCannotBeUsed)
 {
     repo.ignore("[");
-    EXPECT_EQ(tav({"files"}),
-        failed("tav: The ignore file has a rule that is no regular expression that can be used. "
-               "Mend '.tav/properties/ignore'.\n"));
+    EXPECT_EQ(
+        tav({"files"}), failed("tav: The ignore file has a rule that is no regular expression that can be used. "
+                               "Mend '.tav/properties/ignore'.\n"));
 }
 
 TEST_F(Files, MakesNothing)

@@ -57,24 +57,31 @@ struct AddRow {
     std::string after;
 };
 
-class IgnoreAdd : public TavTest, public testing::WithParamInterface<AddRow> {};
+class IgnoreAdd
+    : public TavTest
+    , public testing::WithParamInterface<AddRow> {};
 
 TEST_P(IgnoreAdd, PutsTheRuleBehindThoseInEffect)
 {
     repo.ignore(GetParam().before);
-    EXPECT_EQ(tav({"ignore", "--add=" + GetParam().rule}),
+    EXPECT_EQ(
+        tav({"ignore", "--add=" + GetParam().rule}),
         done("Names that match '" + GetParam().rule + "' are ignored from now on.\n"));
     EXPECT_EQ(repo.read(".tav/properties/ignore"), GetParam().after);
 }
 
-INSTANTIATE_TEST_SUITE_P(Files, IgnoreAdd,
-    testing::Values(AddRow{"Empty", "", "^b$", "^b$"}, AddRow{"NoLastLineFeed", "^a$", "^b$", "^a$\n^b$"},
-        AddRow{"LastLineFeed", "^a$\n", "^b$", "^a$\n^b$"}, AddRow{"EmptyLine", "^a$\n\n^c$\n", "^b$", "^a$\n^b$\n\n^c$\n"},
+INSTANTIATE_TEST_SUITE_P(
+    Files, IgnoreAdd,
+    testing::Values(
+        AddRow{"Empty", "", "^b$", "^b$"}, AddRow{"NoLastLineFeed", "^a$", "^b$", "^a$\n^b$"},
+        AddRow{"LastLineFeed", "^a$\n", "^b$", "^a$\n^b$"},
+        AddRow{"EmptyLine", "^a$\n\n^c$\n", "^b$", "^a$\n^b$\n\n^c$\n"},
         AddRow{"OnlyAnEmptyLine", "\n", "^b$", "^b$\n\n"}, AddRow{"EmptyFirstLine", "\n^c$", "^b$", "^b$\n\n^c$"},
         AddRow{"OtherLineEnds", "^a$\r\n\r\n^c$", "^b$", "^a$\r\n^b$\n\r\n^c$"},
-        AddRow{"OutOfEffect", "^a$\n\n^b$", "^b$", "^a$\n^b$\n\n^b$"}, AddRow{"OtherScripts", "", "^План.*$", "^План.*$"},
-        AddRow{"NotUtf8", "", "^\xff$", "^\xff$"}, AddRow{"Brackets", "", "[ab]", "[ab]"},
-        AddRow{"BracketsWithCommas", "", "[a,b]", "[a,b]"}, AddRow{"LikeAnOption", "", "--all", "--all"}),
+        AddRow{"OutOfEffect", "^a$\n\n^b$", "^b$", "^a$\n^b$\n\n^b$"},
+        AddRow{"OtherScripts", "", "^План.*$", "^План.*$"}, AddRow{"NotUtf8", "", "^\xff$", "^\xff$"},
+        AddRow{"Brackets", "", "[ab]", "[ab]"}, AddRow{"BracketsWithCommas", "", "[a,b]", "[a,b]"},
+        AddRow{"LikeAnOption", "", "--all", "--all"}),
     rowName<AddRow>);
 
 TEST_F(Ignore, AddsARuleOnlyOnce)
@@ -90,7 +97,9 @@ struct RefusalRow {
     std::string message;
 };
 
-class IgnoreRefusal : public TavTest, public testing::WithParamInterface<RefusalRow> {};
+class IgnoreRefusal
+    : public TavTest
+    , public testing::WithParamInterface<RefusalRow> {};
 
 TEST_P(IgnoreRefusal, LeavesTheFileAsItWas)
 {
@@ -99,23 +108,28 @@ TEST_P(IgnoreRefusal, LeavesTheFileAsItWas)
     EXPECT_EQ(repo.read(".tav/properties/ignore"), "^a$\n");
 }
 
-INSTANTIATE_TEST_SUITE_P(Rules, IgnoreRefusal,
-    testing::Values(RefusalRow{"Empty", "", "tav: A rule is one line that is not empty. Give one rule at a time.\n"},
+INSTANTIATE_TEST_SUITE_P(
+    Rules, IgnoreRefusal,
+    testing::Values(
+        RefusalRow{"Empty", "", "tav: A rule is one line that is not empty. Give one rule at a time.\n"},
         RefusalRow{"TwoLines", "^a$\n^b$", "tav: A rule is one line that is not empty. Give one rule at a time.\n"},
-        RefusalRow{"LineFeedAtTheEnd", "^b$\n", "tav: A rule is one line that is not empty. Give one rule at a time.\n"},
+        RefusalRow{
+            "LineFeedAtTheEnd", "^b$\n", "tav: A rule is one line that is not empty. Give one rule at a time.\n"},
         RefusalRow{"CarriageReturn", "^b$\r", "tav: A rule is one line that is not empty. Give one rule at a time.\n"},
         RefusalRow{"OpenBracket", "[", std::string("tav: '['") + kNoExpression},
         RefusalRow{"Wildcard", "*.tmp", std::string("tav: '*.tmp'") + kNoExpression},
         RefusalRow{"WithEscapes", "(\x1b\xff", std::string("tav: '(\\x1B\\xFF'") + kNoExpression},
-        RefusalRow{"TooDeep", std::string(30000, '(') + std::string(30000, ')'),
+        RefusalRow{
+            "TooDeep", std::string(30000, '(') + std::string(30000, ')'),
             "tav: '" + std::string(30000, '(') + std::string(30000, ')') + "'" + kNoExpression}),
     rowName<RefusalRow>);
 
 TEST_F(Ignore, FailsForAFileThatCannotBeUsed)
 {
     repo.ignore("^a$\n(\n");
-    std::string const message = "tav: The ignore file '" + repo.pathTo(".tav/properties/ignore")
-        + "' has a rule that is no regular expression that can be used. Mend or remove it there.\n";
+    std::string const message =
+        "tav: The ignore file '" + repo.pathTo(".tav/properties/ignore") +
+        "' has a rule that is no regular expression that can be used. Mend or remove it there.\n";
     EXPECT_EQ(tav({"ignore"}), failed(message));
     EXPECT_EQ(tav({"ignore", "--add", "^b$"}), failed(message));
     EXPECT_EQ(repo.read(".tav/properties/ignore"), "^a$\n(\n");

@@ -26,8 +26,10 @@ TEST_F(Init, MakesTheCurrentFolderARepository)
 {
     place.write("plan.dwg", "plan");
     EXPECT_EQ(tav({"init"}), done("Made a repository in '.'.\n"));
-    EXPECT_THAT(place.list(),
-        ElementsAre(".tav/", ".tav/properties/", ".tav/properties/ignore", ".tav/tav.lock", ".tav/tav.state", "plan.dwg"));
+    EXPECT_THAT(
+        place.list(),
+        ElementsAre(
+            ".tav/", ".tav/properties/", ".tav/properties/ignore", ".tav/tav.lock", ".tav/tav.state", "plan.dwg"));
     EXPECT_EQ(place.read(".tav/properties/ignore"), kDefaultRules);
     EXPECT_EQ(place.read(".tav/tav.state"), kFreshState);
     EXPECT_EQ(place.read("plan.dwg"), "plan");
@@ -87,32 +89,39 @@ TEST_F(Init, EscapesTheFolderOnATerminal)
 TEST_F(Init, FailsWhereAFileIsInTheWay)
 {
     place.write("plan.dwg", "plan");
-    EXPECT_EQ(tav({"init", "plan.dwg"}),
-        failed("tav: Not able to create the version control folder: plan.dwg. Check that the folder is one and that you "
-               "may write there.\n"));
+    EXPECT_EQ(
+        tav({"init", "plan.dwg"}),
+        failed(
+            "tav: Not able to create the version control folder: plan.dwg. Check that the folder is one and that you "
+            "may write there.\n"));
     EXPECT_EQ(place.read("plan.dwg"), "plan");
 }
 
 TEST_F(Init, FailsWhereTheNameOfItsFolderIsTaken)
 {
     place.write(".tav", "a file");
-    EXPECT_EQ(tav({"init"}),
-        failed("tav: Not able to create a tav directory in . Check that the folder is one and that you may write there.\n"));
+    EXPECT_EQ(
+        tav({"init"}), failed("tav: Not able to create a tav directory in . Check that the folder is one and that you "
+                              "may write there.\n"));
     EXPECT_EQ(place.read(".tav"), "a file");
 }
 
 TEST_F(Init, FailsWhereTheNameOfThePropertiesIsTaken)
 {
     place.write(".tav/properties", "a file");
-    EXPECT_EQ(tav({"init"}),
-        failed("tav: The folder './.tav/properties' cannot be made. Check the free space and your rights in '.tav'.\n"));
+    EXPECT_EQ(
+        tav({"init"}),
+        failed(
+            "tav: The folder './.tav/properties' cannot be made. Check the free space and your rights in '.tav'.\n"));
 }
 
 TEST_F(Init, FailsForAnEmptyName)
 {
-    EXPECT_EQ(tav({"init", ""}),
-        failed("tav: Not able to create the version control folder: . Check that the folder is one and that you may write "
-               "there.\n"));
+    EXPECT_EQ(
+        tav({"init", ""}),
+        failed(
+            "tav: Not able to create the version control folder: . Check that the folder is one and that you may write "
+            "there.\n"));
     EXPECT_TRUE(place.list().empty());
 }
 

@@ -33,7 +33,9 @@ struct ChangingRow {
     Arguments arguments;
 };
 
-class LockAgainstChanges : public Lock, public testing::WithParamInterface<ChangingRow> {};
+class LockAgainstChanges
+    : public Lock
+    , public testing::WithParamInterface<ChangingRow> {};
 
 TEST_P(LockAgainstChanges, IsWaitedForShortlyAndItsHolderNamed)
 {
@@ -41,16 +43,19 @@ TEST_P(LockAgainstChanges, IsWaitedForShortlyAndItsHolderNamed)
     std::string const stateBefore = state();
     os::FileLock const lock = hold("'tav add', process 7 on \x1b[31melsewhere");
     auto const start = std::chrono::steady_clock::now();
-    EXPECT_EQ(tav(GetParam().arguments),
-        failed("tav: 'tav add', process 7 on \\x1B[31melsewhere, is changing the repository. Run the command again when that "
-               "is done.\n"));
+    EXPECT_EQ(
+        tav(GetParam().arguments), failed("tav: 'tav add', process 7 on \\x1B[31melsewhere, is changing the "
+                                          "repository. Run the command again when that "
+                                          "is done.\n"));
     EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
     EXPECT_EQ(repo.list(), before);
     EXPECT_EQ(state(), stateBefore);
 }
 
-INSTANTIATE_TEST_SUITE_P(Commands, LockAgainstChanges,
-    testing::Values(ChangingRow{"Init", {"init"}}, ChangingRow{"Add", {"add", "a.dwg"}},
+INSTANTIATE_TEST_SUITE_P(
+    Commands, LockAgainstChanges,
+    testing::Values(
+        ChangingRow{"Init", {"init"}}, ChangingRow{"Add", {"add", "a.dwg"}},
         ChangingRow{"Unstage", {"unstage", "b.dwg"}}, ChangingRow{"Mv", {"mv", "a.dwg", "c.dwg"}},
         ChangingRow{"Rm", {"rm", "a.dwg"}}, ChangingRow{"IgnoreAdd", {"ignore", "--add", "x"}}),
     rowName<ChangingRow>);
@@ -100,7 +105,8 @@ TEST_F(Lock, NamesTheCommandThatHoldsIt)
     ASSERT_EQ(gethostname(host.data(), host.size()), 0);
     Process process(setting(), {"add", "a.dwg"});
     EXPECT_EQ(process.wait(), done("Staged 1 file.\n"));
-    EXPECT_EQ(os::FileLock::holder(repo.pathTo(".tav/tav.lock")),
+    EXPECT_EQ(
+        os::FileLock::holder(repo.pathTo(".tav/tav.lock")),
         "'tav add', process " + std::to_string(process.id()) + " on " + host.data());
 }
 
@@ -110,9 +116,11 @@ TEST_F(Lock, IsNotTakenThroughALink)
     elsewhere.write("precious", "content");
     ASSERT_EQ(unlink(repo.pathTo(".tav/tav.lock").c_str()), 0);
     repo.makeLink(".tav/tav.lock", elsewhere.pathTo("precious"));
-    EXPECT_EQ(tav({"add", "a.dwg"}),
-        failed("tav: The repository cannot be locked: Too many levels of symbolic links. Check your rights to '"
-            + repo.pathTo(".tav") + "'.\n"));
+    EXPECT_EQ(
+        tav({"add", "a.dwg"}),
+        failed(
+            "tav: The repository cannot be locked: Too many levels of symbolic links. Check your rights to '" +
+            repo.pathTo(".tav") + "'.\n"));
     EXPECT_EQ(elsewhere.read("precious"), "content");
 }
 

@@ -11,16 +11,16 @@ struct Rename {
     std::string to;
 };
 
-/// The state of a new repository in which files were renamed; in ascending order of their new paths, which are staged in
-/// the order `staged` or the same.
+/// The state of a new repository in which files were renamed; in ascending order of their new paths, which are staged
+/// in the order `staged` or the same.
 std::string stateWithRenames(std::vector<Rename> const& renames, std::vector<std::string> staged = {})
 {
     std::string text = "{\n    \"head\" : {\n        \"reference\" : \"master\"\n    },\n    \"renames\" : [";
     char const* separator = "\n";
     for (Rename const& rename : renames) {
         text += separator;
-        text += "        {\n            \"new\" : \"" + rename.to + "\",\n            \"previous\" : \"" + rename.from
-            + "\"\n        }";
+        text += "        {\n            \"new\" : \"" + rename.to + "\",\n            \"previous\" : \"" + rename.from +
+                "\"\n        }";
         separator = ",\n";
     }
     if (staged.empty()) {
@@ -32,7 +32,8 @@ std::string stateWithRenames(std::vector<Rename> const& renames, std::vector<std
     separator = "\n";
     for (std::string const& path : staged) {
         text += separator;
-        text += "        {\n            \"file_change\" : \"added\",\n            \"path\" : \"" + path + "\"\n        }";
+        text +=
+            "        {\n            \"file_change\" : \"added\",\n            \"path\" : \"" + path + "\"\n        }";
         separator = ",\n";
     }
     return text + "\n    ]\n}";
@@ -62,8 +63,8 @@ protected:
 
     std::string cannotMove(std::string const& from, std::string const& to, std::string const& why) const
     {
-        return "'" + repo.pathTo(from) + "' cannot be moved to '" + repo.pathTo(to) + "': " + why
-            + ". Check that the folder exists and that you may write there.";
+        return "'" + repo.pathTo(from) + "' cannot be moved to '" + repo.pathTo(to) + "': " + why +
+               ". Check that the folder exists and that you may write there.";
     }
 
     std::string isTaken(std::string const& to) const
@@ -131,9 +132,10 @@ TEST_F(Mv, RenamesAFolderWithAllThatIsInIt)
     repo.add({"old/a.dwg", "old/north/b.dwg", "old/x.bak", "old/.hidden", "older/c.dwg"});
     EXPECT_EQ(tav({"mv", "old", "new"}), done("Renamed 'old' to 'new'.\n"));
     EXPECT_EQ(state(), stateWithRenames({{"old/a.dwg", "new/a.dwg"}, {"old/north/b.dwg", "new/north/b.dwg"}}));
-    EXPECT_EQ(repo.list(),
-        (std::vector<std::string>{".tav/", ".tav/tav.lock", ".tav/tav.state", "new/", "new/.hidden", "new/a.dwg", "new/north/",
-            "new/north/b.dwg", "new/x.bak", "older/", "older/c.dwg"}));
+    EXPECT_EQ(
+        repo.list(), (std::vector<std::string>{
+                         ".tav/", ".tav/tav.lock", ".tav/tav.state", "new/", "new/.hidden", "new/a.dwg", "new/north/",
+                         "new/north/b.dwg", "new/x.bak", "older/", "older/c.dwg"}));
 }
 
 TEST_F(Mv, RemembersTheFirstPathsInAFolderRenamedTwiceAndForgetsThemWhenItIsBack)
@@ -156,22 +158,27 @@ struct TargetRow {
     char const* path; ///< where the file is then
 };
 
-class MvTarget : public TavTest, public testing::WithParamInterface<TargetRow> {};
+class MvTarget
+    : public TavTest
+    , public testing::WithParamInterface<TargetRow> {};
 
 TEST_P(MvTarget, IsTakenFromTheCurrentFolder)
 {
     TargetRow const& row = GetParam();
     repo.write("a.dwg", "drawing");
     repo.add({"plans/north/b.dwg"});
-    EXPECT_EQ(tavIn(repo.pathTo(row.folder), {"mv", row.from, row.to}),
+    EXPECT_EQ(
+        tavIn(repo.pathTo(row.folder), {"mv", row.from, row.to}),
         done(std::string("Renamed 'a.dwg' to '") + row.path + "'.\n"));
     EXPECT_EQ(repo.read(row.path), "drawing");
     EXPECT_EQ(state(), stateWithRenames({{"a.dwg", row.path}}));
 }
 
-INSTANTIATE_TEST_SUITE_P(Folders, MvTarget,
-    testing::Values(TargetRow{"Here", ".", "a.dwg", "b.dwg", "b.dwg"},
-        TargetRow{"WithoutExtension", ".", "a.dwg", "b", "b"}, TargetRow{"OtherCase", ".", "a.dwg", "A.dwg", "A.dwg"},
+INSTANTIATE_TEST_SUITE_P(
+    Folders, MvTarget,
+    testing::Values(
+        TargetRow{"Here", ".", "a.dwg", "b.dwg", "b.dwg"}, TargetRow{"WithoutExtension", ".", "a.dwg", "b", "b"},
+        TargetRow{"OtherCase", ".", "a.dwg", "A.dwg", "A.dwg"},
         TargetRow{"IntoAFolder", ".", "a.dwg", "plans", "plans/a.dwg"},
         TargetRow{"IntoAFolderWithSlash", ".", "a.dwg", "plans/", "plans/a.dwg"},
         TargetRow{"IntoAFolderUnderANewName", ".", "a.dwg", "plans/c.dwg", "plans/c.dwg"},
@@ -199,7 +206,8 @@ TEST_F(Mv, MovesAFolderIntoAnother)
 TEST_F(Mv, TakesAbsolutePaths)
 {
     repo.add({"a.dwg"});
-    EXPECT_EQ(tavIn("/", {"-C", repo.path(), "mv", repo.pathTo("a.dwg"), repo.pathTo("b.dwg")}),
+    EXPECT_EQ(
+        tavIn("/", {"-C", repo.path(), "mv", repo.pathTo("a.dwg"), repo.pathTo("b.dwg")}),
         done("Renamed 'a.dwg' to 'b.dwg'.\n"));
 }
 
@@ -216,9 +224,9 @@ TEST_F(Mv, RenamesFilesOfOddNames)
 {
     repo.add({"a (1).dwg", "\xff\n.dwg"});
     EXPECT_EQ(tav({"mv", "a (1).dwg", "[План].dwg"}), done("Renamed 'a (1).dwg' to '[План].dwg'.\n"));
-    EXPECT_EQ(tavOnTerminal({"mv", "\xff\n.dwg", "\xfe\x1b.dwg"}), done("Renamed '\\xFF\\x0A.dwg' to '\\xFE\\x1B.dwg'.\n"));
-    EXPECT_EQ(state(),
-        stateWithRenames({{"a (1).dwg", "[План].dwg"}, {"\\uDCFF\\n.dwg", "\\uDCFE\\u001B.dwg"}}));
+    EXPECT_EQ(
+        tavOnTerminal({"mv", "\xff\n.dwg", "\xfe\x1b.dwg"}), done("Renamed '\\xFF\\x0A.dwg' to '\\xFE\\x1B.dwg'.\n"));
+    EXPECT_EQ(state(), stateWithRenames({{"a (1).dwg", "[План].dwg"}, {"\\uDCFF\\n.dwg", "\\uDCFE\\u001B.dwg"}}));
 }
 
 TEST_F(Mv, TakesAFileForNewThatNoCommitCanHold)
@@ -249,7 +257,8 @@ TEST_F(Mv, FailsForWhatIsNotOfTheRepository)
     repo.makeFolder("plans");
     repo.makeLink("link", "plans");
     for (std::string const name : {"nothing", "x.bak", ".hidden", "empty", "link", "."}) {
-        expectRefusal({name, "b.dwg"}, "'" + name + "' is no file or folder of the repository. Run 'tav files' to see those.");
+        expectRefusal(
+            {name, "b.dwg"}, "'" + name + "' is no file or folder of the repository. Run 'tav files' to see those.");
     }
 }
 
@@ -283,8 +292,9 @@ TEST_F(Mv, FailsForNamesThatTheRepositoryWouldNotKeep)
     repo.ignore("^old$\n^.*\\.bak$\n");
     repo.makeFolder("old");
     auto const refused = [](std::string const& to) {
-        return "The repository would not keep '" + to + "': its name is hidden or ignored. Choose another name, or see 'tav "
-            "ignore'.";
+        return "The repository would not keep '" + to +
+               "': its name is hidden or ignored. Choose another name, or see 'tav "
+               "ignore'.";
     };
     expectRefusal({"a.dwg", "a.bak"}, refused("a.bak"));
     expectRefusal({"a.dwg", ".a.dwg"}, refused(".a.dwg"));
@@ -302,13 +312,15 @@ TEST_F(Mv, FailsForFoldersBehindLinks)
     repo.add({"a.dwg", "plans/north/b.dwg"});
     repo.makeLink("link", elsewhere.path());
     repo.makeLink("plans/inside", "north");
-    expectRefusal({"a.dwg", "link"},
+    expectRefusal(
+        {"a.dwg", "link"},
         "The repository would not keep 'link/a.dwg': '" + repo.pathTo("link") + "' is a link. Choose another folder.");
-    expectRefusal({"plans", "link/plans"},
+    expectRefusal(
+        {"plans", "link/plans"},
         "The repository would not keep 'link/plans': '" + repo.pathTo("link") + "' is a link. Choose another folder.");
-    expectRefusal({"a.dwg", "plans/inside/c.dwg"},
-        "The repository would not keep 'plans/inside/c.dwg': '" + repo.pathTo("plans/inside")
-            + "' is a link. Choose another folder.");
+    expectRefusal(
+        {"a.dwg", "plans/inside/c.dwg"}, "The repository would not keep 'plans/inside/c.dwg': '" +
+                                             repo.pathTo("plans/inside") + "' is a link. Choose another folder.");
     EXPECT_TRUE(elsewhere.list().empty());
 }
 
@@ -326,7 +338,8 @@ TEST_F(Mv, FailsForFoldersThatAreNot)
 TEST_F(Mv, MovesTheFileBackWhenTheStateCannotHoldItsName)
 {
     repo.add({"a.dwg"});
-    expectRefusal({"a.dwg", "\xf0\x9f\xbf\xbe.dwg"},
+    expectRefusal(
+        {"a.dwg", "\xf0\x9f\xbf\xbe.dwg"},
         "The name '\xf0\x9f\xbf\xbe.dwg' holds a character that cannot be recorded. Rename the file and try again.");
 }
 

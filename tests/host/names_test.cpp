@@ -51,25 +51,29 @@ TEST_P(PathInRepository, IsRelativeToTheWorkingFolder)
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Roots, PathInRepository,
-    testing::Values(PathRow{"Relative", "/usr", "a/b.dwg", "a/b.dwg"}, PathRow{"Absolute", "/usr", "/usr/a/b.dwg", "a/b.dwg"},
+INSTANTIATE_TEST_SUITE_P(
+    Roots, PathInRepository,
+    testing::Values(
+        PathRow{"Relative", "/usr", "a/b.dwg", "a/b.dwg"}, PathRow{"Absolute", "/usr", "/usr/a/b.dwg", "a/b.dwg"},
         PathRow{"TheRoot", "/usr", "/usr", ""}, PathRow{"TheRootWithSlash", "/usr", "/usr/", ""},
         PathRow{"CurrentFolder", "/usr", ".", ""}, PathRow{"CurrentFolderWithSlash", "/usr", "./", ""},
         PathRow{"Dots", "/usr", "./a/../b/./c", "b/c"}, PathRow{"OutAndBackIn", "/usr", "../usr/a", "a"},
         PathRow{"SlashesAtTheEnd", "/usr", "a//", "a"}, PathRow{"DoubledSlashes", "/usr", "a//b", "a/b"},
         PathRow{"RootBelow", "/usr/share", "share/a", "a"}, PathRow{"RelativeRoot", "share", "share/a", "a"},
-        PathRow{"RelativeRootWithDots", "./share/../share", "share/a", "a"}, PathRow{"RootOfTheSystem", "/", "a", "usr/a"},
-        PathRow{"RootOfTheSystemItself", "/", "/", ""}, PathRow{"OtherScript", "/usr", "План.dwg", "План.dwg"},
-        PathRow{"NotUtf8", "/usr", "\xff\xfe", "\xff\xfe"}, PathRow{"LineFeed", "/usr", "a\nb", "a\nb"},
-        PathRow{"Above", "/usr", "..", nullptr}, PathRow{"Beside", "/usr", "../usrX", nullptr},
-        PathRow{"LongerName", "/usr/sha", "share/a", nullptr}, PathRow{"OtherCase", "/usr", "/USR/a", nullptr},
+        PathRow{"RelativeRootWithDots", "./share/../share", "share/a", "a"},
+        PathRow{"RootOfTheSystem", "/", "a", "usr/a"}, PathRow{"RootOfTheSystemItself", "/", "/", ""},
+        PathRow{"OtherScript", "/usr", "План.dwg", "План.dwg"}, PathRow{"NotUtf8", "/usr", "\xff\xfe", "\xff\xfe"},
+        PathRow{"LineFeed", "/usr", "a\nb", "a\nb"}, PathRow{"Above", "/usr", "..", nullptr},
+        PathRow{"Beside", "/usr", "../usrX", nullptr}, PathRow{"LongerName", "/usr/sha", "share/a", nullptr},
+        PathRow{"OtherCase", "/usr", "/USR/a", nullptr},
         PathRow{"AboveTheRootOfTheSystem", "/usr", "../../../../etc", nullptr}, PathRow{"Empty", "/usr", "", nullptr}),
     [](testing::TestParamInfo<PathRow> const& row) { return row.param.name; });
 
 TEST(PathInRepositoryFailure, NamesWhatWasTypedAndTheWorkingFolder)
 {
     common::RootPath const root(L"/nowhere/in particular/");
-    EXPECT_EQ(failureOf([&] { tav::pathInRepository(root, "/etc//passwd"); }),
+    EXPECT_EQ(
+        failureOf([&] { tav::pathInRepository(root, "/etc//passwd"); }),
         "'/etc//passwd' is not located in the current repository. Name a file below '/nowhere/in particular'.");
 }
 
@@ -106,8 +110,10 @@ protected:
 
 TEST_F(NameFinder, KnowsAllCandidatesInAscendingOrder)
 {
-    EXPECT_THAT(texts(finder().all()), ElementsAre("modified modified.dwg", "added new.dwg", "added plans.txt",
-                                           "modified plans/ground.dwg", "added plans/north/a.dwg", "added plans/roof.dwg"));
+    EXPECT_THAT(
+        texts(finder().all()), ElementsAre(
+                                   "modified modified.dwg", "added new.dwg", "added plans.txt",
+                                   "modified plans/ground.dwg", "added plans/north/a.dwg", "added plans/roof.dwg"));
 }
 
 TEST_F(NameFinder, FindsOneFileByItsPath)
@@ -118,7 +124,8 @@ TEST_F(NameFinder, FindsOneFileByItsPath)
 
 TEST_F(NameFinder, FindsAllFilesOfAFolder)
 {
-    EXPECT_THAT(texts(finder().find("plans")),
+    EXPECT_THAT(
+        texts(finder().find("plans")),
         ElementsAre("modified plans/ground.dwg", "added plans/north/a.dwg", "added plans/roof.dwg"));
     EXPECT_EQ(finder().find(".").size(), 6u);
 }
@@ -138,7 +145,8 @@ TEST_F(NameFinder, FindsNoRemovedAndNoUnchangedFiles)
 
 TEST_F(NameFinder, ListsWhatAnExpressionMatchesThatMatchesSeveral)
 {
-    EXPECT_EQ(failureOf([&] { finder().find("plans/[gr].*"); }),
+    EXPECT_EQ(
+        failureOf([&] { finder().find("plans/[gr].*"); }),
         "More that one file found with name plans/[gr].*.\n Type more of the path of the one you mean:\n"
         "plans/ground.dwg\n"
         "plans/roof.dwg");
@@ -146,9 +154,10 @@ TEST_F(NameFinder, ListsWhatAnExpressionMatchesThatMatchesSeveral)
 
 TEST_F(NameFinder, RefusesWhatIsNeitherAPathNorAnExpression)
 {
-    EXPECT_EQ(failureOf([&] { finder().find("a (1"); }),
-        "No file is named 'a (1', and it is no expression that can be used. Type the path of a file as 'tav status' shows "
-        "it.");
+    EXPECT_EQ(
+        failureOf([&] { finder().find("a (1"); }), "No file is named 'a (1', and it is no expression that can be used. "
+                                                   "Type the path of a file as 'tav status' shows "
+                                                   "it.");
 }
 
 TEST_F(NameFinder, FindsStagedFilesOfEveryKind)
@@ -170,8 +179,10 @@ TEST(FindUnchanged, FindsTheFirstThatTheNameMatches)
     common::RootPath const root(L"/nowhere");
     EXPECT_EQ(tav::findUnchanged("roof", changes, root).ansi_str(), "plans/roof.dwg");
     EXPECT_EQ(tav::findUnchanged("cellar", changes, root).ansi_str(), "");
-    EXPECT_EQ(failureOf([&] { tav::findUnchanged("(", changes, root); }),
-        "No file is named '(', and it is no expression that can be used. Type the path of a file as 'tav status' shows it.");
+    EXPECT_EQ(
+        failureOf([&] { tav::findUnchanged("(", changes, root); }),
+        "No file is named '(', and it is no expression that can be used. Type the path of a file as 'tav status' shows "
+        "it.");
 }
 
 } // namespace

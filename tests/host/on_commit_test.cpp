@@ -149,8 +149,8 @@ TEST_F(StatusOnCommit, TrustsTheIndexForAFileOfUnchangedTime)
     timespec const times[] = {second, second};
     ASSERT_EQ(utimensat(AT_FDCWD, repo.pathTo("a.dwg").c_str(), times, 0), 0);
     auto const stateWithIndex = [](std::string const& ticks, std::string const& modified) {
-        return R"({ "head" : { "reference" : "master" }, "index" : [ { "path" : "a.dwg", "data" : { "last_checked" : )" + ticks
-            + R"(, "modified" : )" + modified + " } } ] }";
+        return R"({ "head" : { "reference" : "master" }, "index" : [ { "path" : "a.dwg", "data" : { "last_checked" : )" +
+               ticks + R"(, "modified" : )" + modified + " } } ] }";
     };
     repo.write(".tav/tav.state", stateWithIndex("1700000000000000007", "false"));
     EXPECT_EQ(status(), "Nothing has changed since the last commit.\n");
@@ -183,9 +183,11 @@ TEST_F(AddOnCommit, FailsForUnchangedAndRemovedFiles)
     repo.add({"new.dwg"});
     for (std::string const name : {"a (1).dwg", "plans/ground.dwg", "ground"}) {
         EXPECT_EQ(
-            tav({"add", "new.dwg", name}), failed("tav: '" + name + "' is as it was committed. There is nothing to stage of it.\n"));
+            tav({"add", "new.dwg", name}),
+            failed("tav: '" + name + "' is as it was committed. There is nothing to stage of it.\n"));
     }
-    EXPECT_EQ(tav({"add", "new.dwg", "r.dwg"}),
+    EXPECT_EQ(
+        tav({"add", "new.dwg", "r.dwg"}),
         failed("tav: 'r.dwg' has been removed. The next commit takes that without staging.\n"));
     EXPECT_EQ(state(), kFreshState);
 }
@@ -195,10 +197,11 @@ TEST_F(AddOnCommit, ListsModifiedAndNewFilesThatAnAmbiguousNameMatches)
     commit({"plans/roof.dwg"});
     repo.write("plans/roof.dwg", "changed");
     repo.add({"annex/roof.dwg"});
-    EXPECT_EQ(tav({"add", "roof"}), failed("tav: More that one file found with name roof. Type more of the path of the one "
-                                           "you mean:\n"
-                                           "  annex/roof.dwg\n"
-                                           "  plans/roof.dwg\n"));
+    EXPECT_EQ(
+        tav({"add", "roof"}), failed("tav: More that one file found with name roof. Type more of the path of the one "
+                                     "you mean:\n"
+                                     "  annex/roof.dwg\n"
+                                     "  plans/roof.dwg\n"));
 }
 
 TEST_F(AddOnCommit, StagesAgainAFileThatWasStagedAsRemoved)
@@ -219,7 +222,8 @@ using RmOnCommit = OnCommit;
 TEST_F(RmOnCommit, RemovesFilesAndStagesThat)
 {
     commit({"a.dwg", "plans/b.dwg", "plans/roof.dwg", "c.dwg"});
-    EXPECT_EQ(tav({"rm", "../a.dwg", "b.dwg", "oof"}, repo.pathTo("plans")),
+    EXPECT_EQ(
+        tav({"rm", "../a.dwg", "b.dwg", "oof"}, repo.pathTo("plans")),
         done("Removed 3 files; the next commit takes that.\n"));
     EXPECT_EQ(filesOfTheUser(), (std::vector<std::string>{"c.dwg", "plans/"}));
     EXPECT_EQ(status(), R"(Staged for the next commit:
@@ -253,11 +257,14 @@ TEST_F(RmOnCommit, RemovesNothingWhenOneOfItsFilesIsInNoCommit)
     repo.write("b.dwg", "changed");
     repo.add({"new.dwg"});
     std::vector<std::string> const before = filesOfTheUser();
-    EXPECT_EQ(tav({"rm", "a.dwg", "new.dwg"}),
-        failed("tav: 'new.dwg' is in no commit: removing it would lose it. Use 'tav unstage' if it is staged, and delete it "
-               "yourself if you do not need it.\n"));
-    EXPECT_EQ(tav({"rm", "a.dwg", "b.dwg"}), failed("tav: 'b.dwg' has changes that are in no commit. Commit them first.\n"));
-    EXPECT_EQ(tav({"rm", "a.dwg", "nothing"}),
+    EXPECT_EQ(
+        tav({"rm", "a.dwg", "new.dwg"}), failed("tav: 'new.dwg' is in no commit: removing it would lose it. Use 'tav "
+                                                "unstage' if it is staged, and delete it "
+                                                "yourself if you do not need it.\n"));
+    EXPECT_EQ(
+        tav({"rm", "a.dwg", "b.dwg"}), failed("tav: 'b.dwg' has changes that are in no commit. Commit them first.\n"));
+    EXPECT_EQ(
+        tav({"rm", "a.dwg", "nothing"}),
         failed("tav: No committed file matches 'nothing'. Run 'tav status' to see what there is.\n"));
     EXPECT_EQ(tav({"rm", "a.dwg", "("}).code, 1);
     EXPECT_EQ(filesOfTheUser(), before);
@@ -309,10 +316,12 @@ TEST_F(Rm, RefusesFilesThatAreInNoCommit)
     tav({"add", "b.dwg"});
     std::string const before = state();
     for (std::string const name : {"a.dwg", "b.dwg"}) {
-        EXPECT_EQ(tav({"rm", name}),
-            failed("tav: '" + name
-                + "' is in no commit: removing it would lose it. Use 'tav unstage' if it is staged, and delete it yourself if "
-                  "you do not need it.\n"));
+        EXPECT_EQ(
+            tav({"rm", name}), failed(
+                                   "tav: '" + name +
+                                   "' is in no commit: removing it would lose it. Use 'tav unstage' if it is staged, "
+                                   "and delete it yourself if "
+                                   "you do not need it.\n"));
     }
     EXPECT_EQ(repo.read("a.dwg") + repo.read("b.dwg"), "drawingdrawing");
     EXPECT_EQ(state(), before);
@@ -322,15 +331,18 @@ TEST_F(Rm, FailsForNamesOfNoCommittedFile)
 {
     repo.add({"plans/a.dwg"});
     for (std::string const name : {"nothing", "plans", "."}) {
-        EXPECT_EQ(tav({"rm", name}),
+        EXPECT_EQ(
+            tav({"rm", name}),
             failed("tav: No committed file matches '" + name + "'. Run 'tav status' to see what there is.\n"));
     }
-    EXPECT_EQ(tav({"rm", "/x"}),
+    EXPECT_EQ(
+        tav({"rm", "/x"}),
         failed("tav: '/x' is not located in the current repository. Name a file below '" + repo.path() + "'.\n"));
     EXPECT_EQ(tav({"rm", ""}), failed("tav: An empty name names no file. Type '.' for the folder that you are in.\n"));
-    EXPECT_EQ(tav({"rm", "("}),
-        failed("tav: No file is named '(', and it is no expression that can be used. Type the path of a file as 'tav status' "
-               "shows it.\n"));
+    EXPECT_EQ(
+        tav({"rm", "("}), failed("tav: No file is named '(', and it is no expression that can be used. Type the path "
+                                 "of a file as 'tav status' "
+                                 "shows it.\n"));
     EXPECT_TRUE(repo.has("plans/a.dwg"));
 }
 

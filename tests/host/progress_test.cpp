@@ -35,11 +35,11 @@ Outcome printedBy(bool isOnTerminal, int millisecondsForEach)
 TEST(Progress, IsShownOnATerminalOnceTheWorkHasTakenLongAndWipedAtTheEnd)
 {
     std::string const drawn = printedBy(true, 300).err;
-    EXPECT_EQ(drawn,
-        "\r[###############...............] 2 of 4 files"
-        "\r[######################........] 3 of 4 files"
-        "\r[##############################] 4 of 4 files"
-        "\r\x1b[K");
+    EXPECT_EQ(
+        drawn, "\r[###############...............] 2 of 4 files"
+               "\r[######################........] 3 of 4 files"
+               "\r[##############################] 4 of 4 files"
+               "\r\x1b[K");
 }
 
 TEST(Progress, IsNotShownForShortWork)

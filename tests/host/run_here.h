@@ -1,5 +1,5 @@
-/// Running the commands of tav inside of a test program, where calls of the system can be made to fail and rights can be
-/// given up.
+/// Running the commands of tav inside of a test program, where calls of the system can be made to fail and rights can
+/// be given up.
 #pragma once
 
 #include "host/cli/command_line.h"

@@ -28,10 +28,10 @@ Outcome misused(std::string const& err);
 
 /// The surroundings of a process.
 struct Setting {
-    std::string folder = "/";                 ///< the current folder
-    std::vector<std::string> environment;     ///< added to the test's own, as "NAME=value"
-    bool isOnTerminal = false;                ///< both streams are terminals; else both are pipes
-    std::string outFile;                      ///< where standard output goes instead, such as "/dev/full"
+    std::string folder = "/";             ///< the current folder
+    std::vector<std::string> environment; ///< added to the test's own, as "NAME=value"
+    bool isOnTerminal = false;            ///< both streams are terminals; else both are pipes
+    std::string outFile;                  ///< where standard output goes instead, such as "/dev/full"
     std::string program = TAV_PROGRAM;
 };
 

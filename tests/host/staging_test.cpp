@@ -10,10 +10,10 @@ namespace {
 
 using common::FileChange;
 using common::StagedFile;
+using tav::Move;
 using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::Pair;
-using tav::Move;
 
 class Staging : public testing::Test {
 protected:
@@ -70,9 +70,13 @@ TEST_F(Staging, RefusesAPathThatTheStateFileCannotHold)
 
 TEST_F(Staging, TakesPathsOfEveryScriptAndOfNone)
 {
-    EXPECT_EQ(tav::stage({{L"План", FileChange::added}, {L"\U0001F3E0", FileChange::added},
-                             {OdString("\xff", 1, CP_UTF_8), FileChange::added}, {L"\xFFFE\n", FileChange::added}},
-                  state),
+    EXPECT_EQ(
+        tav::stage(
+            {{L"План", FileChange::added},
+             {L"\U0001F3E0", FileChange::added},
+             {OdString("\xff", 1, CP_UTF_8), FileChange::added},
+             {L"\xFFFE\n", FileChange::added}},
+            state),
         4u);
 }
 
@@ -80,7 +84,8 @@ TEST_F(Staging, TakesFilesOutWithTheirRenames)
 {
     tav::stage({{L"a", FileChange::added}, {L"b", FileChange::modified}, {L"c", FileChange::removed}}, state);
     state.renames = {{L"a", L"x"}, {L"b", L"y"}};
-    EXPECT_EQ(tav::unstage({{L"a", FileChange::added}, {L"c", FileChange::added}, {L"z", FileChange::added}}, state), 2u);
+    EXPECT_EQ(
+        tav::unstage({{L"a", FileChange::added}, {L"c", FileChange::added}, {L"z", FileChange::added}}, state), 2u);
     EXPECT_THAT(staged(), ElementsAre("modified b"));
     EXPECT_THAT(state.renames, ElementsAre(Pair(OdString(L"b"), OdString(L"y"))));
 }
@@ -116,8 +121,7 @@ TEST_F(Staging, SwapsTwoFilesByWayOfAThirdPath)
     tav::stageMoves({{L"b", L"a"}}, state);
     tav::stageMoves({{L"c", L"b"}}, state);
     EXPECT_THAT(staged(), ElementsAre("added a", "added b"));
-    EXPECT_THAT(state.renames,
-        ElementsAre(Pair(OdString(L"a"), OdString(L"b")), Pair(OdString(L"b"), OdString(L"a"))));
+    EXPECT_THAT(state.renames, ElementsAre(Pair(OdString(L"a"), OdString(L"b")), Pair(OdString(L"b"), OdString(L"a"))));
 }
 
 TEST_F(Staging, MovesTheFilesOfAFolderAtOnce)
@@ -126,7 +130,8 @@ TEST_F(Staging, MovesTheFilesOfAFolderAtOnce)
     tav::stage({{L"old/b", FileChange::added}}, state);
     tav::stageMoves({{L"old/a", L"new/a"}, {L"old/b", L"new/b"}}, state);
     EXPECT_THAT(staged(), ElementsAre("added new/a", "added new/b"));
-    EXPECT_THAT(state.renames,
+    EXPECT_THAT(
+        state.renames,
         ElementsAre(Pair(OdString(L"new/a"), OdString(L"old/a")), Pair(OdString(L"new/b"), OdString(L"first"))));
 }
 

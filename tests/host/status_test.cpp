@@ -147,31 +147,31 @@ TEST_F(StatusOfEverything, IsADocumentForPrograms)
 
 TEST_F(StatusOfEverything, IsColouredOnATerminal)
 {
-    EXPECT_EQ(tavOnTerminal({"status", "--ignored"}), done(
-        "On branch north wing\n"
-        "\n"
-        "Drawings in conflict:\n"
-        "  (the other versions lie in '.tav/conflict')\n"
-        "        \x1b[31mplans/ground.dwg\x1b[m\n"
-        "        \x1b[31mroof.dwg\x1b[m\n"
-        "\n"
-        "Staged for the next commit:\n"
-        "  (use 'tav unstage NAME' to take a file out)\n"
-        "        \x1b[32mnew:      b.dwg\x1b[m\n"
-        "        \x1b[32mmodified: c.dwg\x1b[m\n"
-        "        \x1b[31mgone:     gone.dwg\x1b[m\n"
-        "        \x1b[32mrenamed:  former.dwg -> moved.dwg\x1b[m\n"
-        "        \x1b[32mremoved:  removed.dwg\x1b[m\n"
-        "\n"
-        "New, not staged:\n"
-        "  (use 'tav add NAME' or 'tav add --all' to stage)\n"
-        "        \x1b[31ma/z.dwg\x1b[m\n"
-        "\n"
-        "Ignored:\n"
-        "  (see 'tav ignore' for the rules)\n"
-        "        a/y.bak\n"
-        "        x.bak\n"
-        "\n"));
+    EXPECT_EQ(
+        tavOnTerminal({"status", "--ignored"}), done("On branch north wing\n"
+                                                     "\n"
+                                                     "Drawings in conflict:\n"
+                                                     "  (the other versions lie in '.tav/conflict')\n"
+                                                     "        \x1b[31mplans/ground.dwg\x1b[m\n"
+                                                     "        \x1b[31mroof.dwg\x1b[m\n"
+                                                     "\n"
+                                                     "Staged for the next commit:\n"
+                                                     "  (use 'tav unstage NAME' to take a file out)\n"
+                                                     "        \x1b[32mnew:      b.dwg\x1b[m\n"
+                                                     "        \x1b[32mmodified: c.dwg\x1b[m\n"
+                                                     "        \x1b[31mgone:     gone.dwg\x1b[m\n"
+                                                     "        \x1b[32mrenamed:  former.dwg -> moved.dwg\x1b[m\n"
+                                                     "        \x1b[32mremoved:  removed.dwg\x1b[m\n"
+                                                     "\n"
+                                                     "New, not staged:\n"
+                                                     "  (use 'tav add NAME' or 'tav add --all' to stage)\n"
+                                                     "        \x1b[31ma/z.dwg\x1b[m\n"
+                                                     "\n"
+                                                     "Ignored:\n"
+                                                     "  (see 'tav ignore' for the rules)\n"
+                                                     "        a/y.bak\n"
+                                                     "        x.bak\n"
+                                                     "\n"));
 }
 
 TEST_F(StatusOfEverything, HasNoColoursOnATerminalThatWantsNone)
@@ -278,10 +278,12 @@ TEST_F(Status, EscapesNamesOnATerminalOnly)
 {
     repo.add({"esc\x1b[31m\n\xff.dwg"});
     repo.write(".tav/tav.state", R"({ "head" : { "reference" : "a\u001B]b" } })");
-    EXPECT_EQ(tavOnTerminal({"status"}, {"NO_COLOR=1"}),
+    EXPECT_EQ(
+        tavOnTerminal({"status"}, {"NO_COLOR=1"}),
         done("On branch a\\x1B]b\n\nNew, not staged:\n  (use 'tav add NAME' or 'tav add --all' to stage)\n"
              "        esc\\x1B[31m\\x0A\\xFF.dwg\n\n"));
-    EXPECT_EQ(tav({"status"}),
+    EXPECT_EQ(
+        tav({"status"}),
         done("On branch a\x1b]b\n\nNew, not staged:\n  (use 'tav add NAME' or 'tav add --all' to stage)\n"
              "        esc\x1b[31m\n\xff.dwg\n\n"));
 }
@@ -305,7 +307,9 @@ struct BrokenRow {
     char const* message;
 };
 
-class BrokenState : public TavTest, public testing::WithParamInterface<BrokenRow> {};
+class BrokenState
+    : public TavTest
+    , public testing::WithParamInterface<BrokenRow> {};
 
 TEST_P(BrokenState, IsToldAndLeftAsItIs)
 {
@@ -324,10 +328,11 @@ TEST_P(BrokenState, IsToldAndLeftAsItIs)
 
 constexpr char const* kNoJson = "Unable to parse json, please check if syntax is valid.";
 
-INSTANTIATE_TEST_SUITE_P(States, BrokenState,
-    testing::Values(BrokenRow{"Empty", "", kNoJson}, BrokenRow{"CutOff", "{ \"head\" : { \"reference\"", kNoJson},
-        BrokenRow{"NotText", "\xff\xfe\x01", kNoJson},
-        BrokenRow{"NoHead", "{}", "State does not contain HEAD."},
+INSTANTIATE_TEST_SUITE_P(
+    States, BrokenState,
+    testing::Values(
+        BrokenRow{"Empty", "", kNoJson}, BrokenRow{"CutOff", "{ \"head\" : { \"reference\"", kNoJson},
+        BrokenRow{"NotText", "\xff\xfe\x01", kNoJson}, BrokenRow{"NoHead", "{}", "State does not contain HEAD."},
         BrokenRow{"NoBranch", "{ \"head\" : {} }", "HEAD does not point to a branch."}),
     rowName<BrokenRow>);
 
@@ -335,8 +340,8 @@ TEST_F(Status, FailsWithoutAState)
 {
     support::TempRepository const bare;
     bare.add({"a.dwg"});
-    std::string const message = "tav: No state file found at " + bare.pathTo(".tav/tav.state")
-        + ". Run 'tav init' if '.tav/tav.state' is missing; mend it if not.\n";
+    std::string const message = "tav: No state file found at " + bare.pathTo(".tav/tav.state") +
+                                ". Run 'tav init' if '.tav/tav.state' is missing; mend it if not.\n";
     EXPECT_EQ(tavIn(bare.path(), {"status"}), failed(message));
     EXPECT_EQ(tavIn(bare.path(), {"mv", "a.dwg", "b.dwg"}), failed(message));
     EXPECT_TRUE(bare.has("a.dwg"));
@@ -347,8 +352,8 @@ TEST_F(Status, FailsForAnIgnoreFileThatCannotBeUsed)
 {
     repo.add({"a.dwg"});
     repo.ignore("^a$\n(\n");
-    Outcome const broken = failed(
-        "tav: The ignore file has a rule that is no regular expression that can be used. Mend '.tav/properties/ignore'.\n");
+    Outcome const broken = failed("tav: The ignore file has a rule that is no regular expression that can be used. "
+                                  "Mend '.tav/properties/ignore'.\n");
     EXPECT_EQ(tav({"status"}), broken);
     EXPECT_EQ(tav({"status", "--ignored"}), broken);
     EXPECT_EQ(tav({"add", "a.dwg"}), broken);
@@ -381,7 +386,8 @@ TEST_F(Status, FailsInAFolderThatIsGone)
         execl(TAV_PROGRAM, TAV_PROGRAM, "status", nullptr);
         return 98;
     });
-    EXPECT_EQ(process.wait(),
+    EXPECT_EQ(
+        process.wait(),
         failed("tav: The current folder does not exist any more. Change to another folder and try again.\n"));
 }
 
