@@ -73,7 +73,8 @@ class MU_COMMON_EXPORT RepoIgnore {
 public:
     /// Loads the rules of `root`. Throws `std::regex_error` for a line that is no valid expression, and for one that
     /// would take the matcher too much stack or time: nested deeper than 100, more than some 4,000 characters with
-    /// repetitions counted out, look-aheads inside each other, back references beside repeated groups.
+    /// repetitions counted out (some 400 with a look-ahead), look-aheads inside each other, back references beside
+    /// repeated groups, more than two repetitions or more than four alternatives.
     explicit RepoIgnore(RootPath const& root);
 
     /// Appends the rules once more. Throws as the constructor does.

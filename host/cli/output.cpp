@@ -98,10 +98,10 @@ bool flushOutput()
 
 std::string shown(OdString const& name)
 {
-    return (isTerminal() ? withControlsEscaped(name) : name).ansi_str();
+    return isTerminal() ? withControlsEscaped(name).ansi_str() : name.ansi_str();
 }
 
-std::string coloured(Colour colour, std::string const& text)
+std::string coloured(Colour colour, std::string text)
 {
     static char const* const noColour = std::getenv("NO_COLOR");
     bool const isWanted = isTerminal() && (!noColour || !*noColour);

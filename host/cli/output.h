@@ -25,7 +25,7 @@ std::string shown(OdString const& name);
 enum class Colour { none, red, green };
 
 /// `text` in that colour where people see it: on a terminal, unless the environment sets NO_COLOR.
-std::string coloured(Colour colour, std::string const& text);
+std::string coloured(Colour colour, std::string text);
 
 /// A text as a member of a document. Characters beyond 16 bits become surrogate pairs, which JSON asks for in escapes.
 kutils::json::Value jsonText(OdString const& text);

@@ -24,19 +24,19 @@ bool isUntouched(OdString const& path, common::RootPath const& root, common::Sta
 
 /// Sorts one working file in. A committed one is taken out of `committed`, which keeps what is missing in the folder.
 void sortIn(
-    common::File const& file, Committed& committed, common::RootPath const& root, common::State const& state,
+    common::File file, Committed& committed, common::RootPath const& root, common::State const& state,
     common::RepoChanges& changes)
 {
     auto const match = committed.find(file.path);
     if (match == committed.end()) {
-        changes.untracked.push_back({nullptr, file, 0});
+        changes.untracked.push_back({nullptr, std::move(file), 0});
         return;
     }
     common::VersionedFile const& version = *match->second;
     if (isUntouched(file.path, root, state) || !common::isDifferent(file.path, version.storagePath, root)) {
         changes.unchanged.push_back(version);
     } else {
-        changes.modified.push_back({nullptr, file, version, 0});
+        changes.modified.push_back({nullptr, std::move(file), version, 0});
     }
     committed.erase(match);
 }
@@ -62,8 +62,8 @@ compare(common::RootPath const& root, std::vector<common::VersionedFile> const& 
         missing.emplace(file.path, &file);
     }
     common::RepoChanges changes;
-    for (common::File const& file : scan(root)) {
-        sortIn(file, missing, root, state, changes);
+    for (common::File& file : scan(root)) {
+        sortIn(std::move(file), missing, root, state, changes);
     }
     for (common::VersionedFile const& file : committed) {
         if (missing.count(file.path) > 0) {

@@ -16,14 +16,15 @@ namespace {
 
 using Paths = std::set<OdString>;
 
+/// Takes the paths out of `list`, but for those in `left`.
 template <class List, class PathOf>
-std::vector<OdString> sortedWithout(Paths const& left, List const& list, PathOf const& pathOf)
+std::vector<OdString> takeSorted(List& list, Paths const& left, PathOf const& pathOf)
 {
     std::vector<OdString> paths;
     paths.reserve(list.size());
-    for (auto const& item : list) {
+    for (auto& item : list) {
         if (left.count(pathOf(item)) == 0) {
-            paths.push_back(pathOf(item));
+            paths.push_back(std::move(pathOf(item)));
         }
     }
     std::sort(paths.begin(), paths.end());
@@ -86,18 +87,18 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
 {
     auto const cache = readState(root);
     common::State const& state = cache->read();
-    common::RepoChanges const changes = compare(root, lastCommitFiles(root), state);
+    common::RepoChanges changes = compare(root, lastCommitFiles(root), state);
     Paths const staged = stagedPaths(state);
-    auto const workingPath = [](auto const& file) -> OdString const& { return file.working.path; };
-    auto const committedPath = [](auto const& file) -> OdString const& { return file.committed.path; };
+    auto const workingPath = [](auto& file) -> OdString& { return file.working.path; };
+    auto const committedPath = [](auto& file) -> OdString& { return file.committed.path; };
 
     Status status;
     status.branch = state.head;
     status.conflicts = conflictsOf(root);
     status.staged = stagedEntries(state, root);
-    status.modified = sortedWithout(staged, changes.modified, workingPath);
-    status.untracked = sortedWithout(staged, changes.untracked, workingPath);
-    status.removed = sortedWithout(pathsLeft(state), changes.removed, committedPath);
+    status.modified = takeSorted(changes.modified, staged, workingPath);
+    status.untracked = takeSorted(changes.untracked, staged, workingPath);
+    status.removed = takeSorted(changes.removed, pathsLeft(state), committedPath);
     if (withIgnored) {
         status.ignored = ignoredFiles(root);
         std::sort(status.ignored.begin(), status.ignored.end());
