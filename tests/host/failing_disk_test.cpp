@@ -184,9 +184,10 @@ TEST_F(WithoutRights, CannotChangeAnything)
 TEST_F(WithoutRights, MovesTheFileBackWhenTheStateCannotBeWritten)
 {
     chmod(repo.path().c_str(), 0777);
-    chmod(repo.pathTo(".tav").c_str(), 0555);
+    chmod(repo.pathTo(".tav").c_str(), 0755);
     repo.write(".tav/tav.lock", "");
     chmod(repo.pathTo(".tav/tav.lock").c_str(), 0666);
+    chmod(repo.pathTo(".tav").c_str(), 0555);
     EXPECT_EQ(
         asOrdinaryUser({"mv", "a.dwg", "b.dwg"}),
         text(failed(

@@ -4,8 +4,8 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
 #include <chrono>
-#include <cstdio>
 #include <thread>
 
 namespace host_tests {
@@ -16,15 +16,15 @@ void pause(int milliseconds)
     std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
 }
 
-/// What a work of four files prints that takes some time for each.
-Outcome printedBy(bool isOnTerminal, int millisecondsForEach)
+/// What a work of four files prints that takes this long for each.
+Outcome printedBy(bool isOnTerminal, std::array<int, 4> const& milliseconds)
 {
     Setting setting;
     setting.isOnTerminal = isOnTerminal;
-    Process process(setting, [=] {
-        tav::Progress progress("files", 4);
-        for (int i = 0; i < 4; ++i) {
-            pause(millisecondsForEach);
+    Process process(setting, [&] {
+        tav::Progress progress("files", milliseconds.size());
+        for (int const duration : milliseconds) {
+            pause(duration);
             progress.advance();
         }
         return 0;
@@ -34,22 +34,21 @@ Outcome printedBy(bool isOnTerminal, int millisecondsForEach)
 
 TEST(Progress, IsShownOnATerminalOnceTheWorkHasTakenLongAndWipedAtTheEnd)
 {
-    std::string const drawn = printedBy(true, 300).err;
-    EXPECT_EQ(
-        drawn, "\r[###############...............] 2 of 4 files"
-               "\r[######################........] 3 of 4 files"
-               "\r[##############################] 4 of 4 files"
-               "\r\x1b[K");
+    EXPECT_EQ(printedBy(true, {0, 600, 150, 150}).err,
+        "\r[###############...............] 2 of 4 files"
+        "\r[######################........] 3 of 4 files"
+        "\r[##############################] 4 of 4 files"
+        "\r\x1b[K");
 }
 
 TEST(Progress, IsNotShownForShortWork)
 {
-    EXPECT_EQ(printedBy(true, 0), done(""));
+    EXPECT_EQ(printedBy(true, {0, 0, 0, 0}), done(""));
 }
 
 TEST(Progress, IsNotShownElsewhere)
 {
-    EXPECT_EQ(printedBy(false, 200), done(""));
+    EXPECT_EQ(printedBy(false, {0, 600, 150, 0}), done(""));
 }
 
 TEST(Progress, OfNothingIsWhole)
