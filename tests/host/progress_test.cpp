@@ -34,11 +34,11 @@ Outcome printedBy(bool isOnTerminal, std::array<int, 4> const& milliseconds)
 
 TEST(Progress, IsShownOnATerminalOnceTheWorkHasTakenLongAndWipedAtTheEnd)
 {
-    EXPECT_EQ(printedBy(true, {0, 600, 150, 150}).err,
-        "\r[###############...............] 2 of 4 files"
-        "\r[######################........] 3 of 4 files"
-        "\r[##############################] 4 of 4 files"
-        "\r\x1b[K");
+    EXPECT_EQ(
+        printedBy(true, {0, 600, 150, 150}).err, "\r[###############...............] 2 of 4 files"
+                                                 "\r[######################........] 3 of 4 files"
+                                                 "\r[##############################] 4 of 4 files"
+                                                 "\r\x1b[K");
 }
 
 TEST(Progress, IsNotShownForShortWork)
