@@ -20,8 +20,9 @@ int openAt(int folder, char const* path, int flags, mode_t mode)
 
 Calls& calls() noexcept
 {
-    static Calls table{openAt,      ::read,         ::write,  ::fsync,    ::close,     ::flock,    ::fchown, ::fchmod,
-                       ::fsetxattr, ::fremovexattr, ::linkat, ::renameat, ::renameat2, ::unlinkat, ::mkdir};
+    static Calls table{openAt,   ::read,     ::write,     ::pread,    ::pwrite, ::ftruncate, ::fsync,
+                       ::syncfs, ::close,    ::flock,     ::fchown,   ::fchmod, ::fsetxattr, ::fremovexattr,
+                       ::linkat, ::renameat, ::renameat2, ::unlinkat, ::mkdir,  ::mkdirat,   ::futimens};
     return table;
 }
 

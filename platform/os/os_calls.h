@@ -4,6 +4,7 @@
 #include "platform/mu_platform_export.h"
 
 #include <cstddef>
+#include <ctime>
 #include <sys/types.h>
 
 namespace os {
@@ -14,7 +15,11 @@ struct Calls {
     int (*openat)(int folder, char const* path, int flags, mode_t mode);
     ssize_t (*read)(int file, void* buffer, std::size_t count);
     ssize_t (*write)(int file, void const* bytes, std::size_t count);
+    ssize_t (*pread)(int file, void* buffer, std::size_t count, off_t offset);
+    ssize_t (*pwrite)(int file, void const* bytes, std::size_t count, off_t offset);
+    int (*ftruncate)(int file, off_t length);
     int (*fsync)(int file);
+    int (*syncfs)(int file);
     int (*close)(int file);
     int (*flock)(int file, int operation);
     int (*fchown)(int file, uid_t owner, gid_t group);
@@ -26,6 +31,8 @@ struct Calls {
     int (*renameat2)(int fromFolder, char const* from, int toFolder, char const* to, unsigned flags);
     int (*unlinkat)(int folder, char const* path, int flags);
     int (*mkdir)(char const* path, mode_t mode);
+    int (*mkdirat)(int folder, char const* path, mode_t mode);
+    int (*futimens)(int file, struct timespec const* times);
 };
 
 /// The process's table. Only tests change it, while no other thread uses it.

@@ -1,6 +1,7 @@
 #include "platform/os/os_files.h"
 
 #include "platform/os/os_calls.h"
+#include "platform/os/os_handle.h"
 
 #include <algorithm>
 #include <array>
@@ -24,6 +25,12 @@
 namespace os {
 namespace {
 
+using detail::Handle;
+using detail::lastError;
+using detail::openAt;
+using detail::outcome;
+using detail::retried;
+
 constexpr int kFolderFlags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
 constexpr int kMostLinks = 40;   // as many as the system follows in one path
 constexpr int kMostAttempts = 5; // at a temporary file that others take away
@@ -34,62 +41,9 @@ std::error_code systemError(int number)
     return {number, std::generic_category()};
 }
 
-std::error_code lastError()
-{
-    return systemError(errno);
-}
-
-template <class Call>
-auto retried(Call const& call)
-{
-    for (;;) {
-        auto const result = call();
-        if (result != -1 || errno != EINTR) {
-            return result;
-        }
-    }
-}
-
-std::error_code outcome(int result)
-{
-    return result == -1 ? lastError() : std::error_code();
-}
-
 bool isPath(std::string_view path)
 {
     return path.find('\0') == std::string_view::npos;
-}
-
-// An open file or folder; closes itself.
-class Handle {
-public:
-    Handle() = default;
-    explicit Handle(int file) : file_(file) {}
-    Handle(Handle&& other) noexcept : file_(std::exchange(other.file_, -1)) {}
-    Handle& operator=(Handle&& other) noexcept
-    {
-        std::swap(file_, other.file_);
-        return *this;
-    }
-    // Interrupted or not, the system closes the file: a second call could hit another one.
-    ~Handle()
-    {
-        if (file_ != -1) {
-            calls().close(file_);
-        }
-    }
-
-    bool isOpen() const { return file_ != -1; }
-    int get() const { return file_; }
-    int release() { return std::exchange(file_, -1); }
-
-private:
-    int file_ = -1;
-};
-
-Handle openAt(int folder, std::string const& path, int flags, mode_t mode = 0)
-{
-    return Handle(retried([&] { return calls().openat(folder, path.c_str(), flags | O_CLOEXEC, mode); }));
 }
 
 std::error_code flush(Handle const& file)
@@ -486,6 +440,33 @@ std::error_code replaceFile(std::string const& path, std::string_view content)
         error = replaceOnce(target, old, content, true);
     }
     return error ? error : flushEntries(folder);
+}
+
+std::error_code replaceFileBy(std::string const& path, std::string const& source)
+{
+    Place target;
+    if (auto const error = findTarget(path, target)) {
+        return error;
+    }
+    OldStatus old;
+    if (auto const error = examineTarget(target, old)) {
+        return error;
+    }
+    Handle const folder = openAt(target.folder.get(), ".", kFolderFlags);
+    Handle const file = openAt(AT_FDCWD, source, O_RDWR | O_NOFOLLOW);
+    if (!folder.isOpen() || !file.isOpen()) {
+        return lastError();
+    }
+    if (auto const error = takePermissions(target, old, file)) {
+        return error;
+    }
+    if (auto const error = flush(file)) {
+        return error;
+    }
+    if (retried([&] { return calls().renameat(AT_FDCWD, source.c_str(), folder.get(), target.name.c_str()); }) == -1) {
+        return lastError();
+    }
+    return flushEntries(folder);
 }
 
 std::error_code makeFolder(std::string const& path, mode_t permissions)

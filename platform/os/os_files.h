@@ -29,6 +29,12 @@ namespace os {
 /// flushed) is reported too.
 [[nodiscard]] MU_PLATFORM_EXPORT std::error_code replaceFile(std::string const& path, std::string_view content);
 
+/// Puts the file `source` in the place of the file `path`, or moves it there, and waits until that is safe on the disk.
+/// Both lie on one file system. What `replaceFile` says of links, permissions, refusals and crashes holds here too; a
+/// file that is new under `path` keeps the permissions of `source`. After an error `source` is still there, unless it
+/// was the flush of the folder that failed.
+[[nodiscard]] MU_PLATFORM_EXPORT std::error_code replaceFileBy(std::string const& path, std::string const& source);
+
 /// Makes the folder `path`, whose parent must exist, with `permissions` less the process's umask.
 [[nodiscard]] MU_PLATFORM_EXPORT std::error_code makeFolder(std::string const& path, mode_t permissions);
 

@@ -67,7 +67,11 @@ void standInForAll()
     standInFor<&os::Calls::openat>("openat");
     standInFor<&os::Calls::read>("read");
     standInFor<&os::Calls::write>("write");
+    standInFor<&os::Calls::pread>("pread");
+    standInFor<&os::Calls::pwrite>("pwrite");
+    standInFor<&os::Calls::ftruncate>("ftruncate");
     standInFor<&os::Calls::fsync>("fsync");
+    standInFor<&os::Calls::syncfs>("syncfs");
     standInFor<&os::Calls::close>("close");
     standInFor<&os::Calls::flock>("flock");
     standInFor<&os::Calls::fchown>("fchown");
@@ -79,6 +83,8 @@ void standInForAll()
     standInFor<&os::Calls::renameat2>("renameat2");
     standInFor<&os::Calls::unlinkat>("unlinkat");
     standInFor<&os::Calls::mkdir>("mkdir");
+    standInFor<&os::Calls::mkdirat>("mkdirat");
+    standInFor<&os::Calls::futimens>("futimens");
 }
 
 } // namespace

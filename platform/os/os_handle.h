@@ -1,0 +1,67 @@
+/// What the sources of this floor share: open files that close themselves, and calls that go on after a signal.
+#pragma once
+
+#include "platform/os/os_calls.h"
+
+#include <cerrno>
+#include <fcntl.h>
+#include <string>
+#include <system_error>
+#include <utility>
+
+namespace os::detail {
+
+inline std::error_code lastError()
+{
+    return {errno, std::generic_category()};
+}
+
+template <class Call>
+auto retried(Call const& call)
+{
+    for (;;) {
+        auto const result = call();
+        if (result != -1 || errno != EINTR) {
+            return result;
+        }
+    }
+}
+
+inline std::error_code outcome(int result)
+{
+    return result == -1 ? lastError() : std::error_code();
+}
+
+/// An open file or folder; closes itself.
+class Handle {
+public:
+    Handle() = default;
+    explicit Handle(int file) : file_(file) {}
+    Handle(Handle&& other) noexcept : file_(std::exchange(other.file_, -1)) {}
+    Handle& operator=(Handle&& other) noexcept
+    {
+        std::swap(file_, other.file_);
+        return *this;
+    }
+    // Interrupted or not, the system closes the file: a second call could hit another one.
+    ~Handle()
+    {
+        if (file_ != -1) {
+            calls().close(file_);
+        }
+    }
+
+    bool isOpen() const { return file_ != -1; }
+    int get() const { return file_; }
+    int release() { return std::exchange(file_, -1); }
+
+private:
+    int file_ = -1;
+};
+
+inline Handle openAt(int folder, std::string const& path, int flags, mode_t mode = 0)
+{
+    return Handle(retried([&] { return calls().openat(folder, path.c_str(), flags | O_CLOEXEC, mode); }));
+}
+
+} // namespace os::detail
