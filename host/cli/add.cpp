@@ -3,10 +3,10 @@
 #include "host/failure.h"
 #include "host/repository/changes.h"
 #include "host/repository/last_commit.h"
-#include "host/repository/lock.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/staging.h"
+#include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
 #include <algorithm>
@@ -60,11 +60,13 @@ chosenFiles(Options const& options, common::RepoChanges const& changes, common::
 
 void addFilesToStage(Options const& options)
 {
-    common::RootPath const root = openRepository("");
-    os::FileLock const lock = lockRepository(root, "add");
+    Work const work(openRepository(""), "add");
+    common::RootPath const& root = work.root();
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
-        common::RepoChanges const changes = compare(root, lastCommitFiles(root), cache.read());
+        VerifiedTimes verified;
+        common::RepoChanges const changes = compare(root, lastCommitFiles(root), cache.read(), &verified);
+        enterVerified(verified, work.start(), cache.write());
         count = stage(chosenFiles(options, changes, root), cache.write());
     });
     print(

@@ -112,8 +112,21 @@ void addCommands(CLI::App& app)
     addUnstage(app);
     addMv(app);
     addRm(app);
+    addCommit(app);
+    addLog(app);
+    addShow(app);
+    addDiff(app);
+    addRestore(app);
+    addCheckout(app);
+    addSwitch(app);
+    addBranch(app);
+    addTag(app);
     addFiles(app);
     addIgnore(app);
+    addProjects(app);
+    addVerify(app);
+    addGc(app);
+    addExport(app);
     takeMarksOff(app);
     for (CLI::App* const command : app.get_subcommands({})) {
         takeMarksOff(*command);

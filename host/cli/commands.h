@@ -13,7 +13,20 @@ void addAdd(CLI::App& app);
 void addUnstage(CLI::App& app);
 void addMv(CLI::App& app);
 void addRm(CLI::App& app);
+void addCommit(CLI::App& app);
+void addLog(CLI::App& app);
+void addShow(CLI::App& app);
+void addDiff(CLI::App& app);
+void addRestore(CLI::App& app);
+void addCheckout(CLI::App& app);
+void addSwitch(CLI::App& app);
+void addBranch(CLI::App& app);
+void addTag(CLI::App& app);
 void addFiles(CLI::App& app);
 void addIgnore(CLI::App& app);
+void addProjects(CLI::App& app);
+void addVerify(CLI::App& app);
+void addGc(CLI::App& app);
+void addExport(CLI::App& app);
 
 } // namespace tav

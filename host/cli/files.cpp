@@ -1,7 +1,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/cli/progress.h"
 #include "host/failure.h"
+#include "host/progress.h"
 #include "host/repository/changes.h"
 #include "host/repository/digest.h"
 #include "host/repository/open.h"

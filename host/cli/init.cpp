@@ -1,10 +1,19 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
+#include "host/projects.h"
 #include "host/repository/ignore_file.h"
-#include "host/repository/lock.h"
+#include "host/repository/server_of.h"
+#include "host/repository/work.h"
 #include "host/repository/working_state.h"
+#include "host/text/characters.h"
+#include "host/text/wide.h"
 
+#include "common/mu_common_serialization.h"
+#include "json/json_reader.h"
+#include "json/json_writer.h"
+
+#include <filesystem>
 #include <memory>
 #include <string>
 
@@ -12,15 +21,82 @@ namespace tav {
 
 namespace {
 
-void init(std::string const& folder)
+struct Options {
+    std::string folder = ".";
+    std::string server;
+};
+
+std::string absolute(std::string const& folder)
 {
-    OdString const path(folder.data(), folder.size(), CP_UTF_8);
+    std::filesystem::path const path = std::filesystem::absolute(folder).lexically_normal();
+    return path.has_filename() ? path.string() : path.parent_path().string();
+}
+
+/// The server takes names that can be shown.
+OdString withoutControls(OdString const& name)
+{
+    OdString clean;
+    for (std::size_t i = 0; i < name.getLength(); ++i) {
+        clean += isControl(name.getAt(i)) ? L'_' : name.getAt(i);
+    }
+    return clean;
+}
+
+OdString documentOf(std::string const& name)
+{
+    kutils::json::Object object;
+    object[L"name"] = jsonText(withoutControls(wide(name)));
+    kutils::json::Value document(std::move(object));
+    std::wstring const text = kutils::json::write_string(document, false);
+    return {text.c_str(), text.size()};
+}
+
+/// Makes a repository on the server and returns its identifier.
+OdString registerAt(OdString const& server, std::string const& name)
+{
+    OdString const answer =
+        valueOrFail(connect(server)->request(L"init", documentOf(name)), "Check the folder of the server.");
+    kutils::json::Value document;
+    kutils::json::read_string(document, answer);
+    return valueOrFail(common::deserializeInitData(document.get_object()), "Check the folder of the server.");
+}
+
+void chooseServer(LocalDatabase& database, Options const& options, std::string const& name)
+{
+    OdString const chosen = wide(absolute(options.server.empty() ? defaultServerFolder() : options.server));
+    if (database.repositoryId().isEmpty()) {
+        database.setServer(chosen, registerAt(chosen, name));
+    } else if (!options.server.empty() && database.serverFolder() != chosen) {
+        throw Failure(
+            "The repository has its server already, in '" + database.serverFolder().ansi_str() + "'.",
+            "Run 'tav init' without --server.");
+    }
+}
+
+/// The list of projects is a convenience: without it the repository is as good.
+void enterProject(LocalDatabase const& database, std::string const& folder, std::string const& name)
+{
+    try {
+        addProject(wide(folder), wide(name), database.repositoryId());
+    } catch (Failure const& failure) {
+        printNote("The repository is complete, but 'tav projects' does not know it: " + failure.what);
+    }
+}
+
+void init(Options const& options)
+{
+    OdString const path = wide(options.folder);
     bool const existed = common::RootPath::get(path, false).hasValue();
     common::RootPath const root =
         valueOrFail(common::RootPath::get(path, true), "Check that the folder is one and that you may write there.");
+    std::string const folder = absolute(options.folder);
+    std::string const name = std::filesystem::path(folder).filename().string();
     os::FileLock const lock = lockRepository(root, "init");
     makeIgnoreFile(root);
     makeState(root);
+    LocalDatabase database = LocalDatabase::make(root);
+    chooseServer(database, options, name);
+    enterProject(database, folder, name);
     print(
         existed ? "The repository in '" + shown(path) + "' was there already; it is complete.\n"
                 : "Made a repository in '" + shown(path) + "'.\n");
@@ -31,10 +107,14 @@ void init(std::string const& folder)
 void addInit(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("init", "Make a folder of drawings a repository, or complete one");
-    auto const folder = std::make_shared<std::string>(".");
-    command->add_option("FOLDER", *folder, "The folder of your drawings; it is made when it is missing")
+    auto const options = std::make_shared<Options>();
+    command->add_option("FOLDER", options->folder, "The folder of your drawings; it is made when it is missing")
         ->capture_default_str();
-    command->callback([folder] { init(*folder); });
+    command
+        ->add_option(
+            "--server", options->server, "Where the history is kept; by default 'tav/server' in your folder for data")
+        ->type_name("FOLDER");
+    command->callback([options] { init(*options); });
 }
 
 } // namespace tav

@@ -3,10 +3,10 @@
 #include "host/failure.h"
 #include "host/repository/changes.h"
 #include "host/repository/file_moves.h"
-#include "host/repository/lock.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/staging.h"
+#include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
 #include "platform/ut/Dir.h"
@@ -92,8 +92,8 @@ std::vector<Move> movesOf(OdString const& from, OdString const& to, std::vector<
 
 void moveFiles(std::string const& typedFrom, std::string const& typedTo)
 {
-    common::RootPath const root = openRepository("");
-    os::FileLock const lock = lockRepository(root, "mv");
+    Work const work(openRepository(""), "mv");
+    common::RootPath const& root = work.root();
     OdString const from = pathInRepository(root, typedFrom);
     OdString const to = targetOf(from, typedTo, root);
     std::vector<Move> const moves = movesOf(from, to, scan(root));

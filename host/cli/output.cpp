@@ -1,5 +1,8 @@
 #include "host/cli/output.h"
 
+#include "host/text/characters.h"
+#include "host/text/wide.h"
+
 #include "json/json_writer.h"
 
 #include <unistd.h>
@@ -43,11 +46,6 @@ OdString withControlsEscaped(OdString const& text)
     return escaped;
 }
 
-OdString fromUtf8(std::string const& text)
-{
-    return OdString(text.data(), text.size(), CP_UTF_8);
-}
-
 /// Messages of several lines become one; whatever else could move the cursor is escaped.
 std::string onOneLine(std::string text)
 {
@@ -57,7 +55,7 @@ std::string onOneLine(std::string text)
     for (char& c : text) {
         c = c == '\n' || c == '\t' ? ' ' : c;
     }
-    return withControlsEscaped(fromUtf8(text)).ansi_str();
+    return withControlsEscaped(wide(text)).ansi_str();
 }
 
 std::string asSentence(std::string const& text)
@@ -82,6 +80,12 @@ void printJson(kutils::json::Value const& document)
 void printError(std::string const& what, std::string const& next)
 {
     std::string const line = "tav: " + asSentence(onOneLine(what)) + " " + onOneLine(next) + "\n";
+    std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
+void printNote(std::string const& note)
+{
+    std::string const line = "tav: " + onOneLine(note) + "\n";
     std::fwrite(line.data(), 1, line.size(), stderr);
 }
 
@@ -113,18 +117,8 @@ std::string coloured(Colour colour, std::string text)
 
 kutils::json::Value jsonText(OdString const& text)
 {
-    std::wstring units;
-    units.reserve(text.getLength());
-    for (std::size_t i = 0; i < text.getLength(); ++i) {
-        auto const c = static_cast<std::uint32_t>(text.getAt(i));
-        if (c <= 0xFFFF) {
-            units += static_cast<wchar_t>(c);
-        } else {
-            units += static_cast<wchar_t>(0xD800 + ((c - 0x10000) >> 10));
-            units += static_cast<wchar_t>(0xDC00 + ((c - 0x10000) & 0x3FF));
-        }
-    }
-    return units;
+    OdString const pairs = withPairs(text);
+    return std::wstring(pairs.c_str(), pairs.getLength());
 }
 
 } // namespace tav

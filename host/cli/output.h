@@ -14,6 +14,8 @@ void print(std::string const& text);
 void printJson(kutils::json::Value const& document);
 /// Prints "tav: <what> <next>" as one line on the error stream.
 void printError(std::string const& what, std::string const& next);
+/// Prints "tav: <note>" as one line on the error stream, beside what the command does.
+void printNote(std::string const& note);
 /// Prints a line of details that follows an error, indented.
 void printErrorDetail(std::string const& detail);
 /// Hands over what was printed; false when anything could not be written.

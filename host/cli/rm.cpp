@@ -4,10 +4,10 @@
 #include "host/repository/changes.h"
 #include "host/repository/file_moves.h"
 #include "host/repository/last_commit.h"
-#include "host/repository/lock.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/staging.h"
+#include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
 #include "platform/os/os_files.h"
@@ -67,8 +67,8 @@ std::string waitingName(common::RootPath const& root, std::size_t number)
 
 void removeFiles(std::vector<std::string> const& names)
 {
-    common::RootPath const root = openRepository("");
-    os::FileLock const lock = lockRepository(root, "rm");
+    Work const work(openRepository(""), "rm");
+    common::RootPath const& root = work.root();
     FileMoves moves;
     std::vector<std::string> waiting;
     std::size_t count = 0;

@@ -39,6 +39,18 @@ kutils::json::Array documentOf(std::vector<common::ConflictInfo> const& conflict
     return array;
 }
 
+kutils::json::Array documentOf(Renames const& renames)
+{
+    kutils::json::Array array;
+    for (auto const& [path, previous] : renames) {
+        kutils::json::Object object;
+        object[L"path"] = jsonText(path);
+        object[L"previous"] = jsonText(previous);
+        array.emplace_back(std::move(object));
+    }
+    return array;
+}
+
 kutils::json::Array documentOf(std::vector<StagedEntry> const& entries)
 {
     kutils::json::Array array;
@@ -60,11 +72,14 @@ void printDocument(Status const& status, bool withIgnored)
 {
     kutils::json::Object object;
     object[L"branch"] = jsonText(status.branch);
+    object[L"commit"] = status.commit;
+    object[L"at_end"] = status.isAtEnd;
     object[L"conflicts"] = documentOf(status.conflicts);
     object[L"staged"] = documentOf(status.staged);
     object[L"modified"] = documentOf(status.modified);
     object[L"untracked"] = documentOf(status.untracked);
     object[L"removed"] = documentOf(status.removed);
+    object[L"renamed"] = documentOf(status.renamed);
     if (withIgnored) {
         object[L"ignored"] = documentOf(status.ignored);
     }
@@ -124,13 +139,30 @@ void printStaged(std::vector<StagedEntry> const& entries)
     print("\n");
 }
 
+void printRenamed(Renames const& renames)
+{
+    if (renames.empty()) {
+        return;
+    }
+    print("Renamed:\n  (the next commit takes these without staging)\n");
+    for (auto const& [path, previous] : renames) {
+        print("        " + coloured(Colour::red, "renamed:  " + shown(previous) + " -> " + shown(path)) + "\n");
+    }
+    print("\n");
+}
+
 void printForPeople(Status const& status)
 {
-    print("On branch " + shown(status.branch) + "\n\n");
+    print("On branch " + shown(status.branch) + "\n");
+    if (!status.isAtEnd) {
+        print("At commit " + std::to_string(status.commit) + ", which is not the end of the branch\n");
+    }
+    print("\n");
     printConflicts(status.conflicts);
     printStaged(status.staged);
     printGroup(
         "Modified, not staged:", "use 'tav add NAME' to stage a file", "modified: ", Colour::red, status.modified);
+    printRenamed(status.renamed);
     printGroup("Removed:", "the next commit takes these without staging", "removed:  ", Colour::red, status.removed);
     printGroup("New, not staged:", "use 'tav add NAME' or 'tav add --all' to stage", "", Colour::red, status.untracked);
     printGroup("Ignored:", "see 'tav ignore' for the rules", "", Colour::none, status.ignored);
@@ -142,6 +174,9 @@ void printForPeople(Status const& status)
 void showStatus(Options const& options)
 {
     Status const status = statusOf(openRepository(""), options.ignored);
+    if (!status.unfinishedWork.empty()) {
+        printNote(status.unfinishedWork);
+    }
     if (options.json) {
         printDocument(status, options.ignored);
     } else {

@@ -1,10 +1,10 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
-#include "host/repository/lock.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/staging.h"
+#include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
 #include <memory>
@@ -22,8 +22,8 @@ struct Options {
 
 void unstageFiles(Options const& options)
 {
-    common::RootPath const root = openRepository("");
-    os::FileLock const lock = lockRepository(root, "unstage");
+    Work const work(openRepository(""), "unstage");
+    common::RootPath const& root = work.root();
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
         NameFinder const finder(cache.read().stagedFiles, root);

@@ -1,10 +1,13 @@
 #include "host/repository/changes.h"
 
 #include "host/failure.h"
+#include "host/repository/digest.h"
+#include "host/repository/index_record.h"
+#include "host/storage/local_storage.h"
 
+#include "common/mu_common_file_storage.h"
 #include "common/mu_common_file_utils.h"
 
-#include <map>
 #include <regex>
 #include <set>
 #include <utility>
@@ -13,32 +16,45 @@ namespace tav {
 
 namespace {
 
-using Committed = std::map<OdString, common::VersionedFile const*>;
+/// The working files, beside what they are compared with.
+struct Comparison {
+    common::RootPath const& root;
+    common::State const& state;
+    VerifiedTimes* verified;
+    Tree missing; ///< what has not been met in the working folder so far
+    common::RepoChanges changes;
+};
 
-bool isUntouched(OdString const& path, common::RootPath const& root, common::State const& state)
+bool isUnchanged(OdString const& path, OdString const& url, Comparison& comparison)
 {
-    auto const record = state.index.find(path);
-    return record != state.index.end() && !record->second.modified &&
-           record->second.lastChecked == common::modifyTime(path, root);
+    std::uint64_t const time = common::modifyTime(path, comparison.root);
+    auto const record = comparison.state.index.find(path);
+    if (record != comparison.state.index.end() && isUntouched(record->second, time)) {
+        return true;
+    }
+    if (hasOtherContent(path, url, comparison.root)) {
+        return false;
+    }
+    if (comparison.verified) {
+        comparison.verified->emplace(path, time);
+    }
+    return true;
 }
 
-/// Sorts one working file in. A committed one is taken out of `committed`, which keeps what is missing in the folder.
-void sortIn(
-    common::File file, Committed& committed, common::RootPath const& root, common::State const& state,
-    common::RepoChanges& changes)
+void sortIn(common::File file, Comparison& comparison)
 {
-    auto const match = committed.find(file.path);
-    if (match == committed.end()) {
-        changes.untracked.push_back({nullptr, std::move(file), 0});
+    auto const match = comparison.missing.find(file.path);
+    if (match == comparison.missing.end()) {
+        comparison.changes.untracked.push_back({nullptr, std::move(file), 0});
         return;
     }
-    common::VersionedFile const& version = *match->second;
-    if (isUntouched(file.path, root, state) || !common::isDifferent(file.path, version.storagePath, root)) {
-        changes.unchanged.push_back(version);
+    common::VersionedFile version{file.path, std::move(match->second)};
+    comparison.missing.erase(match);
+    if (isUnchanged(version.path, version.storagePath, comparison)) {
+        comparison.changes.unchanged.push_back(std::move(version));
     } else {
-        changes.modified.push_back({nullptr, std::move(file), version, 0});
+        comparison.changes.modified.push_back({nullptr, std::move(file), std::move(version), 0});
     }
-    committed.erase(match);
 }
 
 } // namespace
@@ -55,22 +71,33 @@ std::vector<common::File> scan(common::RootPath const& root)
 }
 
 common::RepoChanges
-compare(common::RootPath const& root, std::vector<common::VersionedFile> const& committed, common::State const& state)
+compare(common::RootPath const& root, Tree committed, common::State const& state, VerifiedTimes* verified)
 {
-    Committed missing;
-    for (common::VersionedFile const& file : committed) {
-        missing.emplace(file.path, &file);
-    }
-    common::RepoChanges changes;
+    Comparison comparison{root, state, verified, std::move(committed), {}};
     for (common::File& file : scan(root)) {
-        sortIn(std::move(file), missing, root, state, changes);
+        sortIn(std::move(file), comparison);
     }
-    for (common::VersionedFile const& file : committed) {
-        if (missing.count(file.path) > 0) {
-            changes.removed.push_back({nullptr, file, 0});
-        }
+    for (auto& [path, url] : comparison.missing) {
+        comparison.changes.removed.push_back({nullptr, {path, std::move(url)}, 0});
     }
-    return changes;
+    return std::move(comparison.changes);
+}
+
+void enterVerified(VerifiedTimes const& verified, std::uint64_t start, common::State& state)
+{
+    for (auto const& [path, time] : verified) {
+        state.index.insert_or_assign(path, indexRecord(time, start));
+    }
+}
+
+bool hasOtherContent(OdString const& path, OdString const& url, common::RootPath const& root)
+{
+    if (common::urlToType(url) == common::StorageType::Object) {
+        return common::isDifferent(path, url, root);
+    }
+    // For a revision the library answers without a look at the file; its URL carries the digest of the content.
+    auto const digest = fileDigest(root.pathTo(path));
+    return !digest || digest != digestOf(url);
 }
 
 std::vector<OdString> ignoredFiles(common::RootPath const& root)

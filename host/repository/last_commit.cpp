@@ -1,10 +1,13 @@
 #include "host/repository/last_commit.h"
 
+#include "host/repository/local_database.h"
+
 namespace tav {
 
-std::vector<common::VersionedFile> lastCommitFiles(common::RootPath const& /*root*/)
+Tree lastCommitFiles(common::RootPath const& root)
 {
-    return {}; // Every repository stands on the empty commit so far.
+    LocalDatabase const database = LocalDatabase::open(root);
+    return database.commits().files(database.base());
 }
 
 } // namespace tav

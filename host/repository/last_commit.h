@@ -1,14 +1,13 @@
 /// The commit that the working folder stands on.
 #pragma once
 
-#include "common/mu_common_repo_files.h"
-#include "common/mu_common_repo_prop.h"
+#include "host/database/commit_tables.h"
 
-#include <vector>
+#include "common/mu_common_repo_prop.h"
 
 namespace tav {
 
-/// The files of that commit. Their storage paths carry the digests of their contents.
-std::vector<common::VersionedFile> lastCommitFiles(common::RootPath const& root);
+/// The files of that commit. Throws `Failure` when the database cannot be used.
+Tree lastCommitFiles(common::RootPath const& root);
 
 } // namespace tav

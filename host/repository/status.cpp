@@ -1,7 +1,8 @@
 #include "host/repository/status.h"
 
 #include "host/repository/changes.h"
-#include "host/repository/last_commit.h"
+#include "host/repository/local_database.h"
+#include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
 #include "common/mu_common_file_utils.h"
@@ -90,24 +91,42 @@ std::vector<common::ConflictInfo> conflictsOf(common::RootPath const& root)
     return conflicts;
 }
 
+void enterPlace(LocalDatabase const& database, common::State const& state, Status& status)
+{
+    OdString const base = database.base();
+    auto const commit = database.commits().find(base);
+    auto const end = database.commits().reference(state.head);
+    status.branch = state.head;
+    status.commit = commit ? commit->number : 0;
+    status.isAtEnd = !end || end->commitHash == base;
+    status.unfinishedWork = noteOnUnfinished(database);
+}
+
 } // namespace
 
 Status statusOf(common::RootPath const& root, bool withIgnored)
 {
     auto const cache = readState(root);
     common::State const& state = cache->read();
-    common::RepoChanges changes = compare(root, lastCommitFiles(root), state);
-    Paths const staged = stagedPaths(state);
+    LocalDatabase const database = LocalDatabase::open(root);
+    common::RepoChanges changes = compare(root, database.commits().files(database.base()), state);
+    Paths staged = stagedPaths(state);
+    Paths left = pathsLeft(state);
     auto const workingPath = [](auto& file) -> OdString& { return file.working.path; };
     auto const committedPath = [](auto& file) -> OdString& { return file.committed.path; };
 
     Status status;
-    status.branch = state.head;
+    enterPlace(database, state, status);
+    for (auto const& [path, previous] : findRenames(changes, database, root)) {
+        if (staged.insert(path).second && left.insert(previous).second) {
+            status.renamed.emplace(path, previous);
+        }
+    }
     status.conflicts = conflictsOf(root);
     status.staged = stagedEntries(state, root);
     status.modified = takeSorted(changes.modified, staged, workingPath);
     status.untracked = takeSorted(changes.untracked, staged, workingPath);
-    status.removed = takeSorted(changes.removed, pathsLeft(state), committedPath);
+    status.removed = takeSorted(changes.removed, left, committedPath);
     if (withIgnored) {
         status.ignored = ignoredFiles(root);
         sortScanned(status.ignored);

@@ -1,9 +1,13 @@
 /// The state of a repository, as commands show it.
 #pragma once
 
+#include "host/repository/renames.h"
+
 #include "common/mu_common_diff.h"
 #include "common/mu_common_state.h"
 
+#include <cstdint>
+#include <string>
 #include <vector>
 
 namespace tav {
@@ -18,16 +22,21 @@ struct StagedEntry {
 /// Every list is in ascending order of paths.
 struct Status {
     OdString branch;
+    std::int64_t commit = 0;    ///< number of the commit that the working folder stands on; 0 before the first
+    bool isAtEnd = true;        ///< whether that is where the branch ends
+    std::string unfinishedWork; ///< what an interrupted command has left, in a sentence
     std::vector<common::ConflictInfo> conflicts;
     std::vector<StagedEntry> staged;
     std::vector<OdString> modified;  ///< not staged
     std::vector<OdString> untracked; ///< not staged
+    Renames renamed;                 ///< not staged; the next commit takes that without staging
     std::vector<OdString> removed;   ///< gone from the working folder; the next commit takes that without staging
     std::vector<OdString> ignored;   ///< filled in when it is asked for
 
     bool isClean() const
     {
-        return conflicts.empty() && staged.empty() && modified.empty() && untracked.empty() && removed.empty();
+        return conflicts.empty() && staged.empty() && modified.empty() && untracked.empty() && renamed.empty() &&
+               removed.empty();
     }
 };
 

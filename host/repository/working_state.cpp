@@ -1,10 +1,8 @@
 #include "host/repository/working_state.h"
 
-#include "host/failure.h"
+#include "host/save_report.h"
 
 #include "platform/os/os_files.h"
-
-#include <optional>
 
 namespace tav {
 
@@ -13,25 +11,6 @@ namespace {
 constexpr char const* kHowToComplete = "Run 'tav init' if '.tav/tav.state' is missing; mend it if not.";
 constexpr char const* kOldStateStands =
     "The old state still stands; check the free space and your rights, and try again.";
-
-/// Keeps what a cache reported about saving itself.
-class SaveReport final : public common::IoInterface {
-public:
-    std::int32_t accept(OdString const& /*path*/) const override { return 1; }
-    void report(WriteOutcome const& outcome) const override { outcome_ = outcome; }
-
-    bool hasFailed() const { return outcome_ && !outcome_->hasValue(); }
-
-    void failUnlessSaved() const
-    {
-        if (hasFailed()) {
-            throw Failure(outcome_->error(), kOldStateStands);
-        }
-    }
-
-private:
-    mutable std::optional<WriteOutcome> outcome_;
-};
 
 /// Saving may fail when the new state is in place already but not yet safe. What the command did elsewhere is undone
 /// then, so the old state has to be back. Where even this fails the disk takes nothing at all.
@@ -46,7 +25,7 @@ void makeState(common::RootPath const& root)
 {
     SaveReport report;
     common::Cache::create(root, report);
-    report.failUnlessSaved();
+    report.failUnlessSaved(kOldStateStands);
 }
 
 std::shared_ptr<common::Cache const> readState(common::RootPath const& root)
@@ -70,7 +49,7 @@ void changeState(common::RootPath const& root, std::function<void(common::Cache&
     if (report.hasFailed() && !unread) {
         putBack(stateFile, before);
     }
-    report.failUnlessSaved();
+    report.failUnlessSaved(kOldStateStands);
 }
 
 } // namespace tav

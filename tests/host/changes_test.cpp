@@ -19,8 +19,7 @@ protected:
     {
         std::string const content = "committed " + name;
         repo.write(name, content);
-        committed_.push_back(
-            {wide(name), OdString(L"po#") + generateSha(content.data(), static_cast<int>(content.size()))});
+        committed_[wide(name)] = L"po:" + generateSha(content.data(), static_cast<int>(content.size()));
     }
 
     void index(std::string const& name, bool modified)
@@ -70,7 +69,7 @@ protected:
     }
 
     support::TempRepository const repo;
-    std::vector<common::VersionedFile> committed_;
+    tav::Tree committed_;
     common::State state_;
 };
 
@@ -98,18 +97,18 @@ TEST_F(Compare, SortsEveryFileIntoOneList)
     EXPECT_THAT(removed(changes), ElementsAre("gone.dwg"));
 }
 
-TEST_F(Compare, KeepsTheOrderOfTheScanAndOfTheCommit)
+TEST_F(Compare, ListsWorkingFilesAsTheScanDoesAndRemovedOnesInTheOrderOfPaths)
 {
     for (char const* const name : {"b/z.dwg", "y.dwg", "a/x.dwg"}) {
         commit(name);
         repo.write(name, "other");
-        committed_.push_back({wide("gone/" + std::string(name)), L"po#"});
+        committed_[wide("gone/" + std::string(name))] = L"po:";
     }
     repo.add({"b/new.dwg", "new.dwg"});
     common::RepoChanges const changes = compare();
     EXPECT_THAT(modified(changes), ElementsAre("y.dwg", "a/x.dwg", "b/z.dwg"));
     EXPECT_THAT(untracked(changes), ElementsAre("new.dwg", "b/new.dwg"));
-    EXPECT_THAT(removed(changes), ElementsAre("gone/b/z.dwg", "gone/y.dwg", "gone/a/x.dwg"));
+    EXPECT_THAT(removed(changes), ElementsAre("gone/a/x.dwg", "gone/b/z.dwg", "gone/y.dwg"));
 }
 
 TEST_F(Compare, TakesAFileForRemovedThatIsIgnoredOrHiddenByNow)
@@ -118,7 +117,7 @@ TEST_F(Compare, TakesAFileForRemovedThatIsIgnoredOrHiddenByNow)
     commit(".hidden.dwg");
     repo.ignore("^.*\\.old$");
     common::RepoChanges const changes = compare();
-    EXPECT_THAT(removed(changes), ElementsAre("a.old", ".hidden.dwg"));
+    EXPECT_THAT(removed(changes), ElementsAre(".hidden.dwg", "a.old"));
     EXPECT_THAT(untracked(changes), ElementsAre(".tav/properties/ignore"));
 }
 
@@ -161,17 +160,25 @@ TEST_F(Compare, AsksTheIndexOnlyAboutCommittedFiles)
     EXPECT_THAT(untracked(compare()), ElementsAre("new.dwg"));
 }
 
-TEST_F(Compare, TakesAFileForModifiedThatIsRecordedByItsStorageOnly)
+TEST_F(Compare, KnowsARevisionByTheDigestInItsUrl)
 {
     commit("a.dwg");
-    committed_.back().storagePath = L"tf:a.dwg#1";
-    EXPECT_THAT(modified(compare()), ElementsAre("a.dwg"));
+    commit("b.dwg");
+    commit("c.dwg");
+    auto const revision = [&](OdString const& name) { return L"tf:plan-1#" + committed_[name].mid(3); };
+    committed_[L"a.dwg"] = revision(L"a.dwg");
+    committed_[L"b.dwg"] = revision(L"a.dwg");
+    committed_[L"c.dwg"] = L"tf:c.dwg#1";
+    EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg"));
+    EXPECT_THAT(modified(compare()), ElementsAre("b.dwg", "c.dwg"));
 }
 
 TEST_F(Compare, ComparesNamesExactly)
 {
     commit("a.dwg");
-    committed_.back().path = L"A.dwg";
+    auto node = committed_.extract(L"a.dwg");
+    node.key() = L"A.dwg";
+    committed_.insert(std::move(node));
     common::RepoChanges const changes = compare();
     EXPECT_THAT(untracked(changes), ElementsAre("a.dwg"));
     EXPECT_THAT(removed(changes), ElementsAre("A.dwg"));

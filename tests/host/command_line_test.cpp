@@ -25,8 +25,21 @@ Subcommands:
   unstage                     Take files out of the next commit; they stay as they are
   mv                          Rename a file or folder, and stage that
   rm                          Remove committed files, and stage that
+  commit                      Keep what is staged, removed and renamed as a new commit
+  log                         Show the history, newest first
+  show                        Show a commit and what it changed
+  diff                        Show what is different from the last commit, in detail
+  restore                     Bring files back as a commit has them
+  checkout                    Make the working folder what it was at a commit
+  switch                      Go on with the work on another branch
+  branch                      List the branches, or make one
+  tag                         List the tags, or make one
   files                       List the files that the repository keeps
   ignore                      Show the rules for names to ignore, or add one
+  projects                    List the repositories that you have made
+  verify                      Read every stored version and check it against its digest
+  gc                          Remove what no commit needs from the storage
+  export                      Write the files of a commit into a folder of their own
 
 )";
 
@@ -38,6 +51,7 @@ Positionals:
 
 Options:
   -h,--help                   Show this help and do nothing else
+  --server FOLDER             Where the history is kept; by default 'tav/server' in your folder for data
 
 )";
 

@@ -27,9 +27,9 @@ TEST_F(Init, MakesTheCurrentFolderARepository)
     place.write("plan.dwg", "plan");
     EXPECT_EQ(tav({"init"}), done("Made a repository in '.'.\n"));
     EXPECT_THAT(
-        place.list(),
-        ElementsAre(
-            ".tav/", ".tav/properties/", ".tav/properties/ignore", ".tav/tav.lock", ".tav/tav.state", "plan.dwg"));
+        place.list(), ElementsAre(
+                          ".tav/", ".tav/properties/", ".tav/properties/ignore", ".tav/tav.db", ".tav/tav.lock",
+                          ".tav/tav.state", "plan.dwg"));
     EXPECT_EQ(place.read(".tav/properties/ignore"), kDefaultRules);
     EXPECT_EQ(place.read(".tav/tav.state"), kFreshState);
     EXPECT_EQ(place.read("plan.dwg"), "plan");

@@ -1,3 +1,6 @@
+#include "host/repository/local_database.h"
+#include "host/text/wide.h"
+
 #include "tests/host/tav_test.h"
 
 #include "common/mu_common_versions.h"
@@ -12,24 +15,21 @@ namespace {
 /// Runs the commands on a last commit that is not empty.
 class OnCommit : public TavTest {
 protected:
-    Outcome tav(Arguments const& arguments, std::string const& folder = {}) const
-    {
-        Setting onCommit = setting();
-        onCommit.program = TAV_ON_COMMIT_PROGRAM;
-        onCommit.folder = folder.empty() ? repo.path() : folder;
-        return run(onCommit, arguments);
-    }
-
     /// Writes files and makes them those of the last commit, beside the ones that are.
     void commit(std::initializer_list<std::string_view> names)
     {
+        tav::LocalDatabase database = tav::LocalDatabase::make(repo.root());
         for (std::string_view const name : names) {
             std::string const content = "committed " + std::string(name);
             repo.write(name, content);
-            commit_ += "po#" + generateSha(content.data(), static_cast<int>(content.size())).ansi_str() + " ";
-            commit_.append(name).append("\n");
+            OdString const digest = generateSha(content.data(), static_cast<int>(content.size()));
+            files_.push_back({tav::wide(name), L"po:" + digest, OdString()});
+            database.addContent(L"po:" + digest, digest, content.size());
         }
-        repo.write(".tav/last_commit", commit_);
+        ++number_;
+        OdString const hash = OdString().format(L"%064d", number_);
+        database.commits().add({number_, hash, L"ann", L"drawn", 0, {}}, files_);
+        database.setBase(hash);
     }
 
     void remove(std::string_view name) const { ASSERT_EQ(unlink(repo.pathTo(name).c_str()), 0); }
@@ -49,7 +49,8 @@ protected:
     }
 
 private:
-    std::string commit_;
+    std::vector<tav::FileRecord> files_;
+    int number_ = 0;
 };
 
 using StatusOnCommit = OnCommit;
@@ -84,7 +85,9 @@ New, not staged:
 
 )");
     EXPECT_EQ(tav({"status", "--json"}), done(R"({
+    "at_end" : true,
     "branch" : "master",
+    "commit" : 1,
     "conflicts" : [
     ],
     "modified" : [
@@ -94,6 +97,8 @@ New, not staged:
     "removed" : [
         "plans/r1.dwg",
         "r2.dwg"
+    ],
+    "renamed" : [
     ],
     "staged" : [
     ],
@@ -114,13 +119,9 @@ TEST_F(StatusOnCommit, ShowsARenamedFileOnce)
 
 )");
     tav({"unstage", "b.dwg"});
-    EXPECT_EQ(status(), R"(Removed:
+    EXPECT_EQ(status(), R"(Renamed:
   (the next commit takes these without staging)
-        removed:  a.dwg
-
-New, not staged:
-  (use 'tav add NAME' or 'tav add --all' to stage)
-        b.dwg
+        renamed:  a.dwg -> b.dwg
 
 )");
 }
@@ -223,7 +224,7 @@ TEST_F(RmOnCommit, RemovesFilesAndStagesThat)
 {
     commit({"a.dwg", "plans/b.dwg", "plans/roof.dwg", "c.dwg"});
     EXPECT_EQ(
-        tav({"rm", "../a.dwg", "b.dwg", "oof"}, repo.pathTo("plans")),
+        tavIn(repo.pathTo("plans"), {"rm", "../a.dwg", "b.dwg", "oof"}),
         done("Removed 3 files; the next commit takes that.\n"));
     EXPECT_EQ(filesOfTheUser(), (std::vector<std::string>{"c.dwg", "plans/"}));
     EXPECT_EQ(status(), R"(Staged for the next commit:

@@ -1,5 +1,7 @@
 #include "tests/host/run_tav.h"
 
+#include "tests/support/temp_folder.h"
+
 #include <array>
 #include <cerrno>
 #include <csignal>
@@ -60,6 +62,9 @@ void take(Setting const& setting, int out, int err)
     moveTo(err, STDERR_FILENO);
     require(setting.folder.empty() || chdir(setting.folder.c_str()) == 0, "chdir");
     require(unsetenv("NO_COLOR") == 0, "unsetenv");
+    require(setenv("HOME", home().c_str(), 1) == 0, "setenv");
+    require(setenv("XDG_DATA_HOME", (home() + "/data").c_str(), 1) == 0, "setenv");
+    require(setenv("XDG_CONFIG_HOME", (home() + "/config").c_str(), 1) == 0, "setenv");
     for (std::string const& variable : setting.environment) {
         std::size_t const end = variable.find('=');
         require(setenv(variable.substr(0, end).c_str(), variable.substr(end + 1).c_str(), 1) == 0, "setenv");
@@ -104,6 +109,12 @@ void readBoth(int out, int err, Outcome& outcome)
 }
 
 } // namespace
+
+std::string const& home()
+{
+    static support::TempFolder const folder;
+    return folder.path();
+}
 
 bool operator==(Outcome const& a, Outcome const& b)
 {
@@ -155,6 +166,7 @@ void Process::start(Setting const& setting, std::function<int()> const& body)
     Channel const out = setting.isOnTerminal ? makeTerminal() : makePipe();
     Channel const err = setting.isOnTerminal ? makeTerminal() : makePipe();
     std::fflush(nullptr);
+    home(); // Made here, so that the child does not take it away.
     child_ = fork();
     require(child_ != -1, "fork");
     if (child_ == 0) {

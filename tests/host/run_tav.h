@@ -26,6 +26,10 @@ Outcome failed(std::string const& err);
 Outcome misused(std::string const& err);
 ///@}
 
+/// The home folder of every process that is run, which also holds the server and the list of projects: "data" and
+/// "config" in it. It lives as long as the test program.
+std::string const& home();
+
 /// The surroundings of a process.
 struct Setting {
     std::string folder = "/";             ///< the current folder

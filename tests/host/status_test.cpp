@@ -11,12 +11,16 @@ TEST_F(Status, SaysThatNothingHasChanged)
 {
     EXPECT_EQ(tav({"status"}), done("On branch master\n\nNothing has changed since the last commit.\n"));
     EXPECT_EQ(tav({"status", "--json"}), done(R"({
+    "at_end" : true,
     "branch" : "master",
+    "commit" : 0,
     "conflicts" : [
     ],
     "modified" : [
     ],
     "removed" : [
+    ],
+    "renamed" : [
     ],
     "staged" : [
     ],
@@ -89,7 +93,9 @@ Ignored:
 TEST_F(StatusOfEverything, IsADocumentForPrograms)
 {
     EXPECT_EQ(tav({"status", "--json", "--ignored"}), done(R"({
+    "at_end" : true,
     "branch" : "north wing",
+    "commit" : 0,
     "conflicts" : [
         {
             "base" : "",
@@ -109,6 +115,8 @@ TEST_F(StatusOfEverything, IsADocumentForPrograms)
     "modified" : [
     ],
     "removed" : [
+    ],
+    "renamed" : [
     ],
     "staged" : [
         {

@@ -1,0 +1,121 @@
+#include "host/cli/commands.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/repository/commit_names.h"
+#include "host/repository/open.h"
+#include "host/repository/references.h"
+#include "host/repository/work.h"
+#include "host/repository/working_state.h"
+#include "host/text/wide.h"
+
+#include <memory>
+#include <string>
+
+namespace tav {
+
+namespace {
+
+struct Options {
+    std::string name;
+    std::string commit;
+    bool json = false;
+};
+
+struct Kind {
+    char const* name; ///< of the command, and of what it makes
+    common::EType type;
+};
+
+constexpr Kind kBranch = {"branch", common::EType::branch};
+constexpr Kind kTag = {"tag", common::EType::tag};
+
+struct Listed {
+    OdString name;
+    CommitRecord commit;
+    bool isCurrent;
+};
+
+std::vector<Listed> listOf(common::RootPath const& root, LocalDatabase const& database, common::EType type)
+{
+    OdString const current = readState(root)->read().head;
+    std::vector<Listed> list;
+    for (common::Reference const& reference : database.commits().references()) {
+        auto commit = database.commits().find(reference.commitHash);
+        if (reference.type == type && commit) {
+            bool const isCurrent = type == common::EType::branch && reference.name == current;
+            list.push_back({reference.name, std::move(*commit), isCurrent});
+        }
+    }
+    return list;
+}
+
+void printDocument(std::vector<Listed> const& list, Kind const& kind)
+{
+    kutils::json::Array array;
+    for (Listed const& item : list) {
+        kutils::json::Object object;
+        object[L"name"] = jsonText(item.name);
+        object[L"commit"] = item.commit.number;
+        object[L"hash"] = jsonText(item.commit.hash);
+        if (kind.type == common::EType::branch) {
+            object[L"current"] = item.isCurrent;
+        }
+        array.emplace_back(std::move(object));
+    }
+    printJson(std::move(array));
+}
+
+void list(Options const& options, Kind const& kind)
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    std::vector<Listed> const items = listOf(root, database, kind.type);
+    if (options.json) {
+        printDocument(items, kind);
+        return;
+    }
+    for (Listed const& item : items) {
+        std::string const line = shown(item.name) + "  (commit " + std::to_string(item.commit.number) + ")";
+        print(item.isCurrent ? coloured(Colour::green, "* " + line) + "\n" : "  " + line + "\n");
+    }
+}
+
+void make(Options const& options, Kind const& kind)
+{
+    Work work(openRepository(""), kind.name);
+    CommitRecord const commit = findCommit(work.database(), options.commit);
+    makeReference(work.database(), {wide(options.name), commit.hash, kind.type});
+    print(
+        std::string("Made the ") + kind.name + " '" + shown(wide(options.name)) + "' at commit " +
+        std::to_string(commit.number) + ".\n");
+}
+
+void addReferences(CLI::App& app, Kind const& kind, char const* description)
+{
+    CLI::App* const command = app.add_subcommand(kind.name, description);
+    auto const options = std::make_shared<Options>();
+    CLI::Option* const name = command->add_option("NAME", options->name, "Name of a new one; without it, list them");
+    command->add_option("COMMIT", options->commit, "Where it begins; by default where you are")->needs(name);
+    command->add_flag("--json", options->json, "Print a document for programs")->excludes(name);
+    command->callback([options, name, &kind] {
+        if (name->count() > 0) {
+            make(*options, kind);
+        } else {
+            list(*options, kind);
+        }
+    });
+}
+
+} // namespace
+
+void addBranch(CLI::App& app)
+{
+    addReferences(app, kBranch, "List the branches, or make one");
+}
+
+void addTag(CLI::App& app)
+{
+    addReferences(app, kTag, "List the tags, or make one");
+}
+
+} // namespace tav

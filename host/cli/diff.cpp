@@ -1,0 +1,184 @@
+#include "host/cli/commands.h"
+#include "host/cli/commit_output.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/repository/digest.h"
+#include "host/repository/line_diff.h"
+#include "host/repository/names.h"
+#include "host/repository/open.h"
+#include "host/repository/working_changes.h"
+#include "host/storage/local_storage.h"
+#include "host/text/wide.h"
+
+#include "platform/os/os_files.h"
+
+#include <filesystem>
+#include <memory>
+#include <set>
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace tav {
+
+namespace {
+
+struct Options {
+    std::vector<std::string> names;
+    bool json = false;
+};
+
+/// A content on one side of a difference.
+struct Side {
+    std::optional<std::uint64_t> size;
+    std::optional<OdString> sha256;
+};
+
+struct Compared {
+    WorkingChange change;
+    Side before;
+    Side after;
+};
+
+Side workingSide(WorkingChange const& change, common::RootPath const& root)
+{
+    if (change.change == common::FileChange::removed) {
+        return {};
+    }
+    std::error_code error;
+    auto const size = std::filesystem::file_size(root.pathTo(change.path).ansi_str(), error);
+    return {error ? std::nullopt : std::optional<std::uint64_t>(size), fileDigest(root.pathTo(change.path))};
+}
+
+Compared compared(WorkingChange const& change, common::RootPath const& root, LocalDatabase const& database)
+{
+    return {change, {database.sizeOf(change.oldUrl), digestOf(change.oldUrl)}, workingSide(change, root)};
+}
+
+std::vector<WorkingChange>
+chosen(std::vector<WorkingChange> changes, std::vector<std::string> const& names, common::RootPath const& root)
+{
+    if (names.empty()) {
+        return changes;
+    }
+    std::vector<common::StagedFile> all;
+    for (WorkingChange const& change : changes) {
+        all.emplace_back(change.path, change.change);
+    }
+    NameFinder const finder(all, root);
+    std::set<OdString> paths;
+    for (std::string const& name : names) {
+        for (common::StagedFile const& file : finder.find(name)) {
+            paths.insert(file.path);
+        }
+    }
+    std::vector<WorkingChange> found;
+    for (WorkingChange& change : changes) {
+        if (paths.count(change.path) > 0) {
+            found.push_back(std::move(change));
+        }
+    }
+    return found;
+}
+
+void addSide(Side const& side, wchar_t const* size, wchar_t const* digest, kutils::json::Object& object)
+{
+    if (side.size) {
+        object[size] = *side.size;
+    }
+    if (side.sha256) {
+        object[digest] = jsonText(*side.sha256);
+    }
+}
+
+kutils::json::Object documentOf(Compared const& file)
+{
+    kutils::json::Object object;
+    object[L"path"] = jsonText(file.change.path);
+    object[L"change"] = jsonText(valueOrFail(common::toString(file.change.change), ""));
+    if (!file.change.previousPath.isEmpty()) {
+        object[L"previous"] = jsonText(file.change.previousPath);
+    }
+    addSide(file.before, L"old_size", L"old_sha256", object);
+    addSide(file.after, L"size", L"sha256", object);
+    return object;
+}
+
+bool mayBeText(Compared const& file)
+{
+    bool const areShort =
+        file.before.size && file.after.size && *file.before.size <= kLongestText && *file.after.size <= kLongestText;
+    return areShort && file.before.sha256 != file.after.sha256 &&
+           common::fileToType(file.change.path) == common::StorageType::Object;
+}
+
+std::optional<std::string> linesOf(Compared const& file, common::RootPath const& root)
+{
+    if (!mayBeText(file)) {
+        return std::nullopt;
+    }
+    std::string before;
+    std::string after;
+    LocalStorage storage;
+    auto const keep = [&](char const* bytes, std::size_t count) { return before.append(bytes, count), true; };
+    bool const isRead = storage.read(root, file.change.oldUrl, keep).hasValue() &&
+                        !os::readFile(root.pathTo(file.change.path).ansi_str(), after);
+    return isRead ? lineDiff(before, after) : std::nullopt;
+}
+
+void printLines(std::string const& text)
+{
+    std::istringstream lines(text);
+    for (std::string line; std::getline(lines, line);) {
+        Colour const colour = line[0] == '+' ? Colour::green : line[0] == '-' ? Colour::red : Colour::none;
+        print("    " + coloured(colour, shown(wide(line))) + "\n");
+    }
+}
+
+void printForPeople(Compared const& file, common::RootPath const& root)
+{
+    std::string const sizes = sizesText(file.before.size, file.after.size);
+    print(
+        changeLine(file.change.change, file.change.path, file.change.previousPath) +
+        (sizes.empty() ? "" : " (" + sizes + ")") + "\n");
+    if (file.before.sha256 && file.before.sha256 != file.after.sha256) {
+        print("    old  " + file.before.sha256->ansi_str() + "\n");
+    }
+    if (file.after.sha256 && file.before.sha256 != file.after.sha256) {
+        print("    new  " + file.after.sha256->ansi_str() + "\n");
+    }
+    if (auto const lines = linesOf(file, root)) {
+        printLines(*lines);
+    }
+}
+
+void showDifferences(Options const& options)
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    kutils::json::Array array;
+    for (WorkingChange const& change : chosen(workingChanges(root, database), options.names, root)) {
+        Compared const file = compared(change, root, database);
+        if (options.json) {
+            array.emplace_back(documentOf(file));
+        } else {
+            printForPeople(file, root);
+        }
+    }
+    if (options.json) {
+        printJson(std::move(array));
+    }
+}
+
+} // namespace
+
+void addDiff(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("diff", "Show what is different from the last commit, in detail");
+    auto const options = std::make_shared<Options>();
+    command->add_option("NAME", options->names, "Paths of files or folders, or a part of a path; by default all");
+    command->add_flag("--json", options->json, "Print a document for programs");
+    command->callback([options] { showDifferences(*options); });
+}
+
+} // namespace tav

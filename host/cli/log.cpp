@@ -1,0 +1,87 @@
+#include "host/cli/commands.h"
+#include "host/cli/commit_output.h"
+#include "host/cli/output.h"
+#include "host/repository/commit_names.h"
+#include "host/repository/open.h"
+#include "host/repository/work.h"
+#include "host/text/wide.h"
+
+#include "common/mu_common_history.h"
+
+#include <algorithm>
+#include <memory>
+#include <string>
+
+namespace tav {
+
+namespace {
+
+struct Options {
+    std::string start;
+    std::size_t count = 0;
+    bool json = false;
+};
+
+common::HistoryItem itemOf(CommitRecord const& commit)
+{
+    OdTimeStamp date;
+    date.setPackedValue(commit.date);
+    std::string const message = commit.message.ansi_str();
+    OdString const title = wide(message.substr(0, message.find('\n')));
+    return {date, commit.author, title, commit.hash, static_cast<int>(commit.number)};
+}
+
+std::string linesOf(common::HistoryItem const& item)
+{
+    std::string const number = std::to_string(item.number);
+    std::string const indent(number.size() + 2, ' ');
+    std::string const info = item.getInfo().toStdString();
+    return number + "  " + shown(wide(item.getName().toStdString())) + "\n" + indent + shown(wide(info)) + "\n";
+}
+
+void printDocument(std::vector<CommitRecord> const& commits)
+{
+    kutils::json::Array array;
+    for (CommitRecord const& commit : commits) {
+        array.emplace_back(documentOf(commit));
+    }
+    printJson(std::move(array));
+}
+
+void showLog(Options const& options)
+{
+    LocalDatabase const database = LocalDatabase::open(openRepository(""));
+    if (std::string const unfinished = noteOnUnfinished(database); !unfinished.empty()) {
+        printNote(unfinished);
+    }
+    std::vector<CommitRecord> commits =
+        database.commits().history(options.start.empty() ? database.base() : findCommit(database, options.start).hash);
+    if (options.count > 0 && commits.size() > options.count) {
+        commits.resize(options.count);
+    }
+    if (options.json) {
+        printDocument(commits);
+        return;
+    }
+    for (CommitRecord const& commit : commits) {
+        print(linesOf(itemOf(commit)));
+    }
+    if (commits.empty()) {
+        print("There is no commit yet.\n");
+    }
+}
+
+} // namespace
+
+void addLog(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("log", "Show the history, newest first");
+    auto const options = std::make_shared<Options>();
+    command->add_option(
+        "COMMIT", options->start, "Number, hash, branch or tag to begin with; by default where you are");
+    command->add_option("-n,--count", options->count, "Show so many commits at most")->type_name("COUNT");
+    command->add_flag("--json", options->json, "Print a document for programs");
+    command->callback([options] { showLog(*options); });
+}
+
+} // namespace tav

@@ -1,0 +1,98 @@
+#include "host/cli/commands.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/repository/commit_names.h"
+#include "host/repository/names.h"
+#include "host/repository/open.h"
+#include "host/repository/staging.h"
+#include "host/repository/work.h"
+#include "host/repository/working_state.h"
+#include "host/repository/working_tree.h"
+#include "host/text/wide.h"
+
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace tav {
+
+namespace {
+
+struct Options {
+    std::vector<std::string> names;
+    std::string commit;
+    bool force = false;
+};
+
+Tree chosenFiles(Options const& options, Tree const& files, CommitRecord const& commit, common::RootPath const& root)
+{
+    std::vector<common::StagedFile> all;
+    for (auto const& [path, url] : files) {
+        all.emplace_back(path, common::FileChange::added);
+    }
+    NameFinder const finder(all, root);
+    Tree chosen;
+    for (std::string const& name : options.names) {
+        std::vector<common::StagedFile> const found = finder.find(name);
+        if (found.empty()) {
+            throw Failure(
+                "No file of commit " + std::to_string(commit.number) + " matches '" + name + "'.",
+                "Name another one with --from, or run 'tav log' to see the commits.");
+        }
+        for (common::StagedFile const& file : found) {
+            chosen.emplace(file.path, files.at(file.path));
+        }
+    }
+    return chosen;
+}
+
+/// Files that are now as the last commit has them are no changes any more.
+void enterFiles(Tree const& files, Tree const& base, WrittenTimes const& times, common::State& state)
+{
+    std::vector<common::StagedFile> unchanged;
+    for (auto const& [path, url] : files) {
+        auto const committed = base.find(path);
+        auto const time = times.find(path);
+        if (committed == base.end() || committed->second != url) {
+            state.index.erase(path);
+            continue;
+        }
+        if (time != times.end()) {
+            state.index.insert_or_assign(path, common::IndexData{time->second, false});
+        }
+        unchanged.emplace_back(path, common::FileChange::modified);
+    }
+    unstage(unchanged, state);
+}
+
+void restoreFiles(Options const& options)
+{
+    Work work(openRepository(""), "restore");
+    common::RootPath const& root = work.root();
+    CommitRecord const commit = findCommit(work.database(), options.commit);
+    Tree const files = chosenFiles(options, work.database().commits().files(commit.hash), commit, root);
+    Tree const base = work.database().commits().files(work.database().base());
+    TreeUpdate update{files, {}};
+    checkUpdate(root, work.database(), base, options.force ? Unsaved::mayGo : Unsaved::isKept, update);
+    LocalStorage storage;
+    WrittenTimes const times = carryOut(root, storage, update, work.start());
+    changeState(root, [&](common::Cache& cache) { enterFiles(files, base, times, cache.write()); });
+    print(
+        counted(files.size(), "file") + " as in commit " + std::to_string(commit.number) + ", " +
+        std::to_string(update.writes.size()) + " written.\n");
+}
+
+} // namespace
+
+void addRestore(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("restore", "Bring files back as a commit has them");
+    auto const options = std::make_shared<Options>();
+    command->add_option("NAME", options->names, "Paths of files or folders, or a part of a path")->required();
+    command->add_option("--from", options->commit, "Number, hash, branch or tag; by default where you are")
+        ->type_name("COMMIT");
+    command->add_flag("--force", options->force, "Overwrite changes that are in no commit");
+    command->callback([options] { restoreFiles(*options); });
+}
+
+} // namespace tav

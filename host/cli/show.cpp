@@ -1,0 +1,122 @@
+#include "host/cli/commands.h"
+#include "host/cli/commit_output.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/repository/commit_names.h"
+#include "host/repository/open.h"
+#include "host/storage/storage_url.h"
+#include "host/text/wide.h"
+
+#include <memory>
+#include <sstream>
+#include <string>
+
+namespace tav {
+
+namespace {
+
+struct Options {
+    std::string commit;
+    bool json = false;
+};
+
+void addVersion(
+    OdString const& url, LocalDatabase const& database, wchar_t const* size, wchar_t const* digest,
+    kutils::json::Object& object)
+{
+    if (url.isEmpty()) {
+        return;
+    }
+    if (auto const bytes = database.sizeOf(url)) {
+        object[size] = *bytes;
+    }
+    if (auto const sha256 = digestOf(url)) {
+        object[digest] = jsonText(*sha256);
+    }
+}
+
+kutils::json::Array documentOf(std::vector<CommittedChange> const& changes, LocalDatabase const& database)
+{
+    kutils::json::Array array;
+    for (CommittedChange const& change : changes) {
+        kutils::json::Object object;
+        object[L"path"] = jsonText(change.path);
+        object[L"change"] = jsonText(valueOrFail(common::toString(change.change), ""));
+        if (!change.previousPath.isEmpty()) {
+            object[L"previous"] = jsonText(change.previousPath);
+        }
+        addVersion(change.oldUrl, database, L"old_size", L"old_sha256", object);
+        addVersion(change.url, database, L"size", L"sha256", object);
+        array.emplace_back(std::move(object));
+    }
+    return array;
+}
+
+std::string namesOf(CommitRecord const& commit, LocalDatabase const& database)
+{
+    std::string names;
+    for (common::Reference const& reference : database.commits().references()) {
+        if (reference.commitHash == commit.hash) {
+            names += (names.empty() ? " (" : ", ") + shown(reference.name);
+        }
+    }
+    return names.empty() ? names : names + ")";
+}
+
+void printMessage(OdString const& message)
+{
+    std::istringstream lines(message.ansi_str());
+    print("\n");
+    for (std::string line; std::getline(lines, line);) {
+        print("    " + shown(wide(line)) + "\n");
+    }
+    print("\n");
+}
+
+std::string sizesOf(CommittedChange const& change, LocalDatabase const& database)
+{
+    std::string const sizes = sizesText(database.sizeOf(change.oldUrl), database.sizeOf(change.url));
+    return sizes.empty() ? sizes : " (" + sizes + ")";
+}
+
+void printForPeople(
+    CommitRecord const& commit, std::vector<CommittedChange> const& changes, LocalDatabase const& database)
+{
+    print("Commit " + std::to_string(commit.number) + namesOf(commit, database) + "\n");
+    print("Hash:   " + commit.hash.ansi_str() + "\n");
+    print("Author: " + shown(commit.author) + "\n");
+    print("Date:   " + dateText(commit.date) + "\n");
+    printMessage(commit.message);
+    for (CommittedChange const& change : changes) {
+        print(
+            "        " + changeLine(change.change, change.path, change.previousPath) + sizesOf(change, database) +
+            "\n");
+    }
+}
+
+void showCommit(Options const& options)
+{
+    LocalDatabase const database = LocalDatabase::open(openRepository(""));
+    CommitRecord const commit = findCommit(database, options.commit);
+    std::vector<CommittedChange> const changes = committedChanges(database.commits(), commit);
+    if (!options.json) {
+        printForPeople(commit, changes, database);
+        return;
+    }
+    kutils::json::Object document = documentOf(commit);
+    document[L"changes"] = documentOf(changes, database);
+    printJson(std::move(document));
+}
+
+} // namespace
+
+void addShow(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("show", "Show a commit and what it changed");
+    auto const options = std::make_shared<Options>();
+    command->add_option("COMMIT", options->commit, "Number, hash, branch or tag; by default where you are");
+    command->add_flag("--json", options->json, "Print a document for programs");
+    command->callback([options] { showCommit(*options); });
+}
+
+} // namespace tav

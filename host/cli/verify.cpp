@@ -1,0 +1,90 @@
+#include "host/cli/commands.h"
+#include "host/cli/output.h"
+#include "host/failure.h"
+#include "host/progress.h"
+#include "host/repository/local_database.h"
+#include "host/repository/open.h"
+#include "host/storage/local_storage.h"
+#include "host/text/wide.h"
+
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace tav {
+
+namespace {
+
+struct Damage {
+    OdString url;
+    OdString what;
+};
+
+std::vector<Damage> damagesOf(common::RootPath const& root, std::vector<OdString> const& urls)
+{
+    std::vector<Damage> damages;
+    LocalStorage storage;
+    Progress progress("versions", urls.size());
+    for (OdString const& url : urls) {
+        if (auto const outcome = storage.verify(root, url); !outcome.hasValue()) {
+            damages.push_back({url, outcome.error().message});
+        }
+        progress.advance();
+    }
+    return damages;
+}
+
+void printDocument(std::size_t count, std::vector<Damage> const& damages)
+{
+    kutils::json::Array array;
+    for (Damage const& damage : damages) {
+        kutils::json::Object object;
+        object[L"url"] = jsonText(damage.url);
+        object[L"problem"] = jsonText(damage.what);
+        array.emplace_back(std::move(object));
+    }
+    kutils::json::Object document;
+    document[L"versions"] = static_cast<std::uint64_t>(count);
+    document[L"damaged"] = std::move(array);
+    printJson(std::move(document));
+}
+
+void verifyAll(bool json)
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase database = LocalDatabase::open(root);
+    if (std::string const damage = database.database().damage(); !damage.empty()) {
+        throw Failure(
+            "The database '" + database.database().path() + "' is damaged: " + damage + ".",
+            "Put a copy of it from a backup in its place.");
+    }
+    std::vector<OdString> const urls = database.commits().urls();
+    std::vector<Damage> const damages = damagesOf(root, urls);
+    if (json) {
+        printDocument(urls.size(), damages);
+    } else if (damages.empty()) {
+        print("Read " + counted(urls.size(), "stored version") + "; nothing is damaged.\n");
+    }
+    if (!damages.empty()) {
+        Failure failure(
+            std::to_string(damages.size()) + " of " + counted(urls.size(), "stored version") + " cannot be read.",
+            "Put copies of the files below '.tav' from a backup in their place:");
+        for (Damage const& damage : damages) {
+            failure.details.push_back(damage.what.ansi_str());
+        }
+        throw failure;
+    }
+}
+
+} // namespace
+
+void addVerify(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("verify", "Read every stored version and check it against its digest");
+    auto const json = std::make_shared<bool>(false);
+    command->add_flag("--json", *json, "Print a document for programs");
+    command->callback([json] { verifyAll(*json); });
+}
+
+} // namespace tav

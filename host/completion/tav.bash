@@ -1,0 +1,136 @@
+# shellcheck shell=bash
+# Completion of tav for bash: commands, options, files, branches and tags. Sourced when somebody first types "tav" and
+# presses the tabulator, from share/bash-completion/completions/tav.
+
+# Runs tav on the repository that the line names with -C, for what it knows.
+_tav_ask() {
+    tav ${folder:+-C "$folder"} "$@" 2>/dev/null
+}
+
+# The texts of a member of the document on standard input. Names with other escapes than these are left out.
+_tav_texts() { # MEMBER
+    sed -n 's/^ *"'"$1"'" : "\(.*\)",\{0,1\}$/\1/p' | _tav_unescaped
+}
+
+_tav_unescaped() {
+    sed '/\\[^"\\]/d; s/\\\(["\\]\)/\1/g'
+}
+
+# The paths in lists of `tav status --json`.
+_tav_paths() { # LIST...
+    local list document
+    document=$(_tav_ask status --json)
+    for list; do
+        printf '%s\n' "$document" | sed -n '/^    "'"$list"'" : \[$/,/^    \]/p' |
+            sed -n 's/^        \(    "path" : \)\{0,1\}"\(.*\)",\{0,1\}$/\2/p' | _tav_unescaped
+    done
+}
+
+_tav_references() { # branch | tag
+    local kind
+    for kind; do
+        _tav_ask "$kind" --json | _tav_texts name
+    done
+}
+
+# Offers the lines of standard input that begin as the current word does.
+_tav_offer() {
+    local line typed=$current
+    case $typed in
+        [\"\']*) typed=${typed:1} ;;
+        *) typed=${typed//\\/} ;;
+    esac
+    while IFS= read -r line; do
+        [[ $line != "$typed"* ]] || COMPREPLY+=("$line")
+    done
+}
+
+_tav_offer_words() {
+    mapfile -t COMPREPLY < <(compgen -W "$*" -- "$current")
+}
+
+_tav_offer_files() { # as compgen: -f, files and folders; -d, folders
+    compopt -o filenames
+    _tav_offer < <(cd -- "${folder:-.}" 2>/dev/null && compgen "$1" -- "${current//\\/}")
+}
+
+_tav_offer_paths() { # LIST...
+    compopt -o filenames
+    _tav_offer < <(_tav_paths "$@")
+}
+
+_tav_options() { # COMMAND
+    case $1 in
+        init) printf '%s\n' --server ;;
+        status) printf '%s\n' --ignored --json ;;
+        add | unstage) printf '%s\n' --all ;;
+        commit) printf '%s\n' -m --message --author ;;
+        log) printf '%s\n' -n --count --json ;;
+        restore) printf '%s\n' --from --force ;;
+        checkout | switch) printf '%s\n' --force ;;
+        files) printf '%s\n' --hash --json ;;
+        ignore) printf '%s\n' --add --json ;;
+        show | diff | branch | tag | projects | verify) printf '%s\n' --json ;;
+    esac
+    printf '%s\n' -h --help
+}
+
+# Completes the value of the option before it, and says whether there is one.
+_tav_value() { # COMMAND OPTION
+    case $1:$2 in
+        :-C | init:--server) _tav_offer_files -d ;;
+        restore:--from) _tav_offer < <(_tav_references branch tag) ;;
+        commit:-m | commit:--message | commit:--author | log:-n | log:--count | ignore:--add) ;;
+        *) return 1 ;;
+    esac
+}
+
+_tav_argument() { # COMMAND NUMBER, which begins with 1
+    case $1:$2 in
+        add:*) _tav_offer_paths modified untracked ;;
+        unstage:*) _tav_offer_paths staged ;;
+        diff:*) _tav_offer_paths modified untracked removed staged renamed ;;
+        restore:*)
+            _tav_offer_files -f
+            _tav_offer < <(_tav_paths modified removed)
+            ;;
+        mv:[12] | rm:*) _tav_offer_files -f ;;
+        init:1 | files:1 | export:2) _tav_offer_files -d ;;
+        switch:1) _tav_offer < <(_tav_references branch) ;;
+        log:1 | show:1 | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
+    esac
+}
+
+_tav() {
+    local commands='init status add unstage mv rm commit log show diff restore checkout switch branch tag files ignore
+        projects verify gc export'
+    local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
+    local command='' folder='' number=1 word i
+    COMPREPLY=()
+    for ((i = 1; i < COMP_CWORD; ++i)); do
+        word=${COMP_WORDS[i]}
+        case $command:$word in
+            :-C) ((++i == COMP_CWORD)) || folder=${COMP_WORDS[i]//[\\\"\']/} ;;
+            :-*) ;;
+            :*) command=$word ;;
+            commit:-m | commit:--message | commit:--author | log:-n | log:--count) ((++i)) ;;
+            ignore:--add | restore:--from | init:--server) ((++i)) ;;
+            *:-*) ;;
+            *) ((++number)) ;;
+        esac
+    done
+    [[ $folder != \~ && $folder != \~/* ]] || folder=$HOME${folder:1}
+    ((COMP_CWORD > 1)) && _tav_value "$command" "$previous" && return
+    if [[ -z $command && $current == -* ]]; then
+        _tav_offer_words -C -h --help
+    elif [[ -z $command ]]; then
+        _tav_offer_words "$commands"
+    elif [[ $current == -* ]]; then
+        _tav_offer < <(_tav_options "$command")
+    else
+        _tav_argument "$command" "$number"
+    fi
+    return 0
+}
+
+complete -F _tav tav

@@ -1,0 +1,123 @@
+# Completion of tav for fish: commands, options, files, branches and tags.
+
+set -l commands init status add unstage mv rm commit log show diff restore checkout switch branch tag files ignore \
+    projects verify gc export
+
+# Runs tav on the repository that the line names with -C, for what it knows.
+function __tav_ask
+    set -l words (commandline -opc)
+    set -l folder
+    for i in (seq 2 (count $words))
+        if test "$words[$i]" = -C; and test $i -lt (count $words)
+            set folder -C (string replace -r '^~(?=$|/)' $HOME -- $words[(math $i + 1)])
+        end
+    end
+    command tav $folder $argv 2>/dev/null
+end
+
+# Names with other escapes than these are left out. At the head of a function, string does not read its input.
+function __tav_unescaped
+    cat | string match -rv '\\\\[^"\\\\]' | string replace -ra '\\\\(["\\\\])' '$1'
+end
+
+# The paths in lists of `tav status --json`.
+function __tav_paths
+    __tav_ask status --json | while read -l line
+        if string match -qr '^    "' -- $line
+            set list (string replace -rf '^    "([a-z_]*)" : \[$' '$1' -- $line)
+        else if contains -- "$list" $argv
+            string replace -rf '^        (?:    "path" : )?"(.*)",?$' '$1' -- $line
+        end
+    end | __tav_unescaped
+end
+
+function __tav_references
+    for kind in $argv
+        __tav_ask $kind --json | string replace -rf '^ *"name" : "(.*)",?$' '$1' | __tav_unescaped
+    end
+end
+
+# Whether the line has that many arguments behind its command.
+function __tav_arguments
+    set -l words (commandline -opc)
+    set -l count 0
+    for i in (seq (count $words))
+        if contains -- $words[$i] $argv[2..-1]
+            set count 0
+        else if not string match -q -- '-*' $words[$i]
+            set count (math $count + 1)
+        end
+    end
+    test $count -eq $argv[1]
+end
+
+complete -c tav -f
+complete -c tav -s h -l help -d 'Show this help and do nothing else'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -s C -x -a '(__fish_complete_directories)' \
+    -d 'Work as if started in FOLDER'
+
+function __tav_command
+    complete -c tav -n "not __fish_seen_subcommand_from $argv[3..-1]" -a $argv[1] -d $argv[2]
+end
+__tav_command init 'Make a folder of drawings a repository, or complete one' $commands
+__tav_command status 'Show what has changed and what is staged' $commands
+__tav_command add 'Stage changed and new files for the next commit' $commands
+__tav_command unstage 'Take files out of the next commit' $commands
+__tav_command mv 'Rename a file or folder, and stage that' $commands
+__tav_command rm 'Remove committed files, and stage that' $commands
+__tav_command commit 'Keep what is staged, removed and renamed as a new commit' $commands
+__tav_command log 'Show the history, newest first' $commands
+__tav_command show 'Show a commit and what it changed' $commands
+__tav_command diff 'Show what is different from the last commit, in detail' $commands
+__tav_command restore 'Bring files back as a commit has them' $commands
+__tav_command checkout 'Make the working folder what it was at a commit' $commands
+__tav_command switch 'Go on with the work on another branch' $commands
+__tav_command branch 'List the branches, or make one' $commands
+__tav_command tag 'List the tags, or make one' $commands
+__tav_command files 'List the files that the repository keeps' $commands
+__tav_command ignore 'Show the rules for names to ignore, or add one' $commands
+__tav_command projects 'List the repositories that you have made' $commands
+__tav_command verify 'Read every stored version and check it against its digest' $commands
+__tav_command gc 'Remove what no commit needs from the storage' $commands
+__tav_command export 'Write the files of a commit into a folder of their own' $commands
+functions -e __tav_command
+
+complete -c tav -n '__fish_seen_subcommand_from init' -l server -x -a '(__fish_complete_directories)' -d 'Where the history is kept'
+complete -c tav -n '__fish_seen_subcommand_from init' -a '(__fish_complete_directories)'
+complete -c tav -n '__fish_seen_subcommand_from status' -l ignored -d 'Show the files that the ignore rules keep out, too'
+complete -c tav -n '__fish_seen_subcommand_from status' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from add' -l all -d 'Stage every changed and new file'
+complete -c tav -n '__fish_seen_subcommand_from add' -a '(__tav_paths modified untracked)'
+complete -c tav -n '__fish_seen_subcommand_from unstage' -l all -d 'Take every staged file out'
+complete -c tav -n '__fish_seen_subcommand_from unstage' -a '(__tav_paths staged)'
+complete -c tav -n '__fish_seen_subcommand_from mv' -F
+complete -c tav -n '__fish_seen_subcommand_from rm' -F
+complete -c tav -n '__fish_seen_subcommand_from commit' -s m -l message -x -d 'What has changed, and why'
+complete -c tav -n '__fish_seen_subcommand_from commit' -l author -x -d 'Who made it'
+complete -c tav -n '__fish_seen_subcommand_from log' -s n -l count -x -d 'Show so many commits at most'
+complete -c tav -n '__fish_seen_subcommand_from log' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from log' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from show' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from show' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from diff' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from diff' -a '(__tav_paths modified untracked removed staged renamed)'
+complete -c tav -n '__fish_seen_subcommand_from restore' -l from -x -a '(__tav_references branch tag)' -d 'The commit to take them from'
+complete -c tav -n '__fish_seen_subcommand_from restore' -l force -d 'Overwrite changes that are in no commit'
+complete -c tav -n '__fish_seen_subcommand_from restore' -F -a '(__tav_paths modified removed)'
+complete -c tav -n '__fish_seen_subcommand_from checkout' -l force -d 'Overwrite files with changes that are in no commit'
+complete -c tav -n '__fish_seen_subcommand_from checkout' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from switch' -l force -d 'Overwrite files with changes that are in no commit'
+complete -c tav -n '__fish_seen_subcommand_from switch' -a '(__tav_references branch)'
+complete -c tav -n '__fish_seen_subcommand_from branch' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from branch; and __tav_arguments 1 branch' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from tag' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from tag; and __tav_arguments 1 tag' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from files' -l hash -d 'Show the SHA-256 digest of each file'
+complete -c tav -n '__fish_seen_subcommand_from files' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from files' -a '(__fish_complete_directories)'
+complete -c tav -n '__fish_seen_subcommand_from ignore' -l add -x -d 'A regular expression for names'
+complete -c tav -n '__fish_seen_subcommand_from ignore' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from projects' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from verify' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from export; and __tav_arguments 0 export' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from export; and __tav_arguments 1 export' -a '(__fish_complete_directories)'

@@ -1,0 +1,182 @@
+#include "host/database/sqlite.h"
+
+#include "host/failure.h"
+
+#include <sqlite3.h>
+
+#include <utility>
+
+namespace tav {
+
+namespace {
+
+sqlite3* opened(std::string const& path, int flags, int& code)
+{
+    sqlite3* handle = nullptr;
+    code = sqlite3_open_v2(path.c_str(), &handle, flags, nullptr);
+    return handle;
+}
+
+std::string adviceFor(int code, std::string const& path)
+{
+    switch (code & 0xFF) {
+    case SQLITE_BUSY:
+    case SQLITE_LOCKED: return "Another program uses it; run the command again when that is done.";
+    case SQLITE_CORRUPT:
+    case SQLITE_NOTADB: return "Put a copy of it from a backup in its place.";
+    case SQLITE_FULL: return "Free some space there and run the command again; nothing has changed.";
+    default: return "Check the free space and your rights in the folder of '" + path + "'.";
+    }
+}
+
+} // namespace
+
+Statement::Statement(Database const& database, Handle handle) : database_(&database), handle_(std::move(handle)) {}
+
+Statement& Statement::with(std::int64_t value)
+{
+    int const code = sqlite3_bind_int64(handle_.get(), ++parameters_, value);
+    if (code != SQLITE_OK) {
+        database_->fail(code);
+    }
+    return *this;
+}
+
+Statement& Statement::with(OdString const& text)
+{
+    std::string const bytes = text.ansi_str();
+    int const code =
+        sqlite3_bind_text64(handle_.get(), ++parameters_, bytes.data(), bytes.size(), SQLITE_TRANSIENT, SQLITE_UTF8);
+    if (code != SQLITE_OK) {
+        database_->fail(code);
+    }
+    return *this;
+}
+
+Statement& Statement::withNull()
+{
+    int const code = sqlite3_bind_null(handle_.get(), ++parameters_);
+    if (code != SQLITE_OK) {
+        database_->fail(code);
+    }
+    return *this;
+}
+
+bool Statement::next()
+{
+    int const code = sqlite3_step(handle_.get());
+    if (code == SQLITE_ROW) {
+        return true;
+    }
+    reset();
+    if (code != SQLITE_DONE) {
+        database_->fail(code);
+    }
+    return false;
+}
+
+void Statement::run()
+{
+    while (next()) {
+    }
+}
+
+void Statement::reset()
+{
+    sqlite3_reset(handle_.get());
+    parameters_ = 0;
+}
+
+std::int64_t Statement::integer(int column) const
+{
+    return sqlite3_column_int64(handle_.get(), column);
+}
+
+OdString Statement::text(int column) const
+{
+    auto const* const bytes = reinterpret_cast<char const*>(sqlite3_column_text(handle_.get(), column));
+    auto const length = static_cast<std::size_t>(sqlite3_column_bytes(handle_.get(), column));
+    return bytes ? OdString(bytes, length, CP_UTF_8) : OdString();
+}
+
+Database::Database(std::string const& path, std::chrono::milliseconds patience)
+    : path_(path)
+    , handle_(nullptr, sqlite3_close_v2)
+{
+    int code = SQLITE_OK;
+    handle_.reset(opened(path, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, code));
+    if (code == SQLITE_CANTOPEN) {
+        handle_.reset(opened(path, SQLITE_OPEN_READONLY, code));
+    }
+    if (code != SQLITE_OK) {
+        fail(code);
+    }
+    sqlite3_busy_timeout(handle_.get(), static_cast<int>(patience.count()));
+    run("PRAGMA foreign_keys = ON; PRAGMA synchronous = FULL;");
+}
+
+void Database::run(char const* statements)
+{
+    int const code = sqlite3_exec(handle_.get(), statements, nullptr, nullptr, nullptr);
+    if (code != SQLITE_OK) {
+        fail(code);
+    }
+}
+
+Statement Database::prepare(char const* statement) const
+{
+    sqlite3_stmt* handle = nullptr;
+    int const code = sqlite3_prepare_v2(handle_.get(), statement, -1, &handle, nullptr);
+    if (code != SQLITE_OK) {
+        fail(code);
+    }
+    return Statement(*this, Statement::Handle(handle, sqlite3_finalize));
+}
+
+std::int64_t Database::version() const
+{
+    Statement version = prepare("PRAGMA user_version");
+    return version.next() ? version.integer(0) : 0;
+}
+
+void Database::setVersion(std::int64_t version)
+{
+    run(("PRAGMA user_version = " + std::to_string(version)).c_str());
+}
+
+std::string Database::damage() const
+{
+    Statement check = prepare("PRAGMA integrity_check(1)");
+    std::string const found = check.next() ? check.text(0).ansi_str() : "no answer";
+    return found == "ok" ? std::string() : found;
+}
+
+void Database::fail(int code) const
+{
+    throw Failure("The database '" + path_ + "' cannot be used: " + sqlite3_errstr(code) + ".", adviceFor(code, path_));
+}
+
+Change::Change(Database& database) : database_(database)
+{
+    database_.run("BEGIN IMMEDIATE");
+}
+
+Change::~Change()
+{
+    if (!isOpen_) {
+        return;
+    }
+    try {
+        database_.run("ROLLBACK");
+    } catch (Failure const&) {
+        // The journal undoes the change when the database is opened next.
+    }
+}
+
+void Change::commit()
+{
+    database_.run("COMMIT");
+    isOpen_ = false;
+}
+
+} // namespace tav

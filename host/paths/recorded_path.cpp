@@ -1,0 +1,258 @@
+#include "host/paths/recorded_path.h"
+
+#include "host/text/characters.h"
+#include "host/text/wide.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <cstddef>
+#include <system_error>
+#include <vector>
+
+namespace tav {
+
+namespace {
+
+constexpr std::size_t kLongestPath = 4096;
+constexpr std::size_t kLongestPart = 255;
+
+bool isLetter(wchar_t c)
+{
+    return (c >= L'a' && c <= L'z') || (c >= L'A' && c <= L'Z');
+}
+
+bool isDigit(wchar_t c)
+{
+    return c >= L'0' && c <= L'9';
+}
+
+template <class Predicate>
+bool hasAny(OdString const& text, Predicate const& predicate)
+{
+    wchar_t const* const begin = text.c_str();
+    return std::any_of(begin, begin + text.getLength(), predicate);
+}
+
+std::vector<OdString> partsOf(OdString const& path)
+{
+    std::vector<OdString> parts(1);
+    for (std::size_t i = 0; i < path.getLength(); ++i) {
+        wchar_t const c = path.getAt(i);
+        if (c == L'/') {
+            parts.emplace_back();
+        } else {
+            parts.back() += c;
+        }
+    }
+    return parts;
+}
+
+/// What is left of a part on a file system that passes over invisible characters, letter case, and dots and blanks at
+/// the end.
+OdString barePart(OdString const& part)
+{
+    OdString bare;
+    for (std::size_t i = 0; i < part.getLength(); ++i) {
+        wchar_t const c = part.getAt(i);
+        if (!isInvisible(c)) {
+            bare += (c >= L'A' && c <= L'Z') ? static_cast<wchar_t>(c - L'A' + L'a') : c;
+        }
+    }
+    std::size_t length = bare.getLength();
+    while (length > 0 && (bare.getAt(length - 1) == L'.' || bare.getAt(length - 1) == L' ')) {
+        --length;
+    }
+    return bare.left(length);
+}
+
+OdString withoutStream(OdString const& part)
+{
+    std::size_t length = 0;
+    while (length < part.getLength() && part.getAt(length) != L':') {
+        ++length;
+    }
+    return part.left(length);
+}
+
+bool isOwnFolder(OdString const& part)
+{
+    OdString const bare = barePart(withoutStream(part));
+    if (bare == L".tav") {
+        return true;
+    }
+    bool const isShortName = bare.left(4) == L"tav~" && bare.getLength() > 4;
+    return isShortName && !hasAny(bare.mid(4), [](wchar_t c) { return !isDigit(c); });
+}
+
+bool isAbsolute(OdString const& path)
+{
+    return path.getAt(0) == L'/';
+}
+
+bool hasDrive(OdString const& path)
+{
+    return path.getLength() > 1 && path.getAt(1) == L':' && isLetter(path.getAt(0));
+}
+
+bool hasBackslash(OdString const& path)
+{
+    return hasAny(path, [](wchar_t c) { return c == L'\\'; });
+}
+
+bool hasControls(OdString const& path)
+{
+    return hasAny(path, isControl);
+}
+
+bool isNotSound(OdString const& path)
+{
+    return !isSound(path);
+}
+
+bool isTooLong(OdString const& path)
+{
+    return path.ansi_str().size() > kLongestPath;
+}
+
+bool isLongPart(OdString const& part)
+{
+    return part.ansi_str().size() > kLongestPart;
+}
+
+bool isEmptyPart(OdString const& part)
+{
+    return part.isEmpty();
+}
+
+bool isDots(OdString const& part)
+{
+    return barePart(part).isEmpty();
+}
+
+struct Rule {
+    bool (*isBroken)(OdString const& text);
+    char const* fault;
+};
+
+// The order is that of the answers: a path that breaks several rules is told the first.
+constexpr std::array kRulesOfPaths = {
+    Rule{isAbsolute, "is absolute; a recorded path is relative to the working folder"},
+    Rule{hasDrive, "begins with a drive; a recorded path is relative to the working folder"},
+    Rule{isTooLong, "is longer than 4096 bytes"},
+    Rule{hasControls, "holds a control character or a line end"},
+    Rule{hasBackslash, "holds a backslash, which separates folders on other systems"},
+    Rule{isNotSound, "holds a character that no file name has"},
+};
+
+constexpr std::array kRulesOfParts = {
+    Rule{isEmptyPart, "has an empty part between its slashes"},
+    Rule{isDots, "has a part of nothing but dots and blanks, which may lead out of the working folder"},
+    Rule{isLongPart, "has a part that is longer than 255 bytes"},
+    Rule{isOwnFolder, "leads into the folder '.tav', which belongs to the repository"},
+};
+
+char const* faultOf(OdString const& path)
+{
+    for (Rule const& rule : kRulesOfPaths) {
+        if (rule.isBroken(path)) {
+            return rule.fault;
+        }
+    }
+    std::vector<OdString> const parts = partsOf(path);
+    bool const isProperty = parts.size() > 2 && parts[0] == L".tav" && parts[1] == L"properties";
+    for (std::size_t i = isProperty ? 2 : 0; i < parts.size(); ++i) {
+        for (Rule const& rule : kRulesOfParts) {
+            if (rule.isBroken(parts[i])) {
+                return rule.fault;
+            }
+        }
+    }
+    return nullptr;
+}
+
+constexpr int kFolderFlags = O_PATH | O_DIRECTORY | O_CLOEXEC;
+
+class Folder {
+public:
+    explicit Folder(int handle) : handle_(handle) {}
+    Folder(Folder const&) = delete;
+    Folder& operator=(Folder const&) = delete;
+    ~Folder() { take(-1); }
+
+    int handle() const { return handle_; }
+    bool isOpen() const { return handle_ >= 0; }
+    void take(int handle)
+    {
+        if (handle_ >= 0) {
+            close(handle_);
+        }
+        handle_ = handle;
+    }
+
+private:
+    int handle_;
+};
+
+std::string cannotBeExamined(OdString const& way)
+{
+    return quoted(way) + " cannot be examined: " + std::generic_category().message(errno) + ".";
+}
+
+/// Examines the entry `part` of `folder`, which is the last part of `way`, and goes into it unless it is the last of
+/// the path.
+std::optional<std::string> step(Folder& folder, OdString const& part, OdString const& way, bool isLast)
+{
+    std::string const name = part.ansi_str();
+    struct stat entry {};
+    if (fstatat(folder.handle(), name.c_str(), &entry, AT_SYMLINK_NOFOLLOW) != 0) {
+        bool const isFree = errno == ENOENT;
+        folder.take(-1);
+        return isFree ? std::nullopt : std::optional(cannotBeExamined(way));
+    }
+    if (S_ISLNK(entry.st_mode)) {
+        return quoted(way) + " is a symbolic link, which may lead out of the working folder.";
+    }
+    if (isLast) {
+        return std::nullopt;
+    }
+    if (!S_ISDIR(entry.st_mode)) {
+        return quoted(way) + " is no folder.";
+    }
+    folder.take(openat(folder.handle(), name.c_str(), kFolderFlags | O_NOFOLLOW));
+    return folder.isOpen() ? std::nullopt : std::optional(cannotBeExamined(way));
+}
+
+} // namespace
+
+std::optional<std::string> whyUnsafe(OdString const& path)
+{
+    if (path.isEmpty()) {
+        return "The path is empty.";
+    }
+    char const* const fault = faultOf(path);
+    return fault ? std::optional("The path " + quoted(path) + " " + fault + ".") : std::nullopt;
+}
+
+std::optional<std::string> linkOnTheWay(std::string const& root, OdString const& path)
+{
+    Folder folder(open(root.c_str(), kFolderFlags));
+    if (!folder.isOpen()) {
+        return cannotBeExamined(wide(root));
+    }
+    std::vector<OdString> const parts = partsOf(path);
+    OdString way;
+    for (std::size_t i = 0; i < parts.size() && folder.isOpen(); ++i) {
+        way += (i == 0 ? OdString() : OdString(L"/")) + parts[i];
+        if (auto obstacle = step(folder, parts[i], way, i + 1 == parts.size())) {
+            return obstacle;
+        }
+    }
+    return std::nullopt;
+}
+
+} // namespace tav

@@ -1,0 +1,314 @@
+#include "host/repository/commit.h"
+
+#include "host/failure.h"
+#include "host/paths/recorded_path.h"
+#include "host/progress.h"
+#include "host/repository/changes.h"
+#include "host/repository/index_record.h"
+#include "host/repository/server_of.h"
+#include "host/repository/staging.h"
+#include "host/repository/working_state.h"
+#include "host/server/commit_document.h"
+#include "host/storage/local_storage.h"
+#include "host/text/characters.h"
+
+#include "common/mu_common_serialization.h"
+#include "common/mu_common_versions.h"
+#include "json/json_reader.h"
+#include "json/json_writer.h"
+
+#include <algorithm>
+#include <set>
+#include <utility>
+
+namespace tav {
+
+namespace {
+
+constexpr int kMostAttempts = 5; // at a file that somebody is writing
+constexpr char const* kAskOwner = "The server is damaged, or no server of tav; ask its owner.";
+
+using Previous = std::map<OdString, OdString>;
+
+/// A commit that takes shape.
+struct Draft {
+    common::RootPath const& root;
+    LocalDatabase& database;
+    std::uint64_t start;
+    Tree files;        ///< of the new commit, in the end
+    Previous previous; ///< paths of renamed files before
+    CommitUnderWay work;
+};
+
+/// Stores a content that does not change meanwhile, and notes when the file had it.
+OdString storeSteady(Draft& draft, LocalStorage& storage, OdString const& path)
+{
+    for (int attempt = 0; attempt < kMostAttempts; ++attempt) {
+        std::uint64_t const before = common::modifyTime(path, draft.root);
+        auto const url = storage.store(draft.root, path);
+        if (common::modifyTime(path, draft.root) != before) {
+            continue;
+        }
+        draft.work.files[path] = indexRecord(before, draft.start);
+        return valueOrFail(url, "Nothing has been committed; mend that and run the command again.");
+    }
+    throw Failure(
+        quoted(path) + " is being written by another program all the time.",
+        "Save and close it there, and run the command again.");
+}
+
+/// The version of the file that the new one follows.
+OdString previousUrl(Draft const& draft, Tree const& base, OdString const& path)
+{
+    auto const rename = draft.previous.find(path);
+    auto const version = base.find(rename == draft.previous.end() ? path : rename->second);
+    return version == base.end() ? OdString() : version->second;
+}
+
+void storeAll(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& storage)
+{
+    Progress progress("files", plan.size());
+    for (PlannedFile const& file : plan) {
+        if (file.change == common::FileChange::removed) {
+            draft.files.erase(file.path);
+            draft.work.files[file.path] = std::nullopt;
+        } else {
+            draft.files[file.path] = storeSteady(draft, storage, file.path);
+        }
+        progress.advance();
+    }
+    valueOrFail(storage.flush(draft.root), "Nothing has been committed; check the free space.");
+}
+
+/// Reads back what the commit relies on.
+void readBack(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& storage)
+{
+    Progress progress("files read back", plan.size());
+    std::set<OdString> done;
+    for (PlannedFile const& file : plan) {
+        progress.advance();
+        auto const version = draft.files.find(file.path);
+        if (version == draft.files.end() || !done.insert(version->second).second) {
+            continue;
+        }
+        OdString const& url = version->second;
+        valueOrFail(storage.verify(draft.root, url), "Nothing has been committed; the disk may be failing.");
+        std::uint64_t const size = valueOrFail(storage.size(draft.root, url), "Nothing has been committed.");
+        draft.work.contents.push_back({url, *digestOf(url), size});
+    }
+}
+
+class Digest {
+public:
+    Digest& add(OdString const& text)
+    {
+        std::string const bytes = text.ansi_str();
+        std::string const length = std::to_string(bytes.size()) + ":"; // Else "ab","c" would be "a","bc".
+        digest_.update(length.data(), length.size());
+        digest_.update(bytes.data(), bytes.size());
+        return *this;
+    }
+    OdString finish() { return digest_.finish(); }
+
+private:
+    common::ContentDigest digest_;
+};
+
+/// The name of a commit follows from what is in it, its time excepted: the same order gives the same commit.
+OdString hashOf(common::CommitInfo const& info)
+{
+    Digest digest;
+    digest.add(L"tav commit").add(info.author).add(info.message);
+    for (OdString const& parent : info.parents) {
+        digest.add(parent);
+    }
+    digest.add(OdString::kEmpty);
+    for (common::RepoFile const& file : info.files) {
+        digest.add(file.path).add(file.storagePath).add(file.base ? file.base->path : OdString::kEmpty);
+    }
+    return digest.finish();
+}
+
+common::RepoFile recorded(OdString const& path, OdString const& url, Previous const& previous)
+{
+    auto const rename = previous.find(path);
+    if (rename == previous.end()) {
+        return {withPairs(path), url};
+    }
+    return {withPairs(path), url, std::make_unique<common::BaseFile>(withPairs(rename->second))};
+}
+
+OdString documentOf(Draft const& draft, CommitOrder const& order, OdString const& branch)
+{
+    common::CommitInfo info;
+    for (auto const& [path, url] : draft.files) {
+        info.files.push_back(recorded(path, url, draft.previous));
+    }
+    OdString const parent = draft.database.base();
+    if (!parent.isEmpty()) {
+        info.parents.push_back(parent);
+    }
+    info.author = withPairs(order.author);
+    info.message = withPairs(order.message);
+    info.hash = hashOf(info);
+    info.references.emplace_back(withPairs(branch), info.hash, common::EType::branch);
+    auto document = common::serializeCommitInfo(info);
+    std::wstring const text = kutils::json::write_string(document, false);
+    return {text.c_str(), text.size()};
+}
+
+void failIfNotAtTheEnd(LocalDatabase const& database, OdString const& branch)
+{
+    auto const reference = database.commits().reference(branch);
+    if (!reference || reference->commitHash == database.base()) {
+        return;
+    }
+    throw Failure(
+        "You are at an earlier commit, not at the end of the branch '" + branch.ansi_str() + "'.",
+        "Run 'tav branch NAME' and 'tav switch NAME' to go on from here, or 'tav switch " + branch.ansi_str() +
+            "' to go back to its end.");
+}
+
+bool isOnServer(NewCommit const& commit, LocalDatabase const& database, Connection& connection)
+{
+    OdString const known =
+        L"[{\"commitNo\":" + OdString(std::to_wstring(database.commits().lastNumber()).c_str()) + L",\"hash\":\"\"}]";
+    kutils::json::Value answer;
+    kutils::json::read_string(answer, connection.request("fetch", known));
+    auto const fetched = valueOrFail(common::deserializeFetchData(answer.get_object()), kAskOwner);
+    auto const isIt = [&](common::Commit const& other) { return other.hash == commit.commit.hash; };
+    return std::any_of(fetched.commits.begin(), fetched.commits.end(), isIt);
+}
+
+/// Sends the commit and returns its number. One that the server refuses is given up; after any other failure the server
+/// may have it from a try before, so the note stays until that is known.
+std::int64_t sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& database)
+{
+    Connection connection(database);
+    kutils::json::Value answer;
+    try {
+        kutils::json::read_string(answer, connection.request("commit", document));
+    } catch (Failure const&) {
+        if (!isOnServer(commit, database, connection)) {
+            note(std::monostate(), database);
+        }
+        throw;
+    }
+    auto const numbers = valueOrFail(common::deserializeCommitNumbers(answer.get_array()), kAskOwner);
+    if (numbers.size() != 1) {
+        throw Failure("The server did not number the commit.", kAskOwner);
+    }
+    return numbers.front().commitNo;
+}
+
+void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& database)
+{
+    Change change(database.database());
+    if (!database.commits().find(commit.commit.hash)) {
+        database.commits().add(commit.commit, commit.files);
+    }
+    for (common::Reference const& reference : commit.references) {
+        database.commits().set(reference);
+    }
+    for (NewContent const& content : work.contents) {
+        database.addContent(content.url, content.digest, content.size);
+    }
+    database.setBase(commit.commit.hash);
+    change.commit();
+}
+
+void clearStaging(CommitUnderWay const& work, common::State& state)
+{
+    std::vector<common::StagedFile> committed;
+    for (auto const& [path, record] : work.files) {
+        committed.emplace_back(path, common::FileChange::added);
+        if (record) {
+            state.index.insert_or_assign(path, *record);
+        } else {
+            state.index.erase(path);
+        }
+    }
+    unstage(committed, state);
+}
+
+common::RepoChanges compareWithBase(Draft& draft, common::State const& state)
+{
+    VerifiedTimes verified;
+    common::RepoChanges changes = compare(draft.root, draft.files, state, &verified);
+    for (auto const& [path, time] : verified) {
+        draft.work.files.emplace(path, indexRecord(time, draft.start));
+    }
+    return changes;
+}
+
+std::optional<CommitRecord> lastCommitIfOf(CommitOrder const& order, LocalDatabase const& database)
+{
+    auto last = database.commits().find(database.base());
+    bool const isSame = last && last->author == order.author && last->message == order.message;
+    return isSame ? last : std::nullopt;
+}
+
+void checkNames(std::vector<PlannedFile> const& plan)
+{
+    for (PlannedFile const& file : plan) {
+        auto const fault = whyUnsafe(file.path);
+        if (fault && file.change != common::FileChange::removed) {
+            throw Failure(*fault, "Nothing has been committed; rename the file, or run 'tav unstage' for it.");
+        }
+    }
+}
+
+/// Brings the contents into the storage, for good.
+void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
+{
+    Tree const base = draft.files;
+    LocalStorage storage(
+        [&](OdString const& path) { return previousUrl(draft, base, path); },
+        [&](OdString const& digest) { return draft.database.urlOf(digest); });
+    storeAll(draft, plan, storage);
+    if (draft.files == base) {
+        throw Failure("What is staged is as it was committed.", "Run 'tav unstage --all' to clear it.");
+    }
+    readBack(draft, plan, storage);
+}
+
+} // namespace
+
+Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start)
+{
+    auto const cache = readState(root);
+    common::State const& state = cache->read();
+    failIfNotAtTheEnd(database, state.head);
+    Draft draft{root, database, start, database.commits().files(database.base()), {}, {}};
+    common::RepoChanges const changes = compareWithBase(draft, state);
+    std::vector<PlannedFile> const plan =
+        planCommit(state, changes, findRenames(changes, database, root), draft.files, root);
+    if (plan.empty()) {
+        if (auto const last = lastCommitIfOf(order, database)) {
+            return {*last, false};
+        }
+        failForNothing(changes, root);
+    }
+    checkNames(plan);
+    for (PlannedFile const& file : plan) {
+        if (!file.previousPath.isEmpty()) {
+            draft.previous.emplace(file.path, file.previousPath);
+        }
+    }
+    keepContents(draft, plan);
+    draft.work.document = documentOf(draft, order, state.head);
+    note(draft.work, database);
+    return {finishCommit(root, database, draft.work), true};
+}
+
+CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, CommitUnderWay const& work)
+{
+    NewCommit commit = readCommitInfo(work.document);
+    commit.commit.number = sentNumber(commit, work.document, database);
+    enter(commit, work, database);
+    changeState(root, [&](common::Cache& cache) { clearStaging(work, cache.write()); });
+    note(std::monostate(), database);
+    return commit.commit;
+}
+
+} // namespace tav

@@ -1,0 +1,31 @@
+/// From the working folder to a new commit.
+#pragma once
+
+#include "host/repository/commit_plan.h"
+#include "host/repository/unfinished.h"
+
+#include <cstdint>
+
+namespace tav {
+
+struct CommitOrder {
+    OdString author;
+    OdString message;
+};
+
+struct Committed {
+    CommitRecord commit;
+    bool isNew; ///< false: the order repeats the last commit, and there is nothing else to commit
+};
+
+/// Commits what is staged, what is gone and what has been renamed. Contents are stored, flushed and read back before
+/// the server hears of the commit; killed at any point, `finishCommit` or the same order leads to one commit.
+/// Throws `Failure`; staging and working folder are as they were then. The caller holds the lock of the repository
+/// since `start`, and nothing is unfinished.
+Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start);
+
+/// Sends a commit whose contents are stored, unless the server has it, and enters it here. Throws `Failure`; when it is
+/// the server that refuses, the commit is given up.
+CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, CommitUnderWay const& work);
+
+} // namespace tav

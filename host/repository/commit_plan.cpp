@@ -1,0 +1,75 @@
+#include "host/repository/commit_plan.h"
+
+#include "host/failure.h"
+
+#include "common/mu_common_diff.h"
+
+#include "platform/ut/FileName.h"
+
+#include <map>
+#include <utility>
+
+namespace tav {
+
+namespace {
+
+using Plan = std::map<OdString, PlannedFile>;
+
+void planStaged(common::State const& state, Tree const& base, common::RootPath const& root, Plan& plan)
+{
+    for (common::StagedFile const& file : state.stagedFiles) {
+        auto const rename = state.renames.find(file.path);
+        bool const isRenamed = rename != state.renames.end() && base.count(rename->second) > 0;
+        bool const isGone =
+            file.change != common::FileChange::removed && !ut::FileName::fileExists(root.pathTo(file.path));
+        if (isGone && base.count(file.path) == 0) {
+            throw Failure(
+                "'" + file.path.ansi_str() + "' is staged, but it is not there any more.",
+                "Bring it back, or run 'tav unstage' for it.");
+        }
+        common::FileChange const change = isGone ? common::FileChange::removed : file.change;
+        plan.insert_or_assign(file.path, PlannedFile{file.path, change, isRenamed ? rename->second : OdString::kEmpty});
+    }
+}
+
+void planRenames(Renames const& renames, Plan& plan)
+{
+    for (auto const& [path, previous] : renames) {
+        PlannedFile& planned = plan.emplace(path, PlannedFile{path, common::FileChange::added, {}}).first->second;
+        if (planned.previousPath.isEmpty()) {
+            planned.previousPath = previous;
+        }
+    }
+}
+
+} // namespace
+
+std::vector<PlannedFile> planCommit(
+    common::State const& state, common::RepoChanges const& changes, Renames const& found, Tree const& base,
+    common::RootPath const& root)
+{
+    Plan plan;
+    planStaged(state, base, root, plan);
+    for (auto const& file : changes.removed) {
+        plan.emplace(file.committed.path, PlannedFile{file.committed.path, common::FileChange::removed, {}});
+    }
+    planRenames(found, plan);
+    std::vector<PlannedFile> files;
+    for (auto& [path, file] : plan) {
+        files.push_back(std::move(file));
+    }
+    return files;
+}
+
+void failForNothing(common::RepoChanges const& changes, common::RootPath const& root)
+{
+    // The library has the words for a folder without any change.
+    bool const hasChanges = !changes.modified.empty() || !changes.untracked.empty();
+    auto const staged = common::RepoFileExplorer(changes, root).stagedFiles();
+    if (!hasChanges && !staged.hasValue()) {
+        throw Failure(staged.error(), "Change something first.");
+    }
+    throw Failure("Nothing is staged.", "Use 'tav add NAME' or 'tav add --all' to stage what the commit shall take.");
+}
+
+} // namespace tav

@@ -1,0 +1,17 @@
+/// Files of a commit outside of the repository.
+#pragma once
+
+#include "host/database/commit_tables.h"
+
+#include "common/mu_common_repo_prop.h"
+
+#include <cstddef>
+#include <string>
+
+namespace tav {
+
+/// Writes `files` into the folder `target`, in bytes, which is made when it is missing and must be empty else; returns
+/// their number. All of it is safe on the disk then. Throws `Failure`; what was written until then stays there.
+std::size_t exportFiles(common::RootPath const& root, Tree const& files, std::string const& target);
+
+} // namespace tav

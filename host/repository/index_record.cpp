@@ -1,0 +1,39 @@
+#include "host/repository/index_record.h"
+
+namespace tav {
+
+namespace {
+
+constexpr std::uint64_t kSecond = 1'000'000'000;
+constexpr std::uint64_t kTick = 10'000'000; // The system's own clock for files moves in steps of 4 to 10 ms.
+
+/// File systems of network drives know whole seconds only, some every other.
+std::uint64_t granularity(std::uint64_t time)
+{
+    return time % kSecond == 0 ? 2 * kSecond : kTick;
+}
+
+} // namespace
+
+std::uint64_t commandStart(common::RootPath const& root)
+{
+    return common::modifyTime(L".tav/tav.lock", root);
+}
+
+common::IndexData indexRecord(std::uint64_t time, std::uint64_t start)
+{
+    bool const isOlder = time + granularity(time) <= start;
+    return {time, !isOlder};
+}
+
+std::uint64_t timeForWrittenFiles(std::uint64_t start)
+{
+    return start - granularity(start);
+}
+
+bool isUntouched(common::IndexData const& record, std::uint64_t time)
+{
+    return !record.modified && record.lastChecked == time;
+}
+
+} // namespace tav

@@ -1,0 +1,61 @@
+/// What a working folder knows of its history: the database "tav.db" in ".tav".
+#pragma once
+
+#include "host/database/commit_tables.h"
+
+#include "common/mu_common_repo_prop.h"
+
+#include <cstdint>
+#include <optional>
+
+namespace tav {
+
+/// One thread. Every operation throws `Failure` when the database cannot be used.
+class LocalDatabase {
+public:
+    /// Opens the database, and makes it when it is missing.
+    static LocalDatabase make(common::RootPath const& root);
+    /// Opens the database. Where it is missing an empty one stands in for it, which is gone afterwards. Whoever changes
+    /// it holds the lock of the repository.
+    static LocalDatabase open(common::RootPath const& root);
+
+    LocalDatabase(LocalDatabase const&) = delete;
+    LocalDatabase& operator=(LocalDatabase const&) = delete;
+
+    std::string const& path() const { return database_.path(); }
+    Database& database() { return database_; }
+    CommitTables& commits() { return commits_; }
+    CommitTables const& commits() const { return commits_; }
+
+    /// Where the history is kept, and under which identifier; empty before `tav init` has found out.
+    OdString serverFolder() const { return value("server"); }
+    OdString repositoryId() const { return value("repository"); }
+    void setServer(OdString const& folder, OdString const& repositoryId);
+
+    /// Hash of the commit that the working folder stands on; empty before the first commit.
+    OdString base() const { return value("base"); }
+    void setBase(OdString const& hash) { setValue("base", hash); }
+
+    /// What a command has begun and not ended, as the document that the command wrote; empty when there is nothing.
+    OdString unfinished() const { return value("unfinished"); }
+    void setUnfinished(OdString const& document) { setValue("unfinished", document); }
+
+    /// URL of a content of this digest that is kept in a revision store; empty when none is known.
+    OdString urlOf(OdString const& digest) const;
+    /// Whether a commit holds a content of this digest.
+    bool keeps(OdString const& digest) const;
+    /// Bytes of the content at `url`.
+    std::optional<std::uint64_t> sizeOf(OdString const& url) const;
+    void addContent(OdString const& url, OdString const& digest, std::uint64_t size);
+
+private:
+    explicit LocalDatabase(std::string const& path);
+
+    OdString value(char const* key) const;
+    void setValue(char const* key, OdString const& value);
+
+    Database database_;
+    CommitTables commits_;
+};
+
+} // namespace tav

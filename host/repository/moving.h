@@ -1,0 +1,32 @@
+/// Going to another commit or branch.
+#pragma once
+
+#include "host/repository/local_database.h"
+#include "host/repository/working_tree.h"
+
+#include <cstdint>
+
+namespace tav {
+
+struct Destination {
+    OdString commit; ///< hash
+    OdString branch; ///< where HEAD points to afterwards
+};
+
+/// What a move has done.
+struct Moved {
+    std::size_t written = 0;
+    std::size_t removed = 0;
+};
+
+/// Makes the working folder stand on another commit. Changes and staged files at paths where both commits agree stay.
+/// Throws `Failure`; before the first file is written nothing has changed then, later the same move completes it.
+/// The caller holds the lock of the repository since `start`.
+Moved moveTo(
+    common::RootPath const& root, LocalDatabase& database, Destination const& destination, Unsaved unsaved,
+    std::uint64_t start);
+
+/// Ends a move whose files are written, unless that has been done.
+void finishMove(common::RootPath const& root, LocalDatabase& database, Destination const& destination);
+
+} // namespace tav

@@ -1,0 +1,44 @@
+#include "host/repository/references.h"
+
+#include "host/failure.h"
+#include "host/repository/server_of.h"
+#include "host/text/characters.h"
+
+#include "json/json_writer.h"
+
+namespace tav {
+
+namespace {
+
+std::wstring text(OdString const& string)
+{
+    OdString const pairs = withPairs(string);
+    return {pairs.c_str(), pairs.getLength()};
+}
+
+OdString documentOf(common::Reference const& reference)
+{
+    kutils::json::Object object;
+    object[L"name"] = text(reference.name);
+    object[L"commitHash"] = text(reference.commitHash);
+    object[L"refType"] = reference.type == common::EType::branch ? L"branch" : L"tag";
+    kutils::json::Value document(kutils::json::Array{std::move(object)});
+    std::wstring const written = kutils::json::write_string(document, false);
+    return {written.c_str(), written.size()};
+}
+
+} // namespace
+
+void makeReference(LocalDatabase& database, common::Reference const& reference)
+{
+    if (auto const old = database.commits().reference(reference.name)) {
+        std::string const kind = old->type == common::EType::branch ? "branch" : "tag";
+        throw Failure("There is a " + kind + " '" + reference.name.ansi_str() + "' already.", "Choose another name.");
+    }
+    Connection(database).request("references", documentOf(reference));
+    Change change(database.database());
+    database.commits().set(reference);
+    change.commit();
+}
+
+} // namespace tav

@@ -1,0 +1,130 @@
+#include "host/repository/unfinished.h"
+
+#include "host/failure.h"
+#include "host/text/characters.h"
+
+#include "common/mu_common_json.h"
+#include "json/json_reader.h"
+#include "json/json_writer.h"
+
+#include <string>
+
+namespace tav {
+
+namespace {
+
+using kutils::json::Array;
+using kutils::json::Object;
+using kutils::json::Value;
+
+std::wstring text(OdString const& string)
+{
+    OdString const pairs = withPairs(string);
+    return {pairs.c_str(), pairs.getLength()};
+}
+
+OdString textOf(Object const& object, OdString const& key)
+{
+    return withoutPairs(common::getStringValue(object, key, OdString::kEmpty));
+}
+
+Object documentOf(CommitUnderWay const& work)
+{
+    Array contents;
+    for (NewContent const& content : work.contents) {
+        Object object;
+        object[L"url"] = text(content.url);
+        object[L"digest"] = text(content.digest);
+        object[L"size"] = content.size;
+        contents.emplace_back(std::move(object));
+    }
+    Array files;
+    for (auto const& [path, record] : work.files) {
+        Object object;
+        object[L"path"] = text(path);
+        if (record) {
+            object[L"time"] = record->lastChecked;
+            object[L"modified"] = record->modified;
+        }
+        files.emplace_back(std::move(object));
+    }
+    Object document;
+    document[L"document"] = text(work.document);
+    document[L"contents"] = std::move(contents);
+    document[L"files"] = std::move(files);
+    return document;
+}
+
+Object documentOf(MoveUnderWay const& work)
+{
+    Object document;
+    document[L"target"] = text(work.target);
+    document[L"branch"] = text(work.branch);
+    document[L"written"] = work.isWritten;
+    return document;
+}
+
+CommitUnderWay commitOf(Object const& document)
+{
+    CommitUnderWay work;
+    work.document = textOf(document, L"document");
+    for (Value const& element : common::getArrayValue(document, L"contents", L"")) {
+        Object const& content = element.get_object();
+        work.contents.push_back(
+            {textOf(content, L"url"), textOf(content, L"digest"), common::getUInt64Value(content, L"size", L"")});
+    }
+    for (Value const& element : common::getArrayValue(document, L"files", L"")) {
+        Object const& file = element.get_object();
+        std::optional<common::IndexData> record;
+        if (common::hasKey(file, L"time")) {
+            record = {common::getUInt64Value(file, L"time", L""), common::getBoolValue(file, L"modified", L"")};
+        }
+        work.files.emplace(textOf(file, L"path"), record);
+    }
+    return work;
+}
+
+MoveUnderWay moveOf(Object const& document)
+{
+    return {textOf(document, L"target"), textOf(document, L"branch"), common::getBoolValue(document, L"written", L"")};
+}
+
+} // namespace
+
+Unfinished unfinishedOf(LocalDatabase const& database)
+{
+    OdString const text = database.unfinished();
+    if (text.isEmpty()) {
+        return {};
+    }
+    try {
+        Value document;
+        kutils::json::read_string(document, text);
+        Object const& object = document.get_object();
+        if (common::hasKey(object, L"target")) {
+            return moveOf(object);
+        }
+        return commitOf(object);
+    } catch (std::exception const&) {
+        throw Failure(
+            "What an interrupted command noted in '" + database.path() + "' cannot be read.",
+            "Put a copy of that file from a backup in its place.");
+    }
+}
+
+void note(Unfinished const& work, LocalDatabase& database)
+{
+    Object document;
+    if (auto const* const commit = std::get_if<CommitUnderWay>(&work)) {
+        document = documentOf(*commit);
+    } else if (auto const* const move = std::get_if<MoveUnderWay>(&work)) {
+        document = documentOf(*move);
+    } else {
+        database.setUnfinished(OdString::kEmpty);
+        return;
+    }
+    std::wstring const written = kutils::json::write_string(Value(std::move(document)), false);
+    database.setUnfinished(OdString(written.c_str(), written.size()));
+}
+
+} // namespace tav

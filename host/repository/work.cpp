@@ -1,0 +1,63 @@
+#include "host/repository/work.h"
+
+#include "host/failure.h"
+#include "host/repository/commit.h"
+#include "host/repository/index_record.h"
+#include "host/repository/moving.h"
+#include "host/repository/unfinished.h"
+
+namespace tav {
+
+namespace {
+
+std::string nameOf(MoveUnderWay const& move, LocalDatabase const& database)
+{
+    auto const branch = database.commits().reference(move.branch);
+    bool const isBranch = branch && branch->commitHash == move.target;
+    auto const commit = database.commits().find(move.target);
+    return isBranch ? "tav switch " + move.branch.ansi_str()
+                    : "tav checkout " + (commit ? std::to_string(commit->number) : move.target.ansi_str());
+}
+
+std::string interrupted(MoveUnderWay const& move, LocalDatabase const& database)
+{
+    return "'" + nameOf(move, database) + "' was interrupted: the working folder holds files of two commits.";
+}
+
+} // namespace
+
+Work::Work(common::RootPath const& root, std::string const& name)
+    : root_(root)
+    , lock_(lockRepository(root, name))
+    , start_(commandStart(root))
+    , database_(LocalDatabase::open(root))
+{
+    Unfinished const unfinished = unfinishedOf(database_);
+    if (auto const* const commit = std::get_if<CommitUnderWay>(&unfinished)) {
+        finished_ = finishCommit(root_, database_, *commit);
+    }
+    auto const* const move = std::get_if<MoveUnderWay>(&unfinished);
+    if (move && move->isWritten) {
+        finishMove(root_, database_, {move->target, move->branch});
+    }
+}
+
+void Work::failIfBetweenCommits() const
+{
+    Unfinished const unfinished = unfinishedOf(database_);
+    if (auto const* const move = std::get_if<MoveUnderWay>(&unfinished)) {
+        throw Failure(interrupted(*move, database_), "Run it again to complete it.");
+    }
+}
+
+std::string noteOnUnfinished(LocalDatabase const& database)
+{
+    Unfinished const unfinished = unfinishedOf(database);
+    if (std::holds_alternative<CommitUnderWay>(unfinished)) {
+        return "A commit was interrupted. The next command that changes something completes it.";
+    }
+    auto const* const move = std::get_if<MoveUnderWay>(&unfinished);
+    return move && !move->isWritten ? interrupted(*move, database) + " Run it again to complete it." : std::string();
+}
+
+} // namespace tav

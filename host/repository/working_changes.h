@@ -1,0 +1,22 @@
+/// What is different in the working folder, as people see it.
+#pragma once
+
+#include "host/repository/local_database.h"
+
+#include "common/mu_common_repo_files.h"
+
+#include <vector>
+
+namespace tav {
+
+struct WorkingChange {
+    OdString path;
+    common::FileChange change;
+    OdString previousPath; ///< of a renamed file, else empty
+    OdString oldUrl;       ///< of the committed content; empty for a new file
+};
+
+/// In the order of paths. A renamed file, one that 'tav mv' has staged included, is one change.
+std::vector<WorkingChange> workingChanges(common::RootPath const& root, LocalDatabase const& database);
+
+} // namespace tav

@@ -1,0 +1,49 @@
+/// What clients send, read and checked as far as that can be done without knowing the repository. Any thread.
+///
+/// The readers throw `Failure` for a document that is refused; the text names the member. Nothing is copied but what
+/// is kept, and no check takes longer than sorting the paths.
+#pragma once
+
+#include "host/database/commit_tables.h"
+
+#include "common/mu_common_serialization.h"
+
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace tav {
+
+/// A commit on its way into the repository, with everything in it clean. It has no number yet.
+struct NewCommit {
+    CommitRecord commit;
+    std::vector<FileRecord> files; ///< no path twice, and none that is the folder of another
+    std::vector<common::Reference> references;
+};
+
+/// Reads a commit-info document.
+NewCommit readCommitInfo(OdString const& document);
+
+/// Reads a references document; no name stands in it twice.
+std::vector<common::Reference> readReferences(OdString const& document);
+
+/// The highest number in a commit-numbers document, which is what the client knows; 0 for an empty one.
+std::int64_t readLastNumber(OdString const& document);
+
+/// The name in the document that asks for a new repository.
+OdString readRepositoryName(OdString const& document);
+
+/// Whether `hash` is the name of a commit or content: 64 lower-case hexadecimal digits.
+bool isHash(OdString const& hash);
+
+/// Whether `url` names a content in the object folder ("po:" and a hash) or in a revision store ("tf:", a name of
+/// letters, digits, '-' and '_', "#" and a hash).
+bool isContentUrl(OdString const& url);
+
+/// The second of a time written as "2024-03-05T14:07:09Z"; none for any other text.
+std::optional<std::int64_t> secondsOf(OdString const& time);
+
+/// Why `name` cannot be the name of a branch or tag, as the end of a sentence ("begins with a dash"); none when it can.
+std::optional<std::string> whyNoReferenceName(OdString const& name);
+
+} // namespace tav

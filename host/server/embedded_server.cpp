@@ -1,0 +1,323 @@
+#include "host/server/embedded_server.h"
+
+#include "host/failure.h"
+#include "host/server/commit_document.h"
+#include "host/server/document.h"
+#include "host/server/fetch_document.h"
+#include "host/text/characters.h"
+#include "host/text/wide.h"
+
+#include "common/mu_common_json_keys.h"
+#include "platform/os/os_files.h"
+
+#include <algorithm>
+#include <array>
+#include <exception>
+#include <new>
+#include <utility>
+
+namespace tav {
+
+namespace {
+
+using kutils::json::Array;
+using kutils::json::Object;
+using kutils::json::Value;
+
+namespace keys = common::json;
+
+constexpr std::int64_t kTablesVersion = 1;
+constexpr wchar_t const* kCommandVersion = L"1";
+constexpr mode_t kFolderPermissions = 0777;
+constexpr char const* kFetchFirst = "Fetch, merge what others have done, and send again.";
+
+struct Repository {
+    std::int64_t key = 0;
+    OdString id;
+    OdString name;
+};
+
+/// Whether a rule that protects what others have is in force.
+enum class Force { no, yes };
+
+void createTables(Database& database)
+{
+    database.run("CREATE TABLE repositories (key INTEGER PRIMARY KEY, id TEXT NOT NULL UNIQUE, name TEXT NOT NULL)");
+    CommitTables::create(database);
+    database.setVersion(kTablesVersion);
+}
+
+/// Two processes may find the file new at the same time: the one that comes second looks again.
+void prepareTables(Database& database)
+{
+    if (database.version() == 0) {
+        Change change(database);
+        if (database.version() == 0) {
+            createTables(database);
+        }
+        change.commit();
+    }
+    if (database.version() != kTablesVersion) {
+        throw Failure(
+            "The database '" + database.path() + "' was made by a newer tav.",
+            "Install that one, or name another folder for the server.");
+    }
+}
+
+Value numbersDocument(CommitRecord const& commit)
+{
+    Object pair;
+    pair[L"commitNo"] = commit.number;
+    pair[keys::s_hash.c_str()] = textValue(commit.hash);
+    return Array{Value(std::move(pair))};
+}
+
+Repository repositoryOrFail(Database const& database, OdString const& id)
+{
+    Statement row = database.prepare("SELECT key, name FROM repositories WHERE id = ?");
+    if (!row.with(id).next()) {
+        throw Failure("The server has no repository " + quoted(id) + ".", kNothingChanged);
+    }
+    return {row.integer(0), id, row.text(1)};
+}
+
+void requireParents(CommitTables const& tables, CommitRecord const& commit)
+{
+    for (OdString const& parent : commit.parents) {
+        if (!tables.find(parent)) {
+            throw Failure("The server does not have the parent commit " + quoted(parent) + ".", kNothingChanged);
+        }
+    }
+    if (commit.parents.empty() && tables.lastNumber() != 0) {
+        throw Failure("The repository has commits already; one without a parent would not follow them.", kFetchFirst);
+    }
+}
+
+/// Adds the commit unless an earlier request, whose answer may have been lost, has done so. Returns whether it did.
+bool addUnlessThere(CommitTables& tables, NewCommit& added)
+{
+    if (auto const there = tables.find(added.commit.hash)) {
+        added.commit.number = there->number;
+        return false;
+    }
+    requireParents(tables, added.commit);
+    added.commit.number = tables.lastNumber() + 1;
+    tables.add(added.commit, added.files);
+    return true;
+}
+
+void requireSameType(common::Reference const& there, common::Reference const& wanted)
+{
+    if (there.type != wanted.type) {
+        std::string const kind = there.type == common::EType::tag ? "a tag" : "a branch";
+        throw Failure(quoted(wanted.name) + " is the name of " + kind + " already.", "Choose another name.");
+    }
+}
+
+void requireForward(CommitTables const& tables, common::Reference const& there, common::Reference const& wanted)
+{
+    if (wanted.type == common::EType::tag) {
+        throw Failure("The tag " + quoted(wanted.name) + " names another commit already.", "Choose another name.");
+    }
+    if (!tables.isBefore(there.commitHash, wanted.commitHash)) {
+        throw Failure(
+            "The branch " + quoted(wanted.name) + " has commits that the new one does not follow.", kFetchFirst);
+    }
+}
+
+void setReference(CommitTables& tables, common::Reference const& wanted, Force force)
+{
+    if (!tables.find(wanted.commitHash)) {
+        throw Failure(
+            "The server does not have the commit " + quoted(wanted.commitHash) + " of " + quoted(wanted.name) + ".",
+            kNothingChanged);
+    }
+    auto const there = tables.reference(wanted.name);
+    if (there) {
+        requireSameType(*there, wanted);
+        if (force == Force::no && there->commitHash != wanted.commitHash) {
+            requireForward(tables, *there, wanted);
+        }
+    }
+    tables.set(wanted);
+}
+
+/// Whether the branch went past the commit since an earlier request that added it and moved the branch there.
+bool hasPassed(CommitTables const& tables, common::Reference const& branch, OdString const& hash)
+{
+    auto const there = tables.reference(branch.name);
+    return there && there->type == branch.type && branch.type == common::EType::branch && branch.commitHash == hash &&
+           tables.isBefore(hash, there->commitHash);
+}
+
+struct Request {
+    Database& database;
+    Repository repository; ///< as far as the request names one
+    OdString const& document;
+};
+
+OdString answerVersion(Request const&)
+{
+    Object version;
+    version[L"commandVersion"] = kCommandVersion;
+    return textOf(version);
+}
+
+OdString answerInit(Request const& request)
+{
+    OdString const name = readRepositoryName(request.document);
+    Change change(request.database);
+    Statement addRepository =
+        request.database.prepare("INSERT INTO repositories(id, name) VALUES (lower(hex(randomblob(16))), ?)");
+    addRepository.with(name).run();
+    Statement row = request.database.prepare("SELECT id FROM repositories WHERE key = last_insert_rowid()");
+    Object answer;
+    answer[L"id"] = textValue(row.next() ? row.text(0) : OdString());
+    row.reset();
+    change.commit();
+    return textOf(answer);
+}
+
+OdString answerRepositories(Request const& request)
+{
+    Statement rows = request.database.prepare("SELECT id, name FROM repositories ORDER BY key");
+    Array repositories;
+    while (rows.next()) {
+        repositories.push_back(repositoryDocument(rows.text(0), rows.text(1)));
+    }
+    return textOf(repositories);
+}
+
+OdString answerCommit(Request const& request, Force force)
+{
+    NewCommit added = readCommitInfo(request.document);
+    CommitTables tables(request.database, request.repository.key);
+    Change change(request.database);
+    bool const isNew = addUnlessThere(tables, added);
+    for (common::Reference const& reference : added.references) {
+        if (isNew || force == Force::yes || !hasPassed(tables, reference, added.commit.hash)) {
+            setReference(tables, reference, force);
+        }
+    }
+    change.commit();
+    return textOf(numbersDocument(added.commit));
+}
+
+OdString answerReferences(Request const& request, Force force)
+{
+    std::vector<common::Reference> const wanted = readReferences(request.document);
+    CommitTables tables(request.database, request.repository.key);
+    if (!wanted.empty()) { // Who only asks does not wait for those who write.
+        Change change(request.database);
+        for (common::Reference const& reference : wanted) {
+            setReference(tables, reference, force);
+        }
+        change.commit();
+    }
+    return textOf(referencesDocument(tables.references()));
+}
+
+OdString answerFetch(Request const& request)
+{
+    std::int64_t const known = readLastNumber(request.document);
+    CommitTables const tables(request.database, request.repository.key);
+    return fetchDocument(repositoryDocument(request.repository.id, request.repository.name), tables, known);
+}
+
+template <Force force>
+OdString answerCommit(Request const& request)
+{
+    return answerCommit(request, force);
+}
+
+template <Force force>
+OdString answerReferences(Request const& request)
+{
+    return answerReferences(request, force);
+}
+
+struct Verb {
+    wchar_t const* name;
+    bool namesRepository;
+    OdString (*answer)(Request const& request);
+};
+
+constexpr std::array kVerbs = {
+    Verb{L"version", false, answerVersion},
+    Verb{L"init", false, answerInit},
+    Verb{L"repositories", false, answerRepositories},
+    Verb{L"commit", true, answerCommit<Force::no>},
+    Verb{L"force-commit", true, answerCommit<Force::yes>},
+    Verb{L"references", true, answerReferences<Force::no>},
+    Verb{L"force-references", true, answerReferences<Force::yes>},
+    Verb{L"fetch", true, answerFetch},
+};
+
+/// The verb and, behind its first blank, the repository; that is empty when there is none.
+std::pair<OdString, OdString> splitRequest(OdString const& request)
+{
+    wchar_t const* const begin = request.c_str();
+    auto const length = static_cast<std::size_t>(std::find(begin, begin + request.getLength(), L' ') - begin);
+    return {request.left(length), request.mid(length + 1)};
+}
+
+Verb const& verbOrFail(OdString const& name, OdString const& repository)
+{
+    auto const* const verb =
+        std::find_if(kVerbs.begin(), kVerbs.end(), [&](Verb const& candidate) { return name == candidate.name; });
+    if (verb == kVerbs.end()) {
+        throw Failure("The server knows no request " + quoted(name) + ".", kNothingChanged);
+    }
+    if (verb->namesRepository == repository.isEmpty()) {
+        std::string const fault = verb->namesRepository ? " must name a repository." : " concerns no repository.";
+        throw Failure("The request " + quoted(name) + fault, kNothingChanged);
+    }
+    return *verb;
+}
+
+ErrorMessage messageOf(std::string const& text)
+{
+    return ErrorMessage(wide(text));
+}
+
+} // namespace
+
+EmbeddedServer::EmbeddedServer(std::string folder) : folder_(std::move(folder)) {}
+
+Expected<OdString> EmbeddedServer::request(OdString const& verb, OdString const& document)
+{
+    try {
+        return answer(verb, document);
+    } catch (Failure const& failure) {
+        return messageOf(failure.what + " " + failure.next);
+    } catch (std::bad_alloc const&) {
+        return messageOf(std::string("There is not enough memory for the request. ") + kNothingChanged);
+    } catch (std::exception const& error) {
+        return messageOf(std::string("The server failed: ") + error.what() + ". " + kNothingChanged);
+    }
+}
+
+OdString EmbeddedServer::answer(OdString const& verb, OdString const& document)
+{
+    auto const [name, id] = splitRequest(verb);
+    Verb const& known = verbOrFail(name, id);
+    Database& database = openDatabase();
+    return known.answer({database, known.namesRepository ? repositoryOrFail(database, id) : Repository(), document});
+}
+
+Database& EmbeddedServer::openDatabase()
+{
+    if (database_) {
+        return *database_;
+    }
+    if (auto const error = os::makeFolders(folder_, kFolderPermissions)) {
+        throw Failure(
+            "The folder '" + folder_ + "' cannot be made: " + error.message() + ".",
+            "Check your rights there, or name another folder for the server.");
+    }
+    Database database(folder_ + "/server.db");
+    prepareTables(database);
+    return database_.emplace(std::move(database));
+}
+
+} // namespace tav

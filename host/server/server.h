@@ -1,0 +1,25 @@
+/// What tav knows of a server: questions and answers as documents.
+#pragma once
+
+#include "common/mu_common_expected.h"
+
+#include "platform/sdk/OdString.h"
+
+namespace tav {
+
+/// A server, wherever it is. docs/formats/server-protocol.md lists its requests and their documents; nothing else
+/// passes between it and tav, so that another transport or another database can stand behind this interface.
+class Server {
+public:
+    Server() = default;
+    Server(Server const&) = delete;
+    Server& operator=(Server const&) = delete;
+    virtual ~Server() = default;
+
+    /// Sends `document` with the request `verb`, which names its repository behind a blank ("fetch 2f0a..."), and
+    /// returns the answer, a JSON text. Error: the server refuses the request or cannot be reached; the message is for
+    /// people, and nothing has changed on the server. Throws nothing.
+    virtual Expected<OdString> request(OdString const& verb, OdString const& document) = 0;
+};
+
+} // namespace tav

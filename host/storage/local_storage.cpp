@@ -1,0 +1,637 @@
+#include "host/storage/local_storage.h"
+
+#include "host/storage/cleaning.h"
+#include "host/storage/storage_error.h"
+
+#include "platform/os/os_files.h"
+
+#include <algorithm>
+#include <array>
+#include <atomic>
+#include <new>
+#include <sys/stat.h>
+#include <unistd.h>
+#include <utility>
+
+namespace tav {
+
+namespace {
+
+// Up to here single flushes cost less than one of the whole file system, which others write to as well.
+constexpr std::size_t kFewFiles = 8;
+constexpr char const* kStoreEnd = ".tf";
+
+OdString wide(std::string const& text)
+{
+    return OdString(text.data(), text.size(), CP_UTF_8);
+}
+
+std::string quoted(OdString const& text)
+{
+    return "'" + text.ansi_str() + "'";
+}
+
+/// The result of `work`, which throws on an error.
+template <class T, class Work>
+Expected<T> guarded(Work const& work)
+{
+    try {
+        return work();
+    } catch (StorageError const& error) {
+        return ErrorMessage(wide(error.what));
+    } catch (std::bad_alloc const&) {
+        return ErrorMessage(OdString(L"There is not enough memory to work on the storage."));
+    }
+}
+
+template <class Work>
+WriteOutcome guarded(Work const& work)
+{
+    return guarded<std::monostate>([&] {
+        work();
+        return std::monostate();
+    });
+}
+
+std::string tavFolder(common::RootPath const& root)
+{
+    return root.tavPath().ansi_str();
+}
+
+std::string storeFolder(common::RootPath const& root)
+{
+    return tavFolder(root) + "/" + common::repositoryExt().ansi_str();
+}
+
+std::string objectFolder(common::RootPath const& root)
+{
+    return tavFolder(root) + "/objects";
+}
+
+/// Where objects lie until they are flushed.
+std::string incomingFolder(common::RootPath const& root)
+{
+    return objectFolder(root) + "/incoming";
+}
+
+std::string restoringFolder(common::RootPath const& root)
+{
+    return tavFolder(root) + "/restoring";
+}
+
+std::string newRestoringName()
+{
+    static std::atomic<unsigned long> counter{0};
+    return std::to_string(getpid()) + "-" + std::to_string(counter++);
+}
+
+void makeFolders(std::string const& path)
+{
+    check(os::makeFolders(path, 0777), "The folder '" + path + "' cannot be made");
+}
+
+bool exists(std::string const& path)
+{
+    struct statx status;
+    std::error_code const error = os::examine(path, status);
+    if (error != std::errc::no_such_file_or_directory && error != std::errc::not_a_directory) {
+        check(error, "'" + path + "' cannot be examined");
+    }
+    return !error;
+}
+
+StorageUrl urlOf(OdString const& text)
+{
+    std::optional<StorageUrl> const url = parseUrl(text);
+    if (!url) {
+        throw StorageError(quoted(text) + " is no URL of this storage.");
+    }
+    return *url;
+}
+
+[[noreturn]] void throwMissing(OdString const& url)
+{
+    throw StorageError(quoted(url) + " is not in the storage.");
+}
+
+/// A file that fits into one segment is read whole: then what is compressed is what was digested.
+Content openContent(std::string const& path, std::string const& name, std::uint64_t segmentLength)
+{
+    os::OpenFile file;
+    check(file.openForReading(path), name + " cannot be opened");
+    std::uint64_t length = 0;
+    check(file.length(length), name + " cannot be read");
+    if (length > segmentLength) {
+        return {std::move(file), length, name};
+    }
+    Buffer bytes;
+    std::size_t done = 0;
+    auto const count = static_cast<std::size_t>(length);
+    check(file.readAt(0, bytes.reserve(count + 1), count + 1, done), name + " cannot be read");
+    if (done != count) {
+        throw StorageError(name + " has changed while it was being stored.");
+    }
+    return {std::move(bytes), count};
+}
+
+bool isReadable(RecordFile const& file, std::size_t index, std::string const& scratch)
+{
+    try {
+        file.read(index, scratch, nullptr, [](std::string_view) {});
+        return true;
+    } catch (StorageError const&) {
+        return false;
+    }
+}
+
+/// The record that a new revision builds on: the previous one, or, where its chain is full, the whole one that the
+/// chain begins with.
+std::optional<std::size_t> baseIn(RecordFile const& file, DigestBytes const& previous)
+{
+    if (file.entries().empty()) {
+        return std::nullopt;
+    }
+    try {
+        std::size_t const newest = file.entries().size() - 1;
+        std::vector<std::size_t> const chain = file.chainOf(file.find(previous).value_or(newest));
+        Record const& last = file.entries()[chain.back()].record;
+        std::size_t const longest = last.length > last.segmentLength() ? kLongestLargeChain : kLongestChain;
+        return chain.size() <= longest ? chain.back() : chain.front();
+    } catch (StorageError const&) {
+        return std::nullopt;
+    }
+}
+
+/// `target` inside the working folder. It may come from a stranger's commit.
+std::string targetPath(common::RootPath const& root, OdString const& target)
+{
+    std::string const path = target.ansi_str() + "/";
+    for (std::size_t begin = 0; begin < path.size();) {
+        std::size_t const end = path.find('/', begin);
+        std::string const part = path.substr(begin, end - begin);
+        if (part.empty() || part == "." || part == ".." || part.find('\0') != std::string::npos) {
+            throw StorageError(quoted(target) + " is no path inside the working folder.");
+        }
+        begin = end + 1;
+    }
+    return root.pathTo(target).ansi_str();
+}
+
+void flushFile(std::string const& path)
+{
+    os::OpenFile file;
+    check(file.openForReading(path), "'" + path + "' cannot be opened");
+    check(file.flush(), "'" + path + "' cannot be written");
+}
+
+} // namespace
+
+LocalStorage::LocalStorage(LookUp previousUrl, LookUp knownUrl, unsigned segmentLog)
+    : previousUrl_(std::move(previousUrl))
+    , knownUrl_(std::move(knownUrl))
+    , segmentLog_(segmentLog)
+{
+}
+
+LocalStorage::~LocalStorage()
+{
+    takeBack();
+}
+
+Expected<OdString> LocalStorage::store(common::RootPath const& root, OdString const& path)
+{
+    return guarded<OdString>([&] {
+        Content const content =
+            openContent(root.pathTo(path).ansi_str(), quoted(path), std::uint64_t{1} << segmentLog_);
+        DigestBytes const digest = digestOf(content);
+        OdString url = keptUrl(root, digest);
+        if (url.isEmpty()) {
+            beginBatch(root);
+            bool const isDrawing = common::fileToType(path) == common::StorageType::Tf;
+            url = (isDrawing ? keepDrawing(root, path, digest, content) : keepObject(root, digest, content)).text();
+            batch_.urls[digest] = url;
+        }
+        return url;
+    });
+}
+
+OdString LocalStorage::keptUrl(common::RootPath const& root, DigestBytes const& digest)
+{
+    auto const stored = batch_.urls.find(digest);
+    if (stored != batch_.urls.end()) {
+        return stored->second;
+    }
+    OdString const known = knownUrl_ ? knownUrl_(wide(hexOf(digest))) : OdString();
+    std::optional<StorageUrl> const url = parseUrl(known);
+    return url && url->digest == digest && isKept(root, known) ? known : OdString();
+}
+
+// Opened before anything is written: what fails on the disk from here on is seen when it is flushed.
+void LocalStorage::beginBatch(common::RootPath const& root)
+{
+    if (!batch_.fileSystem.isOpen()) {
+        check(batch_.fileSystem.openFolder(tavFolder(root)), "'" + tavFolder(root) + "' cannot be opened");
+    }
+}
+
+StorageUrl LocalStorage::keepObject(common::RootPath const& root, DigestBytes const& digest, Content const& content)
+{
+    StorageUrl const url{{}, digest};
+    std::string const path = objectFolder(root) + "/" + hexOf(digest);
+    makeFolders(incomingFolder(root));
+    batch_.folders.insert(objectFolder(root));
+    if (exists(path)) { // Whole, but perhaps of an interrupted operation that has not flushed the folder.
+        return url;
+    }
+    std::string const incoming = incomingFolder(root) + "/" + hexOf(digest);
+    [[maybe_unused]] std::error_code const mostlyMissing = os::removeUnflushed(incoming);
+    try {
+        RecordFile file = RecordFile::create(incoming, "The object " + quoted(url.text()));
+        file.append(content, digest, nullptr, segmentLog_);
+        batch_.objects[path] = incoming;
+    } catch (...) {
+        [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(incoming);
+        throw;
+    }
+    return url;
+}
+
+StorageUrl LocalStorage::previousVersion(OdString const& path) const
+{
+    std::optional<StorageUrl> const previous = previousUrl_ ? parseUrl(previousUrl_(path)) : std::nullopt;
+    return previous.value_or(StorageUrl());
+}
+
+StorageUrl LocalStorage::keepDrawing(
+    common::RootPath const& root, OdString const& path, DigestBytes const& digest, Content const& content)
+{
+    StorageUrl const previous = previousVersion(path);
+    StorageUrl const url{previous.isObject() ? newStoreName(path, digest) : previous.store, digest};
+    std::string const file = pathOf(root, url);
+    std::string const name = "The revision store '" + url.store + "'";
+    makeFolders(storeFolder(root));
+    batch_.folders.insert(storeFolder(root));
+    bool const isNew = !exists(file);
+    RecordFile store = isNew ? RecordFile::create(file, name) : RecordFile::openForChanging(file, name);
+    batch_.storeLengths.emplace(file, store.end());
+    std::optional<std::size_t> const found = store.find(digest);
+    if (found && isReadable(store, *found, tavFolder(root))) { // Of an interrupted operation; perhaps not flushed.
+        return url;
+    }
+    try {
+        loadBase(store, baseIn(store, previous.digest), tavFolder(root));
+        store.append(content, digest, base_ ? &*base_ : nullptr, segmentLog_);
+        if (base_ && !base_->content.isInMemory()) {
+            base_.reset();
+        }
+    } catch (...) {
+        if (isNew) {
+            [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(file);
+            batch_.storeLengths.erase(file);
+        }
+        throw;
+    }
+    return url;
+}
+
+void LocalStorage::loadBase(RecordFile const& store, std::optional<std::size_t> index, std::string const& scratch)
+{
+    base_.reset();
+    if (!index) {
+        return;
+    }
+    try {
+        base_ = {store.entries()[*index].record.digest, store.load(*index, scratch)};
+    } catch (StorageError const&) {
+        return; // Nothing is built on a damaged content.
+    }
+}
+
+WriteOutcome LocalStorage::flush(common::RootPath const&)
+{
+    return guarded([&] { flushBatch(); });
+}
+
+void LocalStorage::flushBatch()
+{
+    try {
+        flushContents();
+        for (auto const& [path, incoming] : batch_.objects) {
+            check(os::renameUnflushed(incoming, path), "'" + path + "' cannot be made");
+        }
+        for (std::string const& folder : batch_.folders) {
+            check(os::flushFolder(folder), "'" + folder + "' cannot be written");
+        }
+    } catch (...) {
+        takeBack();
+        throw;
+    }
+    batch_ = Batch();
+}
+
+void LocalStorage::flushContents() const
+{
+    if (batch_.objects.size() + batch_.storeLengths.size() > kFewFiles) {
+        std::error_code const error = batch_.fileSystem.flushFileSystem();
+        if (error != std::errc::function_not_supported) {
+            return check(error, "The storage cannot be written");
+        }
+    }
+    for (auto const& [path, incoming] : batch_.objects) {
+        flushFile(incoming);
+    }
+    for (auto const& [path, length] : batch_.storeLengths) {
+        flushFile(path);
+    }
+}
+
+// What cannot be taken back is in nobody's way: torn tails and incoming objects are dropped later, whole ones found.
+void LocalStorage::takeBack() noexcept
+{
+    std::error_code ignored;
+    for (auto const& [path, incoming] : batch_.objects) {
+        ignored = os::removeUnflushed(incoming);
+        ignored = os::removeUnflushed(path);
+    }
+    for (auto const& [path, length] : batch_.storeLengths) {
+        os::OpenFile store;
+        if (length == 0) {
+            ignored = os::removeUnflushed(path);
+        } else if (!store.openForChanging(path)) {
+            ignored = store.truncate(length);
+        }
+    }
+    batch_ = Batch();
+}
+
+std::string LocalStorage::pathOf(common::RootPath const& root, StorageUrl const& url) const
+{
+    if (!url.isObject()) {
+        return storeFolder(root) + "/" + url.store + kStoreEnd;
+    }
+    std::string const path = objectFolder(root) + "/" + hexOf(url.digest);
+    auto const incoming = batch_.objects.find(path);
+    return incoming == batch_.objects.end() ? path : incoming->second;
+}
+
+bool LocalStorage::isKept(common::RootPath const& root, OdString const& text) const
+{
+    StorageUrl const url = urlOf(text);
+    std::string const path = pathOf(root, url);
+    if (url.isObject() || !exists(path)) {
+        return exists(path);
+    }
+    return RecordFile::openForReading(path, "The store of " + quoted(text)).find(url.digest).has_value();
+}
+
+LocalStorage::Found LocalStorage::find(common::RootPath const& root, OdString const& text) const
+{
+    StorageUrl const url = urlOf(text);
+    std::string const path = pathOf(root, url);
+    if (!exists(path)) {
+        throwMissing(text);
+    }
+    std::string const name = "The content of " + quoted(text);
+    RecordFile file = RecordFile::openForReading(path, name);
+    std::optional<std::size_t> const index = file.find(url.digest);
+    if (index) {
+        return {std::move(file), *index};
+    }
+    if (url.isObject()) {
+        throw StorageError(name + " is damaged.");
+    }
+    throwMissing(text);
+}
+
+void LocalStorage::read(common::RootPath const& root, OdString const& url, Sink const& sink) const
+{
+    Found const found = find(root, url);
+    found.file.read(found.index, tavFolder(root), base_ ? &*base_ : nullptr, sink);
+}
+
+WriteOutcome LocalStorage::read(
+    common::RootPath const& root, OdString const& url, std::function<bool(char const*, std::size_t)> const& sink)
+{
+    return guarded([&] {
+        read(root, url, [&](std::string_view piece) {
+            if (!sink(piece.data(), piece.size())) {
+                throw StorageError("The content of " + quoted(url) + " was not read to its end.");
+            }
+        });
+    });
+}
+
+WriteOutcome LocalStorage::verify(common::RootPath const& root, OdString const& url)
+{
+    return guarded([&] { read(root, url, [](std::string_view) {}); });
+}
+
+void LocalStorage::extractTo(
+    common::RootPath const& root, OdString const& url, std::string const& path, mode_t permissions) const
+{
+    Found const found = find(root, url);
+    os::OpenFile file;
+    check(file.create(path, permissions), "'" + path + "' cannot be made");
+    std::uint64_t offset = 0;
+    try {
+        found.file.read(found.index, tavFolder(root), nullptr, [&](std::string_view piece) {
+            check(file.writeAt(offset, piece), "'" + path + "' cannot be written");
+            offset += piece.size();
+        });
+    } catch (...) {
+        [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(path);
+        throw;
+    }
+}
+
+WriteOutcome LocalStorage::extract(common::RootPath const& root, OdString const& url, std::string const& path)
+{
+    return guarded([&] { extractTo(root, url, path, 0666); });
+}
+
+void LocalStorage::restoreTo(common::RootPath const& root, OdString const& url, OdString const& target) const
+{
+    std::string const path = targetPath(root, target);
+    makeFolders(restoringFolder(root));
+    std::string const restoring = restoringFolder(root) + "/" + newRestoringName();
+    mode_t const permissions = exists(path) ? 0600 : 0666; // Nobody reads it before its permissions are right.
+    extractTo(root, url, restoring, permissions);
+    try {
+        makeFolders(path.substr(0, path.rfind('/')));
+        check(os::replaceFileBy(path, restoring), quoted(target) + " cannot be replaced");
+    } catch (...) {
+        [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(restoring);
+        throw;
+    }
+}
+
+WriteOutcome LocalStorage::restore(common::RootPath const& root, OdString const& url, OdString const& target)
+{
+    return guarded([&] { restoreTo(root, url, target); });
+}
+
+Expected<bool> LocalStorage::contains(common::RootPath const& root, OdString const& url)
+{
+    return guarded<bool>([&] { return isKept(root, url); });
+}
+
+Expected<std::uint64_t> LocalStorage::size(common::RootPath const& root, OdString const& url)
+{
+    return guarded<std::uint64_t>([&] {
+        Found const found = find(root, url);
+        return found.file.entries()[found.index].record.length;
+    });
+}
+
+Expected<std::vector<OdString>> LocalStorage::revisions(common::RootPath const& root, OdString const& text)
+{
+    return guarded<std::vector<OdString>>([&] {
+        StorageUrl url = urlOf(text);
+        Found const found = find(root, text);
+        std::vector<OdString> all;
+        std::set<DigestBytes> seen;
+        for (Entry const& entry : found.file.entries()) {
+            url.digest = entry.record.digest;
+            if (seen.insert(url.digest).second) {
+                all.push_back(url.text());
+            }
+        }
+        return all;
+    });
+}
+
+Expected<bool> LocalStorage::mergeFromStorage(common::RootPath const& root, OdString const& target, OdString const& url)
+{
+    return guarded<bool>([&] {
+        if (!isKept(root, url)) {
+            return false;
+        }
+        std::string const path = targetPath(root, target);
+        if (!exists(path)) {
+            restoreTo(root, url, target);
+        } else if (digestOf(openContent(path, quoted(target), 0)) != urlOf(url).digest) {
+            throw StorageError(quoted(target) + " differs from the stored version, and the two cannot be merged here.");
+        }
+        return true;
+    });
+}
+
+WriteOutcome LocalStorage::remove(common::RootPath const& root, OdString const& text)
+{
+    return guarded([&] {
+        flushBatch();
+        Found const found = find(root, text);
+        StorageUrl const url = urlOf(text);
+        Freed freed;
+        if (url.isObject()) {
+            removeCounted(pathOf(root, url), 1, freed);
+            return check(os::flushFolder(objectFolder(root)), "'" + objectFolder(root) + "' cannot be written");
+        }
+        std::set<DigestBytes> others;
+        for (Entry const& entry : found.file.entries()) {
+            others.insert(entry.record.digest);
+        }
+        others.erase(url.digest);
+        reduceStore(pathOf(root, url), "The revision store '" + url.store + "'", others, tavFolder(root), freed);
+        check(os::flushFolder(storeFolder(root)), "'" + storeFolder(root) + "' cannot be written");
+    });
+}
+
+namespace {
+
+/// The steps of `keepOnly` on one repository.
+class Cleaning {
+public:
+    Cleaning(common::RootPath const& root, std::set<OdString> const& urls) : root_(root)
+    {
+        for (OdString const& text : urls) {
+            StorageUrl const url = urlOf(text);
+            kept_[url.store].insert(url.digest);
+        }
+    }
+
+    Freed run()
+    {
+        removeAllIn(incomingFolder(root_));
+        removeAllIn(restoringFolder(root_));
+        cleanObjects();
+        cleanStores();
+        for (std::string const& folder : {objectFolder(root_), storeFolder(root_)}) {
+            if (exists(folder)) {
+                check(os::flushFolder(folder), "'" + folder + "' cannot be written");
+            }
+        }
+        if (!firstError_.empty()) {
+            throw StorageError(firstError_);
+        }
+        return freed_;
+    }
+
+private:
+    void removeAllIn(std::string const& folder)
+    {
+        for (std::string const& name : entriesOf(folder)) {
+            if (name != "." && name != "..") {
+                removeCounted(std::string(folder).append("/").append(name), 0, freed_);
+            }
+        }
+    }
+
+    void cleanObjects()
+    {
+        std::set<DigestBytes> const& kept = kept_[{}];
+        for (std::string const& name : entriesOf(objectFolder(root_))) {
+            std::optional<DigestBytes> const digest = digestFromHex(name);
+            if (digest && kept.count(*digest) == 0) {
+                removeCounted(objectFolder(root_).append("/").append(name), 1, freed_);
+            }
+        }
+    }
+
+    void cleanStores()
+    {
+        std::string const newEnd = std::string(kStoreEnd) + ".new";
+        for (std::string const& name : entriesOf(storeFolder(root_))) {
+            if (endsWith(name, newEnd)) {
+                removeCounted(storeFolder(root_).append("/").append(name), 0, freed_);
+            }
+        }
+        for (std::string const& name : entriesOf(storeFolder(root_))) {
+            std::string const store = name.substr(0, name.rfind('.'));
+            if (endsWith(name, kStoreEnd) && isStoreName(store)) {
+                reduce(storeFolder(root_).append("/").append(name), store);
+            }
+        }
+    }
+
+    void reduce(std::string const& path, std::string const& store)
+    {
+        try {
+            reduceStore(path, "The revision store '" + store + "'", kept_[store], tavFolder(root_), freed_);
+        } catch (StorageError const& error) {
+            firstError_ = firstError_.empty() ? error.what : firstError_;
+        }
+    }
+
+    static bool endsWith(std::string_view text, std::string_view end)
+    {
+        return text.size() >= end.size() && text.substr(text.size() - end.size()) == end;
+    }
+
+    common::RootPath root_;
+    std::map<std::string, std::set<DigestBytes>> kept_;
+    Freed freed_;
+    std::string firstError_;
+};
+
+} // namespace
+
+Expected<Freed> LocalStorage::keepOnly(common::RootPath const& root, std::set<OdString> const& urls)
+{
+    return guarded<Freed>([&] {
+        flushBatch();
+        return Cleaning(root, urls).run();
+    });
+}
+
+} // namespace tav

@@ -1,0 +1,137 @@
+/// The storage inside ".tav", where the contents of all versions are kept.
+///
+/// A drawing's versions are appended to a revision store, ".tav/tf/NAME.tf", each as the difference to an earlier one
+/// where that is smaller; every other content is an object of its own, ".tav/objects/DIGEST". All of it is compressed
+/// with zstd, checked against its SHA-256 digest whenever it is read, and described in docs/formats/storage.md.
+///
+/// URLs are "tf:NAME#DIGEST" and "po:DIGEST" (host/storage/storage_url.h): a URL names the same content in every
+/// repository. Equal content is kept once, so a drawing may get the URL of an object, and the reverse.
+///
+/// An object works on one repository, on one thread at a time. What changes the storage is for who holds the lock of
+/// the repository; reading needs none. All errors are sentences in English that name what they speak of. No content
+/// ends the process: lack of memory is an error too.
+///
+/// Memory: files up to 64 MiB are held whole, with their base, a spare for unpacking it and the result, so a file of n
+/// MiB needs about four times n. Beyond that, work goes by segments of 64 MiB, whatever the length. No operation uses
+/// more than some 400 MiB; storing a second version of a file of 1.5 GiB was measured to use 223.
+#pragma once
+
+#include "common/mu_common_file_storage.h"
+
+#include "host/storage/record_file.h"
+#include "host/storage/storage_url.h"
+
+#include "platform/os/os_open_file.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <optional>
+#include <set>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace tav {
+
+/// What a cleaning of the storage has removed.
+struct Freed {
+    std::size_t contents = 0; ///< objects and revisions
+    std::uint64_t bytes = 0;
+};
+
+/// See above.
+class LocalStorage final : public common::FileStorage {
+public:
+    /// Answers with a URL, or an empty text when there is none.
+    using LookUp = std::function<OdString(OdString const&)>;
+
+    /// `previousUrl` gives, for a path, the URL of the version that the last commit holds of that file, under whatever
+    /// path: its store is appended to. `knownUrl` gives, for a digest, the URL under which its content is kept already.
+    /// Either may be empty. Only tests give a `segmentLog`: contents are worked on in pieces of 2^`segmentLog` bytes.
+    explicit LocalStorage(LookUp previousUrl = {}, LookUp knownUrl = {}, unsigned segmentLog = kSegmentLog);
+    /// Takes back what was stored and not flushed.
+    ~LocalStorage() override;
+
+    /// Keeps the content of `path`, which is relative to the working folder. The URL may be handed on once `flush` has
+    /// succeeded; this object reads the content at once. A repetition gives the same URL. What is kept is
+    /// what was read, under its own digest; a file seen to change meanwhile is an error ("has changed while it was
+    /// being stored"), after which the caller tries again. An error leaves nothing of the file behind.
+    Expected<OdString> store(common::RootPath const& root, OdString const& path) override;
+    /// Waits until everything stored since the last flush is safe on the disk, in one go. After an error nothing of it
+    /// is kept, and its URLs are void.
+    WriteOutcome flush(common::RootPath const& root);
+
+    /// Writes the content into `target`, relative to the working folder and inside it; missing folders are made. The
+    /// old file, whose permissions are kept, gives way to the new one, whole and flushed, in one step.
+    WriteOutcome restore(common::RootPath const& root, OdString const& url, OdString const& target) override;
+    /// Writes the content into the new file `path`, a full path in bytes, and does not flush it. When the name is
+    /// taken, nothing is touched; after any other error there is no file.
+    WriteOutcome extract(common::RootPath const& root, OdString const& url, std::string const& path);
+    /// Gives the content to `sink`, piece by piece. Until this returns success the content may yet turn out to be
+    /// damaged. A sink that returns false gets no more; that is an error too ("was not read to its end").
+    WriteOutcome
+    read(common::RootPath const& root, OdString const& url, std::function<bool(char const*, std::size_t)> const& sink);
+
+    /// Whether the content is kept; that it is whole, `verify` finds out. Error: no URL of this storage.
+    Expected<bool> contains(common::RootPath const& root, OdString const& url) override;
+    /// Length of the content in bytes, without unpacking it.
+    Expected<std::uint64_t> size(common::RootPath const& root, OdString const& url);
+    /// Reads the content and checks its digest.
+    WriteOutcome verify(common::RootPath const& root, OdString const& url) override;
+    /// Revisions in the store of `url`, each once; of an object the object alone.
+    Expected<std::vector<OdString>> revisions(common::RootPath const& root, OdString const& url) override;
+
+    /// True at once where `target`, relative to the working folder, has that content already; restores a target that
+    /// is missing. Differing contents cannot be merged here: error, with the target untouched.
+    Expected<bool> mergeFromStorage(common::RootPath const& root, OdString const& target, OdString const& url) override;
+
+    /// Removes the content. A revision that others build on stays in the store until they go.
+    WriteOutcome remove(common::RootPath const& root, OdString const& url) override;
+    /// Removes everything but `urls` and the revisions that they build on, and what interrupted operations have left.
+    /// A store is rewritten beside the old one, flushed, read back, and takes its place. A store in which something to
+    /// be kept cannot be read stays as it is; the rest is cleaned, and then that is the error. What was stored and not
+    /// flushed is flushed first.
+    Expected<Freed> keepOnly(common::RootPath const& root, std::set<OdString> const& urls);
+
+private:
+    struct Batch { // since the last flush
+        std::map<DigestBytes, OdString> urls;
+        std::map<std::string, std::string> objects;        // final path, path meanwhile
+        std::map<std::string, std::uint64_t> storeLengths; // before the first append
+        std::set<std::string> folders;
+        os::OpenFile fileSystem;
+    };
+    struct Found {
+        RecordFile file;
+        std::size_t index;
+    };
+
+    StorageUrl keepObject(common::RootPath const& root, DigestBytes const& digest, Content const& content);
+    StorageUrl
+    keepDrawing(common::RootPath const& root, OdString const& path, DigestBytes const& digest, Content const& content);
+    OdString keptUrl(common::RootPath const& root, DigestBytes const& digest);
+    StorageUrl previousVersion(OdString const& path) const;
+    void loadBase(RecordFile const& store, std::optional<std::size_t> index, std::string const& scratch);
+    void beginBatch(common::RootPath const& root);
+    void flushBatch();
+    void flushContents() const;
+    void takeBack() noexcept;
+
+    std::string pathOf(common::RootPath const& root, StorageUrl const& url) const;
+    bool isKept(common::RootPath const& root, OdString const& url) const;
+    Found find(common::RootPath const& root, OdString const& url) const;
+    void read(common::RootPath const& root, OdString const& url, Sink const& sink) const;
+    void
+    extractTo(common::RootPath const& root, OdString const& url, std::string const& path, mode_t permissions) const;
+    void restoreTo(common::RootPath const& root, OdString const& url, OdString const& target) const;
+
+    LookUp previousUrl_;
+    LookUp knownUrl_;
+    unsigned segmentLog_;
+    Batch batch_;
+    std::optional<KnownContent> base_; // of the drawing stored last: whoever verifies that one needs it again
+};
+
+} // namespace tav

@@ -1,0 +1,269 @@
+#include "host/storage/record_file.h"
+
+#include "host/storage/storage_error.h"
+
+#include <algorithm>
+#include <utility>
+
+namespace tav {
+
+namespace {
+
+constexpr std::size_t kPiece = std::size_t{1} << 20;
+
+} // namespace
+
+RecordFile RecordFile::openForReading(std::string const& path, std::string name)
+{
+    os::OpenFile file;
+    check(file.openForReading(path), name + " cannot be opened");
+    RecordFile records(std::move(file), std::move(name));
+    records.list();
+    return records;
+}
+
+RecordFile RecordFile::openForChanging(std::string const& path, std::string name)
+{
+    os::OpenFile file;
+    check(file.openForChanging(path), name + " cannot be opened");
+    RecordFile records(std::move(file), std::move(name));
+    records.list();
+    return records;
+}
+
+RecordFile RecordFile::create(std::string const& path, std::string name)
+{
+    os::OpenFile file;
+    check(file.create(path, 0666), name + " cannot be made");
+    return {std::move(file), std::move(name)};
+}
+
+void RecordFile::list()
+{
+    check(file_.length(length_), name_ + " cannot be read");
+    for (std::uint64_t offset = 0; offset < length_; offset = end()) {
+        std::optional<Entry> entry = entryAt(offset);
+        if (!entry) {
+            entry = nextEntry(offset + 1);
+        }
+        if (!entry) {
+            return;
+        }
+        entries_.push_back(*entry);
+    }
+}
+
+std::size_t RecordFile::readUpTo(std::uint64_t offset, char* buffer, std::size_t count) const
+{
+    std::size_t done = 0;
+    check(file_.readAt(offset, buffer, count, done), name_ + " cannot be read");
+    return done;
+}
+
+std::optional<Entry> RecordFile::entryAt(std::uint64_t offset) const
+{
+    std::array<char, kHeaderLength> bytes;
+    std::size_t const done = readUpTo(offset, bytes.data(), bytes.size());
+    std::optional<Record> const record = parseHeader({bytes.data(), done});
+    if (!record || record->framesLength > length_ - offset - kHeaderLength) {
+        return std::nullopt;
+    }
+    return Entry{*record, offset};
+}
+
+std::optional<Entry> RecordFile::nextEntry(std::uint64_t offset) const
+{
+    std::string piece(std::min<std::uint64_t>(kPiece, length_ - offset), '\0');
+    while (offset + kHeaderLength <= length_) {
+        std::size_t const done = readUpTo(offset, piece.data(), piece.size());
+        std::string_view const text(piece.data(), done);
+        for (std::size_t mark = text.find(headerMark()); mark < text.size(); mark = text.find(headerMark(), mark + 1)) {
+            if (auto const entry = entryAt(offset + mark)) {
+                return entry;
+            }
+        }
+        if (done < piece.size() || done < kHeaderLength) {
+            return std::nullopt;
+        }
+        offset += done - headerMark().size() + 1; // A mark may lie across the border.
+    }
+    return std::nullopt;
+}
+
+bool RecordFile::isClean() const
+{
+    std::uint64_t offset = 0;
+    for (Entry const& entry : entries_) {
+        if (entry.offset != offset) {
+            return false;
+        }
+        offset = entry.end();
+    }
+    return offset == length_;
+}
+
+std::optional<std::size_t> RecordFile::findBefore(std::size_t index, DigestBytes const& digest) const
+{
+    while (index-- > 0) {
+        if (entries_[index].record.digest == digest) {
+            return index;
+        }
+    }
+    return std::nullopt;
+}
+
+std::vector<std::size_t> RecordFile::chainOf(std::size_t index) const
+{
+    std::vector<std::size_t> chain = {index};
+    while (!entries_[chain.back()].record.isWhole()) {
+        std::optional<std::size_t> const base = findBefore(chain.back(), entries_[chain.back()].record.base);
+        if (!base || chain.size() > kLongestChain) {
+            throw StorageError(name_ + " is damaged.");
+        }
+        chain.push_back(*base);
+    }
+    std::reverse(chain.begin(), chain.end());
+    return chain;
+}
+
+void RecordFile::unpack(std::size_t index, Content const* base, Buffer& memory, Sink const& sink) const
+{
+    Entry const& entry = entries_[index];
+    decompress(entry.record, {file_, entry.framesOffset()}, base, name_, memory, sink);
+}
+
+// Up to the length of a segment in `memory`, else in a file without a name.
+Content RecordFile::unpack(std::size_t index, Content const* base, std::string const& scratch, Buffer memory) const
+{
+    Record const& record = entries_[index].record;
+    if (record.length <= record.segmentLength()) {
+        unpack(index, base, memory, [](std::string_view) {});
+        return {std::move(memory), static_cast<std::size_t>(record.length)};
+    }
+    os::OpenFile file;
+    check(file.createUnnamed(scratch), "A temporary file in '" + scratch + "' cannot be made");
+    std::uint64_t offset = 0;
+    unpack(index, base, memory, [&](std::string_view piece) {
+        check(file.writeAt(offset, piece), "A temporary file in '" + scratch + "' cannot be written");
+        offset += piece.size();
+    });
+    return {std::move(file), record.length, "A temporary file"};
+}
+
+// The memory of one content of the chain serves for the next but one: fresh pages cost as much as unpacking into them.
+std::optional<Content> RecordFile::loadBase(std::size_t index, std::string const& scratch, Buffer& spare) const
+{
+    std::vector<std::size_t> const chain = chainOf(index);
+    std::optional<Content> base;
+    for (std::size_t i = 0; i + 1 < chain.size(); ++i) {
+        Content next = unpack(chain[i], base ? &*base : nullptr, scratch, std::move(spare));
+        spare = base ? base->takeMemory() : Buffer();
+        base = std::move(next);
+    }
+    return base;
+}
+
+void RecordFile::requireDigest(std::size_t index, DigestBytes const& digest) const
+{
+    if (digest != entries_[index].record.digest) {
+        throw StorageError(name_ + " is damaged.");
+    }
+}
+
+void RecordFile::read(std::size_t index, std::string const& scratch, KnownContent const* known, Sink const& sink) const
+{
+    Buffer spare;
+    bool const isOnKnown = known != nullptr && entries_[index].record.base == known->digest;
+    std::optional<Content> const base = isOnKnown ? std::nullopt : loadBase(index, scratch, spare);
+    common::ContentDigest digest;
+    unpack(
+        index,
+        isOnKnown ? &known->content
+        : base    ? &*base
+                  : nullptr,
+        spare, [&](std::string_view piece) {
+            digest.update(piece.data(), piece.size());
+            sink(piece);
+        });
+    requireDigest(index, finish(digest));
+}
+
+Content RecordFile::load(std::size_t index, std::string const& scratch) const
+{
+    Buffer spare;
+    std::optional<Content> const base = loadBase(index, scratch, spare);
+    Content content = unpack(index, base ? &*base : nullptr, scratch, std::move(spare));
+    requireDigest(index, digestOf(content));
+    return content;
+}
+
+void RecordFile::write(std::uint64_t offset, std::string_view bytes) const
+{
+    check(file_.writeAt(offset, bytes), name_ + " cannot be written");
+}
+
+// The header last: until it is there, what follows it is no record.
+Record RecordFile::writeRecord(
+    Content const& content, DigestBytes const& digest, KnownContent const* base, unsigned segmentLog) const
+{
+    std::uint64_t offset = end() + kHeaderLength;
+    Content const* const baseContent = base != nullptr ? &base->content : nullptr;
+    Compressed const compressed = compress(content, digest, baseContent, segmentLog, [&](std::string_view frame) {
+        write(offset, frame);
+        offset += frame.size();
+    });
+    Record const record{
+        digest, compressed.usesBase ? base->digest : DigestBytes{}, content.length(), compressed.framesLength,
+        segmentLog};
+    write(end(), headerOf(record));
+    return record;
+}
+
+template <class Write>
+void RecordFile::appendRecord(Write const& write)
+{
+    std::uint64_t const before = end();
+    if (length_ > before) {
+        check(file_.truncate(before), name_ + " cannot be written");
+    }
+    try {
+        entries_.push_back({write(), before});
+        length_ = end();
+    } catch (...) {
+        // What is left if this fails is a torn tail.
+        [[maybe_unused]] std::error_code const ignored = file_.truncate(before);
+        length_ = before;
+        throw;
+    }
+}
+
+void RecordFile::append(
+    Content const& content, DigestBytes const& digest, KnownContent const* base, unsigned segmentLog)
+{
+    appendRecord([&] { return writeRecord(content, digest, base, segmentLog); });
+}
+
+void RecordFile::appendFrom(RecordFile const& other, std::size_t index)
+{
+    Entry const& entry = other.entries_[index];
+    std::string piece(std::min<std::uint64_t>(kPiece, entry.end() - entry.offset), '\0');
+    appendRecord([&] {
+        for (std::uint64_t offset = entry.offset; offset < entry.end();) {
+            std::size_t const wanted = std::min<std::uint64_t>(piece.size(), entry.end() - offset);
+            std::size_t const done = other.readUpTo(offset, piece.data(), wanted);
+            if (done < wanted) {
+                throw StorageError(other.name_ + " is damaged.");
+            }
+            write(end() + offset - entry.offset, {piece.data(), done});
+            offset += done;
+        }
+        return entry.record;
+    });
+}
+
+void RecordFile::flush() const
+{
+    check(file_.flush(), name_ + " cannot be written");
+}
+
+} // namespace tav

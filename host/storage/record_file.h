@@ -1,0 +1,107 @@
+/// Files of records: a revision store holds many, an object is one with a single record (docs/formats/storage.md).
+#pragma once
+
+#include "host/storage/content.h"
+#include "host/storage/record.h"
+#include "host/storage/segments.h"
+
+#include "platform/os/os_open_file.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace tav {
+
+/// Deltas on deltas are read back one after the other; this many at most lead from a whole content to another one.
+inline constexpr std::size_t kLongestChain = 32;
+/// The same for contents longer than a segment, whose every step goes through a file.
+inline constexpr std::size_t kLongestLargeChain = 8;
+
+/// A record and its place in the file.
+struct Entry {
+    Record record;
+    std::uint64_t offset = 0; ///< of the header
+
+    std::uint64_t framesOffset() const { return offset + kHeaderLength; }
+    std::uint64_t end() const { return framesOffset() + record.framesLength; }
+};
+
+/// A content that was read and checked, kept for another use.
+struct KnownContent {
+    DigestBytes digest{};
+    Content content;
+};
+
+/// An open file of records, and the list of them. Everything throws `StorageError`. One thread at a time; appending
+/// is for who holds the repository's lock, reading is not disturbed by it.
+///
+/// Damage is stepped over: where a header does not hold, the next one that does is looked for. What follows the last
+/// record that is whole is a torn tail, left by an append that never ended. Readers do not see it, and the next append
+/// takes its place.
+class RecordFile {
+public:
+    /// Opens the file `path`. Messages speak of it as `name`.
+    static RecordFile openForReading(std::string const& path, std::string name);
+    static RecordFile openForChanging(std::string const& path, std::string name);
+    /// Makes the file, which must not exist.
+    static RecordFile create(std::string const& path, std::string name);
+
+    /// In the order of the file, which is that of their making.
+    std::vector<Entry> const& entries() const { return entries_; }
+    /// Where the next record goes.
+    std::uint64_t end() const { return entries_.empty() ? 0 : entries_.back().end(); }
+    /// Length of the file, any torn tail included.
+    std::uint64_t length() const { return length_; }
+    /// Whether the file is its records and nothing else.
+    bool isClean() const;
+
+    /// The newest record of the content `digest`: its index.
+    std::optional<std::size_t> find(DigestBytes const& digest) const { return findBefore(entries_.size(), digest); }
+    /// The records that lead to the content of record `index`, the whole one first, that record last. Throws when one
+    /// is missing or there are too many.
+    std::vector<std::size_t> chainOf(std::size_t index) const;
+
+    /// Gives `sink` the content of record `index`, and throws if it was not the right one: only who has seen this
+    /// return may believe what `sink` got. Large contents on the way lie in files without names in `scratch`. Where the
+    /// record builds on `known`, if that is not null, its base is not read.
+    void read(std::size_t index, std::string const& scratch, KnownContent const* known, Sink const& sink) const;
+    /// The content of record `index`, checked.
+    Content load(std::size_t index, std::string const& scratch) const;
+
+    /// Appends `content`, on `base` where that is not null and makes it smaller; `base` is a content of this file. A
+    /// failure leaves the file as it was, as far as the disk lets it. Throws when the content turns out to be another
+    /// than `digest`.
+    void append(Content const& content, DigestBytes const& digest, KnownContent const* base, unsigned segmentLog);
+    /// Appends the record `index` of `other` as it stands.
+    void appendFrom(RecordFile const& other, std::size_t index);
+    /// Waits until the file is safe on the disk.
+    void flush() const;
+
+private:
+    RecordFile(os::OpenFile file, std::string name) : file_(std::move(file)), name_(std::move(name)) {}
+
+    void list();
+    std::optional<Entry> entryAt(std::uint64_t offset) const;
+    std::optional<Entry> nextEntry(std::uint64_t offset) const;
+    std::size_t readUpTo(std::uint64_t offset, char* buffer, std::size_t count) const;
+    std::optional<std::size_t> findBefore(std::size_t index, DigestBytes const& digest) const;
+    std::optional<Content> loadBase(std::size_t index, std::string const& scratch, Buffer& spare) const;
+    Content unpack(std::size_t index, Content const* base, std::string const& scratch, Buffer memory) const;
+    void unpack(std::size_t index, Content const* base, Buffer& memory, Sink const& sink) const;
+    void requireDigest(std::size_t index, DigestBytes const& digest) const;
+    void write(std::uint64_t offset, std::string_view bytes) const;
+    Record
+    writeRecord(Content const& content, DigestBytes const& digest, KnownContent const* base, unsigned segmentLog) const;
+    template <class Write>
+    void appendRecord(Write const& write);
+
+    os::OpenFile file_;
+    std::string name_;
+    std::vector<Entry> entries_;
+    std::uint64_t length_ = 0;
+};
+
+} // namespace tav

@@ -1,0 +1,304 @@
+#include "tests/host/history_test.h"
+
+#include <gmock/gmock.h>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace host_tests {
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+using testing::MatchesRegex;
+using testing::SizeIs;
+
+class Commit : public HistoryTest {
+protected:
+    void remove(std::string const& name) const { ASSERT_EQ(unlink(repo.pathTo(name).c_str()), 0); }
+
+    void move(std::string const& from, std::string const& to) const
+    {
+        ASSERT_EQ(rename(repo.pathTo(from).c_str(), repo.pathTo(to).c_str()), 0);
+    }
+
+    void setTime(std::string const& name, timespec time) const
+    {
+        timespec const times[] = {time, time};
+        ASSERT_EQ(utimensat(AT_FDCWD, repo.pathTo(name).c_str(), times, 0), 0);
+    }
+};
+
+TEST_F(Commit, TakesWhatIsStagedAndNothingElse)
+{
+    repo.write("a.dwg", "one");
+    repo.write("b.dwg", "two");
+    tav({"add", "a.dwg"});
+    Outcome const outcome = tav({"commit", "-m", "the first"});
+    EXPECT_EQ(outcome.code, 0);
+    EXPECT_THAT(outcome.out, MatchesRegex("Made commit 1 \\([0-9a-f]{12}\\)\\.\n"));
+    EXPECT_EQ(outcome.err, "");
+    EXPECT_THAT(values({"show", "1"}, "path"), ElementsAre("a.dwg"));
+    EXPECT_EQ(
+        status(), "New, not staged:\n"
+                  "  (use 'tav add NAME' or 'tav add --all' to stage)\n"
+                  "        .tav/properties/ignore\n"
+                  "        b.dwg\n\n");
+}
+
+TEST_F(Commit, GivesTheSameNameToTheSameContentAndOrder)
+{
+    repo.write("a.dwg", "one");
+    std::string const first = commitAll("drawn").out;
+    support::TempRepository const other;
+    EXPECT_EQ(tavIn(other.path(), {"init"}).code, 0);
+    other.write("a.dwg", "one");
+    tavIn(other.path(), {"add", "--all"});
+    EXPECT_EQ(tavIn(other.path(), {"commit", "-m", "drawn", "--author", "ann@studio"}).out, first);
+    other.write("a.dwg", "two");
+    EXPECT_NE(tavIn(other.path(), {"commit", "-m", "drawn", "--author", "ann@studio"}).out, first);
+}
+
+TEST_F(Commit, NotesAuthorMessageAndParents)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    repo.write("a.dwg", "two");
+    commitAll("the \"second\"\nof two");
+    EXPECT_THAT(values({"log"}, "number"), ElementsAre("2", "1"));
+    EXPECT_THAT(values({"log"}, "author"), ElementsAre("ann@studio", "ann@studio"));
+    std::vector<std::string> const hashes = values({"log"}, "hash");
+    ASSERT_THAT(hashes, SizeIs(2));
+    std::string const shownCommit = tav({"show"}).out;
+    EXPECT_THAT(shownCommit, testing::StartsWith("Commit 2 (master)\nHash:   " + hashes[0] + "\nAuthor: ann@studio\n"));
+    EXPECT_THAT(
+        shownCommit, testing::EndsWith("\n\n    the \"second\"\n    of two\n\n        modified: a.dwg (3 bytes)\n"));
+    EXPECT_THAT(
+        tav({"show", "--json"}).out, testing::HasSubstr("\"parents\" : [\n        \"" + hashes[1] + "\"\n    ]"));
+}
+
+TEST_F(Commit, TakesFilesThatAreGoneWithoutStaging)
+{
+    repo.write("a.dwg", "one");
+    repo.write("b.dwg", "two");
+    commitAll("the first");
+    remove("b.dwg");
+    EXPECT_EQ(tav({"commit", "-m", "removed"}).code, 0);
+    EXPECT_EQ(status(), kClean);
+    EXPECT_THAT(values({"show", "2"}, "change"), ElementsAre("removed"));
+}
+
+TEST_F(Commit, TakesRenamesThatNobodyTold)
+{
+    repo.write("a.dwg", "one");
+    repo.write("plans/b.dwg", "another drawing");
+    commitAll("the first");
+    move("plans/b.dwg", "c.dwg");
+    EXPECT_EQ(
+        status(), "Renamed:\n"
+                  "  (the next commit takes these without staging)\n"
+                  "        renamed:  plans/b.dwg -> c.dwg\n\n");
+    EXPECT_EQ(tav({"commit", "-m", "renamed"}).code, 0);
+    EXPECT_EQ(status(), kClean);
+    EXPECT_THAT(values({"show"}, "previous"), ElementsAre("plans/b.dwg"));
+    EXPECT_THAT(values({"show"}, "path"), ElementsAre("c.dwg"));
+}
+
+TEST_F(Commit, KeepsTheRevisionsOfARenamedDrawingTogether)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    tav({"mv", "a.dwg", "b.dwg"});
+    repo.write("b.dwg", "two");
+    commitAll("renamed and changed");
+    std::vector<std::string> stores;
+    for (std::string const& name : repo.list()) {
+        if (name.find(".tf") != std::string::npos && name.back() != '/') {
+            stores.push_back(name);
+        }
+    }
+    EXPECT_THAT(stores, ElementsAre(testing::StartsWith(".tav/tf/a-")));
+    EXPECT_THAT(values({"show"}, "previous"), ElementsAre("a.dwg"));
+}
+
+TEST_F(Commit, StoresEqualContentOnce)
+{
+    repo.write("a.txt", "equal content");
+    repo.write("b.txt", "equal content");
+    repo.write("c.dwg", "equal drawing");
+    repo.write("d.dwg", "equal drawing");
+    commitAll("the first");
+    std::size_t stored = 0;
+    for (std::string const& name : repo.list()) {
+        bool const isContent = name.find(".tav/objects/") == 0 || name.find(".tav/tf/") == 0;
+        stored += isContent && name.back() != '/' ? 1 : 0;
+    }
+    EXPECT_EQ(stored, 3U); // with the ignore file
+    EXPECT_EQ(tav({"verify"}), done("Read 3 stored versions; nothing is damaged.\n"));
+}
+
+TEST_F(Commit, SaysThatThereIsNothingToCommit)
+{
+    EXPECT_EQ(commitAll("the first").code, 0);
+    EXPECT_EQ(
+        tav({"commit", "-m", "again"}),
+        failed("tav: There are no modified or untracked files for commit. Change something first.\n"));
+    repo.write("a.dwg", "one");
+    EXPECT_EQ(
+        tav({"commit", "-m", "again"}),
+        failed("tav: Nothing is staged. Use 'tav add NAME' or 'tav add --all' to stage what the commit shall take.\n"));
+}
+
+TEST_F(Commit, MakesNoSecondCommitWhenItsOrderIsRepeated)
+{
+    repo.write("a.dwg", "one");
+    std::string const first = commitAll("the first").out;
+    Outcome const again = tav({"commit", "-m", "the first", "--author", "ann@studio"});
+    EXPECT_EQ(again, done("Nothing has changed since" + first.substr(std::string("Made").size())));
+    EXPECT_THAT(values({"log"}, "number"), ElementsAre("1"));
+}
+
+TEST_F(Commit, RefusesStagedFilesThatAreAsTheyWereCommitted)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    repo.write("a.dwg", "two");
+    tav({"add", "a.dwg"});
+    repo.write("a.dwg", "one");
+    EXPECT_EQ(
+        tav({"commit", "-m", "again"}),
+        failed("tav: What is staged is as it was committed. Run 'tav unstage --all' to clear it.\n"));
+    EXPECT_THAT(values({"log"}, "number"), ElementsAre("1"));
+}
+
+TEST_F(Commit, RefusesANewFileThatIsGone)
+{
+    repo.write("a.dwg", "one");
+    tav({"add", "a.dwg"});
+    remove("a.dwg");
+    EXPECT_EQ(
+        tav({"commit", "-m", "drawn"}),
+        failed("tav: 'a.dwg' is staged, but it is not there any more. Bring it back, or run 'tav unstage' for it.\n"));
+}
+
+TEST_F(Commit, RefusesAnEmptyMessage)
+{
+    repo.write("a.dwg", "one");
+    tav({"add", "a.dwg"});
+    EXPECT_EQ(tav({"commit"}).code, 2);
+    EXPECT_EQ(
+        tav({"commit", "-m", " \n"}),
+        failed("tav: The message is empty. Say in a few words what has changed, and who did.\n"));
+}
+
+TEST_F(Commit, WantsAServer)
+{
+    support::TempRepository const bare;
+    bare.write(".tav/tav.state", kFreshState);
+    bare.write("a.dwg", "one");
+    tavIn(bare.path(), {"add", "a.dwg"});
+    EXPECT_EQ(
+        tavIn(bare.path(), {"commit", "-m", "drawn"}),
+        failed("tav: The repository has no server yet. Run 'tav init' to complete it.\n"));
+    EXPECT_EQ(tavIn(bare.path(), {"init"}).code, 0);
+    EXPECT_EQ(tavIn(bare.path(), {"commit", "-m", "drawn"}).code, 0);
+}
+
+TEST_F(Commit, TakesNamesOfAnyBytes)
+{
+    std::string const name = "H\xC3\xA4user \xF0\x9F\x8F\xA0/\xFF\xFE.dwg";
+    repo.write(name, "one");
+    EXPECT_EQ(commitAll("drawn \xF0\x9F\x8F\xA0").code, 0);
+    EXPECT_EQ(status(), kClean);
+    remove(name);
+    EXPECT_EQ(tav({"restore", name}).code, 0);
+    EXPECT_EQ(repo.read(name), "one");
+    EXPECT_THAT(tav({"log"}).out, testing::StartsWith("1  drawn \xF0\x9F\x8F\xA0\n"));
+}
+
+TEST_F(Commit, ReadsAFileThatWasNotOlderThanTheCommand)
+{
+    repo.write("a.dwg", "one");
+    timespec const tomorrow = {time(nullptr) + 86400, 7};
+    setTime("a.dwg", tomorrow);
+    commitAll("the first");
+    EXPECT_EQ(status(), kClean);
+    repo.write("a.dwg", "two");
+    setTime("a.dwg", tomorrow);
+    EXPECT_THAT(status(), testing::StartsWith("Modified, not staged:\n"));
+}
+
+TEST_F(Commit, DoesNotReadAFileOfUnchangedTimeThatIsOld)
+{
+    repo.write("a.dwg", "one");
+    timespec const past = {1700000000, 7};
+    setTime("a.dwg", past);
+    commitAll("the first");
+    repo.write("a.dwg", "two");
+    setTime("a.dwg", past);
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Commit, FindsADrawingUnchangedThatWasOnlyTouched)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    setTime("a.dwg", {1700000000, 7});
+    EXPECT_EQ(status(), kClean);
+    EXPECT_EQ(tav({"add", "--all"}), done("Nothing new to stage.\n"));
+}
+
+TEST_F(Commit, ClearsStagingAndEntersTheIndex)
+{
+    repo.write("a.dwg", "one");
+    setTime("a.dwg", {1700000000, 7});
+    commitAll("the first");
+    EXPECT_THAT(
+        state(),
+        MatchesRegex("\\{\n    \"head\" : \\{\n        \"reference\" : \"master\"\n    \\},\n    \"index\" : \\[\n.*"
+                     "\"last_checked\" : 1700000000000000007,\n                \"modified\" : false\n            \\},\n"
+                     "            \"path\" : \"a.dwg\"\n        \\}\n    \\]\n\\}"));
+}
+
+TEST_F(Commit, LeavesEverythingAsItIsWhenTheServerIsGone)
+{
+    repo.write("a.dwg", "one");
+    tav({"add", "--all"});
+    std::string const before = state();
+    std::string const away = home() + "/data/tav/server.away";
+    ASSERT_EQ(rename((home() + "/data/tav/server").c_str(), away.c_str()), 0);
+    std::string const file = home() + "/data/tav/server";
+    close(open(file.c_str(), O_CREAT | O_WRONLY, 0644));
+    EXPECT_EQ(tav({"commit", "-m", "drawn"}).code, 1);
+    EXPECT_EQ(state(), before);
+    EXPECT_THAT(values({"log"}, "number"), IsEmpty());
+    ASSERT_EQ(unlink(file.c_str()), 0);
+    ASSERT_EQ(rename(away.c_str(), file.c_str()), 0);
+    EXPECT_EQ(tav({"commit", "-m", "drawn"}).code, 0);
+    EXPECT_THAT(values({"log"}, "number"), ElementsAre("1"));
+}
+
+TEST_F(Commit, RefusesNamesThatNoSystemShallMeet)
+{
+    repo.write("a\x1b[31m.dwg", "one");
+    tav({"add", "--all"});
+    EXPECT_EQ(
+        tav({"commit", "-m", "drawn"}), failed("tav: The path 'a\\u001B[31m.dwg' holds a control character or a line "
+                                               "end. Nothing has been committed; rename the file, "
+                                               "or run 'tav unstage' for it.\n"));
+}
+
+TEST_F(Commit, IsShownWithItsControlCharactersEscapedOnATerminal)
+{
+    repo.write("a.dwg", "one");
+    commitAll("red \x1b[31m");
+    for (char const* const command : {"log", "show"}) {
+        std::string const text = tavOnTerminal({command}).out;
+        EXPECT_EQ(text.find('\x1b'), std::string::npos) << text;
+        EXPECT_NE(text.find("red \\x1B[31m"), std::string::npos) << text;
+    }
+}
+
+} // namespace
+} // namespace host_tests

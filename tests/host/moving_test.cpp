@@ -1,0 +1,279 @@
+// Commands that bring stored versions back: restore, checkout, switch, export.
+#include "tests/host/history_test.h"
+
+#include <gmock/gmock.h>
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace host_tests {
+namespace {
+
+using testing::ElementsAre;
+using testing::HasSubstr;
+
+/// Two commits: "a.dwg" and "sub/b.txt" as "one", then "a.dwg" as "two", without "sub/b.txt", with "c.dwg".
+class Moving : public HistoryTest {
+protected:
+    Moving()
+    {
+        repo.write("a.dwg", "one");
+        repo.write("sub/b.txt", "one");
+        commitAll("the first");
+        repo.write("a.dwg", "two");
+        repo.write("c.dwg", "two");
+        unlink(repo.pathTo("sub/b.txt").c_str());
+        rmdir(repo.pathTo("sub").c_str());
+        commitAll("the second");
+    }
+
+    std::vector<std::string> filesOfTheUser() const
+    {
+        std::vector<std::string> names;
+        for (std::string const& name : repo.list()) {
+            if (name.compare(0, 4, ".tav") != 0) {
+                names.push_back(name);
+            }
+        }
+        return names;
+    }
+
+    static std::string wouldBeLost(std::string const& names)
+    {
+        return "tav: These files hold changes that are in no commit, which would be lost. Commit them first, or let "
+               "them go with --force:\n" +
+               names;
+    }
+};
+
+TEST_F(Moving, CheckoutMakesTheFolderWhatItWas)
+{
+    EXPECT_EQ(tav({"checkout", "1"}), done("The working folder is at commit 1 now: 2 files written, 1 removed.\n"));
+    EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "sub/", "sub/b.txt"));
+    EXPECT_EQ(repo.read("a.dwg"), "one");
+    EXPECT_EQ(
+        tav({"status"}), done("On branch master\nAt commit 1, which is not the end of the branch\n\n"
+                              "Nothing has changed since the last commit.\n"));
+    EXPECT_EQ(tav({"checkout", "2"}).code, 0);
+    EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "c.dwg"));
+    EXPECT_EQ(tav({"status"}), done(std::string("On branch master\n\n") + kClean));
+}
+
+TEST_F(Moving, CommitsAreNamedByNumberHashBranchAndTag)
+{
+    std::string const hash = values({"log", "1"}, "hash").at(0);
+    tav({"tag", "as-built", "1"});
+    for (std::string const& name : {std::string("1"), hash, hash.substr(0, 8), std::string("as-built")}) {
+        EXPECT_THAT(values({"show", name}, "number"), ElementsAre("1")) << name;
+    }
+    EXPECT_THAT(values({"show", "master"}, "number"), ElementsAre("2"));
+    for (std::string const name : {"3", "nothing", "0", "-1x", "fff"}) {
+        EXPECT_EQ(
+            tav({"checkout", "--", name}),
+            failed(
+                "tav: There is no commit, branch or tag '" + name + "'. Run 'tav log' or 'tav branch' to see them.\n"));
+    }
+}
+
+TEST_F(Moving, CheckoutKeepsUnsavedWorkUnlessForced)
+{
+    repo.write("a.dwg", "three");
+    repo.write("sub/b.txt", "mine");
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  a.dwg\n  sub/b.txt\n")));
+    EXPECT_EQ(repo.read("a.dwg"), "three");
+    EXPECT_EQ(repo.read("sub/b.txt"), "mine");
+    EXPECT_TRUE(repo.has("c.dwg"));
+    EXPECT_EQ(tav({"checkout", "1", "--force"}).code, 0);
+    EXPECT_EQ(repo.read("a.dwg"), "one");
+    EXPECT_EQ(repo.read("sub/b.txt"), "one");
+}
+
+TEST_F(Moving, CheckoutKeepsAChangedFileThatItWouldRemove)
+{
+    repo.write("c.dwg", "changed");
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  c.dwg\n")));
+    EXPECT_EQ(repo.read("c.dwg"), "changed");
+}
+
+TEST_F(Moving, CheckoutLeavesWorkAtOtherPathsAndItsStaging)
+{
+    repo.write("d.dwg", "new");
+    tav({"add", "d.dwg"});
+    EXPECT_EQ(tav({"checkout", "1"}).code, 0);
+    EXPECT_EQ(repo.read("d.dwg"), "new");
+    EXPECT_EQ(
+        status(), "Staged for the next commit:\n"
+                  "  (use 'tav unstage NAME' to take a file out)\n"
+                  "        new:      d.dwg\n\n");
+}
+
+TEST_F(Moving, CheckoutTakesAFileThatHoldsTheNewContentAsItIs)
+{
+    repo.write("a.dwg", "one");
+    EXPECT_EQ(tav({"checkout", "1"}), done("The working folder is at commit 1 now: 1 file written, 1 removed.\n"));
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, CheckoutPutsFilesInThePlaceOfFoldersAndTheReverse)
+{
+    repo.write("plan/x.dwg", "in a folder");
+    commitAll("a folder");
+    unlink(repo.pathTo("plan/x.dwg").c_str());
+    rmdir(repo.pathTo("plan").c_str());
+    repo.write("plan", "a file");
+    commitAll("a file");
+    EXPECT_EQ(tav({"checkout", "3"}).code, 0);
+    EXPECT_EQ(repo.read("plan/x.dwg"), "in a folder");
+    EXPECT_EQ(tav({"checkout", "4"}).code, 0);
+    EXPECT_EQ(repo.read("plan"), "a file");
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, CheckoutWritesThroughNoLink)
+{
+    support::TempFolder const outside;
+    repo.makeLink("sub", outside.path());
+    EXPECT_EQ(tav({"checkout", "1"}).code, 1);
+    EXPECT_TRUE(outside.list().empty());
+    EXPECT_EQ(repo.read("a.dwg"), "two");
+    EXPECT_EQ(tav({"checkout", "1", "--force"}).code, 1);
+    EXPECT_TRUE(outside.list().empty());
+}
+
+TEST_F(Moving, CheckoutKeepsThePermissionsOfFiles)
+{
+    ASSERT_EQ(chmod(repo.pathTo("a.dwg").c_str(), 0640), 0);
+    tav({"checkout", "1"});
+    struct stat status;
+    ASSERT_EQ(stat(repo.pathTo("a.dwg").c_str(), &status), 0);
+    EXPECT_EQ(status.st_mode & 07777, 0640U);
+}
+
+TEST_F(Moving, CommitWantsTheEndOfTheBranch)
+{
+    tav({"checkout", "1"});
+    repo.write("a.dwg", "another way");
+    tav({"add", "a.dwg"});
+    EXPECT_EQ(
+        tav({"commit", "-m", "another way"}),
+        failed("tav: You are at an earlier commit, not at the end of the branch 'master'. Run 'tav branch NAME' and "
+               "'tav switch NAME' to go on from here, or 'tav switch master' to go back to its end.\n"));
+    EXPECT_EQ(tav({"branch", "sketch"}), done("Made the branch 'sketch' at commit 1.\n"));
+    EXPECT_EQ(tav({"switch", "sketch"}), done("On branch sketch now: 0 files written, 0 removed.\n"));
+    EXPECT_EQ(tav({"commit", "-m", "another way"}).code, 0);
+    EXPECT_EQ(tav({"branch"}), done("  master  (commit 2)\n* sketch  (commit 3)\n"));
+    EXPECT_EQ(tav({"switch", "master"}).code, 0);
+    EXPECT_EQ(repo.read("a.dwg"), "two");
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, SwitchWantsABranch)
+{
+    tav({"tag", "as-built"});
+    for (std::string const name : {"as-built", "1", "nothing"}) {
+        EXPECT_EQ(
+            tav({"switch", name}),
+            failed(
+                "tav: There is no branch '" + name +
+                "'. Run 'tav branch' to see those that there are, or 'tav branch NAME' to make one.\n"));
+    }
+}
+
+TEST_F(Moving, NamesOfBranchesAndTagsAreTakenOnce)
+{
+    tav({"branch", "north"});
+    tav({"tag", "south"});
+    EXPECT_EQ(tav({"tag", "north"}), failed("tav: There is a branch 'north' already. Choose another name.\n"));
+    EXPECT_EQ(tav({"branch", "south"}), failed("tav: There is a tag 'south' already. Choose another name.\n"));
+    EXPECT_EQ(tav({"branch", "12"}).code, 1);
+    EXPECT_EQ(tav({"tag"}), done("  south  (commit 2)\n"));
+}
+
+TEST_F(Moving, RestoreBringsAnEarlierVersionBack)
+{
+    EXPECT_EQ(tav({"restore", "a.dwg", "--from", "1"}), done("1 file as in commit 1, 1 written.\n"));
+    EXPECT_EQ(repo.read("a.dwg"), "one");
+    EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
+    EXPECT_EQ(tav({"restore", "a.dwg"}), done("1 file as in commit 2, 1 written.\n"));
+    EXPECT_EQ(repo.read("a.dwg"), "two");
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, RestoreBringsWholeFoldersAndMissingFilesBack)
+{
+    EXPECT_EQ(tav({"restore", "sub", "--from", "1"}), done("1 file as in commit 1, 1 written.\n"));
+    EXPECT_EQ(repo.read("sub/b.txt"), "one");
+    unlink(repo.pathTo("a.dwg").c_str());
+    unlink(repo.pathTo("c.dwg").c_str());
+    EXPECT_EQ(tav({"restore", "."}), done("3 files as in commit 2, 2 written.\n"));
+    EXPECT_EQ(repo.read("a.dwg"), "two");
+}
+
+TEST_F(Moving, RestoreKeepsUnsavedWorkUnlessForced)
+{
+    repo.write("a.dwg", "unsaved");
+    EXPECT_EQ(tav({"restore", "a.dwg"}), failed(wouldBeLost("  a.dwg\n")));
+    tav({"add", "a.dwg"});
+    EXPECT_EQ(tav({"restore", "a.dwg"}), failed(wouldBeLost("  a.dwg\n")));
+    EXPECT_EQ(repo.read("a.dwg"), "unsaved");
+    EXPECT_EQ(tav({"restore", "a.dwg", "--force"}).code, 0);
+    EXPECT_EQ(repo.read("a.dwg"), "two");
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, RestoreSaysWhatACommitDoesNotHave)
+{
+    EXPECT_EQ(
+        tav({"restore", "sub/b.txt"}),
+        failed(
+            "tav: No file of commit 2 matches 'sub/b.txt'. Name another one with --from, or run 'tav log' to see the "
+            "commits.\n"));
+}
+
+TEST_F(Moving, ExportWritesTheFilesOfACommitElsewhere)
+{
+    support::TempFolder const target;
+    EXPECT_EQ(
+        tav({"export", "1", target.pathTo("old")}),
+        done("Wrote the 2 files of commit 1 into '" + target.pathTo("old") + "'.\n"));
+    EXPECT_THAT(target.list(), ElementsAre("old/", "old/a.dwg", "old/sub/", "old/sub/b.txt"));
+    EXPECT_EQ(target.read("old/a.dwg"), "one");
+    EXPECT_EQ(
+        tav({"export", "1", target.path()}),
+        failed("tav: '" + target.path() + "' is not empty. Name a folder that is empty or does not exist yet.\n"));
+}
+
+TEST_F(Moving, GcKeepsWhatCommitsNeed)
+{
+    repo.write(".tav/objects/" + std::string(64, 'a'), "left over");
+    Outcome const outcome = tav({"gc"});
+    EXPECT_EQ(outcome, done("Removed 1 stored version that no commit needs; 9 bytes freed.\n"));
+    EXPECT_FALSE(repo.has(".tav/objects/" + std::string(64, 'a')));
+    EXPECT_EQ(tav({"verify"}), done("Read 3 stored versions; nothing is damaged.\n"));
+    EXPECT_EQ(tav({"checkout", "1"}).code, 0);
+}
+
+TEST_F(Moving, VerifyFindsDamage)
+{
+    std::string store;
+    for (std::string const& name : repo.list()) {
+        store = name.find(".tav/tf/a-") == 0 ? name : store;
+    }
+    std::string bytes = repo.read(store);
+    bytes[bytes.size() - 2] = static_cast<char>(bytes[bytes.size() - 2] ^ 1);
+    repo.write(store, bytes);
+    Outcome const outcome = tav({"verify"});
+    EXPECT_EQ(outcome.code, 1);
+    EXPECT_THAT(
+        outcome.err, testing::StartsWith("tav: 1 of 3 stored versions cannot be read. Put copies of the files "
+                                         "below '.tav' from a backup in their place:\n  "));
+    EXPECT_EQ(tav({"restore", "a.dwg", "--from", "1"}).code, 0);
+}
+
+TEST_F(Moving, ProjectsListsTheRepository)
+{
+    EXPECT_THAT(values({"projects"}, "path"), testing::Contains(repo.path()));
+}
+
+} // namespace
+} // namespace host_tests

@@ -1,0 +1,160 @@
+#include "tests/host_server/server_test.h"
+#include "tests/server/examples.h"
+#include "tests/server/outcome.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using namespace common;
+using server::commit;
+
+class ServerDocuments : public server::ServerTest {
+protected:
+    ServerDocuments()
+    {
+        ask("commit <id>", commit('a', "", {"plan 1"}, {"branch main a"}));
+        ask("commit <id>", commit('b', "a", {"new 1 plan"}, {"branch main b", "tag v1 a"}));
+    }
+
+    std::string answerTo(std::string const& verb, std::string const& document)
+    {
+        return server::expanded(ask(verb, document));
+    }
+    static std::string words(std::string const& text) { return server::shortened(text); }
+};
+
+TEST_F(ServerDocuments, AreReadByTheLibrary)
+{
+    EXPECT_EQ(
+        words(server::outcomeOf([&] { return deserializeFetchData(server::object(answerTo("fetch <id>", "[]"))); })),
+        "bridge is <id> ''; commits [1 <a> of []: ann said 'moves the stairs' at 1709647629 [plan in po:<1>], "
+        "2 <b> of [<a>]: ann said 'moves the stairs' at 1709647629 [new in po:<1>]]; "
+        "references [branch main -> <b>, tag v1 -> <a>]");
+    EXPECT_EQ(
+        words(
+            server::outcomeOf([&] { return deserializeReferences(server::wide(answerTo("references <id>", "[]"))); })),
+        "[branch main -> <b>, tag v1 -> <a>]");
+    EXPECT_EQ(
+        server::outcomeOf([&] { return deserializeRepoDatas(server::wide(answerTo("repositories", ""))); }),
+        "[bridge is <id> '']");
+    EXPECT_EQ(server::outcomeOf([&] { return deserializeServerVersion(server::wide(answerTo("version", ""))); }), "1");
+    EXPECT_EQ(
+        words(server::outcomeOf([&] {
+            std::string const again = commit('b', "a", {"new 1 plan"}, {});
+            return deserializeCommitNumbers(server::array(answerTo("commit <id>", again)));
+        })),
+        "[<b> is 2]");
+    EXPECT_EQ(
+        server::outcomeOf([&] {
+            return deserializeInitData(server::object(answerTo("init", R"({"name":"a"})")));
+        }).size(),
+        32u);
+}
+
+TEST_F(ServerDocuments, ThatTheLibraryWritesAreTaken)
+{
+    CommitInfo info;
+    OdString const hash = server::wideText(std::string(64, 'c'));
+    OdString const url = server::wideText("tf:plan#" + std::string(64, '7'));
+    info.files.emplace_back(L"house/plan.dwg", url, std::make_unique<BaseFile>(L"new"));
+    info.references.emplace_back(L"main", hash, EType::branch);
+    info.parents = {server::wideText(std::string(64, 'b'))};
+    info.hash = hash;
+    info.author = L"ann@example.org";
+    info.message = L"moves the stairs";
+    EXPECT_EQ(ask("commit <id>", server::pretty(serializeCommitInfo(info))), R"([{"commitNo":3,"hash":"<c>"}])");
+}
+
+struct Row {
+    char const* name;
+    char const* verb;
+    char const* document;
+    char const* message;
+};
+
+class ServerRequest
+    : public server::ServerTest
+    , public testing::WithParamInterface<Row> {};
+
+TEST_P(ServerRequest, IsRefusedWithAReason)
+{
+    EXPECT_EQ(
+        ask(GetParam().verb, GetParam().document),
+        std::string("error: ") + GetParam().message + " Nothing has changed on the server.");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Requests, ServerRequest,
+    testing::Values(
+        Row{"Empty", "", "", "The server knows no request ''."},
+        Row{"Unknown", "delete <id>", "", "The server knows no request 'delete'."},
+        Row{"Capitals", "Version", "", "The server knows no request 'Version'."},
+        Row{"UnknownRepository", "fetch 12", "[]", "The server has no repository '12'."},
+        Row{"RepositoryAndMore", "fetch <id> 1", "[]", "The server has no repository '<id> 1'."},
+        Row{"NoRepository", "fetch", "[]", "The request 'fetch' must name a repository."},
+        Row{"EmptyRepository", "commit ", "{}", "The request 'commit' must name a repository."},
+        Row{"NeedlessRepository", "init <id>", "{}", "The request 'init' concerns no repository."},
+        Row{"InitOfNoJson", "init", "", "The document is no JSON."},
+        Row{"InitOfAnArray", "init", "[]", "The document must be of type object, not array."},
+        Row{"InitWithoutName", "init", "{}", "The document lacks the member 'name'."},
+        Row{"InitWithNumber", "init", R"({"name":1})", "'name' must be of type string, not int."},
+        Row{"InitWithEmptyName", "init", R"({"name":""})", "'name' is empty."},
+        Row{"InitWithLineEnd", "init", R"({"name":"a\nb"})", "'name' holds a control character."},
+        Row{"InitWithBlank", "init", R"({"name":"a "})", "'name' begins or ends with a blank."}),
+    [](testing::TestParamInfo<Row> const& row) { return row.param.name; });
+
+class ServerRequestOfHostileText : public server::ServerTest {};
+
+TEST_F(ServerRequestOfHostileText, IsAnErrorAndNoMore)
+{
+    std::string deep(1000000, '[');
+    for (char const* const verb :
+         {"init", "commit <id>", "force-commit <id>", "references <id>", "force-references <id>", "fetch <id>"}) {
+        for (std::string const& text :
+             {deep, deep + std::string(1000000, ']'), std::string("null"), std::string("\xFF"), std::string("1e999"),
+              std::string("{\"commits\":[{}],\"references\":[[]]}"), std::string(1, '\0')}) {
+            std::string const answer = ask(verb, text);
+            EXPECT_EQ(answer.rfind("error: ", 0), 0u) << verb << " answered " << answer;
+        }
+    }
+}
+
+TEST_F(ServerRequestOfHostileText, CutOffAnywhereIsAnError)
+{
+    std::string const whole = server::expanded(commit('a', "", {"plan.dwg 1 old.dwg"}, {"branch main a"}));
+    for (std::size_t length = 0; length < whole.size(); ++length) {
+        ASSERT_EQ(
+            ask("commit <id>", whole.substr(0, length)),
+            "error: The document is no JSON. Nothing has changed on the server.")
+            << "cut at " << length;
+    }
+}
+
+/// The example below a heading of the description of the protocol, with its blanks taken out.
+std::string documented(char const* heading, int number)
+{
+    return server::shortened(OdString(kutils::json::write_string(
+                                          server::parsed(server::example("server-protocol.md", heading, number)), false)
+                                          .c_str())
+                                 .ansi_str());
+}
+
+class DocumentedProtocol : public server::ServerTest {};
+
+TEST_F(DocumentedProtocol, IsTheServers)
+{
+    EXPECT_EQ(ask("version", ""), documented("## version", 0));
+    EXPECT_EQ(ask("commit <id>", documented("## commit", 0)), documented("## commit", 1));
+    EXPECT_EQ(ask("references <id>", documented("## references", 0)), documented("## references", 1));
+    std::string const id = server::example("server-protocol.md", "## Requests");
+    EXPECT_EQ(id, "fetch 5f0c1d2e3b4a59687766554433221100");
+    std::string const fetched = documented("## fetch", 1);
+    EXPECT_EQ(ask("fetch <id>", documented("## fetch", 0)), server::replaced(fetched, id.substr(6), "<id>"));
+    EXPECT_EQ(init("bridge").size(), 32u);
+    EXPECT_EQ(documented("## init", 0), R"({"name":"bridge"})");
+    EXPECT_EQ(documented("## init", 1), R"({"id":"5f0c1d2e3b4a59687766554433221100"})");
+    EXPECT_EQ(documented("## repositories", 0), R"([{"id":"5f0c1d2e3b4a59687766554433221100","name":"bridge"}])");
+}
+
+} // namespace

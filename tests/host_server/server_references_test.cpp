@@ -1,0 +1,86 @@
+#include "tests/host_server/server_test.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using server::commit;
+using server::references;
+
+class ServerReferences : public server::ServerTest {
+protected:
+    ServerReferences()
+    {
+        ask("commit <id>", commit('a', "", {}, {"branch main a", "tag v1 a"}));
+        ask("commit <id>", commit('b', "a", {}, {}));
+        ask("commit <id>", commit('c', "a", {}, {}));
+    }
+
+    std::string move(std::string const& document) { return ask("references <id>", document); }
+    std::string force(std::string const& document) { return ask("force-references <id>", document); }
+};
+
+TEST_F(ServerReferences, AreListedInTheOrderOfTheirNames)
+{
+    EXPECT_EQ(move("[]"), references({"branch main a", "tag v1 a"}));
+    EXPECT_EQ(force("[]"), references({"branch main a", "tag v1 a"}));
+}
+
+TEST_F(ServerReferences, AreMadeAndMovedForward)
+{
+    EXPECT_EQ(
+        move(references({"branch side c", "branch main b", "tag v2 b"})),
+        references({"branch main b", "branch side c", "tag v1 a", "tag v2 b"}));
+}
+
+TEST_F(ServerReferences, MayStayWhereTheyAre)
+{
+    EXPECT_EQ(move(references({"branch main a", "tag v1 a"})), references({"branch main a", "tag v1 a"}));
+}
+
+TEST_F(ServerReferences, MoveAllOrNone)
+{
+    EXPECT_EQ(
+        move(references({"branch main b", "tag v1 b"})),
+        "error: The tag 'v1' names another commit already. Choose another name.");
+    EXPECT_EQ(move("[]"), references({"branch main a", "tag v1 a"}));
+}
+
+TEST_F(ServerReferences, DoNotMoveBackOrAsideUnlessForced)
+{
+    std::string const refusal =
+        "error: The branch 'main' has commits that the new one does not follow. Fetch, merge what others have done, "
+        "and send again.";
+    move(references({"branch main b"}));
+    EXPECT_EQ(move(references({"branch main a"})), refusal);
+    EXPECT_EQ(move(references({"branch main c"})), refusal);
+    EXPECT_EQ(force(references({"branch main c", "tag v1 b"})), references({"branch main c", "tag v1 b"}));
+    EXPECT_EQ(force(references({"branch main a"})), references({"branch main a", "tag v1 b"}));
+}
+
+TEST_F(ServerReferences, KeepTheirTypeAlsoWhenForced)
+{
+    EXPECT_EQ(force(references({"tag main a"})), "error: 'main' is the name of a branch already. Choose another name.");
+}
+
+TEST_F(ServerReferences, NameCommitsThatAreThereAlsoWhenForced)
+{
+    EXPECT_EQ(
+        force(references({"branch new d"})),
+        "error: The server does not have the commit '<d>' of 'new'. Nothing has changed on the server.");
+}
+
+TEST_F(ServerReferences, AreCheckedLikeThoseOfACommit)
+{
+    EXPECT_EQ(move("{}"), "error: The document must be of type array, not object. Nothing has changed on the server.");
+    EXPECT_EQ(move("[1]"), "error: '[0]' must be of type object, not int. Nothing has changed on the server.");
+    EXPECT_EQ(
+        move(references({"branch main b", "branch -f b"})),
+        "error: '[1].name' begins with a dash. Nothing has changed on the server.");
+    EXPECT_EQ(
+        move(references({"branch new b", "tag new b"})),
+        "error: The document must not hold the name 'new' twice. Nothing has changed on the server.");
+    EXPECT_EQ(move(""), "error: The document is no JSON. Nothing has changed on the server.");
+}
+
+} // namespace

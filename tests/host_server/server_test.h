@@ -1,0 +1,147 @@
+/// A server in a temporary folder, driven through its documents alone.
+///
+/// In the texts here "<a>" stands for a hash of 64 characters 'a', and "<id>" for the identifier of the repository.
+#pragma once
+
+#include "host/server/embedded_server.h"
+
+#include "tests/support/temp_folder.h"
+
+#include <cctype>
+#include <cstddef>
+#include <gtest/gtest.h>
+#include <sstream>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace server {
+
+inline OdString wideText(std::string_view text)
+{
+    return {text.data(), text.size(), CP_UTF_8};
+}
+
+inline std::string replaced(std::string text, std::string const& what, std::string const& with)
+{
+    std::size_t const place = text.find(what);
+    if (place == std::string::npos) {
+        throw std::invalid_argument("no '" + what + "' in: " + text);
+    }
+    return text.replace(place, what.size(), with);
+}
+
+/// Writes out what stands for hashes.
+inline std::string expanded(std::string const& text)
+{
+    std::string result;
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        bool const isHash = i + 2 < text.size() && text[i] == '<' && text[i + 2] == '>';
+        result += isHash ? std::string(64, text[i + 1]) : std::string(1, text[i]);
+        i += isHash ? 2 : 0;
+    }
+    return result;
+}
+
+/// The way back.
+inline std::string shortened(std::string const& text)
+{
+    std::string result;
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        char const c = text[i];
+        bool const isHash =
+            std::isxdigit(static_cast<unsigned char>(c)) != 0 && text.compare(i, 64, std::string(64, c)) == 0;
+        result += isHash ? std::string("<") + c + ">" : std::string(1, c);
+        i += isHash ? 63 : 0;
+    }
+    return result;
+}
+
+inline std::string joined(std::vector<std::string> const& items)
+{
+    std::string text;
+    for (std::string const& item : items) {
+        text += (text.empty() ? "" : ",") + item;
+    }
+    return "[" + text + "]";
+}
+
+/// References, each as "branch main a".
+inline std::string references(std::vector<std::string> const& lines)
+{
+    std::vector<std::string> items;
+    for (std::string const& line : lines) {
+        std::istringstream words(line);
+        std::string type, name, hash;
+        words >> type >> name >> hash;
+        items.push_back(R"({"commitHash":"<)" + hash + R"(>","name":")" + name + R"(","refType":")" + type + R"("})");
+    }
+    return joined(items);
+}
+
+/// Files, each as "plan.dwg 1", or as "plan.dwg 1 draft.dwg" with its previous path.
+inline std::string files(std::vector<std::string> const& lines)
+{
+    std::vector<std::string> items;
+    for (std::string const& line : lines) {
+        std::istringstream words(line);
+        std::string path, content, previous;
+        words >> path >> content >> previous;
+        previous = previous.empty() ? "" : R"("previousPath":")" + previous + R"(",)";
+        items.push_back(R"({"path":")" + path + R"(",)" + previous + R"("storagePath":"po:<)" + content + R"(>"})");
+    }
+    return joined(items);
+}
+
+/// A commit-info document for the commit `hash` behind the commits `parents`, one character each.
+inline std::string commit(
+    char hash, std::string const& parents, std::vector<std::string> const& fileLines,
+    std::vector<std::string> const& referenceLines)
+{
+    std::vector<std::string> hashes;
+    for (char const parent : parents) {
+        hashes.push_back(std::string("\"<") + parent + ">\"");
+    }
+    return R"({"commits":[{"annotation":{"author":"ann","date":"2024-03-05T14:07:09Z","message":"moves the stairs"},)"
+           R"("files":)" +
+           files(fileLines) + R"(,"hash":"<)" + hash + R"(>","parentsHashes":)" + joined(hashes) + R"(}],)" +
+           R"("references":)" + references(referenceLines) + "}";
+}
+
+class ServerTest : public testing::Test {
+protected:
+    ServerTest() : id_(init("bridge")) {}
+
+    /// The server's answer, or "error: " and its message.
+    std::string ask(std::string const& verb, std::string const& document) { return ask(server_, verb, document); }
+
+    std::string ask(tav::Server& server, std::string const& verb, std::string const& document)
+    {
+        std::string const request = verb.find("<id>") == std::string::npos ? verb : replaced(verb, "<id>", id_);
+        auto const answer = server.request(wideText(request), wideText(expanded(document)));
+        std::string text =
+            answer.hasValue() ? answer.value().ansi_str() : "error: " + answer.error().message.ansi_str();
+        text = shortened(text);
+        return id_.empty() || text.find(id_) == std::string::npos ? text : replaced(text, id_, "<id>");
+    }
+
+    /// Makes a repository and returns its identifier.
+    std::string init(std::string const& name)
+    {
+        std::string const answer = ask("init", R"({"name":")" + name + R"("})");
+        std::string const before = R"({"id":")";
+        return answer.size() > before.size() + 2 ? answer.substr(before.size(), answer.size() - before.size() - 2) : "";
+    }
+
+    std::string const& id() const { return id_; }
+    support::TempFolder const& folder() const { return folder_; }
+    std::string serverFolder() const { return folder_.pathTo("server"); }
+
+private:
+    support::TempFolder folder_;
+    tav::EmbeddedServer server_{folder_.pathTo("server")};
+    std::string id_;
+};
+
+} // namespace server
