@@ -1,5 +1,6 @@
 # What `cmake --install` lays out: the libraries, their headers below include/mu_common (so that include lines read as
-# they do here), the CMake package, the pkg-config file, message catalogues, and tav.
+# they do here), the CMake package, the pkg-config file, message catalogues, and tav with its manual page and
+# completions.
 #
 # A host that brings its own platform (MU_COMMON_PLATFORM) gets none from here: its package names no platform, and its
 # users link theirs beside mu_common::mu_common.
@@ -57,4 +58,11 @@ if(TARGET tav)
     file(RELATIVE_PATH bin_to_lib "/${CMAKE_INSTALL_BINDIR}" "/${CMAKE_INSTALL_LIBDIR}")
     set_property(TARGET tav PROPERTY INSTALL_RPATH "$ORIGIN/${bin_to_lib}")
     install(TARGETS tav RUNTIME DESTINATION "${CMAKE_INSTALL_BINDIR}")
+    install(FILES "${PROJECT_SOURCE_DIR}/docs/man/tav.1" DESTINATION "${CMAKE_INSTALL_MANDIR}/man1")
+    # Each shell looks for completions in a folder of its own, by the name of the command.
+    set(completion "${PROJECT_SOURCE_DIR}/host/completion")
+    install(FILES "${completion}/tav.bash"
+        DESTINATION "${CMAKE_INSTALL_DATADIR}/bash-completion/completions" RENAME tav)
+    install(FILES "${completion}/_tav" DESTINATION "${CMAKE_INSTALL_DATADIR}/zsh/site-functions")
+    install(FILES "${completion}/tav.fish" DESTINATION "${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d")
 endif()
