@@ -1,15 +1,27 @@
 include(GoogleTest)
 
-# mu_test(<name> SOURCES <file>... [LINK <target>...]): one test program whose tests ctest runs one by one.
+# mu_test(<name> SOURCES <file>... [LINK <target>...]): one test program whose tests ctest runs one by one. Under the
+# sanitizers a process takes longer to start than most tests to run: there each program runs in a few shards.
 function(mu_test name)
     cmake_parse_arguments(TEST "" "" "SOURCES;LINK" ${ARGN})
     add_executable(${name} ${TEST_SOURCES})
+    target_link_libraries(${name} PRIVATE mu_test_support ${TEST_LINK} GTest::gmock_main mu_warnings)
     # The code under test is optimised; optimising the tests takes longer than running them.
     if(MU_COMMON_SANITIZE)
         target_compile_options(${name} PRIVATE -O0)
+        mu_test_in_shards(${name} 4)
     else()
         target_compile_options(${name} PRIVATE -O1)
+        gtest_discover_tests(${name} DISCOVERY_MODE PRE_TEST NO_PRETTY_VALUES PROPERTIES TIMEOUT 120)
     endif()
-    target_link_libraries(${name} PRIVATE mu_test_support ${TEST_LINK} GTest::gmock_main mu_warnings)
-    gtest_discover_tests(${name} DISCOVERY_MODE PRE_TEST NO_PRETTY_VALUES PROPERTIES TIMEOUT 120)
+endfunction()
+
+function(mu_test_in_shards name shards)
+    math(EXPR last "${shards} - 1")
+    foreach(shard RANGE ${last})
+        add_test(NAME ${name}.${shard} COMMAND ${name} --gtest_brief=1)
+        set_tests_properties(${name}.${shard} PROPERTIES
+            TIMEOUT 600
+            ENVIRONMENT "GTEST_TOTAL_SHARDS=${shards};GTEST_SHARD_INDEX=${shard}")
+    endforeach()
 endfunction()

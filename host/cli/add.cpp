@@ -81,7 +81,7 @@ void addAdd(CLI::App& app)
     CLI::App* const command = app.add_subcommand("add", "Stage changed and new files for the next commit");
     auto const options = std::make_shared<Options>();
     CLI::Option* const names = command->add_option(
-        "NAME", options->names, "Paths of files or folders, or a part of a path that only one changed file matches");
+        "NAME", options->names, "Paths of files or folders, or the end of a path that only one changed file matches");
     CLI::Option* const all = command->add_flag("--all", options->all, "Stage every changed and new file");
     names->excludes(all);
     command->callback([options] {

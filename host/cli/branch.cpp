@@ -74,6 +74,9 @@ void list(Options const& options, Kind const& kind)
         printDocument(items, kind);
         return;
     }
+    if (items.empty()) {
+        print(std::string("There is no ") + kind.name + " yet.\n");
+    }
     for (Listed const& item : items) {
         std::string const line = shown(item.name) + "  (commit " + std::to_string(item.commit.number) + ")";
         print(item.isCurrent ? coloured(Colour::green, "* " + line) + "\n" : "  " + line + "\n");

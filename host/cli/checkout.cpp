@@ -43,7 +43,10 @@ void switchBranch(Options const& options)
 {
     Work work(openRepository(""), "switch");
     auto const branch = work.database().commits().reference(wide(options.target));
-    if (!branch || branch->type != common::EType::branch) {
+    if (branch && branch->type == common::EType::tag) {
+        throw Failure("'" + options.target + "' is a tag.", "Use 'tav checkout " + options.target + "' to go there.");
+    }
+    if (!branch) {
         throw Failure(
             "There is no branch '" + options.target + "'.",
             "Run 'tav branch' to see those that there are, or 'tav branch NAME' to make one.");

@@ -75,7 +75,7 @@ std::string complaint(CLI::App const& app, CLI::ParseError const& error)
 {
     std::vector<std::string> const surplus = app.remaining();
     bool const isUnknownCommand = app.get_subcommands().empty() && !surplus.empty();
-    std::string what = isUnknownCommand ? "The following argument was not expected: " + surplus.front() : error.what();
+    std::string what = isUnknownCommand ? "There is no command '" + surplus.front() + "'" : error.what();
     what.erase(std::remove(what.begin(), what.end(), kMark), what.end());
     return what;
 }
@@ -103,6 +103,7 @@ void addCommands(CLI::App& app)
 {
     app.require_subcommand(1);
     app.set_help_flag("-h,--help", "Show this help and do nothing else");
+    app.set_version_flag("--version", TAV_VERSION, "Show the version and do nothing else");
     app.add_option_function<std::string>("-C", enterFolder, "Work as if started in FOLDER")
         ->type_name("FOLDER")
         ->trigger_on_parse();

@@ -68,7 +68,11 @@ chosen(std::vector<WorkingChange> changes, std::vector<std::string> const& names
     NameFinder const finder(all, root);
     std::set<OdString> paths;
     for (std::string const& name : names) {
-        for (common::StagedFile const& file : finder.find(name)) {
+        std::vector<common::StagedFile> const files = finder.find(name);
+        if (files.empty()) {
+            throw Failure("No changed file matches '" + name + "'.", "Run 'tav status' to see what has changed.");
+        }
+        for (common::StagedFile const& file : files) {
             paths.insert(file.path);
         }
     }
@@ -176,7 +180,7 @@ void addDiff(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("diff", "Show what is different from the last commit, in detail");
     auto const options = std::make_shared<Options>();
-    command->add_option("NAME", options->names, "Paths of files or folders, or a part of a path; by default all");
+    command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path; by default all");
     command->add_flag("--json", options->json, "Print a document for programs");
     command->callback([options] { showDifferences(*options); });
 }

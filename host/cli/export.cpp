@@ -21,7 +21,7 @@ void exportCommit(std::string const& typed, std::string const& target)
     CommitRecord const commit = findCommit(database, typed);
     std::size_t const count = exportFiles(root, database.commits().files(commit.hash), target);
     print(
-        "Wrote the " + counted(count, "file") + " of commit " + std::to_string(commit.number) + " into '" +
+        "Wrote " + counted(count, "file") + " of commit " + std::to_string(commit.number) + " into '" +
         shown(wide(target)) + "'.\n");
 }
 

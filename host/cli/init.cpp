@@ -54,8 +54,9 @@ OdString documentOf(std::string const& name)
 /// Makes a repository on the server and returns its identifier.
 OdString registerAt(OdString const& server, std::string const& name)
 {
-    OdString const answer =
-        valueOrFail(connect(server)->request(L"init", documentOf(name)), "Check the folder of the server.");
+    OdString const answer = valueOrFail(
+        connect(server, EmbeddedServer::Missing::isMade)->request(L"init", documentOf(name)),
+        "Check the folder of the server.");
     kutils::json::Value document;
     kutils::json::read_string(document, answer);
     return valueOrFail(common::deserializeInitData(document.get_object()), "Check the folder of the server.");

@@ -8,7 +8,7 @@
 
 #include "common/mu_common_history.h"
 
-#include <algorithm>
+#include <map>
 #include <memory>
 #include <string>
 
@@ -31,12 +31,34 @@ common::HistoryItem itemOf(CommitRecord const& commit)
     return {date, commit.author, title, commit.hash, static_cast<int>(commit.number)};
 }
 
-std::string linesOf(common::HistoryItem const& item)
+using Names = std::multimap<OdString, std::string>;
+
+/// The branches and tags at each commit.
+Names namesByHash(LocalDatabase const& database)
+{
+    Names names;
+    for (common::Reference const& reference : database.commits().references()) {
+        names.emplace(reference.commitHash, shown(reference.name));
+    }
+    return names;
+}
+
+std::string namesAt(OdString const& hash, Names const& names)
+{
+    std::string list;
+    for (auto [name, end] = names.equal_range(hash); name != end; ++name) {
+        list += (list.empty() ? "  (" : ", ") + name->second;
+    }
+    return list.empty() ? list : list + ")";
+}
+
+std::string linesOf(common::HistoryItem const& item, Names const& names)
 {
     std::string const number = std::to_string(item.number);
     std::string const indent(number.size() + 2, ' ');
     std::string const info = item.getInfo().toStdString();
-    return number + "  " + shown(wide(item.getName().toStdString())) + "\n" + indent + shown(wide(info)) + "\n";
+    return number + "  " + shown(wide(item.getName().toStdString())) + namesAt(item.detail, names) + "\n" + indent +
+           shown(wide(info)) + "\n";
 }
 
 void printDocument(std::vector<CommitRecord> const& commits)
@@ -63,8 +85,9 @@ void showLog(Options const& options)
         printDocument(commits);
         return;
     }
+    Names const names = namesByHash(database);
     for (CommitRecord const& commit : commits) {
-        print(linesOf(itemOf(commit)));
+        print(linesOf(itemOf(commit), names));
     }
     if (commits.empty()) {
         print("There is no commit yet.\n");
@@ -79,7 +102,9 @@ void addLog(CLI::App& app)
     auto const options = std::make_shared<Options>();
     command->add_option(
         "COMMIT", options->start, "Number, hash, branch or tag to begin with; by default where you are");
-    command->add_option("-n,--count", options->count, "Show so many commits at most")->type_name("COUNT");
+    command->add_option("-n,--count", options->count, "Show so many commits at most")
+        ->type_name("COUNT")
+        ->check(CLI::PositiveNumber);
     command->add_flag("--json", options->json, "Print a document for programs");
     command->callback([options] { showLog(*options); });
 }

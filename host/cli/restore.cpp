@@ -88,7 +88,7 @@ void addRestore(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("restore", "Bring files back as a commit has them");
     auto const options = std::make_shared<Options>();
-    command->add_option("NAME", options->names, "Paths of files or folders, or a part of a path")->required();
+    command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path")->required();
     command->add_option("--from", options->commit, "Number, hash, branch or tag; by default where you are")
         ->type_name("COMMIT");
     command->add_flag("--force", options->force, "Overwrite changes that are in no commit");

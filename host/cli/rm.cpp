@@ -28,31 +28,55 @@ bool holds(List const& list, OdString const& path, PathOf const& pathOf)
     return std::any_of(list.begin(), list.end(), [&](auto const& item) { return pathOf(item) == path; });
 }
 
-/// The path of the committed file that `name` means. Only content that a commit keeps may be removed.
-OdString removablePath(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
+[[noreturn]] void failForChanges(std::string const& name)
+{
+    throw Failure("'" + name + "' has changes that are in no commit.", "Commit them first.");
+}
+
+/// A folder is removed only when no work in it would be lost.
+void failForChangesIn(OdString const& folder, common::RepoChanges const& changes)
+{
+    OdString const prefix = folder + L"/";
+    for (auto const& file : changes.modified) {
+        if (file.working.path.left(prefix.getLength()) == prefix) {
+            failForChanges(file.working.path.ansi_str());
+        }
+    }
+}
+
+/// The committed files that `name` means. Only content that a commit keeps may be removed.
+std::vector<common::StagedFile> removableFiles(
+    std::string const& name, common::RepoChanges const& changes, NameFinder const& committed,
+    common::RootPath const& root)
 {
     OdString const typed = pathInRepository(root, name);
     auto const workingPath = [](auto const& file) { return file.working.path; };
-    auto const committedPath = [](auto const& file) { return file.committed.path; };
     if (holds(changes.untracked, typed, workingPath)) {
         throw Failure(
             "'" + name + "' is in no commit: removing it would lose it.",
             "Use 'tav unstage' if it is staged, and delete it yourself if you do not need it.");
     }
     if (holds(changes.modified, typed, workingPath)) {
-        throw Failure("'" + name + "' has changes that are in no commit.", "Commit them first.");
+        failForChanges(name);
     }
-    if (holds(changes.removed, typed, committedPath)) {
-        return typed;
-    }
-    if (holds(changes.unchanged, typed, [](auto const& file) { return file.path; })) {
-        return typed;
-    }
-    OdString const found = findUnchanged(name, changes, root);
-    if (found.isEmpty()) {
+    failForChangesIn(typed, changes);
+    std::vector<common::StagedFile> found = committed.find(name);
+    if (found.empty()) {
         throw Failure("No committed file matches '" + name + "'.", "Run 'tav status' to see what there is.");
     }
     return found;
+}
+
+NameFinder finderOfCommitted(common::RepoChanges const& changes, common::RootPath const& root)
+{
+    std::vector<common::StagedFile> files;
+    for (common::VersionedFile const& file : changes.unchanged) {
+        files.emplace_back(file.path, common::FileChange::removed);
+    }
+    for (auto const& file : changes.removed) {
+        files.emplace_back(file.committed.path, common::FileChange::removed);
+    }
+    return {files, root};
 }
 
 /// Where a removed file waits until the new state is safe. A command that was killed may have left such files.
@@ -74,13 +98,16 @@ void removeFiles(std::vector<std::string> const& names)
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
         common::RepoChanges const changes = compare(root, lastCommitFiles(root), cache.read());
+        NameFinder const committed = finderOfCommitted(changes, root);
         std::vector<common::StagedFile> staged;
         for (std::string const& name : names) {
-            OdString const path = removablePath(name, changes, root);
-            staged.emplace_back(path, common::FileChange::removed);
-            if (ut::FileName::fileExists(root.pathTo(path))) {
+            std::vector<common::StagedFile> const found = removableFiles(name, changes, committed, root);
+            staged.insert(staged.end(), found.begin(), found.end());
+        }
+        for (common::StagedFile const& file : staged) {
+            if (ut::FileName::fileExists(root.pathTo(file.path))) {
                 waiting.push_back(waitingName(root, waiting.size()));
-                moves.move(root.pathTo(path).ansi_str(), waiting.back());
+                moves.move(root.pathTo(file.path).ansi_str(), waiting.back());
             }
         }
         count = stage(staged, cache.write());
@@ -100,7 +127,7 @@ void addRm(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("rm", "Remove committed files, and stage that");
     auto const names = std::make_shared<std::vector<std::string>>();
-    command->add_option("NAME", *names, "Paths of files, or a part of a path")->required();
+    command->add_option("NAME", *names, "Paths of files or folders, or the end of a path")->required();
     command->callback([names] { removeFiles(*names); });
 }
 

@@ -155,7 +155,9 @@ void printForPeople(Status const& status)
 {
     print("On branch " + shown(status.branch) + "\n");
     if (!status.isAtEnd) {
-        print("At commit " + std::to_string(status.commit) + ", which is not the end of the branch\n");
+        print(
+            "At commit " + std::to_string(status.commit) + ", which is not the end of the branch (use 'tav switch " +
+            shown(status.branch) + "' to go there)\n");
     }
     print("\n");
     printConflicts(status.conflicts);

@@ -47,7 +47,7 @@ void addUnstage(CLI::App& app)
     CLI::App* const command = app.add_subcommand("unstage", "Take files out of the next commit; they stay as they are");
     auto const options = std::make_shared<Options>();
     CLI::Option* const names = command->add_option(
-        "NAME", options->names, "Paths of files or folders, or a part of a path that only one staged file matches");
+        "NAME", options->names, "Paths of files or folders, or the end of a path that only one staged file matches");
     CLI::Option* const all = command->add_flag("--all", options->all, "Take every staged file out");
     names->excludes(all);
     command->callback([options] {

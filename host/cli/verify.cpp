@@ -7,6 +7,8 @@
 #include "host/storage/local_storage.h"
 #include "host/text/wide.h"
 
+#include "common/mu_common_file_storage.h"
+
 #include <memory>
 #include <string>
 #include <utility>
@@ -19,16 +21,22 @@ namespace {
 struct Damage {
     OdString url;
     OdString what;
+    FileVersion file; ///< one of the files that have this content
+    OdString store;   ///< path of the file that is damaged
 };
 
-std::vector<Damage> damagesOf(common::RootPath const& root, std::vector<OdString> const& urls)
+std::vector<Damage>
+damagesOf(common::RootPath const& root, CommitTables const& commits, std::vector<OdString> const& urls)
 {
     std::vector<Damage> damages;
     LocalStorage storage;
     Progress progress("versions", urls.size());
     for (OdString const& url : urls) {
         if (auto const outcome = storage.verify(root, url); !outcome.hasValue()) {
-            damages.push_back({url, outcome.error().message});
+            auto const store = common::getStoragePath(root, url);
+            damages.push_back(
+                {url, outcome.error().message, commits.firstFileAt(url),
+                 store.hasValue() ? store.value() : OdString::kEmpty});
         }
         progress.advance();
     }
@@ -42,6 +50,9 @@ void printDocument(std::size_t count, std::vector<Damage> const& damages)
         kutils::json::Object object;
         object[L"url"] = jsonText(damage.url);
         object[L"problem"] = jsonText(damage.what);
+        object[L"path"] = jsonText(damage.file.path);
+        object[L"commit"] = damage.file.commit;
+        object[L"file"] = jsonText(damage.store);
         array.emplace_back(std::move(object));
     }
     kutils::json::Object document;
@@ -60,7 +71,7 @@ void verifyAll(bool json)
             "Put a copy of it from a backup in its place.");
     }
     std::vector<OdString> const urls = database.commits().urls();
-    std::vector<Damage> const damages = damagesOf(root, urls);
+    std::vector<Damage> const damages = damagesOf(root, database.commits(), urls);
     if (json) {
         printDocument(urls.size(), damages);
     } else if (damages.empty()) {
@@ -69,9 +80,11 @@ void verifyAll(bool json)
     if (!damages.empty()) {
         Failure failure(
             std::to_string(damages.size()) + " of " + counted(urls.size(), "stored version") + " cannot be read.",
-            "Put copies of the files below '.tav' from a backup in their place:");
+            "Put copies of these files from a backup in their place:");
         for (Damage const& damage : damages) {
-            failure.details.push_back(damage.what.ansi_str());
+            failure.details.push_back(
+                damage.store.ansi_str() + ", for '" + damage.file.path.ansi_str() + "' of commit " +
+                std::to_string(damage.file.commit) + ": " + damage.what.ansi_str());
         }
         throw failure;
     }

@@ -122,7 +122,7 @@ _tav() {
     [[ $folder != \~ && $folder != \~/* ]] || folder=$HOME${folder:1}
     ((COMP_CWORD > 1)) && _tav_value "$command" "$previous" && return
     if [[ -z $command && $current == -* ]]; then
-        _tav_offer_words -C -h --help
+        _tav_offer_words -C -h --help --version
     elif [[ -z $command ]]; then
         _tav_offer_words "$commands"
     elif [[ $current == -* ]]; then

@@ -53,6 +53,8 @@ end
 
 complete -c tav -f
 complete -c tav -s h -l help -d 'Show this help and do nothing else'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -l version \
+    -d 'Show the version and do nothing else'
 complete -c tav -n "not __fish_seen_subcommand_from $commands" -s C -x -a '(__fish_complete_directories)' \
     -d 'Work as if started in FOLDER'
 

@@ -217,6 +217,13 @@ std::vector<OdString> CommitTables::urls() const
     return urls;
 }
 
+FileVersion CommitTables::firstFileAt(OdString const& url) const
+{
+    Statement row =
+        database_->prepare("SELECT path, number FROM changes WHERE repository = ? AND url = ? ORDER BY number, path");
+    return row.with(repository_).with(url).next() ? FileVersion{row.text(0), row.integer(1)} : FileVersion();
+}
+
 std::vector<common::Reference> CommitTables::references() const
 {
     Statement rows = database_->prepare(R"(

@@ -33,6 +33,12 @@ struct FileRecord {
     OdString previousPath; ///< of a file that the commit renamed, else empty
 };
 
+/// A file of a commit.
+struct FileVersion {
+    OdString path;
+    std::int64_t commit = 0; ///< number
+};
+
 /// The files of a commit: storage URL by path.
 using Tree = std::map<OdString, OdString>;
 
@@ -64,6 +70,9 @@ public:
     std::vector<FileRecord> changes(OdString const& hash) const;
     /// The URLs of all files of all commits, in ascending order.
     std::vector<OdString> urls() const;
+
+    /// The file that had the content at `url` first; an empty path when there is none.
+    FileVersion firstFileAt(OdString const& url) const;
 
     /// In the order of names.
     std::vector<common::Reference> references() const;

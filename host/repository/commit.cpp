@@ -188,10 +188,11 @@ std::int64_t sentNumber(NewCommit const& commit, OdString const& document, Local
     kutils::json::Value answer;
     try {
         kutils::json::read_string(answer, connection.request("commit", document));
-    } catch (Failure const&) {
+    } catch (Failure& failure) {
         if (!isOnServer(commit, database, connection)) {
             note(std::monostate(), database);
         }
+        failure.next += " With 'tav branch NAME' and 'tav switch NAME' you have a branch of your own.";
         throw;
     }
     auto const numbers = valueOrFail(common::deserializeCommitNumbers(answer.get_array()), kAskOwner);
@@ -278,6 +279,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
 {
     auto const cache = readState(root);
     common::State const& state = cache->read();
+    requireServer(database);
     failIfNotAtTheEnd(database, state.head);
     Draft draft{root, database, start, database.commits().files(database.base()), {}, {}};
     common::RepoChanges const changes = compareWithBase(draft, state);

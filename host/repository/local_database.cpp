@@ -3,6 +3,7 @@
 #include "host/failure.h"
 #include "host/text/wide.h"
 
+#include "platform/ut/Dir.h"
 #include "platform/ut/FileName.h"
 
 namespace tav {
@@ -28,15 +29,29 @@ void makeTables(Database& database)
     change.commit();
 }
 
+/// A database that is missing beside stored contents has been lost: a new one would hide the history.
+void failIfLost(common::RootPath const& root)
+{
+    bool const isThere = ut::FileName::fileExists(root.dbPath());
+    bool const hasContents = ut::Dir::exists(root.tavPath() + L"/objects") || ut::Dir::exists(root.tavPath() + L"/tf");
+    if (!isThere && hasContents) {
+        throw Failure(
+            "The database '" + root.dbPath().ansi_str() + "' is missing, though versions are stored here.",
+            "Put a copy of it from a backup in its place.");
+    }
+}
+
 } // namespace
 
 LocalDatabase LocalDatabase::make(common::RootPath const& root)
 {
+    failIfLost(root);
     return LocalDatabase(root.dbPath().ansi_str());
 }
 
 LocalDatabase LocalDatabase::open(common::RootPath const& root)
 {
+    failIfLost(root);
     bool const isThere = ut::FileName::fileExists(root.dbPath());
     return LocalDatabase(isThere ? root.dbPath().ansi_str() : ":memory:");
 }

@@ -10,7 +10,8 @@
 
 namespace tav {
 
-/// One thread. Every operation throws `Failure` when the database cannot be used.
+/// One thread. Every operation throws `Failure` when the database cannot be used; opening also when it is missing
+/// beside stored contents.
 class LocalDatabase {
 public:
     /// Opens the database, and makes it when it is missing.

@@ -1,7 +1,6 @@
 #include "host/repository/server_of.h"
 
 #include "host/failure.h"
-#include "host/server/embedded_server.h"
 #include "host/user_folders.h"
 
 #include "common/mu_common_serialization.h"
@@ -19,12 +18,12 @@ std::string defaultServerFolder()
     return userFolder("XDG_DATA_HOME", ".local/share") + "/tav/server";
 }
 
-std::unique_ptr<Server> connect(OdString const& folder)
+std::unique_ptr<Server> connect(OdString const& folder, EmbeddedServer::Missing missing)
 {
-    auto server = std::make_unique<EmbeddedServer>(folder.ansi_str());
+    auto server = std::make_unique<EmbeddedServer>(folder.ansi_str(), missing);
     auto const answer = server->request(L"version", OdString::kEmpty);
     if (!answer.hasValue()) {
-        throw Failure(answer.error(), "Check the server's folder '" + folder.ansi_str() + "'.");
+        throw Failure(answer.error(), "The folder of the server is '" + folder.ansi_str() + "'.");
     }
     OdString const version = valueOrFail(common::deserializeServerVersion(answer.value()), "Ask its owner.");
     if (version != kVersion) {
@@ -36,12 +35,17 @@ std::unique_ptr<Server> connect(OdString const& folder)
     return server;
 }
 
-Connection::Connection(LocalDatabase const& database) : repository_(database.repositoryId())
+void requireServer(LocalDatabase const& database)
 {
-    if (repository_.isEmpty()) {
+    if (database.repositoryId().isEmpty()) {
         throw Failure("The repository has no server yet.", "Run 'tav init' to complete it.");
     }
-    server_ = connect(database.serverFolder());
+}
+
+Connection::Connection(LocalDatabase const& database) : repository_(database.repositoryId())
+{
+    requireServer(database);
+    server_ = connect(database.serverFolder(), EmbeddedServer::Missing::isAnError);
 }
 
 OdString Connection::request(char const* verb, OdString const& document)

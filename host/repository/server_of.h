@@ -2,7 +2,7 @@
 #pragma once
 
 #include "host/repository/local_database.h"
-#include "host/server/server.h"
+#include "host/server/embedded_server.h"
 
 #include <memory>
 #include <string>
@@ -12,8 +12,12 @@ namespace tav {
 /// Where servers are kept unless the user names a folder: "tav/server" in the user's folder for data.
 std::string defaultServerFolder();
 
-/// A server in `folder`. Throws `Failure` when it does not answer, or speaks another version than this program.
-std::unique_ptr<Server> connect(OdString const& folder);
+/// The server in `folder`, which is made when it is missing and shall be. Throws `Failure` when it does not answer, or
+/// speaks another version than this program.
+std::unique_ptr<Server> connect(OdString const& folder, EmbeddedServer::Missing missing);
+
+/// Throws `Failure` when `database` names no server.
+void requireServer(LocalDatabase const& database);
 
 /// A server, and a repository that it keeps.
 class Connection {

@@ -41,22 +41,23 @@ std::vector<OdString> takeSorted(List& list, Paths const& left, PathOf const& pa
     return paths;
 }
 
-StagedEntry entryOf(common::StagedFile const& file, common::State const& state, common::RootPath const& root)
+StagedEntry
+entryOf(common::StagedFile const& file, common::State const& state, Tree const& base, common::RootPath const& root)
 {
     StagedEntry entry{file.path, file.change, OdString(), false};
     auto const rename = state.renames.find(file.path);
-    if (rename != state.renames.end()) {
+    if (rename != state.renames.end() && base.count(rename->second) > 0) {
         entry.previousPath = rename->second;
     }
     entry.isMissing = file.change != common::FileChange::removed && !ut::FileName::fileExists(root.pathTo(file.path));
     return entry;
 }
 
-std::vector<StagedEntry> stagedEntries(common::State const& state, common::RootPath const& root)
+std::vector<StagedEntry> stagedEntries(common::State const& state, Tree const& base, common::RootPath const& root)
 {
     std::vector<StagedEntry> entries;
     for (common::StagedFile const& file : state.stagedFiles) {
-        entries.push_back(entryOf(file, state, root));
+        entries.push_back(entryOf(file, state, base, root));
     }
     auto const byPath = [](StagedEntry const& a, StagedEntry const& b) { return a.path < b.path; };
     std::stable_sort(entries.begin(), entries.end(), byPath);
@@ -109,7 +110,8 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     auto const cache = readState(root);
     common::State const& state = cache->read();
     LocalDatabase const database = LocalDatabase::open(root);
-    common::RepoChanges changes = compare(root, database.commits().files(database.base()), state);
+    Tree const base = database.commits().files(database.base());
+    common::RepoChanges changes = compare(root, base, state);
     Paths staged = stagedPaths(state);
     Paths left = pathsLeft(state);
     auto const workingPath = [](auto& file) -> OdString& { return file.working.path; };
@@ -123,7 +125,7 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
         }
     }
     status.conflicts = conflictsOf(root);
-    status.staged = stagedEntries(state, root);
+    status.staged = stagedEntries(state, base, root);
     status.modified = takeSorted(changes.modified, staged, workingPath);
     status.untracked = takeSorted(changes.untracked, staged, workingPath);
     status.removed = takeSorted(changes.removed, left, committedPath);

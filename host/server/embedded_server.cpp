@@ -9,6 +9,7 @@
 
 #include "common/mu_common_json_keys.h"
 #include "platform/os/os_files.h"
+#include "platform/ut/FileName.h"
 
 #include <algorithm>
 #include <array>
@@ -29,7 +30,7 @@ namespace keys = common::json;
 constexpr std::int64_t kTablesVersion = 1;
 constexpr wchar_t const* kCommandVersion = L"1";
 constexpr mode_t kFolderPermissions = 0777;
-constexpr char const* kFetchFirst = "Fetch, merge what others have done, and send again.";
+constexpr char const* kFetchFirst = "Merge what others have done, or send it as a branch of its own.";
 
 struct Repository {
     std::int64_t key = 0;
@@ -282,7 +283,7 @@ ErrorMessage messageOf(std::string const& text)
 
 } // namespace
 
-EmbeddedServer::EmbeddedServer(std::string folder) : folder_(std::move(folder)) {}
+EmbeddedServer::EmbeddedServer(std::string folder, Missing missing) : folder_(std::move(folder)), missing_(missing) {}
 
 Expected<OdString> EmbeddedServer::request(OdString const& verb, OdString const& document)
 {
@@ -309,6 +310,9 @@ Database& EmbeddedServer::openDatabase()
 {
     if (database_) {
         return *database_;
+    }
+    if (missing_ == Missing::isAnError && !ut::FileName::fileExists(wide(folder_ + "/server.db"))) {
+        throw Failure("There is no server in '" + folder_ + "'.", "Bring it back; it may lie on a drive that is off.");
     }
     if (auto const error = os::makeFolders(folder_, kFolderPermissions)) {
         throw Failure(

@@ -14,8 +14,11 @@ namespace tav {
 /// servers on one folder: a request changes all or nothing, and the others wait for it. One thread for each object.
 class EmbeddedServer final : public Server {
 public:
-    /// The folder, in bytes, is made with the first request when it is missing. Nothing fails before that.
-    explicit EmbeddedServer(std::string folder);
+    /// What becomes of a server that is not there. One that has been moved away must not be mistaken for a new one.
+    enum class Missing { isMade, isAnError };
+
+    /// The server in `folder`, in bytes, opened with the first request. Nothing fails before that.
+    explicit EmbeddedServer(std::string folder, Missing missing = Missing::isMade);
 
     Expected<OdString> request(OdString const& verb, OdString const& document) override;
 
@@ -24,6 +27,7 @@ private:
     Database& openDatabase();
 
     std::string folder_;
+    Missing missing_;
     std::optional<Database> database_;
 };
 

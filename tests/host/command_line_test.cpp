@@ -16,6 +16,7 @@ Usage: tav [OPTIONS] SUBCOMMAND
 
 Options:
   -h,--help                   Show this help and do nothing else
+  --version                   Show the version and do nothing else
   -C FOLDER                   Work as if started in FOLDER
 
 Subcommands:
@@ -70,7 +71,7 @@ Usage: tav add [OPTIONS] [NAME...]
 
 Positionals:
   NAME TEXT ... Excludes: --all
-                              Paths of files or folders, or a part of a path that only one changed file matches
+                              Paths of files or folders, or the end of a path that only one changed file matches
 
 Options:
   -h,--help                   Show this help and do nothing else
@@ -83,7 +84,7 @@ Usage: tav unstage [OPTIONS] [NAME...]
 
 Positionals:
   NAME TEXT ... Excludes: --all
-                              Paths of files or folders, or a part of a path that only one staged file matches
+                              Paths of files or folders, or the end of a path that only one staged file matches
 
 Options:
   -h,--help                   Show this help and do nothing else
@@ -107,7 +108,7 @@ constexpr char const* kRmHelp = R"(Remove committed files, and stage that
 Usage: tav rm [OPTIONS] NAME...
 
 Positionals:
-  NAME TEXT ... REQUIRED      Paths of files, or a part of a path
+  NAME TEXT ... REQUIRED      Paths of files or folders, or the end of a path
 
 Options:
   -h,--help                   Show this help and do nothing else
@@ -185,11 +186,11 @@ INSTANTIATE_TEST_SUITE_P(
         MisuseRow{
             "UnknownCommand",
             {"statsu", "--json"},
-            "tav: The following argument was not expected: statsu. Run 'tav --help' to see how it is used.\n"},
+            "tav: There is no command 'statsu'. Run 'tav --help' to see how it is used.\n"},
         MisuseRow{
             "UnknownCommandInBrackets",
             {"[status]"},
-            "tav: The following argument was not expected: [status]. Run 'tav --help' to see how it is used.\n"},
+            "tav: There is no command '[status]'. Run 'tav --help' to see how it is used.\n"},
         MisuseRow{
             "TwoCommands",
             {"status", "files"},

@@ -214,7 +214,7 @@ TEST_F(Commit, TakesNamesOfAnyBytes)
     remove(name);
     EXPECT_EQ(tav({"restore", name}).code, 0);
     EXPECT_EQ(repo.read(name), "one");
-    EXPECT_THAT(tav({"log"}).out, testing::StartsWith("1  drawn \xF0\x9F\x8F\xA0\n"));
+    EXPECT_THAT(tav({"log"}).out, testing::StartsWith("1  drawn \xF0\x9F\x8F\xA0  (master)\n"));
 }
 
 TEST_F(Commit, ReadsAFileThatWasNotOlderThanTheCommand)

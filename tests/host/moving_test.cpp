@@ -52,7 +52,8 @@ TEST_F(Moving, CheckoutMakesTheFolderWhatItWas)
     EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "sub/", "sub/b.txt"));
     EXPECT_EQ(repo.read("a.dwg"), "one");
     EXPECT_EQ(
-        tav({"status"}), done("On branch master\nAt commit 1, which is not the end of the branch\n\n"
+        tav({"status"}), done("On branch master\nAt commit 1, which is not the end of the branch (use 'tav switch "
+                              "master' to go there)\n\n"
                               "Nothing has changed since the last commit.\n"));
     EXPECT_EQ(tav({"checkout", "2"}).code, 0);
     EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "c.dwg"));
@@ -170,7 +171,9 @@ TEST_F(Moving, CommitWantsTheEndOfTheBranch)
 TEST_F(Moving, SwitchWantsABranch)
 {
     tav({"tag", "as-built"});
-    for (std::string const name : {"as-built", "1", "nothing"}) {
+    EXPECT_EQ(
+        tav({"switch", "as-built"}), failed("tav: 'as-built' is a tag. Use 'tav checkout as-built' to go there.\n"));
+    for (std::string const name : {"1", "nothing"}) {
         EXPECT_EQ(
             tav({"switch", name}),
             failed(
@@ -185,7 +188,9 @@ TEST_F(Moving, NamesOfBranchesAndTagsAreTakenOnce)
     tav({"tag", "south"});
     EXPECT_EQ(tav({"tag", "north"}), failed("tav: There is a branch 'north' already. Choose another name.\n"));
     EXPECT_EQ(tav({"branch", "south"}), failed("tav: There is a tag 'south' already. Choose another name.\n"));
-    EXPECT_EQ(tav({"branch", "12"}).code, 1);
+    EXPECT_EQ(
+        tav({"branch", "12"}),
+        failed("tav: The name '12' could be taken for the number of a commit. Choose another name.\n"));
     EXPECT_EQ(tav({"tag"}), done("  south  (commit 2)\n"));
 }
 
@@ -235,7 +240,7 @@ TEST_F(Moving, ExportWritesTheFilesOfACommitElsewhere)
     support::TempFolder const target;
     EXPECT_EQ(
         tav({"export", "1", target.pathTo("old")}),
-        done("Wrote the 2 files of commit 1 into '" + target.pathTo("old") + "'.\n"));
+        done("Wrote 2 files of commit 1 into '" + target.pathTo("old") + "'.\n"));
     EXPECT_THAT(target.list(), ElementsAre("old/", "old/a.dwg", "old/sub/", "old/sub/b.txt"));
     EXPECT_EQ(target.read("old/a.dwg"), "one");
     EXPECT_EQ(
@@ -265,9 +270,40 @@ TEST_F(Moving, VerifyFindsDamage)
     Outcome const outcome = tav({"verify"});
     EXPECT_EQ(outcome.code, 1);
     EXPECT_THAT(
-        outcome.err, testing::StartsWith("tav: 1 of 3 stored versions cannot be read. Put copies of the files "
-                                         "below '.tav' from a backup in their place:\n  "));
+        outcome.err, testing::MatchesRegex("tav: 1 of 3 stored versions cannot be read. Put copies of these files from "
+                                           "a backup in their place:\n  .*/\\.tav/tf/a-[0-9a-f]*\\.tf, for 'a.dwg' of "
+                                           "commit 2: The content of 'tf:a-[^ ]*' is damaged\\.\n"));
     EXPECT_EQ(tav({"restore", "a.dwg", "--from", "1"}).code, 0);
+}
+
+TEST_F(Moving, MissingDatabaseIsNotMistakenForANewRepository)
+{
+    ASSERT_EQ(unlink(repo.pathTo(".tav/tav.db").c_str()), 0);
+    for (char const* const command : {"status", "log", "init"}) {
+        EXPECT_EQ(
+            tav({command}), failed(
+                                std::string("tav: The database '") +
+                                (command == std::string("init") ? "." : repo.path()) + "/.tav/tav.db" +
+                                "' is missing, though versions are stored here. Put a copy of it from a backup in its "
+                                "place.\n"));
+    }
+    EXPECT_FALSE(repo.has(".tav/tav.db"));
+}
+
+TEST_F(Moving, MissingServerIsNotMadeAgain)
+{
+    support::TempRepository const other;
+    ASSERT_EQ(tavIn(other.path(), {"init", "--server", other.pathTo("server")}).code, 0);
+    ASSERT_EQ(rename(other.pathTo("server").c_str(), other.pathTo("moved").c_str()), 0);
+    other.write("a.dwg", "one");
+    tavIn(other.path(), {"add", "a.dwg"});
+    EXPECT_EQ(
+        tavIn(other.path(), {"commit", "-m", "drawn"}),
+        failed(
+            "tav: There is no server in '" + other.pathTo("server") +
+            "'. Bring it back; it may lie on a drive that is off. The folder of the server is '" +
+            other.pathTo("server") + "'.\n"));
+    EXPECT_FALSE(other.has("server"));
 }
 
 TEST_F(Moving, ProjectsListsTheRepository)

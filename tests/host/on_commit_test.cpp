@@ -274,6 +274,29 @@ TEST_F(RmOnCommit, RemovesNothingWhenOneOfItsFilesIsInNoCommit)
     EXPECT_FALSE(repo.has(".tav/removed-0"));
 }
 
+TEST_F(RmOnCommit, RemovesNothingWhenANameMatchesSeveralFiles)
+{
+    commit({"annex/roof.dwg", "plans/roof.dwg"});
+    EXPECT_EQ(
+        tav({"rm", "roof"}), failed("tav: More that one file found with name roof. Type more of the path of the one "
+                                    "you mean:\n"
+                                    "  annex/roof.dwg\n"
+                                    "  plans/roof.dwg\n"));
+    EXPECT_TRUE(repo.has("annex/roof.dwg"));
+}
+
+TEST_F(RmOnCommit, RemovesTheFilesOfAFolderUnlessOneHasChanges)
+{
+    commit({"plans/a.dwg", "plans/b.dwg", "c.dwg"});
+    repo.write("plans/b.dwg", "changed");
+    EXPECT_EQ(
+        tav({"rm", "plans"}), failed("tav: 'plans/b.dwg' has changes that are in no commit. Commit them first.\n"));
+    EXPECT_TRUE(repo.has("plans/a.dwg"));
+    repo.write("plans/b.dwg", "committed plans/b.dwg");
+    EXPECT_EQ(tav({"rm", "plans"}), done("Removed 2 files; the next commit takes that.\n"));
+    EXPECT_TRUE(repo.has("c.dwg"));
+}
+
 TEST_F(RmOnCommit, StepsAroundWhatAKilledCommandLeft)
 {
     commit({"a.dwg", "b.dwg"});

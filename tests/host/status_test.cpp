@@ -65,7 +65,7 @@ Staged for the next commit:
         new:      b.dwg
         modified: c.dwg
         gone:     gone.dwg
-        renamed:  former.dwg -> moved.dwg
+        new:      moved.dwg
         removed:  removed.dwg
 
 New, not staged:
@@ -137,8 +137,7 @@ TEST_F(StatusOfEverything, IsADocumentForPrograms)
         {
             "change" : "added",
             "missing" : false,
-            "path" : "moved.dwg",
-            "previous" : "former.dwg"
+            "path" : "moved.dwg"
         },
         {
             "change" : "removed",
@@ -168,7 +167,7 @@ TEST_F(StatusOfEverything, IsColouredOnATerminal)
                                                      "        \x1b[32mnew:      b.dwg\x1b[m\n"
                                                      "        \x1b[32mmodified: c.dwg\x1b[m\n"
                                                      "        \x1b[31mgone:     gone.dwg\x1b[m\n"
-                                                     "        \x1b[32mrenamed:  former.dwg -> moved.dwg\x1b[m\n"
+                                                     "        \x1b[32mnew:      moved.dwg\x1b[m\n"
                                                      "        \x1b[32mremoved:  removed.dwg\x1b[m\n"
                                                      "\n"
                                                      "New, not staged:\n"
@@ -264,7 +263,7 @@ Nothing has changed since the last commit.
 )"));
 }
 
-TEST_F(Status, ShowsANewFileUnderTheFormerNameOfARenamedOne)
+TEST_F(Status, ShowsAFileThatIsInNoCommitAsNewWhateverItWasCalled)
 {
     repo.add({"plan.dwg"});
     tav({"mv", "plan.dwg", "ground.dwg"});
@@ -273,7 +272,7 @@ TEST_F(Status, ShowsANewFileUnderTheFormerNameOfARenamedOne)
 
 Staged for the next commit:
   (use 'tav unstage NAME' to take a file out)
-        renamed:  plan.dwg -> ground.dwg
+        new:      ground.dwg
 
 New, not staged:
   (use 'tav add NAME' or 'tav add --all' to stage)

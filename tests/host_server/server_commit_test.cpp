@@ -69,8 +69,8 @@ TEST_F(ServerCommit, KeepsOthersFromBeingOverwritten)
     std::string const before = everything();
     EXPECT_EQ(
         send(commit('c', "a", {}, {"branch main c"})),
-        "error: The branch 'main' has commits that the new one does not follow. Fetch, merge what others have done, "
-        "and send again.");
+        "error: The branch 'main' has commits that the new one does not follow. Merge what others have done, or "
+        "send it as a branch of its own.");
     EXPECT_EQ(everything(), before) << "the commit itself must not stay either";
 }
 
@@ -89,8 +89,8 @@ TEST_F(ServerCommit, RefusesASecondBeginning)
     send(commit('a', "", {}, {}));
     EXPECT_EQ(
         send(commit('b', "", {}, {})),
-        "error: The repository has commits already; one without a parent would not follow them. Fetch, merge what "
-        "others have done, and send again.");
+        "error: The repository has commits already; one without a parent would not follow them. Merge what others "
+        "have done, or send it as a branch of its own.");
 }
 
 TEST_F(ServerCommit, RefusesAnUnknownParent)

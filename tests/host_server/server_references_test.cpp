@@ -49,8 +49,8 @@ TEST_F(ServerReferences, MoveAllOrNone)
 TEST_F(ServerReferences, DoNotMoveBackOrAsideUnlessForced)
 {
     std::string const refusal =
-        "error: The branch 'main' has commits that the new one does not follow. Fetch, merge what others have done, "
-        "and send again.";
+        "error: The branch 'main' has commits that the new one does not follow. Merge what others have done, or "
+        "send it as a branch of its own.";
     move(references({"branch main b"}));
     EXPECT_EQ(move(references({"branch main a"})), refusal);
     EXPECT_EQ(move(references({"branch main c"})), refusal);
