@@ -108,6 +108,8 @@ private:
     }
     void append(Char const* text, std::size_t length);
     void append(char const* begin, char const* end);
+    /// Does nothing and returns false for a text that has to be escaped, or is too long for the buffer.
+    bool appendPlain(String const& text);
     Char* room(std::size_t length);
     void flush();
 
@@ -115,7 +117,8 @@ private:
     bool const pretty_;
     Plain_chars const plain_;
     std::vector<Level> levels_;
-    String buffer_; ///< Its first `used_` characters are still to go to the stream.
+    String lineStart_; ///< A line feed and as many spaces as were needed so far.
+    String buffer_;    ///< Its first `used_` characters are still to go to the stream.
     std::size_t used_ = 0;
 };
 

@@ -240,6 +240,22 @@ TEST(JsonWriterOf, TextsBeyondThirtyTwoMebibytesAreWhole)
     EXPECT_EQ(write_string(Array{text, 1}, true), L"[\n    \"" + text + L"\",\n    1\n]");
 }
 
+// How long the text of a long array becomes is told from every eighth of these elements.
+TEST(JsonWriterOf, LongArraysAreWholeWhereverTheirLongElementsStand)
+{
+    constexpr std::size_t kSize = 8192;
+    for (bool const isLongInTheSample : {false, true}) {
+        Array array(kSize);
+        std::wstring expected;
+        for (std::size_t i = 0; i < kSize; ++i) {
+            std::wstring const text((i % 8 == 0) == isLongInTheSample ? 1000 : 1, L'x');
+            array[i] = text;
+            expected += (i > 0 ? L",\"" : L"[\"") + text + L"\"";
+        }
+        EXPECT_EQ(write_string(array, false), expected + L"]") << isLongInTheSample;
+    }
+}
+
 Value stateDocument()
 {
     Object const entry = {
