@@ -60,12 +60,13 @@ chosenFiles(Options const& options, common::RepoChanges const& changes, common::
 
 void addFilesToStage(Options const& options)
 {
-    Work const work(openRepository(""), "add");
+    Work const work(openRepository(""), "add", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
         VerifiedTimes verified;
-        common::RepoChanges const changes = compare(root, lastCommitFiles(root), cache.read(), &verified);
+        common::RepoChanges const changes =
+            compare(root, matchFolder(root, lastCommitFiles(root)), cache.read(), &verified);
         enterVerified(verified, work.start(), cache.write());
         count = stage(chosenFiles(options, changes, root), cache.write());
     });

@@ -3,6 +3,7 @@
 #include "host/cli/output.h"
 #include "host/failure.h"
 #include "host/repository/open.h"
+#include "host/repository/server_of.h"
 #include "host/repository/work.h"
 #include "host/storage/local_storage.h"
 #include "host/text/wide.h"
@@ -17,6 +18,7 @@ namespace {
 void collectGarbage()
 {
     Work work(openRepository(""), "gc");
+    requireWholeHistory(work.database());
     std::vector<OdString> const urls = work.database().commits().urls();
     LocalStorage storage;
     Freed const freed = valueOrFail(

@@ -13,6 +13,7 @@
 #include "json/json_reader.h"
 #include "json/json_writer.h"
 
+#include <algorithm>
 #include <filesystem>
 #include <memory>
 #include <string>
@@ -62,10 +63,23 @@ OdString registerAt(OdString const& server, std::string const& name)
     return valueOrFail(common::deserializeInitData(document.get_object()), "Check the folder of the server.");
 }
 
-void chooseServer(LocalDatabase& database, Options const& options, std::string const& name)
+/// What lies in the working folder is versioned with it, unless it is hidden: going back to an earlier commit would
+/// take the server back too.
+void failIfInside(std::string const& server, std::string const& workingFolder)
+{
+    std::filesystem::path const relative =
+        std::filesystem::weakly_canonical(server).lexically_relative(std::filesystem::weakly_canonical(workingFolder));
+    auto const isHidden = [](std::filesystem::path const& part) { return part.string().front() == '.'; };
+    if (std::none_of(relative.begin(), relative.end(), isHidden)) {
+        throw Failure("'" + server + "' lies in the working folder.", "Name a folder outside of it for the server.");
+    }
+}
+
+void chooseServer(LocalDatabase& database, Options const& options, std::string const& folder, std::string const& name)
 {
     OdString const chosen = wide(absolute(options.server.empty() ? defaultServerFolder() : options.server));
     if (database.repositoryId().isEmpty()) {
+        failIfInside(chosen.ansi_str(), folder);
         database.setServer(chosen, registerAt(chosen, name));
     } else if (!options.server.empty() && database.serverFolder() != chosen) {
         throw Failure(
@@ -96,7 +110,7 @@ void init(Options const& options)
     makeIgnoreFile(root);
     makeState(root);
     LocalDatabase database = LocalDatabase::make(root);
-    chooseServer(database, options, name);
+    chooseServer(database, options, folder, name);
     enterProject(database, folder, name);
     print(
         existed ? "The repository in '" + shown(path) + "' was there already; it is complete.\n"

@@ -92,7 +92,7 @@ std::vector<Move> movesOf(OdString const& from, OdString const& to, std::vector<
 
 void moveFiles(std::string const& typedFrom, std::string const& typedTo)
 {
-    Work const work(openRepository(""), "mv");
+    Work const work(openRepository(""), "mv", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
     OdString const from = pathInRepository(root, typedFrom);
     OdString const to = targetOf(from, typedTo, root);

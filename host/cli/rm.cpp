@@ -91,13 +91,13 @@ std::string waitingName(common::RootPath const& root, std::size_t number)
 
 void removeFiles(std::vector<std::string> const& names)
 {
-    Work const work(openRepository(""), "rm");
+    Work const work(openRepository(""), "rm", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
     FileMoves moves;
     std::vector<std::string> waiting;
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
-        common::RepoChanges const changes = compare(root, lastCommitFiles(root), cache.read());
+        common::RepoChanges const changes = compare(root, matchFolder(root, lastCommitFiles(root)), cache.read());
         NameFinder const committed = finderOfCommitted(changes, root);
         std::vector<common::StagedFile> staged;
         for (std::string const& name : names) {

@@ -22,7 +22,7 @@ struct Options {
 
 void unstageFiles(Options const& options)
 {
-    Work const work(openRepository(""), "unstage");
+    Work const work(openRepository(""), "unstage", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {

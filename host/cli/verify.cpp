@@ -64,10 +64,10 @@ void printDocument(std::size_t count, std::vector<Damage> const& damages)
 void verifyAll(bool json)
 {
     common::RootPath const root = openRepository("");
-    LocalDatabase database = LocalDatabase::open(root);
-    if (std::string const damage = database.database().damage(); !damage.empty()) {
+    LocalDatabase const database = LocalDatabase::open(root);
+    if (std::string const damage = database.damage(); !damage.empty()) {
         throw Failure(
-            "The database '" + database.database().path() + "' is damaged: " + damage + ".",
+            "The database '" + database.path() + "' is damaged: " + damage + ".",
             "Put a copy of it from a backup in its place.");
     }
     std::vector<OdString> const urls = database.commits().urls();

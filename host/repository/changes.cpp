@@ -8,6 +8,9 @@
 #include "common/mu_common_file_storage.h"
 #include "common/mu_common_file_utils.h"
 
+#include <algorithm>
+#include <filesystem>
+#include <iterator>
 #include <regex>
 #include <set>
 #include <utility>
@@ -16,46 +19,41 @@ namespace tav {
 
 namespace {
 
-/// The working files, beside what they are compared with.
-struct Comparison {
-    common::RootPath const& root;
-    common::State const& state;
-    VerifiedTimes* verified;
-    Tree missing; ///< what has not been met in the working folder so far
-    common::RepoChanges changes;
+std::vector<common::File> scanInOrder(common::RootPath const& root)
+{
+    std::vector<common::File> files = scan(root);
+    std::sort(files.begin(), files.end(), [](common::File const& a, common::File const& b) { return a.path < b.path; });
+    return files;
+}
+
+/// A file that cannot be looked at is not taken for removed.
+bool isThere(OdString const& path, common::RootPath const& root)
+{
+    std::error_code error;
+    auto const type = std::filesystem::symlink_status(root.pathTo(path).ansi_str(), error).type();
+    return type != std::filesystem::file_type::not_found && type != std::filesystem::file_type::directory;
+}
+
+using Index = std::map<OdString, common::IndexData>;
+
+/// Goes through the index beside a list of paths that is in the same order, which saves looking each path up.
+class IndexReader {
+public:
+    explicit IndexReader(Index const& index) : next_(index.begin()), end_(index.end()) {}
+
+    /// Whether the index says that `file`, which comes behind the ones asked for before, is as it was committed.
+    bool isUntouched(CommittedFile const& file)
+    {
+        while (next_ != end_ && next_->first < file.path) {
+            ++next_;
+        }
+        return next_ != end_ && next_->first == file.path && tav::isUntouched(next_->second, file.time);
+    }
+
+private:
+    Index::const_iterator next_;
+    Index::const_iterator end_;
 };
-
-bool isUnchanged(OdString const& path, OdString const& url, Comparison& comparison)
-{
-    std::uint64_t const time = common::modifyTime(path, comparison.root);
-    auto const record = comparison.state.index.find(path);
-    if (record != comparison.state.index.end() && isUntouched(record->second, time)) {
-        return true;
-    }
-    if (hasOtherContent(path, url, comparison.root)) {
-        return false;
-    }
-    if (comparison.verified) {
-        comparison.verified->emplace(path, time);
-    }
-    return true;
-}
-
-void sortIn(common::File file, Comparison& comparison)
-{
-    auto const match = comparison.missing.find(file.path);
-    if (match == comparison.missing.end()) {
-        comparison.changes.untracked.push_back({nullptr, std::move(file), 0});
-        return;
-    }
-    common::VersionedFile version{file.path, std::move(match->second)};
-    comparison.missing.erase(match);
-    if (isUnchanged(version.path, version.storagePath, comparison)) {
-        comparison.changes.unchanged.push_back(std::move(version));
-    } else {
-        comparison.changes.modified.push_back({nullptr, std::move(file), std::move(version), 0});
-    }
-}
 
 } // namespace
 
@@ -70,17 +68,51 @@ std::vector<common::File> scan(common::RootPath const& root)
     }
 }
 
-common::RepoChanges
-compare(common::RootPath const& root, Tree committed, common::State const& state, VerifiedTimes* verified)
+FolderMatch matchFolder(common::RootPath const& root, Tree committed)
 {
-    Comparison comparison{root, state, verified, std::move(committed), {}};
-    for (common::File& file : scan(root)) {
-        sortIn(std::move(file), comparison);
+    FolderMatch match;
+    std::vector<common::File> files = scanInOrder(root);
+    auto file = files.begin();
+    for (auto& [path, url] : committed) {
+        for (; file != files.end() && file->path < path; ++file) {
+            match.untracked.push_back(std::move(*file));
+        }
+        bool const isScanned = file != files.end() && file->path == path;
+        CommittedFile known{path, std::move(url), isScanned || isThere(path, root), 0};
+        if (known.isThere) {
+            known.time = common::modifyTime(path, root);
+        }
+        match.committed.push_back(std::move(known));
+        file += isScanned ? 1 : 0;
     }
-    for (auto& [path, url] : comparison.missing) {
-        comparison.changes.removed.push_back({nullptr, {path, std::move(url)}, 0});
+    std::move(file, files.end(), std::back_inserter(match.untracked));
+    return match;
+}
+
+common::RepoChanges
+compare(common::RootPath const& root, FolderMatch match, common::State const& state, VerifiedTimes* verified)
+{
+    common::RepoChanges changes;
+    IndexReader index(state.index);
+    for (CommittedFile& file : match.committed) {
+        bool const isUntouched = file.isThere && index.isUntouched(file);
+        bool const isUnchanged = isUntouched || (file.isThere && !hasOtherContent(file.path, file.url, root));
+        if (isUnchanged && !isUntouched && verified) {
+            verified->emplace(file.path, file.time);
+        }
+        common::VersionedFile version{std::move(file.path), std::move(file.url)};
+        if (isUnchanged) {
+            changes.unchanged.push_back(std::move(version));
+        } else if (file.isThere) {
+            changes.modified.push_back({nullptr, {version.path}, version, 0});
+        } else {
+            changes.removed.push_back({nullptr, std::move(version), 0});
+        }
     }
-    return std::move(comparison.changes);
+    for (common::File& file : match.untracked) {
+        changes.untracked.push_back({nullptr, std::move(file), 0});
+    }
+    return changes;
 }
 
 void enterVerified(VerifiedTimes const& verified, std::uint64_t start, common::State& state)

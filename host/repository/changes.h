@@ -15,14 +15,31 @@ namespace tav {
 /// The files that the repository keeps. Throws `Failure` when the ignore rules cannot be used.
 std::vector<common::File> scan(common::RootPath const& root);
 
+/// A file of a commit, beside what lies in the working folder.
+struct CommittedFile {
+    OdString path;
+    OdString url;
+    bool isThere = false;   ///< the ignore rules may leave it out of the scan all the same
+    std::uint64_t time = 0; ///< its modification time now
+};
+
+/// A commit beside the working folder; both lists are in the order of paths.
+struct FolderMatch {
+    std::vector<CommittedFile> committed;
+    std::vector<common::File> untracked;
+};
+
+/// Finds out what there is of the files `committed`, and what else. Reads no file. Throws as `scan` does.
+FolderMatch matchFolder(common::RootPath const& root, Tree committed);
+
 /// Modification times of files that were read and found to be as the last commit has them, by path.
 using VerifiedTimes = std::map<OdString, std::uint64_t>;
 
-/// Compares the files of the working folder with `committed`. A committed file whose modification time is the one in
-/// the index is taken for unchanged without being read; those that were read are added to `verified`, if it is given.
-/// The lists of working files are in scan order, that of removed ones in the order of paths.
+/// How the working folder differs from the commit. A file whose modification time is the one in the index is taken for
+/// unchanged without being read; those that were read and are unchanged are added to `verified`, if it is given. All
+/// lists of the result are in the order of paths.
 common::RepoChanges
-compare(common::RootPath const& root, Tree committed, common::State const& state, VerifiedTimes* verified = nullptr);
+compare(common::RootPath const& root, FolderMatch match, common::State const& state, VerifiedTimes* verified = nullptr);
 
 /// Enters the files that were read into the index, for a command that began at `start`.
 void enterVerified(VerifiedTimes const& verified, std::uint64_t start, common::State& state);

@@ -17,6 +17,8 @@
 #include "json/json_reader.h"
 #include "json/json_writer.h"
 
+#include "platform/ut/FileName.h"
+
 #include <algorithm>
 #include <set>
 #include <utility>
@@ -171,13 +173,9 @@ void failIfNotAtTheEnd(LocalDatabase const& database, OdString const& branch)
 
 bool isOnServer(NewCommit const& commit, LocalDatabase const& database, Connection& connection)
 {
-    OdString const known =
-        L"[{\"commitNo\":" + OdString(std::to_wstring(database.commits().lastNumber()).c_str()) + L",\"hash\":\"\"}]";
-    kutils::json::Value answer;
-    kutils::json::read_string(answer, connection.request("fetch", known));
-    auto const fetched = valueOrFail(common::deserializeFetchData(answer.get_object()), kAskOwner);
+    std::vector<common::Commit> const commits = unknownCommits(database, connection);
     auto const isIt = [&](common::Commit const& other) { return other.hash == commit.commit.hash; };
-    return std::any_of(fetched.commits.begin(), fetched.commits.end(), isIt);
+    return std::any_of(commits.begin(), commits.end(), isIt);
 }
 
 /// Sends the commit and returns its number. One that the server refuses is given up; after any other failure the server
@@ -235,7 +233,7 @@ void clearStaging(CommitUnderWay const& work, common::State& state)
 common::RepoChanges compareWithBase(Draft& draft, common::State const& state)
 {
     VerifiedTimes verified;
-    common::RepoChanges changes = compare(draft.root, draft.files, state, &verified);
+    common::RepoChanges changes = compare(draft.root, matchFolder(draft.root, draft.files), state, &verified);
     for (auto const& [path, time] : verified) {
         draft.work.files.emplace(path, indexRecord(time, draft.start));
     }
@@ -255,6 +253,23 @@ void checkNames(std::vector<PlannedFile> const& plan)
         auto const fault = whyUnsafe(file.path);
         if (fault && file.change != common::FileChange::removed) {
             throw Failure(*fault, "Nothing has been committed; rename the file, or run 'tav unstage' for it.");
+        }
+    }
+}
+
+/// Programs that save by renaming let a file be gone for a moment: that is no removal.
+void failIfBack(std::vector<PlannedFile> const& plan, common::State const& state, common::RootPath const& root)
+{
+    std::set<OdString> wanted;
+    for (common::StagedFile const& file : state.stagedFiles) {
+        wanted.insert(file.path);
+    }
+    for (PlannedFile const& file : plan) {
+        bool const isNoticed = file.change == common::FileChange::removed && wanted.count(file.path) == 0;
+        if (isNoticed && ut::FileName::fileExists(root.pathTo(file.path))) {
+            throw Failure(
+                "'" + file.path.ansi_str() + "' was gone and is back: another program is saving it.",
+                "Nothing has been committed; run the command again.");
         }
     }
 }
@@ -279,12 +294,12 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
 {
     auto const cache = readState(root);
     common::State const& state = cache->read();
-    requireServer(database);
+    Connection{database}; // Without a server there is nothing to begin.
     failIfNotAtTheEnd(database, state.head);
     Draft draft{root, database, start, database.commits().files(database.base()), {}, {}};
     common::RepoChanges const changes = compareWithBase(draft, state);
     std::vector<PlannedFile> const plan =
-        planCommit(state, changes, findRenames(changes, database, root), draft.files, root);
+        planCommit(state, changes, findRenames(changes, state, database, root), draft.files, root);
     if (plan.empty()) {
         if (auto const last = lastCommitIfOf(order, database)) {
             return {*last, false};
@@ -298,6 +313,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
         }
     }
     keepContents(draft, plan);
+    failIfBack(plan, state, root);
     draft.work.document = documentOf(draft, order, state.head);
     note(draft.work, database);
     return {finishCommit(root, database, draft.work), true};

@@ -6,6 +6,8 @@
 #include "platform/ut/Dir.h"
 #include "platform/ut/FileName.h"
 
+#include <filesystem>
+
 namespace tav {
 
 namespace {
@@ -32,11 +34,13 @@ void makeTables(Database& database)
 /// A database that is missing beside stored contents has been lost: a new one would hide the history.
 void failIfLost(common::RootPath const& root)
 {
-    bool const isThere = ut::FileName::fileExists(root.dbPath());
+    std::error_code error;
+    auto const size = std::filesystem::file_size(root.dbPath().ansi_str(), error);
+    bool const isThere = !error && size > 0;
     bool const hasContents = ut::Dir::exists(root.tavPath() + L"/objects") || ut::Dir::exists(root.tavPath() + L"/tf");
     if (!isThere && hasContents) {
         throw Failure(
-            "The database '" + root.dbPath().ansi_str() + "' is missing, though versions are stored here.",
+            "The database '" + root.dbPath().ansi_str() + "' is missing or empty, though versions are stored here.",
             "Put a copy of it from a backup in its place.");
     }
 }

@@ -1,5 +1,6 @@
 #include "host/repository/renames.h"
 
+#include "host/paths/recorded_path.h"
 #include "host/repository/digest.h"
 #include "host/storage/local_storage.h"
 
@@ -12,57 +13,97 @@ namespace tav {
 namespace {
 
 using Sizes = std::set<std::uintmax_t>;
+using Paths = std::set<OdString>;
 using PathsByDigest = std::multimap<OdString, OdString>;
 
-Sizes sizesOf(common::RepoChanges const& changes, LocalDatabase const& database)
+Paths stagedPaths(common::State const& state)
+{
+    Paths paths;
+    for (common::StagedFile const& file : state.stagedFiles) {
+        paths.insert(file.path);
+    }
+    return paths;
+}
+
+/// Removed files that nobody told of.
+std::vector<common::VersionedFile>
+openRemovals(common::RepoChanges const& changes, common::State const& state, Paths told)
+{
+    for (auto const& [path, previous] : state.renames) {
+        told.insert(previous);
+    }
+    std::vector<common::VersionedFile> removals;
+    for (auto const& file : changes.removed) {
+        if (told.count(file.committed.path) == 0) {
+            removals.push_back(file.committed);
+        }
+    }
+    return removals;
+}
+
+Sizes sizesOf(std::vector<common::VersionedFile> const& removals, LocalDatabase const& database)
 {
     Sizes sizes;
-    for (auto const& file : changes.removed) {
-        if (auto const size = database.sizeOf(file.committed.storagePath)) {
+    for (common::VersionedFile const& file : removals) {
+        if (auto const size = database.sizeOf(file.storagePath)) {
             sizes.insert(*size);
         }
     }
+    sizes.erase(0);
     return sizes;
 }
 
-PathsByDigest digestsOf(common::RepoChanges const& changes)
+PathsByDigest digestsOf(std::vector<common::VersionedFile> const& removals)
 {
     PathsByDigest paths;
-    for (auto const& file : changes.removed) {
-        if (auto digest = digestOf(file.committed.storagePath)) {
-            paths.emplace(std::move(*digest), file.committed.path);
+    for (common::VersionedFile const& file : removals) {
+        if (auto digest = digestOf(file.storagePath)) {
+            paths.emplace(std::move(*digest), file.path);
         }
     }
     return paths;
 }
 
-std::vector<OdString> newFilesOf(Sizes const& sizes, common::RepoChanges const& changes, common::RootPath const& root)
+bool isCandidate(OdString const& path, Sizes const& sizes, common::State const& state, common::RootPath const& root)
 {
-    std::vector<OdString> paths;
+    std::error_code error;
+    auto const size = std::filesystem::file_size(root.pathTo(path).ansi_str(), error);
+    return !error && sizes.count(size) > 0 && state.renames.count(path) == 0 && !whyUnsafe(path);
+}
+
+/// New files that may be renamed ones, those that are staged first.
+std::vector<OdString> candidatesIn(
+    common::RepoChanges const& changes, Sizes const& sizes, common::State const& state, Paths const& staged,
+    common::RootPath const& root)
+{
+    std::vector<OdString> candidates;
     for (auto const& file : changes.untracked) {
-        std::error_code error;
-        auto const size = std::filesystem::file_size(root.pathTo(file.working.path).ansi_str(), error);
-        if (!error && sizes.count(size) > 0) {
-            paths.push_back(file.working.path);
+        if (isCandidate(file.working.path, sizes, state, root)) {
+            candidates.push_back(file.working.path);
         }
     }
-    std::sort(paths.begin(), paths.end());
-    return paths;
+    auto const isStaged = [&](OdString const& path) { return staged.count(path) > 0; };
+    std::stable_partition(candidates.begin(), candidates.end(), isStaged);
+    return candidates;
 }
 
 } // namespace
 
-Renames findRenames(common::RepoChanges const& changes, LocalDatabase const& database, common::RootPath const& root)
+Renames findRenames(
+    common::RepoChanges const& changes, common::State const& state, LocalDatabase const& database,
+    common::RootPath const& root)
 {
     Renames renames;
-    if (changes.removed.empty()) {
+    Paths const staged = stagedPaths(state);
+    std::vector<common::VersionedFile> const removals = openRemovals(changes, state, staged);
+    if (removals.empty()) {
         return renames;
     }
-    PathsByDigest removed = digestsOf(changes);
-    for (OdString const& path : newFilesOf(sizesOf(changes, database), changes, root)) {
+    PathsByDigest removed = digestsOf(removals);
+    for (OdString const& path : candidatesIn(changes, sizesOf(removals, database), state, staged, root)) {
         auto const digest = fileDigest(root.pathTo(path));
-        auto const match = digest ? removed.lower_bound(*digest) : removed.end();
-        if (match != removed.end() && match->first == *digest) {
+        auto const match = digest ? removed.find(*digest) : removed.end();
+        if (match != removed.end()) {
             renames.emplace(path, match->second);
             removed.erase(match);
         }

@@ -4,6 +4,7 @@
 #include "host/repository/local_database.h"
 
 #include "common/mu_common_diff.h"
+#include "common/mu_common_state.h"
 
 #include <map>
 
@@ -12,8 +13,11 @@ namespace tav {
 /// Previous path by new path.
 using Renames = std::map<OdString, OdString>;
 
-/// Pairs new files with removed ones of the same content, each at most once, in the order of paths. Only new files as
+/// Pairs new files with removed ones of the same content, each at most once: staged ones first, then in the order of
+/// paths. Files whose removal or renaming is staged are told of already, and no content says nothing. Only new files as
 /// long as a removed one are read.
-Renames findRenames(common::RepoChanges const& changes, LocalDatabase const& database, common::RootPath const& root);
+Renames findRenames(
+    common::RepoChanges const& changes, common::State const& state, LocalDatabase const& database,
+    common::RootPath const& root);
 
 } // namespace tav

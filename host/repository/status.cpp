@@ -1,6 +1,7 @@
 #include "host/repository/status.h"
 
 #include "host/repository/changes.h"
+#include "host/repository/last_commit.h"
 #include "host/repository/local_database.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
@@ -8,6 +9,7 @@
 #include "common/mu_common_file_utils.h"
 
 #include <algorithm>
+#include <future>
 #include <set>
 #include <utility>
 
@@ -41,23 +43,26 @@ std::vector<OdString> takeSorted(List& list, Paths const& left, PathOf const& pa
     return paths;
 }
 
-StagedEntry
-entryOf(common::StagedFile const& file, common::State const& state, Tree const& base, common::RootPath const& root)
+/// The path that a file to be staged had in the last commit; empty when it had none.
+OdString previousPath(OdString const& path, common::State const& state, FolderMatch const& match)
 {
-    StagedEntry entry{file.path, file.change, OdString(), false};
-    auto const rename = state.renames.find(file.path);
-    if (rename != state.renames.end() && base.count(rename->second) > 0) {
-        entry.previousPath = rename->second;
+    auto const rename = state.renames.find(path);
+    if (rename == state.renames.end()) {
+        return {};
     }
-    entry.isMissing = file.change != common::FileChange::removed && !ut::FileName::fileExists(root.pathTo(file.path));
-    return entry;
+    auto const isBefore = [](CommittedFile const& file, OdString const& other) { return file.path < other; };
+    auto const file = std::lower_bound(match.committed.begin(), match.committed.end(), rename->second, isBefore);
+    return file != match.committed.end() && file->path == rename->second ? file->path : OdString();
 }
 
-std::vector<StagedEntry> stagedEntries(common::State const& state, Tree const& base, common::RootPath const& root)
+std::vector<StagedEntry>
+stagedEntries(common::State const& state, FolderMatch const& match, common::RootPath const& root)
 {
     std::vector<StagedEntry> entries;
     for (common::StagedFile const& file : state.stagedFiles) {
-        entries.push_back(entryOf(file, state, base, root));
+        bool const isMissing =
+            file.change != common::FileChange::removed && !ut::FileName::fileExists(root.pathTo(file.path));
+        entries.push_back({file.path, file.change, previousPath(file.path, state, match), isMissing});
     }
     auto const byPath = [](StagedEntry const& a, StagedEntry const& b) { return a.path < b.path; };
     std::stable_sort(entries.begin(), entries.end(), byPath);
@@ -103,31 +108,47 @@ void enterPlace(LocalDatabase const& database, common::State const& state, Statu
     status.unfinishedWork = noteOnUnfinished(database);
 }
 
+/// A staged file that turns out to be renamed is shown so; other renamed files are a group of their own.
+void enterRenames(Renames const& renames, Paths& left, Status& status)
+{
+    for (auto const& [path, previous] : renames) {
+        left.insert(previous);
+        auto const isIt = [&path = path](StagedEntry const& entry) { return entry.path == path; };
+        auto const staged = std::find_if(status.staged.begin(), status.staged.end(), isIt);
+        if (staged == status.staged.end()) {
+            status.renamed.emplace(path, previous);
+        } else {
+            staged->previousPath = previous;
+        }
+    }
+}
+
 } // namespace
 
 Status statusOf(common::RootPath const& root, bool withIgnored)
 {
+    // Reading the state takes as long as looking at the folder.
+    auto matching = std::async(std::launch::async, [&] { return matchFolder(root, lastCommitFiles(root)); });
     auto const cache = readState(root);
     common::State const& state = cache->read();
     LocalDatabase const database = LocalDatabase::open(root);
-    Tree const base = database.commits().files(database.base());
-    common::RepoChanges changes = compare(root, base, state);
-    Paths staged = stagedPaths(state);
-    Paths left = pathsLeft(state);
-    auto const workingPath = [](auto& file) -> OdString& { return file.working.path; };
-    auto const committedPath = [](auto& file) -> OdString& { return file.committed.path; };
+    FolderMatch match = matching.get();
 
     Status status;
     enterPlace(database, state, status);
-    for (auto const& [path, previous] : findRenames(changes, database, root)) {
-        if (staged.insert(path).second && left.insert(previous).second) {
-            status.renamed.emplace(path, previous);
-        }
-    }
     status.conflicts = conflictsOf(root);
-    status.staged = stagedEntries(state, base, root);
-    status.modified = takeSorted(changes.modified, staged, workingPath);
-    status.untracked = takeSorted(changes.untracked, staged, workingPath);
+    status.staged = stagedEntries(state, match, root);
+    common::RepoChanges changes = compare(root, std::move(match), state);
+    Paths left = pathsLeft(state);
+    enterRenames(findRenames(changes, state, database, root), left, status);
+    Paths named = stagedPaths(state);
+    for (auto const& [path, previous] : status.renamed) {
+        named.insert(path);
+    }
+    auto const workingPath = [](auto& file) -> OdString& { return file.working.path; };
+    auto const committedPath = [](auto& file) -> OdString& { return file.committed.path; };
+    status.modified = takeSorted(changes.modified, named, workingPath);
+    status.untracked = takeSorted(changes.untracked, named, workingPath);
     status.removed = takeSorted(changes.removed, left, committedPath);
     if (withIgnored) {
         status.ignored = ignoredFiles(root);

@@ -26,13 +26,24 @@ std::string interrupted(MoveUnderWay const& move, LocalDatabase const& database)
 
 } // namespace
 
-Work::Work(common::RootPath const& root, std::string const& name)
+Work::Work(common::RootPath const& root, std::string const& name, Unfinished unfinished)
     : root_(root)
     , lock_(lockRepository(root, name))
     , start_(commandStart(root))
     , database_(LocalDatabase::open(root))
 {
-    Unfinished const unfinished = unfinishedOf(database_);
+    try {
+        finish();
+    } catch (Failure const&) {
+        if (unfinished == Unfinished::mustEnd) {
+            throw;
+        }
+    }
+}
+
+void Work::finish()
+{
+    tav::Unfinished const unfinished = unfinishedOf(database_);
     if (auto const* const commit = std::get_if<CommitUnderWay>(&unfinished)) {
         finished_ = finishCommit(root_, database_, *commit);
     }
@@ -44,7 +55,7 @@ Work::Work(common::RootPath const& root, std::string const& name)
 
 void Work::failIfBetweenCommits() const
 {
-    Unfinished const unfinished = unfinishedOf(database_);
+    tav::Unfinished const unfinished = unfinishedOf(database_);
     if (auto const* const move = std::get_if<MoveUnderWay>(&unfinished)) {
         throw Failure(interrupted(*move, database_), "Run it again to complete it.");
     }

@@ -13,9 +13,12 @@ namespace tav {
 /// A repository that nobody else changes meanwhile, and in which nothing is left half done.
 class Work {
 public:
+    /// Whether a command can do without what an interrupted one has left to finish, as long as the server is away.
+    enum class Unfinished { mustEnd, mayStay };
+
     /// Takes the lock for the command `name` and finishes the commit or move that an interrupted command has left.
     /// Throws `Failure`.
-    Work(common::RootPath const& root, std::string const& name);
+    Work(common::RootPath const& root, std::string const& name, Unfinished unfinished = Unfinished::mustEnd);
 
     common::RootPath const& root() const { return root_; }
     LocalDatabase& database() { return database_; }
@@ -28,6 +31,8 @@ public:
     void failIfBetweenCommits() const;
 
 private:
+    void finish();
+
     common::RootPath root_;
     os::FileLock lock_;
     std::uint64_t start_;

@@ -51,10 +51,11 @@ void joinRenamed(Renames const& renames, ByPath& all)
 std::vector<WorkingChange> workingChanges(common::RootPath const& root, LocalDatabase const& database)
 {
     auto const cache = readState(root);
-    common::RepoChanges const changes = compare(root, database.commits().files(database.base()), cache->read());
+    common::RepoChanges const changes =
+        compare(root, matchFolder(root, database.commits().files(database.base())), cache->read());
     ByPath all = plainChanges(changes);
     joinRenamed(cache->read().renames, all);
-    joinRenamed(findRenames(changes, database, root), all);
+    joinRenamed(findRenames(changes, cache->read(), database, root), all);
     std::vector<WorkingChange> list;
     for (auto& [path, change] : all) {
         list.push_back(std::move(change));

@@ -6,6 +6,7 @@
 #include <gmock/gmock.h>
 
 #include <string>
+#include <unistd.h>
 
 namespace {
 
@@ -27,7 +28,10 @@ protected:
         state_.index[wide(name)] = {common::modifyTime(wide(name), repo.root()), modified};
     }
 
-    common::RepoChanges compare() const { return tav::compare(repo.root(), committed_, state_); }
+    common::RepoChanges compare() const
+    {
+        return tav::compare(repo.root(), tav::matchFolder(repo.root(), committed_), state_);
+    }
 
     static OdString wide(std::string const& name) { return OdString(name.data(), name.size(), CP_UTF_8); }
 
@@ -97,7 +101,7 @@ TEST_F(Compare, SortsEveryFileIntoOneList)
     EXPECT_THAT(removed(changes), ElementsAre("gone.dwg"));
 }
 
-TEST_F(Compare, ListsWorkingFilesAsTheScanDoesAndRemovedOnesInTheOrderOfPaths)
+TEST_F(Compare, ListsFilesInTheOrderOfPaths)
 {
     for (char const* const name : {"b/z.dwg", "y.dwg", "a/x.dwg"}) {
         commit(name);
@@ -106,19 +110,30 @@ TEST_F(Compare, ListsWorkingFilesAsTheScanDoesAndRemovedOnesInTheOrderOfPaths)
     }
     repo.add({"b/new.dwg", "new.dwg"});
     common::RepoChanges const changes = compare();
-    EXPECT_THAT(modified(changes), ElementsAre("y.dwg", "a/x.dwg", "b/z.dwg"));
-    EXPECT_THAT(untracked(changes), ElementsAre("new.dwg", "b/new.dwg"));
+    EXPECT_THAT(modified(changes), ElementsAre("a/x.dwg", "b/z.dwg", "y.dwg"));
+    EXPECT_THAT(untracked(changes), ElementsAre("b/new.dwg", "new.dwg"));
     EXPECT_THAT(removed(changes), ElementsAre("gone/a/x.dwg", "gone/b/z.dwg", "gone/y.dwg"));
 }
 
-TEST_F(Compare, TakesAFileForRemovedThatIsIgnoredOrHiddenByNow)
+TEST_F(Compare, KeepsTrackOfACommittedFileThatIsIgnoredOrHiddenByNow)
 {
     commit("a.old");
     commit(".hidden.dwg");
-    repo.ignore("^.*\\.old$");
+    commit("changed.old");
+    repo.write("changed.old", "changed");
+    repo.ignore("^.*\\.old$\n^ignore$");
     common::RepoChanges const changes = compare();
-    EXPECT_THAT(removed(changes), ElementsAre(".hidden.dwg", "a.old"));
-    EXPECT_THAT(untracked(changes), ElementsAre(".tav/properties/ignore"));
+    EXPECT_THAT(unchanged(changes), ElementsAre(".hidden.dwg", "a.old"));
+    EXPECT_THAT(modified(changes), ElementsAre("changed.old"));
+    EXPECT_THAT(removed(changes), IsEmpty());
+}
+
+TEST_F(Compare, TakesAFileForRemovedThatAFolderHasReplaced)
+{
+    commit("a.dwg");
+    ASSERT_EQ(unlink(repo.pathTo("a.dwg").c_str()), 0);
+    repo.makeFolder("a.dwg");
+    EXPECT_THAT(removed(compare()), ElementsAre("a.dwg"));
 }
 
 TEST_F(Compare, TrustsTheIndexForAFileOfUnchangedTime)

@@ -279,6 +279,93 @@ TEST_F(Commit, LeavesEverythingAsItIsWhenTheServerIsGone)
     EXPECT_THAT(values({"log"}, "number"), ElementsAre("1"));
 }
 
+TEST_F(Commit, KeepsACommittedFileThatIsIgnoredByNow)
+{
+    repo.write("a.old", "one");
+    commitAll("the first");
+    tav({"ignore", "--add", "^.*\\.old$"});
+    repo.write("b.dwg", "two");
+    commitAll("the second");
+    EXPECT_THAT(values({"show"}, "change"), ElementsAre("modified", "added"));
+    repo.write("a.old", "changed");
+    EXPECT_THAT(status(), testing::HasSubstr("modified: a.old"));
+}
+
+TEST_F(Commit, TakesACopyOfARenamedFileForNew)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    tav({"mv", "a.dwg", "b.dwg"});
+    repo.write("aa.dwg", "one");
+    EXPECT_THAT(
+        status(), testing::HasSubstr("New, not staged:\n"
+                                     "  (use 'tav add NAME' or 'tav add --all' to stage)\n"
+                                     "        aa.dwg\n"));
+    EXPECT_EQ(tav({"commit", "-m", "renamed"}).code, 0);
+    EXPECT_THAT(values({"show"}, "path"), ElementsAre("b.dwg"));
+    EXPECT_TRUE(repo.has("aa.dwg"));
+}
+
+TEST_F(Commit, TakesACopyOfAFileThatWasRemovedOnPurposeForNew)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    repo.write("copy.dwg", "one");
+    tav({"rm", "a.dwg"});
+    EXPECT_EQ(tav({"commit", "-m", "removed"}).code, 0);
+    EXPECT_THAT(values({"show"}, "path"), ElementsAre("a.dwg"));
+    EXPECT_THAT(values({"show"}, "change"), ElementsAre("removed"));
+}
+
+TEST_F(Commit, TakesNoEmptyFileForARenamedOne)
+{
+    repo.write("empty.dwg", "");
+    commitAll("the first");
+    remove("empty.dwg");
+    repo.write("other.dwg", "");
+    EXPECT_THAT(status(), testing::HasSubstr("removed:  empty.dwg"));
+}
+
+TEST_F(Commit, NotesARenameThatWasStagedAsANewFile)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    move("a.dwg", "b.dwg");
+    tav({"add", "--all"});
+    EXPECT_THAT(status(), testing::HasSubstr("renamed:  a.dwg -> b.dwg"));
+    EXPECT_EQ(tav({"commit", "-m", "renamed"}).code, 0);
+    EXPECT_THAT(values({"show"}, "previous"), ElementsAre("a.dwg"));
+}
+
+TEST_F(Commit, GcRemovesNothingWhenTheServerKnowsMore)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    std::string const old = repo.read(".tav/tav.db");
+    repo.write("a.dwg", "two");
+    commitAll("the second");
+    repo.write(".tav/tav.db", old);
+    EXPECT_EQ(
+        tav({"gc"}), failed(
+                         "tav: The server has commits that the database '" + repo.path() +
+                         "/.tav/tav.db' does not know. Put a newer copy of it in its place.\n"));
+    repo.write(".tav/tav.db", "");
+    EXPECT_EQ(tav({"gc"}).code, 1);
+    EXPECT_EQ(tav({"verify"}).code, 1);
+}
+
+TEST_F(Commit, RefusesAServerInTheWorkingFolder)
+{
+    support::TempRepository const other;
+    EXPECT_EQ(
+        tavIn(other.path(), {"init", "--server", "server"}),
+        failed(
+            "tav: '" + other.pathTo("server") +
+            "' lies in the working folder. Name a folder outside of it for the server.\n"));
+    EXPECT_FALSE(other.has("server"));
+    EXPECT_EQ(tavIn(other.path(), {"init", "--server", ".server"}).code, 0);
+}
+
 TEST_F(Commit, RefusesNamesThatNoSystemShallMeet)
 {
     repo.write("a\x1b[31m.dwg", "one");

@@ -1,8 +1,17 @@
 // Commands that bring stored versions back: restore, checkout, switch, export.
 #include "tests/host/history_test.h"
+#include "tests/host/run_here.h"
+
+#include "platform/os/os_calls.h"
 
 #include <gmock/gmock.h>
 
+#include <array>
+#include <cerrno>
+#include <csignal>
+#include <fcntl.h>
+#include <functional>
+#include <map>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -11,6 +20,73 @@ namespace {
 
 using testing::ElementsAre;
 using testing::HasSubstr;
+using testing::Not;
+
+/// What a copy of this process does when a command in it calls the system. The changes die with the copy.
+struct StandIn {
+    static inline os::Calls real;
+    static inline std::function<void()> act;
+    static inline std::string name; ///< of the file whose removal is waited for
+    static inline int calls = 0;    ///< that are left until the process dies
+
+    static void whenFlushed(std::function<void()> const& what)
+    {
+        act = what;
+        real = os::calls();
+        os::calls().syncfs = [](int file) {
+            act();
+            return real.syncfs(file);
+        };
+    }
+
+    static void whenRemoved(std::string const& file, std::function<void()> const& what)
+    {
+        act = what;
+        name = file;
+        real = os::calls();
+        os::calls().unlinkat = [](int folder, char const* path, int flags) {
+            if (path == name) {
+                act();
+            }
+            return real.unlinkat(folder, path, flags);
+        };
+    }
+
+    /// Dies in the n-th call that changes an entry of a folder.
+    static void dieIn(int n)
+    {
+        calls = n;
+        real = os::calls();
+        os::calls().renameat = [](int fromFolder, char const* from, int toFolder, char const* to) {
+            count();
+            return real.renameat(fromFolder, from, toFolder, to);
+        };
+        os::calls().unlinkat = [](int folder, char const* path, int flags) {
+            count();
+            return real.unlinkat(folder, path, flags);
+        };
+        os::calls().mkdirat = [](int folder, char const* path, mode_t mode) {
+            count();
+            return real.mkdirat(folder, path, mode);
+        };
+    }
+
+    static void fillTheDisk()
+    {
+        os::calls().pwrite = [](int, void const*, std::size_t, off_t) -> ssize_t {
+            errno = ENOSPC;
+            return -1;
+        };
+    }
+
+private:
+    static void count()
+    {
+        if (calls-- == 0) {
+            raise(SIGKILL);
+        }
+    }
+};
 
 /// Two commits: "a.dwg" and "sub/b.txt" as "one", then "a.dwg" as "two", without "sub/b.txt", with "c.dwg".
 class Moving : public HistoryTest {
@@ -25,6 +101,16 @@ protected:
         unlink(repo.pathTo("sub/b.txt").c_str());
         rmdir(repo.pathTo("sub").c_str());
         commitAll("the second");
+    }
+
+    /// Runs a command in a copy of this process, after `before`.
+    Outcome tavAfter(std::function<void()> const& before, Arguments const& arguments) const
+    {
+        Process process(setting(), [&] {
+            before();
+            return runHere(arguments);
+        });
+        return process.wait();
     }
 
     std::vector<std::string> filesOfTheUser() const
@@ -226,6 +312,180 @@ TEST_F(Moving, RestoreKeepsUnsavedWorkUnlessForced)
     EXPECT_EQ(status(), kClean);
 }
 
+TEST_F(Moving, CheckoutReadsWhatItOverwritesWhateverTheIndexSays)
+{
+    tav({"checkout", "1"});
+    struct stat status;
+    ASSERT_EQ(stat(repo.pathTo("a.dwg").c_str(), &status), 0);
+    repo.write("a.dwg", "own");
+    std::array<timespec, 2> const times = {status.st_atim, status.st_mtim};
+    ASSERT_EQ(utimensat(AT_FDCWD, repo.pathTo("a.dwg").c_str(), times.data(), 0), 0);
+    EXPECT_EQ(tav({"checkout", "2"}), failed(wouldBeLost("  a.dwg\n")));
+    EXPECT_EQ(repo.read("a.dwg"), "own");
+}
+
+TEST_F(Moving, FilesThatOneCommandWroteShowWhenTheyChangePlaces)
+{
+    repo.write("p.txt", "left");
+    repo.write("q.txt", "rite");
+    commitAll("two sides");
+    tav({"checkout", "1"});
+    tav({"checkout", "3"});
+    ASSERT_EQ(status(), kClean);
+    ASSERT_EQ(rename(repo.pathTo("p.txt").c_str(), repo.pathTo("swap").c_str()), 0);
+    ASSERT_EQ(rename(repo.pathTo("q.txt").c_str(), repo.pathTo("p.txt").c_str()), 0);
+    ASSERT_EQ(rename(repo.pathTo("swap").c_str(), repo.pathTo("q.txt").c_str()), 0);
+    EXPECT_THAT(status(), HasSubstr("modified: p.txt"));
+    EXPECT_THAT(status(), HasSubstr("modified: q.txt"));
+}
+
+TEST_F(Moving, CheckoutStopsAtTheFirstSightOfAFileThatHasBeenChangedMeanwhile)
+{
+    auto const edit = [&] { repo.write("a.dwg", "edited"); };
+    EXPECT_EQ(
+        tavAfter([&] { StandIn::whenFlushed(edit); }, {"checkout", "1"}),
+        failed("tav: 'a.dwg' has been changed while this command was at work. Nothing has been written; run the "
+               "command again.\n"));
+    EXPECT_EQ(repo.read("a.dwg"), "edited");
+    EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "c.dwg"));
+    EXPECT_THAT(tav({"status"}).out, Not(HasSubstr("interrupted")));
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  a.dwg\n")));
+}
+
+TEST_F(Moving, CheckoutLeavesAFileThatIsChangedWhileOthersTakeTheirPlaces)
+{
+    auto const edit = [&] { repo.write("a.dwg", "edited"); };
+    EXPECT_EQ(
+        tavAfter([&] { StandIn::whenRemoved("c.dwg", edit); }, {"checkout", "1"}),
+        failed("tav: 'a.dwg' has been changed while this command was at work. What has been written is whole; run the "
+               "command again.\n"));
+    EXPECT_EQ(repo.read("a.dwg"), "edited");
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  a.dwg\n")));
+    EXPECT_EQ(tav({"checkout", "2"}).code, 0);
+    EXPECT_EQ(repo.read("c.dwg"), "two");
+    EXPECT_EQ(repo.read("a.dwg"), "edited");
+    EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
+}
+
+TEST_F(Moving, RestoreLeavesAFileThatHasBeenMadeMeanwhile)
+{
+    auto const edit = [&] { repo.write("sub/b.txt", "mine"); };
+    EXPECT_EQ(
+        tavAfter([&] { StandIn::whenFlushed(edit); }, {"restore", "sub", "--from", "1"}),
+        failed("tav: 'sub/b.txt' has been changed while this command was at work. Nothing has been written; run the "
+               "command again.\n"));
+    EXPECT_EQ(repo.read("sub/b.txt"), "mine");
+}
+
+TEST_F(Moving, CheckoutPutsNoFileInThePlaceOfAFolderWithOtherFiles)
+{
+    repo.write("plan/x.dwg", "in a folder");
+    commitAll("a folder");
+    unlink(repo.pathTo("plan/x.dwg").c_str());
+    rmdir(repo.pathTo("plan").c_str());
+    repo.write("plan", "a file");
+    commitAll("a file");
+    tav({"checkout", "3"});
+    repo.write("plan/inner/.notes", "mine");
+    for (Arguments const& arguments : {Arguments{"checkout", "4"}, {"checkout", "4", "--force"}}) {
+        EXPECT_EQ(
+            tav(arguments), failed("tav: 'plan/inner/.notes' lies in a folder whose place a file of the commit takes. "
+                                   "Nothing has been written; move it away first.\n"));
+        EXPECT_EQ(repo.read("plan/x.dwg"), "in a folder");
+    }
+    ASSERT_EQ(unlink(repo.pathTo("plan/inner/.notes").c_str()), 0);
+    EXPECT_EQ(tav({"checkout", "4"}).code, 0);
+    EXPECT_EQ(repo.read("plan"), "a file");
+}
+
+TEST_F(Moving, CheckoutOnAFullDiskHasBegunNothing)
+{
+    EXPECT_EQ(
+        tavAfter(StandIn::fillTheDisk, {"checkout", "1"}),
+        failed(
+            "tav: 'a.dwg' cannot be brought back: '" + repo.pathTo(".tav/restoring/0") +
+            "' cannot be written: No space left on device. Check the free space.\n"));
+    EXPECT_EQ(tav({"status"}), done(std::string("On branch master\n\n") + kClean));
+    EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "c.dwg"));
+}
+
+/// The files of each commit, by its number.
+using Contents = std::map<std::string, std::string>;
+
+class InterruptedMove : public Moving {
+protected:
+    InterruptedMove()
+    {
+        unlink(repo.pathTo("a.dwg").c_str());
+        repo.write("a.dwg/x.dwg", "three");
+        repo.write("c.dwg", "three");
+        repo.write("d.dwg", "three");
+        commitAll("the third");
+    }
+
+    void expectAt(std::string const& commit, std::string const& when) const
+    {
+        Contents contents;
+        for (std::string const& name : filesOfTheUser()) {
+            if (name.back() != '/') {
+                contents[name] = repo.read(name);
+            }
+        }
+        EXPECT_EQ(contents, contents_.at(commit)) << "at commit " << commit << ", " << when;
+        EXPECT_EQ(status(), kClean) << "at commit " << commit << ", " << when;
+    }
+
+    /// Whether the command came to its end.
+    bool dieIn(int n, std::string const& commit) const
+    {
+        Outcome const outcome = tavAfter([&] { StandIn::dieIn(n); }, {"checkout", commit});
+        EXPECT_TRUE(outcome.code == 0 || outcome.code == -SIGKILL) << testing::PrintToString(outcome);
+        return outcome.code == 0;
+    }
+
+    std::map<std::string, Contents> const contents_ = {
+        {"1", {{"a.dwg", "one"}, {"sub/b.txt", "one"}}},
+        {"2", {{"a.dwg", "two"}, {"c.dwg", "two"}}},
+        {"3", {{"a.dwg/x.dwg", "three"}, {"c.dwg", "three"}, {"d.dwg", "three"}}}};
+};
+
+TEST_F(InterruptedMove, LeavesNothingBehindAfterAnyOtherMove)
+{
+    for (std::string const next : {"1", "2", "3"}) {
+        int n = 0;
+        for (bool isDone = false; !isDone; ++n) {
+            isDone = dieIn(n, "1");
+            EXPECT_EQ(tav({"checkout", next}).code, 0);
+            expectAt(next, "after death in call " + std::to_string(n));
+            ASSERT_EQ(tav({"checkout", "3"}).code, 0);
+        }
+        EXPECT_GT(n, 5);
+    }
+}
+
+TEST_F(InterruptedMove, LeavesNothingBehindAfterTwoOfThem)
+{
+    for (std::string const next : {"1", "2", "3"}) {
+        int n = 0;
+        for (bool isDone = false; !isDone; ++n) {
+            isDone = dieIn(n, "1");
+            dieIn(n, "2");
+            EXPECT_EQ(tav({"checkout", next}).code, 0);
+            expectAt(next, "after two deaths in call " + std::to_string(n));
+            ASSERT_EQ(tav({"checkout", "3"}).code, 0);
+        }
+        EXPECT_GT(n, 5);
+    }
+}
+
+TEST_F(Moving, RestoreLeavesNoRemovalStaged)
+{
+    tav({"rm", "a.dwg"});
+    tav({"restore", "a.dwg", "--from", "1"});
+    EXPECT_EQ(state().find("staged_files"), std::string::npos) << state();
+    EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
+}
+
 TEST_F(Moving, RestoreSaysWhatACommitDoesNotHave)
 {
     EXPECT_EQ(
@@ -281,29 +541,31 @@ TEST_F(Moving, MissingDatabaseIsNotMistakenForANewRepository)
     ASSERT_EQ(unlink(repo.pathTo(".tav/tav.db").c_str()), 0);
     for (char const* const command : {"status", "log", "init"}) {
         EXPECT_EQ(
-            tav({command}), failed(
-                                std::string("tav: The database '") +
-                                (command == std::string("init") ? "." : repo.path()) + "/.tav/tav.db" +
-                                "' is missing, though versions are stored here. Put a copy of it from a backup in its "
-                                "place.\n"));
+            tav({command}),
+            failed(
+                std::string("tav: The database '") + (command == std::string("init") ? "." : repo.path()) +
+                "/.tav/tav.db" +
+                "' is missing or empty, though versions are stored here. Put a copy of it from a backup in its "
+                "place.\n"));
     }
     EXPECT_FALSE(repo.has(".tav/tav.db"));
 }
 
 TEST_F(Moving, MissingServerIsNotMadeAgain)
 {
+    support::TempFolder const place;
     support::TempRepository const other;
-    ASSERT_EQ(tavIn(other.path(), {"init", "--server", other.pathTo("server")}).code, 0);
-    ASSERT_EQ(rename(other.pathTo("server").c_str(), other.pathTo("moved").c_str()), 0);
+    std::string const server = place.pathTo("server");
+    ASSERT_EQ(tavIn(other.path(), {"init", "--server", server}).code, 0);
+    ASSERT_EQ(rename(server.c_str(), place.pathTo("moved").c_str()), 0);
     other.write("a.dwg", "one");
     tavIn(other.path(), {"add", "a.dwg"});
     EXPECT_EQ(
         tavIn(other.path(), {"commit", "-m", "drawn"}),
         failed(
-            "tav: There is no server in '" + other.pathTo("server") +
-            "'. Bring it back; it may lie on a drive that is off. The folder of the server is '" +
-            other.pathTo("server") + "'.\n"));
-    EXPECT_FALSE(other.has("server"));
+            "tav: There is no server in '" + server +
+            "'. Bring it back; it may lie on a drive that is off. The folder of the server is '" + server + "'.\n"));
+    EXPECT_FALSE(place.has("server"));
 }
 
 TEST_F(Moving, ProjectsListsTheRepository)
