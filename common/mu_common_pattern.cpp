@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <locale>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace common {
@@ -238,6 +239,104 @@ bool matchesWhole(std::regex const& expression, std::string const& text)
     return std::regex_match(text, expression);
 }
 
+std::unique_ptr<CharacterRow const> CharacterRow::of(std::string_view expression)
+{
+    if (startsWith(expression, "^")) {
+        expression.remove_prefix(1);
+    }
+    if (endsWith(expression, "$") && !endsWith(expression, R"(\$)")) {
+        expression.remove_suffix(1);
+    }
+    auto row = std::make_unique<CharacterRow>();
+    return row->read(expression) ? std::move(row) : nullptr;
+}
+
+bool CharacterRow::read(std::string_view rest)
+{
+    while (!rest.empty()) {
+        if (length_ == kLongest || !readCharacter(rest)) {
+            return false;
+        }
+        ++length_;
+        readQuantifier(rest);
+    }
+    return true;
+}
+
+bool CharacterRow::readCharacter(std::string_view& rest)
+{
+    if (rest.front() == '[') {
+        return readClass(rest);
+    }
+    bool const isEscape = rest.front() == '\\' && rest.size() > 1;
+    std::string literal;
+    if (rest.front() == '.') {
+        for (Bits& states : admitted_) {
+            states |= Bits{1} << (length_ + 1);
+        }
+    } else if (readLiteral(rest.substr(0, isEscape ? 2 : 1), literal)) {
+        admit(literal.front());
+    } else {
+        return false;
+    }
+    rest.remove_prefix(isEscape ? 2 : 1);
+    return true;
+}
+
+// Letters, digits, underscores, and ranges of them.
+bool CharacterRow::readClass(std::string_view& rest)
+{
+    auto const isWord = [](char c) {
+        return c == '_' || (c >= '0' && c <= '9') || ((c | 32) >= 'a' && (c | 32) <= 'z');
+    };
+    rest.remove_prefix(1);
+    std::size_t const before = rest.size();
+    while (!rest.empty() && isWord(rest.front())) {
+        bool const isRange = rest.size() > 2 && rest[1] == '-' && isWord(rest[2]);
+        for (char c = rest.front(); c <= rest[isRange ? 2 : 0]; ++c) {
+            admit(c);
+        }
+        rest.remove_prefix(isRange ? 3 : 1);
+    }
+    bool const isWhole = before > rest.size() && !rest.empty() && rest.front() == ']';
+    rest.remove_prefix(isWhole ? 1 : 0);
+    return isWhole;
+}
+
+// A second one, as in `.*?`, stands where a character has to, and is none.
+void CharacterRow::readQuantifier(std::string_view& rest)
+{
+    char const mark = rest.empty() ? '\0' : rest.front();
+    if (mark != '*' && mark != '+' && mark != '?') {
+        return;
+    }
+    Bits const state = Bits{1} << length_;
+    repeated_ |= mark != '?' ? state : 0;
+    optional_ |= mark != '+' ? state : 0;
+    rest.remove_prefix(1);
+}
+
+CharacterRow::Bits CharacterRow::skipOptional(Bits states) const
+{
+    for (Bits more = states; more != 0; states |= more) {
+        more = (more << 1) & optional_ & ~states;
+    }
+    return states;
+}
+
+bool CharacterRow::matches(std::string_view text) const
+{
+    Bits states = skipOptional(1);
+    for (char const c : text) {
+        Bits const reached = ((states << 1) | (states & repeated_)) & admitted_[static_cast<unsigned char>(c)];
+        if (reached == 0) {
+            return false;
+        }
+        states = skipOptional(reached);
+    }
+    return (states >> length_ & 1) != 0;
+}
+
 NameFilter::NameFilter(std::vector<OdString> const& rules)
 {
     for (OdString const& rule : rules) {
@@ -269,6 +368,9 @@ NameFilter::Rule NameFilter::ruleOf(OdString const& text)
     rule.anyAfter = endsWith(rest, ".*") && !endsWith(rest, R"(\.*)");
     rest.remove_suffix(rule.anyAfter ? 2 : 0);
     rule.isPlain = readLiteral(rest, rule.literal);
+    if (!rule.isPlain) {
+        rule.row = CharacterRow::of(narrow);
+    }
     return rule;
 }
 
@@ -283,12 +385,20 @@ bool NameFilter::matchesPlain(Rule const& rule, std::string_view name)
     return rule.anyAfter ? startsWith(name, rule.literal) : name == rule.literal;
 }
 
+bool NameFilter::matchesSimple(Rule const& rule, std::string const& name)
+{
+    if (rule.isPlain) {
+        return matchesPlain(rule, name);
+    }
+    return rule.row ? rule.row->matches(name) : matchesWhole(rule.expression, name);
+}
+
 bool NameFilter::matches(std::string const& name) const
 {
     // `.` matches no line end, so a name that holds one is left to the expressions.
     bool const hasLineEnd = name.find_first_of("\r\n") != name.npos;
     return std::any_of(rules_.begin(), rules_.end(), [&](Rule const& rule) {
-        return rule.isPlain && !hasLineEnd ? matchesPlain(rule, name) : matchesWhole(rule.expression, name);
+        return hasLineEnd ? matchesWhole(rule.expression, name) : matchesSimple(rule, name);
     });
 }
 
