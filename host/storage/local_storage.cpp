@@ -134,16 +134,6 @@ Content openContent(std::string const& path, std::string const& name, std::uint6
     return {std::move(bytes), count};
 }
 
-bool isReadable(RecordFile const& file, std::size_t index, std::string const& scratch)
-{
-    try {
-        file.read(index, scratch, nullptr, [](std::string_view) {});
-        return true;
-    } catch (StorageError const&) {
-        return false;
-    }
-}
-
 /// The record that a new revision builds on: the previous one, or, where its chain is full, the whole one that the
 /// chain begins with.
 std::optional<std::size_t> baseIn(RecordFile const& file, DigestBytes const& previous)
@@ -204,26 +194,34 @@ Expected<OdString> LocalStorage::store(common::RootPath const& root, OdString co
         Content const content =
             openContent(root.pathTo(path).ansi_str(), quoted(path), std::uint64_t{1} << segmentLog_);
         DigestBytes const digest = digestOf(content);
-        OdString url = keptUrl(root, digest);
-        if (url.isEmpty()) {
-            beginBatch(root);
-            bool const isDrawing = common::fileToType(path) == common::StorageType::Tf;
-            url = (isDrawing ? keepDrawing(root, path, digest, content) : keepObject(root, digest, content)).text();
-            batch_.urls[digest] = url;
+        auto const stored = batch_.urls.find(digest);
+        if (stored != batch_.urls.end()) {
+            return stored->second;
         }
-        return url;
+        std::optional<StorageUrl> const known = knownPlace(digest);
+        StorageUrl const url = known ? *known : newPlace(path, digest);
+        if (!known || !isReadable(root, url)) {
+            beginBatch(root);
+            url.isObject() ? keepObject(root, url, content) : keepDrawing(root, url, path, content);
+        }
+        return batch_.urls[digest] = url.text();
     });
 }
 
-OdString LocalStorage::keptUrl(common::RootPath const& root, DigestBytes const& digest)
+// Where it should be: what is damaged or gone there is mended for all commits that name it.
+std::optional<StorageUrl> LocalStorage::knownPlace(DigestBytes const& digest) const
 {
-    auto const stored = batch_.urls.find(digest);
-    if (stored != batch_.urls.end()) {
-        return stored->second;
+    std::optional<StorageUrl> url = knownUrl_ ? parseUrl(knownUrl_(wide(hexOf(digest)))) : std::nullopt;
+    return url && url->digest == digest ? url : std::nullopt;
+}
+
+StorageUrl LocalStorage::newPlace(OdString const& path, DigestBytes const& digest) const
+{
+    if (common::fileToType(path) != common::StorageType::Tf) {
+        return {{}, digest};
     }
-    OdString const known = knownUrl_ ? knownUrl_(wide(hexOf(digest))) : OdString();
-    std::optional<StorageUrl> const url = parseUrl(known);
-    return url && url->digest == digest && isKept(root, known) ? known : OdString();
+    StorageUrl const previous = previousVersion(path);
+    return {previous.isObject() ? newStoreName(path, digest) : previous.store, digest};
 }
 
 // Opened before anything is written: what fails on the disk from here on is seen when it is flushed.
@@ -234,26 +232,25 @@ void LocalStorage::beginBatch(common::RootPath const& root)
     }
 }
 
-StorageUrl LocalStorage::keepObject(common::RootPath const& root, DigestBytes const& digest, Content const& content)
+void LocalStorage::keepObject(common::RootPath const& root, StorageUrl const& url, Content const& content)
 {
-    StorageUrl const url{{}, digest};
-    std::string const path = objectFolder(root) + "/" + hexOf(digest);
+    std::string const path = pathOf(root, url);
     makeFolders(incomingFolder(root));
     batch_.folders.insert(objectFolder(root));
-    if (exists(path)) { // Whole, but perhaps of an interrupted operation that has not flushed the folder.
-        return url;
+    if (isReadable(root, url)) { // Perhaps of an interrupted operation that has not flushed the folder.
+        return;
     }
-    std::string const incoming = incomingFolder(root) + "/" + hexOf(digest);
+    bool const isNew = !exists(path);
+    std::string const incoming = incomingFolder(root) + "/" + hexOf(url.digest);
     [[maybe_unused]] std::error_code const mostlyMissing = os::removeUnflushed(incoming);
     try {
         RecordFile file = RecordFile::create(incoming, "The object " + quoted(url.text()));
-        file.append(content, digest, nullptr, segmentLog_);
-        batch_.objects[path] = incoming;
+        file.append(content, url.digest, nullptr, segmentLog_);
+        batch_.objects[path] = {incoming, isNew};
     } catch (...) {
         [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(incoming);
         throw;
     }
-    return url;
 }
 
 StorageUrl LocalStorage::previousVersion(OdString const& path) const
@@ -262,11 +259,10 @@ StorageUrl LocalStorage::previousVersion(OdString const& path) const
     return previous.value_or(StorageUrl());
 }
 
-StorageUrl LocalStorage::keepDrawing(
-    common::RootPath const& root, OdString const& path, DigestBytes const& digest, Content const& content)
+// What was found damaged is kept whole: others may build on it, and their chains do not get longer by that.
+void LocalStorage::keepDrawing(
+    common::RootPath const& root, StorageUrl const& url, OdString const& path, Content const& content)
 {
-    StorageUrl const previous = previousVersion(path);
-    StorageUrl const url{previous.isObject() ? newStoreName(path, digest) : previous.store, digest};
     std::string const file = pathOf(root, url);
     std::string const name = "The revision store '" + url.store + "'";
     makeFolders(storeFolder(root));
@@ -274,13 +270,13 @@ StorageUrl LocalStorage::keepDrawing(
     bool const isNew = !exists(file);
     RecordFile store = isNew ? RecordFile::create(file, name) : RecordFile::openForChanging(file, name);
     batch_.storeLengths.emplace(file, store.end());
-    std::optional<std::size_t> const found = store.find(digest);
-    if (found && isReadable(store, *found, tavFolder(root))) { // Of an interrupted operation; perhaps not flushed.
-        return url;
+    if (store.find(url.digest) && isReadable(root, url)) { // Of an interrupted operation; perhaps not flushed.
+        return;
     }
     try {
-        loadBase(store, baseIn(store, previous.digest), tavFolder(root));
-        store.append(content, digest, base_ ? &*base_ : nullptr, segmentLog_);
+        bool const isWhole = store.isNamed(url.digest);
+        loadBase(store, isWhole ? std::nullopt : baseIn(store, previousVersion(path).digest), tavFolder(root));
+        store.append(content, url.digest, base_ ? &*base_ : nullptr, segmentLog_);
         if (base_ && !base_->content.isInMemory()) {
             base_.reset();
         }
@@ -291,7 +287,6 @@ StorageUrl LocalStorage::keepDrawing(
         }
         throw;
     }
-    return url;
 }
 
 void LocalStorage::loadBase(RecordFile const& store, std::optional<std::size_t> index, std::string const& scratch)
@@ -316,8 +311,8 @@ void LocalStorage::flushBatch()
 {
     try {
         flushContents();
-        for (auto const& [path, incoming] : batch_.objects) {
-            check(os::renameUnflushed(incoming, path), "'" + path + "' cannot be made");
+        for (auto const& [path, object] : batch_.objects) {
+            check(os::renameUnflushed(object.incoming, path), "'" + path + "' cannot be made");
         }
         for (std::string const& folder : batch_.folders) {
             check(os::flushFolder(folder), "'" + folder + "' cannot be written");
@@ -337,8 +332,8 @@ void LocalStorage::flushContents() const
             return check(error, "The storage cannot be written");
         }
     }
-    for (auto const& [path, incoming] : batch_.objects) {
-        flushFile(incoming);
+    for (auto const& [path, object] : batch_.objects) {
+        flushFile(object.incoming);
     }
     for (auto const& [path, length] : batch_.storeLengths) {
         flushFile(path);
@@ -349,9 +344,11 @@ void LocalStorage::flushContents() const
 void LocalStorage::takeBack() noexcept
 {
     std::error_code ignored;
-    for (auto const& [path, incoming] : batch_.objects) {
-        ignored = os::removeUnflushed(incoming);
-        ignored = os::removeUnflushed(path);
+    for (auto const& [path, object] : batch_.objects) {
+        ignored = os::removeUnflushed(object.incoming);
+        if (object.isNew) {
+            ignored = os::removeUnflushed(path);
+        }
     }
     for (auto const& [path, length] : batch_.storeLengths) {
         os::OpenFile store;
@@ -371,7 +368,7 @@ std::string LocalStorage::pathOf(common::RootPath const& root, StorageUrl const&
     }
     std::string const path = objectFolder(root) + "/" + hexOf(url.digest);
     auto const incoming = batch_.objects.find(path);
-    return incoming == batch_.objects.end() ? path : incoming->second;
+    return incoming == batch_.objects.end() ? path : incoming->second.incoming;
 }
 
 bool LocalStorage::isKept(common::RootPath const& root, OdString const& text) const
@@ -382,6 +379,16 @@ bool LocalStorage::isKept(common::RootPath const& root, OdString const& text) co
         return exists(path);
     }
     return RecordFile::openForReading(path, "The store of " + quoted(text)).find(url.digest).has_value();
+}
+
+bool LocalStorage::isReadable(common::RootPath const& root, StorageUrl const& url) const
+{
+    try {
+        read(root, url.text(), [](std::string_view) {});
+        return true;
+    } catch (StorageError const&) {
+        return false;
+    }
 }
 
 LocalStorage::Found LocalStorage::find(common::RootPath const& root, OdString const& text) const

@@ -55,7 +55,8 @@ public:
     ~LocalStorage() override;
 
     /// Keeps the content of `path`, which is relative to the working folder. The URL may be handed on once `flush` has
-    /// succeeded; this object reads the content at once. A repetition gives the same URL. What is kept is
+    /// succeeded; this object reads the content at once. A repetition gives the same URL. A content that is kept
+    /// already is read, once in a batch, and stored again under its URL where it is damaged or gone. What is kept is
     /// what was read, under its own digest; a file seen to change meanwhile is an error ("has changed while it was
     /// being stored"), after which the caller tries again. An error leaves nothing of the file behind.
     Expected<OdString> store(common::RootPath const& root, OdString const& path) override;
@@ -96,9 +97,13 @@ public:
     Expected<Freed> keepOnly(common::RootPath const& root, std::set<OdString> const& urls);
 
 private:
+    struct Object {
+        std::string incoming; // path meanwhile
+        bool isNew = true;    // else it replaces a damaged one
+    };
     struct Batch { // since the last flush
         std::map<DigestBytes, OdString> urls;
-        std::map<std::string, std::string> objects;        // final path, path meanwhile
+        std::map<std::string, Object> objects;             // by final path
         std::map<std::string, std::uint64_t> storeLengths; // before the first append
         std::set<std::string> folders;
         os::OpenFile fileSystem;
@@ -108,10 +113,10 @@ private:
         std::size_t index;
     };
 
-    StorageUrl keepObject(common::RootPath const& root, DigestBytes const& digest, Content const& content);
-    StorageUrl
-    keepDrawing(common::RootPath const& root, OdString const& path, DigestBytes const& digest, Content const& content);
-    OdString keptUrl(common::RootPath const& root, DigestBytes const& digest);
+    std::optional<StorageUrl> knownPlace(DigestBytes const& digest) const;
+    StorageUrl newPlace(OdString const& path, DigestBytes const& digest) const;
+    void keepObject(common::RootPath const& root, StorageUrl const& url, Content const& content);
+    void keepDrawing(common::RootPath const& root, StorageUrl const& url, OdString const& path, Content const& content);
     StorageUrl previousVersion(OdString const& path) const;
     void loadBase(RecordFile const& store, std::optional<std::size_t> index, std::string const& scratch);
     void beginBatch(common::RootPath const& root);
@@ -121,6 +126,7 @@ private:
 
     std::string pathOf(common::RootPath const& root, StorageUrl const& url) const;
     bool isKept(common::RootPath const& root, OdString const& url) const;
+    bool isReadable(common::RootPath const& root, StorageUrl const& url) const;
     Found find(common::RootPath const& root, OdString const& url) const;
     void read(common::RootPath const& root, OdString const& url, Sink const& sink) const;
     void

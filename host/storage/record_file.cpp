@@ -3,6 +3,8 @@
 #include "host/storage/storage_error.h"
 
 #include <algorithm>
+#include <array>
+#include <string_view>
 #include <utility>
 
 namespace tav {
@@ -10,6 +12,7 @@ namespace tav {
 namespace {
 
 constexpr std::size_t kPiece = std::size_t{1} << 20;
+constexpr std::string_view kFrameMark("\x28\xb5\x2f\xfd"); // of zstd
 
 } // namespace
 
@@ -41,16 +44,51 @@ RecordFile RecordFile::create(std::string const& path, std::string name)
 void RecordFile::list()
 {
     check(file_.length(length_), name_ + " cannot be read");
-    for (std::uint64_t offset = 0; offset < length_; offset = end()) {
+    std::uint64_t offset = 0;
+    while (offset < length_) {
         std::optional<Entry> entry = entryAt(offset);
         if (!entry) {
             entry = nextEntry(offset + 1);
         }
         if (!entry) {
-            return;
+            break;
         }
         entries_.push_back(*entry);
+        offset = entry->end();
     }
+    end_ = isTorn(offset) ? offset : length_;
+}
+
+// A killed append leaves zeros for the header and frames behind, a power failure perhaps nothing but zeros. A damaged
+// header is neither, and whoever damaged it may not have touched the content.
+bool RecordFile::isTorn(std::uint64_t offset) const
+{
+    std::array<char, kHeaderLength + kFrameMark.size()> bytes;
+    std::string_view const head(bytes.data(), readUpTo(offset, bytes.data(), bytes.size()));
+    if (head.size() < kHeaderLength || parseHeader(head.substr(0, kHeaderLength))) { // The frames are cut off.
+        return true;
+    }
+    if (head.find_first_not_of('\0') < kHeaderLength) {
+        return false;
+    }
+    std::string_view const frame = head.substr(kHeaderLength);
+    return frame == kFrameMark.substr(0, frame.size()) || isZero(offset);
+}
+
+bool RecordFile::isZero(std::uint64_t offset) const
+{
+    std::string piece(kPiece, '\0');
+    while (offset < length_) {
+        std::size_t const done = readUpTo(offset, piece.data(), piece.size());
+        if (std::string_view(piece.data(), done).find_first_not_of('\0') != std::string_view::npos) {
+            return false;
+        }
+        if (done < piece.size()) {
+            return true;
+        }
+        offset += done;
+    }
+    return true;
 }
 
 std::size_t RecordFile::readUpTo(std::uint64_t offset, char* buffer, std::size_t count) const
@@ -102,9 +140,9 @@ bool RecordFile::isClean() const
     return offset == length_;
 }
 
-std::optional<std::size_t> RecordFile::findBefore(std::size_t index, DigestBytes const& digest) const
+std::optional<std::size_t> RecordFile::find(DigestBytes const& digest) const
 {
-    while (index-- > 0) {
+    for (std::size_t index = entries_.size(); index-- > 0;) {
         if (entries_[index].record.digest == digest) {
             return index;
         }
@@ -112,11 +150,18 @@ std::optional<std::size_t> RecordFile::findBefore(std::size_t index, DigestBytes
     return std::nullopt;
 }
 
+bool RecordFile::isNamed(DigestBytes const& digest) const
+{
+    return std::any_of(entries_.begin(), entries_.end(), [&](Entry const& entry) {
+        return entry.record.digest == digest || entry.record.base == digest;
+    });
+}
+
 std::vector<std::size_t> RecordFile::chainOf(std::size_t index) const
 {
     std::vector<std::size_t> chain = {index};
     while (!entries_[chain.back()].record.isWhole()) {
-        std::optional<std::size_t> const base = findBefore(chain.back(), entries_[chain.back()].record.base);
+        std::optional<std::size_t> const base = find(entries_[chain.back()].record.base);
         if (!base || chain.size() > kLongestChain) {
             throw StorageError(name_ + " is damaged.");
         }
@@ -228,7 +273,7 @@ void RecordFile::appendRecord(Write const& write)
     }
     try {
         entries_.push_back({write(), before});
-        length_ = end();
+        length_ = end_ = entries_.back().end();
     } catch (...) {
         // What is left if this fails is a torn tail.
         [[maybe_unused]] std::error_code const ignored = file_.truncate(before);

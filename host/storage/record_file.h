@@ -39,8 +39,8 @@ struct KnownContent {
 /// is for who holds the repository's lock, reading is not disturbed by it.
 ///
 /// Damage is stepped over: where a header does not hold, the next one that does is looked for. What follows the last
-/// record that is whole is a torn tail, left by an append that never ended. Readers do not see it, and the next append
-/// takes its place.
+/// record is not seen by readers. The next append takes its place where it is a torn tail, left by an append that never
+/// ended; else it may be a record with a damaged header, which stays, and the append goes behind it.
 class RecordFile {
 public:
     /// Opens the file `path`. Messages speak of it as `name`.
@@ -52,16 +52,18 @@ public:
     /// In the order of the file, which is that of their making.
     std::vector<Entry> const& entries() const { return entries_; }
     /// Where the next record goes.
-    std::uint64_t end() const { return entries_.empty() ? 0 : entries_.back().end(); }
+    std::uint64_t end() const { return end_; }
     /// Length of the file, any torn tail included.
     std::uint64_t length() const { return length_; }
     /// Whether the file is its records and nothing else.
     bool isClean() const;
 
     /// The newest record of the content `digest`: its index.
-    std::optional<std::size_t> find(DigestBytes const& digest) const { return findBefore(entries_.size(), digest); }
-    /// The records that lead to the content of record `index`, the whole one first, that record last. Throws when one
-    /// is missing or there are too many.
+    std::optional<std::size_t> find(DigestBytes const& digest) const;
+    /// Whether there is a record of the content `digest`, or one that builds on it.
+    bool isNamed(DigestBytes const& digest) const;
+    /// The records that lead to the content of record `index`, the whole one first, that record last: of each base the
+    /// newest. Throws when one is missing or there are too many.
     std::vector<std::size_t> chainOf(std::size_t index) const;
 
     /// Gives `sink` the content of record `index`, and throws if it was not the right one: only who has seen this
@@ -86,8 +88,9 @@ private:
     void list();
     std::optional<Entry> entryAt(std::uint64_t offset) const;
     std::optional<Entry> nextEntry(std::uint64_t offset) const;
+    bool isTorn(std::uint64_t offset) const;
+    bool isZero(std::uint64_t offset) const;
     std::size_t readUpTo(std::uint64_t offset, char* buffer, std::size_t count) const;
-    std::optional<std::size_t> findBefore(std::size_t index, DigestBytes const& digest) const;
     std::optional<Content> loadBase(std::size_t index, std::string const& scratch, Buffer& spare) const;
     Content unpack(std::size_t index, Content const* base, std::string const& scratch, Buffer memory) const;
     void unpack(std::size_t index, Content const* base, Buffer& memory, Sink const& sink) const;
@@ -102,6 +105,7 @@ private:
     std::string name_;
     std::vector<Entry> entries_;
     std::uint64_t length_ = 0;
+    std::uint64_t end_ = 0;
 };
 
 } // namespace tav

@@ -117,6 +117,48 @@ TEST_P(FailingStorage, KeepsAllOfABatchOrNothing)
     }
 }
 
+TEST_P(FailingStorage, ReplacesADamagedObjectOrLeavesIt)
+{
+    bool more = true;
+    for (int n = 0; more; ++n) {
+        Scene const scene;
+        std::string const whole = scene.repo.read(Scene::fileOf(scene.object));
+        std::string const damaged = whole.substr(0, whole.size() - 1) + "x";
+        scene.repo.write(Scene::fileOf(scene.object), damaged);
+        bool succeeded = false;
+        std::string name;
+        {
+            FailingCall const failing(n, GetParam());
+            tav::LocalStorage storage = scene.newStorage();
+            succeeded =
+                storage.store(scene.repo.root(), L"file").hasValue() && storage.flush(scene.repo.root()).hasValue();
+            more = failing.hasFailed();
+            name = failing.name();
+        }
+        EXPECT_EQ(scene.files(), scene.before) << name;
+        std::string const bytes = scene.repo.read(Scene::fileOf(scene.object));
+        EXPECT_TRUE(bytes == whole || (!succeeded && bytes == damaged)) << name;
+    }
+}
+
+TEST_P(FailingStorage, NeverLosesARevisionWithADamagedHeader)
+{
+    bool more = true;
+    for (int n = 0; more; ++n) {
+        Scene const scene;
+        std::string damaged = scene.storeBefore;
+        std::size_t const place = damaged.rfind("tavrev1") + 40;
+        damaged[place] = static_cast<char>(damaged[place] ^ 1);
+        scene.repo.write(Scene::fileOf(scene.first), damaged);
+        writeThree(scene);
+        std::vector<std::string> urls;
+        FailingCall const failing(n, GetParam());
+        static_cast<void>(storeThree(scene, urls));
+        more = failing.hasFailed();
+        EXPECT_EQ(scene.repo.read(Scene::fileOf(scene.first)).substr(0, damaged.size()), damaged) << failing.name();
+    }
+}
+
 TEST_P(FailingStorage, RestoresTheOldFileOrTheNewOne)
 {
     bool more = true;

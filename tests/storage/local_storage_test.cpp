@@ -158,9 +158,63 @@ TEST_F(LocalStorage, DoesNotRelyOnAKnownUrlWhoseContentIsGoneOrOfAnotherDigest)
     for (std::string const& url :
          {"po:" + kAbc, "tf:gone#" + kAbc, "po:" + kNothing, std::string("tf:../x#1"), std::string()}) {
         known[kAbc] = url;
-        EXPECT_EQ(contentOf(store("c", "abc")), "abc") << url;
-        EXPECT_EQ(unlink(repo.pathTo(".tav/objects/" + kAbc).c_str()), 0) << url;
+        std::string const kept = store("c", "abc");
+        EXPECT_EQ(contentOf(kept), "abc") << url;
+        EXPECT_EQ(kept, url == "tf:gone#" + kAbc ? url : "po:" + kAbc);
+        EXPECT_EQ(unlink(repo.pathTo(fileOf(kept)).c_str()), 0) << url;
     }
+}
+
+TEST_F(LocalStorage, ReplacesAnObjectWhicheverByteOfItIsDamaged)
+{
+    std::string const url = store("file", "abc");
+    std::string const whole = repo.read(fileOf(url));
+    for (bool const isKnown : {false, true}) {
+        known[kAbc] = isKnown ? url : "";
+        for (std::size_t place = 0; place < whole.size(); ++place) {
+            std::string bytes = whole;
+            bytes[place] = static_cast<char>(bytes[place] ^ 1);
+            repo.write(fileOf(url), bytes);
+            EXPECT_EQ(store("file", "abc"), url) << place;
+            EXPECT_EQ(repo.read(fileOf(url)), whole) << place;
+        }
+        repo.write(fileOf(url), "");
+        EXPECT_EQ(store("file", "abc"), url);
+        EXPECT_EQ(contentOf(url), "abc");
+    }
+    EXPECT_THAT(files(), ElementsAre(fileOf(url)));
+}
+
+TEST_F(LocalStorage, KeepsADamagedObjectUntilTheNewOneIsFlushed)
+{
+    std::string const url = store("file", "abc");
+    repo.write(fileOf(url), "damaged");
+    {
+        tav::LocalStorage storage = newStorage();
+        EXPECT_EQ(messageOf(storage.store(repo.root(), L"file")), "success");
+        EXPECT_EQ(messageOf(storage.verify(repo.root(), wide(url))), "success");
+    }
+    EXPECT_THAT(files(), ElementsAre(fileOf(url)));
+    EXPECT_EQ(repo.read(fileOf(url)), "damaged");
+}
+
+TEST_F(LocalStorage, ReadsAKnownContentOnceHoweverManyFilesHaveIt)
+{
+    static std::string path;
+    static int opened;
+    known[kAbc] = store("a.dwg", "abc");
+    path = repo.pathTo(fileOf(known[kAbc]));
+    opened = 0;
+    tav::LocalStorage storage = newStorage();
+    RealCallsAfterwards const afterwards;
+    os::calls().openat = [](int folder, char const* name, int flags, mode_t mode) {
+        opened += name == path ? 1 : 0;
+        return RealCallsAfterwards::real.openat(folder, name, flags, mode);
+    };
+    for (int i = 0; i < 3; ++i) {
+        EXPECT_EQ(storage.store(repo.root(), L"a.dwg").value(), wide(known[kAbc]));
+    }
+    EXPECT_EQ(opened, 1);
 }
 
 TEST_F(LocalStorage, AppendsToTheStoreOfADrawingThatWasRenamed)

@@ -55,16 +55,76 @@ TEST_F(RevisionStore, ServesEarlierRevisionsAndTakesANewOneWhereverTheLastIsCutO
     }
 }
 
-TEST_F(RevisionStore, TakesATailOfAnyBytesForTorn)
+TEST_F(RevisionStore, DropsWhatAnAppendThatWasKilledHasLeft)
 {
     commitThree();
-    for (std::string const& tail :
-         {std::string(5000, '\0'), drawing(9, 5000), whole.substr(0, 50) + whole.substr(0, 90)}) {
+    auto const before = static_cast<std::size_t>(recordsOf(urls[0]).entries()[2].offset);
+    committed["plan.dwg"] = urls[1];
+    std::string bytes = whole;
+    bytes.replace(before, tav::kHeaderLength, tav::kHeaderLength, '\0'); // It would have been written last.
+    for (std::size_t length = before; length <= bytes.size(); ++length) {
+        repo.write(file, bytes.substr(0, length));
+        EXPECT_EQ(store("plan.dwg", contents[2]), urls[2]) << length;
+        EXPECT_TRUE(repo.read(file) == whole) << length;
+    }
+}
+
+TEST_F(RevisionStore, DropsATailThatCanHoldNothing)
+{
+    commitThree();
+    for (std::string const& tail : {std::string(5000, '\0'), whole.substr(0, 103), std::string("x")}) {
         repo.write(file, whole + tail);
         EXPECT_EQ(contentOf(urls[2]), contents[2]);
         std::string const content = edited(contents[2], 9);
         EXPECT_EQ(contentOf(store("plan.dwg", content)), content);
         EXPECT_TRUE(recordsOf(urls[0]).isClean());
+    }
+}
+
+TEST_F(RevisionStore, AppendsBehindATailThatMayHoldSomething)
+{
+    commitThree();
+    for (std::string const& tail :
+         {drawing(9, 5000), whole.substr(0, 50) + whole.substr(0, 90), std::string(4096, '\0') + drawing(9, 1)}) {
+        repo.write(file, whole + tail);
+        EXPECT_EQ(contentOf(urls[2]), contents[2]);
+        std::string const content = edited(contents[2], 9);
+        EXPECT_EQ(contentOf(store("plan.dwg", content)), content);
+        EXPECT_EQ(contentOf(urls[2]), contents[2]);
+        EXPECT_EQ(repo.read(file).substr(0, whole.size() + tail.size()), whole + tail);
+    }
+}
+
+TEST_F(RevisionStore, KeepsTheNewestRevisionWhicheverByteOfItsHeaderIsDamaged)
+{
+    commitThree();
+    auto const begin = static_cast<std::size_t>(recordsOf(urls[0]).entries()[2].offset);
+    std::string const content = edited(contents[2], 9);
+    for (std::size_t place = begin; place < begin + tav::kHeaderLength; ++place) {
+        damage(place);
+        EXPECT_EQ(contentOf(urls[2]), missing(2)) << place;
+        std::string const url = store("plan.dwg", content);
+        EXPECT_EQ(contentOf(url), content) << place;
+        std::string mended = repo.read(file);
+        mended.replace(0, whole.size(), whole);
+        repo.write(file, mended);
+        EXPECT_EQ(contentOf(urls[2]), contents[2]) << place;
+        EXPECT_EQ(contentOf(url), content) << place;
+    }
+}
+
+TEST_F(RevisionStore, KeepsARevisionWithADamagedHeaderWhenAnAppendIsTakenBack)
+{
+    commitThree();
+    for (std::size_t const begin : {std::size_t{0}, static_cast<std::size_t>(recordsOf(urls[0]).entries()[2].offset)}) {
+        std::string bytes = begin == 0 ? whole.substr(0, recordsOf(urls[0]).entries()[0].end()) : whole;
+        bytes[begin + 40] = static_cast<char>(bytes[begin + 40] ^ 1);
+        repo.write(file, bytes);
+        repo.write("plan.dwg", edited(contents[2], 9));
+        EXPECT_EQ(messageOf(newStorage().store(repo.root(), L"plan.dwg")), "success");
+        ASSERT_TRUE(repo.has(file));
+        EXPECT_EQ(repo.read(file), bytes);
+        repo.write(file, whole);
     }
 }
 
@@ -115,6 +175,75 @@ TEST_F(RevisionStore, StoresARevisionAgainThatAnInterruptedCommitLeftDamaged)
     EXPECT_EQ(contentOf(urls[2]), contents[2]);
     auto const all = newStorage().revisions(repo.root(), wide(urls[2]));
     EXPECT_THAT(all.value(), ElementsAre(wide(urls[0]), wide(urls[1]), wide(urls[2])));
+}
+
+TEST_F(RevisionStore, ReadsLaterRevisionsAgainWhenTheOneTheyBuildOnIsStoredAgain)
+{
+    commitThree();
+    auto const begin = static_cast<std::size_t>(recordsOf(urls[0]).entries()[1].offset);
+    for (std::size_t const place : {begin + 40, begin + tav::kHeaderLength + 5}) { // In the header, in the frame.
+        damage(place);
+        EXPECT_EQ(contentOf(urls[2]), damaged(2)) << place;
+        EXPECT_EQ(store("plan.dwg", contents[1]), urls[1]) << place;
+        for (std::size_t i = 0; i < urls.size(); ++i) {
+            EXPECT_EQ(contentOf(urls[i]), contents[i]) << place;
+        }
+    }
+}
+
+TEST_F(RevisionStore, ReadsTheWholeOfALongChainWhenAnEarlyLinkIsStoredAgain)
+{
+    for (unsigned i = 0; i <= tav::kLongestChain; ++i) {
+        contents.push_back(i == 0 ? drawing(0, 300) : edited(contents.back(), i));
+        urls.push_back(commit("plan.dwg", contents.back()));
+    }
+    file = fileOf(urls[0]);
+    whole = repo.read(file);
+    auto const begin = static_cast<std::size_t>(recordsOf(urls[0]).entries()[5].offset);
+    for (std::size_t const place : {begin + 40, begin + tav::kHeaderLength + 5}) {
+        for (std::size_t const previous : {4u, 5u, 32u}) {
+            damage(place);
+            committed["plan.dwg"] = urls[previous];
+            EXPECT_EQ(store("plan.dwg", contents[5]), urls[5]);
+            for (std::size_t i = 0; i < urls.size(); ++i) {
+                EXPECT_EQ(contentOf(urls[i]), contents[i]) << i << " after " << previous << ", " << place;
+            }
+        }
+    }
+}
+
+TEST_F(RevisionStore, StoresAgainWhatIsKnownUnderItsUrlButCannotBeRead)
+{
+    commitThree();
+    for (std::size_t i = 0; i < urls.size(); ++i) {
+        known[urls[i].substr(urls[i].size() - 64)] = urls[i];
+    }
+    for (std::size_t place = 0; place < whole.size(); place += 7) {
+        damage(place);
+        for (std::size_t i = 0; i < urls.size(); ++i) {
+            EXPECT_EQ(store(i == 1 ? "text" : "copy.dwg", contents[i]), urls[i]) << place;
+        }
+        for (std::size_t i = 0; i < urls.size(); ++i) {
+            EXPECT_EQ(contentOf(urls[i]), contents[i]) << place;
+        }
+    }
+    EXPECT_THAT(files(), ElementsAre(file));
+}
+
+TEST_F(RevisionStore, LosesTheDamagedRecordOfARevisionStoredAgainWithTheNextCleaning)
+{
+    commitThree();
+    for (std::size_t const place : {std::size_t{40}, std::size_t{150}}) {
+        damage(place);
+        EXPECT_EQ(store("plan.dwg", contents[0]), urls[0]);
+        auto const freed = newStorage().keepOnly(repo.root(), {wide(urls[0]), wide(urls[1]), wide(urls[2])});
+        EXPECT_EQ(messageOf(freed), "success");
+        EXPECT_EQ(repo.read(file).size(), whole.size());
+        EXPECT_TRUE(recordsOf(urls[0]).isClean());
+        for (std::size_t i = 0; i < urls.size(); ++i) {
+            EXPECT_EQ(contentOf(urls[i]), contents[i]) << place;
+        }
+    }
 }
 
 /// How long the chains of the revisions of one drawing may become.
