@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <cctype>
 #include <charconv>
-#include <exception>
 #include <ios>
 #include <streambuf>
 #include <utility>
@@ -67,7 +66,8 @@ char const* writeInteger(Value const& value, NumberText& text)
 /// Tells how long the text of a value will be, so that it is put where it stays. Escapes and reals count at their
 /// shortest, and what is nested deeper than any real document does not count at all, so that recursion is safe.
 /// Of long arrays, the bulk of every large document, only a sample counts: to measure a million records takes 0.15 s,
-/// to write them 0.4 s. A text that becomes longer than it seemed is moved once more.
+/// to write them 0.4 s. A text that becomes longer than it seemed is moved once more; what is not written to takes no
+/// memory.
 class LengthEstimate {
 public:
     explicit LengthEstimate(bool pretty) : pretty_(pretty) {}
@@ -110,7 +110,11 @@ private:
         }
         std::size_t length = 0;
         for (std::size_t i = 0; i < kSample; ++i) {
-            length += ofItem(array[i * array.size() / kSample], depth + 1);
+            std::size_t const item = ofItem(array[i * array.size() / kSample], depth + 1);
+            if (item > kLongItem) {
+                return ofContainer(array, depth);
+            }
+            length += item;
         }
         return length / kSample * array.size();
     }
@@ -131,6 +135,7 @@ private:
 
     static constexpr std::size_t kDeepest = 64;
     static constexpr std::size_t kSample = 1024;
+    static constexpr std::size_t kLongItem = 16'384; // A few of these in the sample would mislead by far too much.
 
     bool const pretty_;
 };
@@ -157,7 +162,7 @@ class TextStream : public std::wostringstream {
 public:
     explicit TextStream(std::size_t expectedLength)
     {
-        reserve(expectedLength + expectedLength / 8);
+        buffer_.text.reserve(expectedLength + expectedLength / 8);
         adviseLargePages(buffer_.text);
         std::wios::rdbuf(&buffer_);
         exceptions(std::ios_base::badbit); // Lets what the allocation throws pass.
@@ -177,16 +182,6 @@ private:
             return count;
         }
     };
-
-    // What is not written to takes no memory. A sample can mislead, though, and the text be far shorter.
-    void reserve(std::size_t length)
-    {
-        try {
-            buffer_.text.reserve(length);
-        } catch (std::exception const&) {
-            return; // It grows as it is written.
-        }
-    }
 
     Buffer buffer_;
 };
