@@ -6,7 +6,6 @@
 #include "platform/ut/FileName.h"
 
 #include <algorithm>
-#include <set>
 #include <string_view>
 #include <unordered_map>
 #include <utility>
@@ -46,6 +45,7 @@ struct RepoFileExplorer::Pimpl {
     Pimpl(RepoChanges const& changes, RootPath const& repository)
         : removed(changes.removed)
         , candidates(candidatesOf(changes))
+        , staged(candidates.size())
         , unchanged(changes.unchanged)
         , root(repository)
     {
@@ -57,7 +57,8 @@ struct RepoFileExplorer::Pimpl {
 
     std::vector<Versions<void, VersionedFile>> removed;
     std::vector<StagedFile> candidates;
-    std::set<std::size_t> staged;
+    std::vector<bool> staged; ///< of each candidate, whether it is
+    std::size_t stagedCount = 0;
     std::vector<VersionedFile> unchanged;
     RootPath root;
     /// Candidates by what they are: searching the list for each of many would take quadratic time.
@@ -77,26 +78,31 @@ RepoFileExplorer::~RepoFileExplorer() = default;
 
 bool RepoFileExplorer::hasFilesToStage() const
 {
-    return pimpl_->staged.size() < pimpl_->candidates.size();
+    return pimpl_->stagedCount < pimpl_->candidates.size();
 }
 
 bool RepoFileExplorer::stage(StagedFile const& file)
 {
     auto const position = pimpl_->positions.find(&file);
-    return position != pimpl_->positions.end() && pimpl_->staged.insert(position->second).second;
+    if (position == pimpl_->positions.end() || pimpl_->staged[position->second]) {
+        return false;
+    }
+    pimpl_->staged[position->second] = true;
+    ++pimpl_->stagedCount;
+    return true;
 }
 
 Expected<std::vector<StatusRef>> RepoFileExplorer::stagedFiles() const
 {
-    if (pimpl_->staged.empty()) {
+    if (pimpl_->stagedCount == 0) {
         if (pimpl_->removed.empty()) {
             return ErrorMessage(translate(L"There are no modified or untracked files for commit."));
         }
         return std::vector<StatusRef>();
     }
     std::vector<StatusRef> files = possibleStageFiles();
-    for (std::size_t const position : pimpl_->staged) {
-        files[position].selected = true;
+    for (std::size_t i = 0; i < files.size(); ++i) {
+        files[i].selected = files[i].selected || pimpl_->staged[i];
     }
     return files;
 }

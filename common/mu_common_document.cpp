@@ -12,6 +12,16 @@
 
 namespace common {
 
+namespace {
+
+OdString textOf(kutils::json::Value const& document)
+{
+    std::wstring const text = kutils::json::write_string(document, true);
+    return OdString(text.c_str(), text.size());
+}
+
+} // namespace
+
 kutils::json::Value readDocument(OdString const& path)
 {
     kutils::json::Value document;
@@ -24,10 +34,9 @@ kutils::json::Value readDocument(OdString const& path)
 
 WriteOutcome writeDocument(OdString const& path, kutils::json::Value const& document)
 {
-    std::wstring const text = kutils::json::write_string(document, true);
     ut::TextFile file(path);
     file.create();
-    file.addLine(OdString(text.c_str(), text.size()));
+    file.addLine(textOf(document));
     if (!file.write()) {
         return ErrorMessage(translate(L"Error writing to file '%ls'"), path.c_str());
     }

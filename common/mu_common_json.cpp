@@ -1,6 +1,9 @@
 #include "common/mu_common_json.h"
 
+#include <algorithm>
+#include <cstddef>
 #include <string>
+#include <string_view>
 
 using kutils::json::Array;
 using kutils::json::Object;
@@ -33,9 +36,16 @@ OdString composeErrorMessage(OdString const& message, OdString const& context, O
     return composed;
 }
 
+// Looking at each member of a small object is faster than making a key of the map's own type, which needs an
+// allocation.
 Object::const_iterator findMember(Object const& object, OdString const& key)
 {
-    return object.find(std::wstring(key.c_str(), key.getLength()));
+    constexpr std::size_t kSmall = 8;
+    std::wstring_view const name(key.c_str(), key.getLength());
+    if (object.size() > kSmall) {
+        return object.find(std::wstring(name));
+    }
+    return std::find_if(object.begin(), object.end(), [&](auto const& member) { return member.first == name; });
 }
 
 Value const& getTyped(Object const& object, OdString const& key, OdString const& context, Value_type type)

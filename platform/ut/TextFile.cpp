@@ -4,6 +4,8 @@
 #include "platform/ut/FileName.h"
 #include "platform/ut/text.h"
 
+#include <utility>
+
 namespace ut {
 namespace {
 
@@ -26,9 +28,9 @@ std::vector<OdString> splitLines(OdString const& text)
 
 std::string joinLines(std::vector<OdString> const& lines)
 {
-    std::string bytes;
-    for (std::size_t i = 0; i < lines.size(); ++i) {
-        bytes += i == 0 ? "" : "\n";
+    std::string bytes = lines.empty() ? std::string() : lines.front().ansi_str();
+    for (std::size_t i = 1; i < lines.size(); ++i) {
+        bytes += '\n';
         bytes += lines[i].ansi_str();
     }
     return bytes;
@@ -71,9 +73,9 @@ void TextFile::create()
     next_ = 0;
 }
 
-void TextFile::addLine(OdString const& line)
+void TextFile::addLine(OdString line)
 {
-    lines_.push_back(line);
+    lines_.push_back(std::move(line));
 }
 
 bool TextFile::write()

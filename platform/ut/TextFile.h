@@ -31,7 +31,7 @@ public:
     /// file behind.
     void create();
     /// Appends a line. A line that holds line feeds is written as it stands.
-    void addLine(OdString const& line);
+    void addLine(OdString line);
     /// Writes the lines, joined with line feeds, none after the last. The old content is replaced as a whole and
     /// durably: after a crash, a full disk or any other failure the file holds the old content or the new. Permissions
     /// are kept, and a link stays and leads to the new content. True when the new content is safe on the disk.
