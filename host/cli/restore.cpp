@@ -46,9 +46,22 @@ Tree chosenFiles(Options const& options, Tree const& files, CommitRecord const& 
     return chosen;
 }
 
+/// Who brings a file back does not want to remove it any more.
+void unstageRemovals(Tree const& files, common::State& state)
+{
+    std::vector<common::StagedFile> removals;
+    for (common::StagedFile const& file : state.stagedFiles) {
+        if (file.change == common::FileChange::removed && files.count(file.path) > 0) {
+            removals.push_back(file);
+        }
+    }
+    unstage(removals, state);
+}
+
 /// Files that are now as the last commit has them are no changes any more.
 void enterFiles(Tree const& files, Tree const& base, WrittenTimes const& times, common::State& state)
 {
+    unstageRemovals(files, state);
     std::vector<common::StagedFile> unchanged;
     for (auto const& [path, url] : files) {
         auto const committed = base.find(path);
@@ -72,8 +85,9 @@ void restoreFiles(Options const& options)
     CommitRecord const commit = findCommit(work.database(), options.commit);
     Tree const files = chosenFiles(options, work.database().commits().files(commit.hash), commit, root);
     Tree const base = work.database().commits().files(work.database().base());
-    TreeUpdate update{files, {}};
-    checkUpdate(root, work.database(), base, options.force ? Unsaved::mayGo : Unsaved::isKept, update);
+    TreeUpdate update;
+    update.writes = files;
+    checkUpdate(root, work.database(), options.force ? Unsaved::mayGo : Unsaved::isKept, update);
     LocalStorage storage;
     WrittenTimes const times = carryOut(root, storage, update, work.start());
     changeState(root, [&](common::Cache& cache) { enterFiles(files, base, times, cache.write()); });

@@ -5,22 +5,50 @@
 #include "host/repository/unfinished.h"
 #include "host/repository/working_state.h"
 
+#include <algorithm>
+
 namespace tav {
 
 namespace {
 
+/// The targets of moves whose files may be in the working folder beside those of the last commit.
+std::vector<OdString> begunMoves(LocalDatabase const& database)
+{
+    Unfinished const unfinished = unfinishedOf(database);
+    auto const* const move = std::get_if<MoveUnderWay>(&unfinished);
+    if (!move) {
+        return {};
+    }
+    std::vector<OdString> targets = move->begun;
+    if (std::find(targets.begin(), targets.end(), move->target) == targets.end()) {
+        targets.push_back(move->target);
+    }
+    return targets;
+}
+
+std::vector<Tree> filesOf(std::vector<OdString> const& commits, LocalDatabase const& database)
+{
+    std::vector<Tree> files;
+    for (OdString const& commit : commits) {
+        files.push_back(database.commits().files(commit));
+    }
+    return files;
+}
+
+/// `update` as it was before the check: also a file that was found as it shall be is no change any more.
 void enterFiles(TreeUpdate const& update, WrittenTimes const& times, common::State& state)
 {
-    std::vector<common::StagedFile> replaced;
+    std::vector<common::StagedFile> settled;
+    for (Tree const* const files : {&update.writes, &update.removals}) {
+        for (auto const& [path, url] : *files) {
+            state.index.erase(path);
+            settled.emplace_back(path, common::FileChange::modified);
+        }
+    }
     for (auto const& [path, time] : times) {
         state.index.insert_or_assign(path, common::IndexData{time, false});
-        replaced.emplace_back(path, common::FileChange::modified);
     }
-    for (auto const& [path, url] : update.removals) {
-        state.index.erase(path);
-        replaced.emplace_back(path, common::FileChange::removed);
-    }
-    unstage(replaced, state);
+    unstage(settled, state);
 }
 
 } // namespace
@@ -29,19 +57,23 @@ Moved moveTo(
     common::RootPath const& root, LocalDatabase& database, Destination const& destination, Unsaved unsaved,
     std::uint64_t start)
 {
-    Tree const from = database.commits().files(database.base());
-    TreeUpdate update = updateBetween(from, database.commits().files(destination.commit));
-    checkUpdate(root, database, from, unsaved, update);
+    std::vector<OdString> const begun = begunMoves(database);
+    TreeUpdate const whole = updateBetween(
+        database.commits().files(database.base()), filesOf(begun, database),
+        database.commits().files(destination.commit));
+    TreeUpdate update = whole;
+    checkUpdate(root, database, unsaved, update);
     LocalStorage storage;
-    note(MoveUnderWay{destination.commit, destination.branch, false}, database);
-    WrittenTimes const times = carryOut(root, storage, update, start);
+    MoveUnderWay move{destination.commit, destination.branch, false, begun};
+    WrittenTimes const times = carryOut(root, storage, update, start, [&] { note(move, database); });
     Change change(database.database());
     database.setBase(destination.commit);
-    note(MoveUnderWay{destination.commit, destination.branch, true}, database);
+    move.isWritten = true;
+    note(move, database);
     change.commit();
     changeState(root, [&](common::Cache& cache) {
         cache.write().head = destination.branch;
-        enterFiles(update, times, cache.write());
+        enterFiles(whole, times, cache.write());
     });
     note(std::monostate(), database);
     return {update.writes.size(), update.removals.size()};

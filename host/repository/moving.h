@@ -20,7 +20,8 @@ struct Moved {
 };
 
 /// Makes the working folder stand on another commit. Changes and staged files at paths where both commits agree stay.
-/// Throws `Failure`; before the first file is written nothing has changed then, later the same move completes it.
+/// Throws `Failure`; before the first file is written nothing has changed then, later the same move completes it, and
+/// one to any other commit, also back to where it began, leaves nothing of it behind.
 /// The caller holds the lock of the repository since `start`.
 Moved moveTo(
     common::RootPath const& root, LocalDatabase& database, Destination const& destination, Unsaved unsaved,

@@ -61,6 +61,11 @@ Object documentOf(MoveUnderWay const& work)
     document[L"target"] = text(work.target);
     document[L"branch"] = text(work.branch);
     document[L"written"] = work.isWritten;
+    Array begun;
+    for (OdString const& target : work.begun) {
+        begun.emplace_back(text(target));
+    }
+    document[L"begun"] = std::move(begun);
     return document;
 }
 
@@ -86,7 +91,15 @@ CommitUnderWay commitOf(Object const& document)
 
 MoveUnderWay moveOf(Object const& document)
 {
-    return {textOf(document, L"target"), textOf(document, L"branch"), common::getBoolValue(document, L"written", L"")};
+    MoveUnderWay work{
+        textOf(document, L"target"), textOf(document, L"branch"), common::getBoolValue(document, L"written", L"")};
+    if (common::hasKey(document, L"begun")) {
+        for (Value const& element : common::getArrayValue(document, L"begun", L"")) {
+            std::wstring const& target = element.get_string();
+            work.begun.push_back(withoutPairs(OdString(target.c_str(), target.size())));
+        }
+    }
+    return work;
 }
 
 } // namespace

@@ -29,9 +29,10 @@ struct CommitUnderWay {
 
 /// A working folder that is being made to hold another commit.
 struct MoveUnderWay {
-    OdString target; ///< hash of the commit
-    OdString branch; ///< where HEAD points to afterwards
-    bool isWritten;  ///< whether all files are there already
+    OdString target;                  ///< hash of the commit
+    OdString branch;                  ///< where HEAD points to afterwards
+    bool isWritten;                   ///< whether all files are there already
+    std::vector<OdString> begun = {}; ///< targets of moves that were interrupted before this one, and not completed
 };
 
 using Unfinished = std::variant<std::monostate, CommitUnderWay, MoveUnderWay>;

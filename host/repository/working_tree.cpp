@@ -5,7 +5,6 @@
 #include "host/progress.h"
 #include "host/repository/digest.h"
 #include "host/repository/index_record.h"
-#include "host/repository/working_state.h"
 
 #include "platform/os/os_batch.h"
 #include "platform/os/os_files.h"
@@ -20,33 +19,32 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr char const* kAgain = "What has been written is whole; mend that and run the command again.";
+constexpr char const* kNothingYet = "Nothing has been written; mend that and run the command again.";
+constexpr std::uint64_t kBetweenFiles = 1000; ///< ns; the finest step that all file systems with fractions know
 
-/// The part of `path` that is there to be looked at: a file that goes may stand where a folder is to be.
-OdString partThatStays(OdString const& path, Tree const& removals)
+/// The part of `path` that is there to be looked at: a file may stand where a folder was, or is to be.
+OdString partThatStays(OdString const& path, TreeUpdate const& update)
 {
     for (std::size_t i = 0; i < path.getLength(); ++i) {
-        if (path.getAt(i) == L'/' && removals.count(path.left(i)) > 0) {
-            return path.left(i);
+        if (path.getAt(i) != L'/') {
+            continue;
+        }
+        OdString const part = path.left(i);
+        if (update.removals.count(part) > 0 || update.writes.count(part) > 0) {
+            return part;
         }
     }
     return path;
 }
 
-void checkPath(common::RootPath const& root, OdString const& path, Tree const& removals)
+void checkPath(common::RootPath const& root, OdString const& path, TreeUpdate const& update)
 {
     if (auto const fault = whyUnsafe(path)) {
         throw Failure(*fault, "Nothing has been written.");
     }
-    if (auto const link = linkOnTheWay(root.path().ansi_str(), partThatStays(path, removals))) {
+    if (auto const link = linkOnTheWay(root.path().ansi_str(), partThatStays(path, update))) {
         throw Failure(*link, "Nothing has been written; move that away first.");
     }
-}
-
-/// Whether `tree` has files in the folder `path`.
-bool hasFilesIn(OdString const& path, Tree const& tree)
-{
-    auto const first = tree.lower_bound(path + L"/");
-    return first != tree.end() && first->first.left(path.getLength() + 1) == path + L"/";
 }
 
 fs::file_type typeOf(OdString const& path, common::RootPath const& root)
@@ -55,50 +53,95 @@ fs::file_type typeOf(OdString const& path, common::RootPath const& root)
     return fs::symlink_status(root.pathTo(path).ansi_str(), error).type();
 }
 
-/// What is known of a working file.
-struct Versions {
-    OdString const* before; ///< URL of the content that the commit has which the folder stands on; null for none
-    OdString const* after;  ///< URL of the content that it shall have; null when it goes
-    bool isFolderBefore;    ///< it stands where a folder is whose files all go
-};
-
 enum class Finding { isFree, isAsWanted, holdsUnsaved };
-
-Finding
-lookInto(OdString const& path, Versions const& versions, common::RootPath const& root, LocalDatabase const& database)
-{
-    auto const digest = fileDigest(root.pathTo(path));
-    if (digest && versions.after && digest == digestOf(*versions.after)) {
-        return Finding::isAsWanted;
-    }
-    return digest && database.keeps(*digest) ? Finding::isFree : Finding::holdsUnsaved;
-}
 
 class Check {
 public:
-    Check(
-        common::RootPath const& root, LocalDatabase const& database, Tree const& from, Tree const& removals,
-        Unsaved unsaved)
+    Check(common::RootPath const& root, LocalDatabase const& database, Unsaved unsaved, TreeUpdate& update)
         : root_(root)
         , database_(database)
-        , from_(from)
-        , removals_(removals)
-        , cache_(readState(root))
         , unsaved_(unsaved)
+        , whole_(update)
+        , update_(update)
+        , batch_(root.path().ansi_str())
     {
     }
 
-    /// Takes out of `files` what is as it shall be.
+    void run()
+    {
+        sift(update_.removals, false);
+        sift(update_.writes, true);
+        failIfAnyIsInTheWay();
+    }
+
+private:
+    /// Takes out of `files` what stays as it is.
     void sift(Tree& files, bool areWritten)
     {
         for (auto file = files.begin(); file != files.end();) {
-            checkPath(root_, file->first, removals_);
-            Finding const finding = look(file->first, versionsOf(*file, areWritten));
-            if (finding == Finding::holdsUnsaved && unsaved_ == Unsaved::isKept) {
-                inTheWay_.push_back(file->first.ansi_str());
+            auto const& [path, url] = *file;
+            checkPath(root_, path, whole_);
+            noteMark(path);
+            Finding const finding = look(path, areWritten ? &url : nullptr);
+            bool const isUnsaved = finding == Finding::holdsUnsaved;
+            bool const isLeftover = update_.leftovers.count(path) > 0;
+            if (isUnsaved && !isLeftover && unsaved_ == Unsaved::isKept) {
+                inTheWay_.push_back(path.ansi_str());
             }
-            file = finding == Finding::isAsWanted ? files.erase(file) : std::next(file);
+            bool const stays = finding == Finding::isAsWanted || (isUnsaved && isLeftover);
+            file = stays ? files.erase(file) : std::next(file);
         }
+    }
+
+    /// Before the file is read, so that whatever happens to it from here on shows.
+    void noteMark(OdString const& path)
+    {
+        if (std::error_code const error = batch_.mark(path.ansi_str(), update_.marks[path])) {
+            throw Failure("'" + path.ansi_str() + "' cannot be examined: " + error.message() + ".", kNothingYet);
+        }
+    }
+
+    /// `wanted` is the URL of the content that the file shall have; null when it goes.
+    Finding look(OdString const& path, OdString const* wanted) const
+    {
+        fs::file_type const type = typeOf(path, root_);
+        if (type == fs::file_type::directory) {
+            return wanted ? lookIntoFolder(path) : Finding::isAsWanted;
+        }
+        if (type == fs::file_type::not_found) {
+            return wanted ? Finding::isFree : Finding::isAsWanted;
+        }
+        if (type != fs::file_type::regular) {
+            throw Failure(
+                "'" + path.ansi_str() + "' is no ordinary file.", "Nothing has been written; move it away first.");
+        }
+        auto const digest = fileDigest(root_.pathTo(path));
+        if (digest && wanted && digest == digestOf(*wanted)) {
+            return Finding::isAsWanted;
+        }
+        return digest && database_.keeps(*digest) ? Finding::isFree : Finding::holdsUnsaved;
+    }
+
+    /// Whether a file can take the place of the folder `path` once the files that go are gone. They have been sifted:
+    /// those left out have gone already, or stay.
+    Finding lookIntoFolder(OdString const& path) const
+    {
+        std::string const top = root_.path().ansi_str();
+        std::error_code error;
+        fs::recursive_directory_iterator entry(top + "/" + path.ansi_str(), error);
+        for (; !error && entry != fs::recursive_directory_iterator(); entry.increment(error)) {
+            std::string const name = entry->path().string().substr(top.size() + 1);
+            bool const isFolder = entry->symlink_status(error).type() == fs::file_type::directory;
+            if (!isFolder && update_.removals.count(OdString(name.data(), name.size(), CP_UTF_8)) == 0) {
+                throw Failure(
+                    "'" + name + "' lies in a folder whose place a file of the commit takes.",
+                    "Nothing has been written; move it away first.");
+            }
+        }
+        if (error) {
+            throw Failure("The folder '" + path.ansi_str() + "' cannot be read: " + error.message() + ".", kNothingYet);
+        }
+        return Finding::isFree;
     }
 
     void failIfAnyIsInTheWay()
@@ -113,42 +156,12 @@ public:
         throw failure;
     }
 
-private:
-    Versions versionsOf(Tree::value_type const& file, bool isWritten) const
-    {
-        auto const before = from_.find(file.first);
-        return {
-            before == from_.end() ? nullptr : &before->second, isWritten ? &file.second : nullptr,
-            isWritten && hasFilesIn(file.first, removals_)};
-    }
-
-    Finding look(OdString const& path, Versions const& versions) const
-    {
-        fs::file_type const type = typeOf(path, root_);
-        if (type == fs::file_type::not_found || versions.isFolderBefore) {
-            return versions.after ? Finding::isFree : Finding::isAsWanted;
-        }
-        if (type != fs::file_type::regular) {
-            throw Failure(
-                "'" + path.ansi_str() + "' is a folder, or no ordinary file.",
-                "Nothing has been written; move it away first.");
-        }
-        auto const& index = cache_->read().index;
-        auto const record = index.find(path);
-        bool const isCommitted =
-            versions.before && record != index.end() && isUntouched(record->second, common::modifyTime(path, root_));
-        if (!isCommitted) {
-            return lookInto(path, versions, root_, database_);
-        }
-        return versions.after && *versions.after == *versions.before ? Finding::isAsWanted : Finding::isFree;
-    }
-
     common::RootPath const& root_;
     LocalDatabase const& database_;
-    Tree const& from_;
-    Tree const removals_; ///< as they were at first
-    std::shared_ptr<common::Cache const> cache_;
     Unsaved unsaved_;
+    TreeUpdate const whole_; ///< as it was at first
+    TreeUpdate& update_;
+    os::Batch batch_;
     std::vector<std::string> inTheWay_;
 };
 
@@ -160,7 +173,7 @@ public:
     explicit Restored(common::RootPath const& root) : folder_(root.pathTo(kRestoring).ansi_str())
     {
         if (std::error_code const error = os::makeFolders(folder_, 0777)) {
-            throw Failure("'" + folder_ + "' cannot be made: " + error.message() + ".", kAgain);
+            throw Failure("'" + folder_ + "' cannot be made: " + error.message() + ".", kNothingYet);
         }
         removeAll(); // A command that was killed may have left some.
     }
@@ -183,10 +196,22 @@ private:
     std::string folder_;
 };
 
-void requireDone(std::error_code const& error, OdString const& path)
+void requireDone(std::error_code const& error, OdString const& path, char const* next)
 {
     if (error) {
-        throw Failure("'" + path.ansi_str() + "' cannot be written: " + error.message() + ".", kAgain);
+        throw Failure("'" + path.ansi_str() + "' cannot be written: " + error.message() + ".", next);
+    }
+}
+
+void extract(
+    common::RootPath const& root, LocalStorage& storage, Tree::value_type const& file, std::string const& target)
+{
+    auto const& [path, url] = file;
+    if (auto const done = storage.extract(root, url, target); !done.hasValue()) {
+        bool const isDamaged = !storage.verify(root, url).hasValue();
+        throw Failure(
+            "'" + path.ansi_str() + "' cannot be brought back: " + done.error().message.ansi_str(),
+            isDamaged ? "Run 'tav verify' to see what is damaged." : "Check the free space.");
     }
 }
 
@@ -197,36 +222,68 @@ WrittenTimes extractAll(
     WrittenTimes times;
     Progress progress("files", files.size());
     std::size_t number = 0;
-    for (auto const& [path, url] : files) {
-        std::string const file = restored.pathOf(number);
-        if (auto const done = storage.extract(root, url, file); !done.hasValue()) {
-            throw Failure(
-                "'" + path.ansi_str() + "' cannot be brought back: " + done.error().message.ansi_str(),
-                "Run 'tav verify' to see what is damaged.");
-        }
-        requireDone(os::setModificationTime(file, time), path);
-        times.emplace(path, common::modifyTime(kRestoring + L"/" + std::to_wstring(number).c_str(), root));
+    for (auto const& file : files) {
+        std::string const target = restored.pathOf(number);
+        extract(root, storage, file, target);
+        requireDone(os::setModificationTime(target, time - number * kBetweenFiles), file.first, kNothingYet);
+        times.emplace(file.first, common::modifyTime(kRestoring + L"/" + std::to_wstring(number).c_str(), root));
         ++number;
         progress.advance();
     }
     return times;
 }
 
+/// People go on working while a command runs.
+void requireUnchanged(os::Batch& batch, TreeUpdate const& update, OdString const& path, char const* next)
+{
+    os::FileMark now;
+    requireDone(batch.mark(path.ansi_str(), now), path, next);
+    if (!isSame(now, update.marks.at(path))) {
+        throw Failure("'" + path.ansi_str() + "' has been changed while this command was at work.", next);
+    }
+}
+
+void requireAllUnchanged(os::Batch& batch, TreeUpdate const& update)
+{
+    for (Tree const* const files : {&update.removals, &update.writes}) {
+        for (auto const& [path, url] : *files) {
+            requireUnchanged(batch, update, path, "Nothing has been written; run the command again.");
+        }
+    }
+}
+
 void placeAll(os::Batch& batch, TreeUpdate const& update, Restored const& restored)
 {
+    constexpr char const* kWhole = "What has been written is whole; run the command again.";
     for (auto const& [path, url] : update.removals) {
-        requireDone(batch.remove(path.ansi_str()), path);
+        requireUnchanged(batch, update, path, kWhole);
+        requireDone(batch.remove(path.ansi_str()), path, kAgain);
         batch.removeEmptyFoldersOf(path.ansi_str());
     }
     std::size_t number = 0;
     for (auto const& [path, url] : update.writes) {
-        requireDone(batch.place(restored.pathOf(number++), path.ansi_str()), path);
+        requireUnchanged(batch, update, path, kWhole);
+        requireDone(batch.place(restored.pathOf(number++), path.ansi_str()), path, kAgain);
+    }
+}
+
+/// Adds to `update` what is in the way of `to` only where files of `begun` have been written.
+void addLeftovers(Tree const& begun, Tree const& to, TreeUpdate& update)
+{
+    TreeUpdate more = updateBetween(begun, {}, to);
+    for (Tree* const files : {&more.writes, &more.removals}) {
+        Tree& known = files == &more.writes ? update.writes : update.removals;
+        for (auto const& file : *files) {
+            if (known.insert(file).second) {
+                update.leftovers.insert(file.first);
+            }
+        }
     }
 }
 
 } // namespace
 
-TreeUpdate updateBetween(Tree const& from, Tree const& to)
+TreeUpdate updateBetween(Tree const& from, std::vector<Tree> const& begun, Tree const& to)
 {
     TreeUpdate update;
     for (auto const& [path, url] : to) {
@@ -240,27 +297,29 @@ TreeUpdate updateBetween(Tree const& from, Tree const& to)
             update.removals.emplace(path, url);
         }
     }
+    for (Tree const& files : begun) {
+        addLeftovers(files, to, update);
+    }
     return update;
 }
 
-void checkUpdate(
-    common::RootPath const& root, LocalDatabase const& database, Tree const& from, Unsaved unsaved, TreeUpdate& update)
+void checkUpdate(common::RootPath const& root, LocalDatabase const& database, Unsaved unsaved, TreeUpdate& update)
 {
-    Check check(root, database, from, update.removals, unsaved);
-    check.sift(update.removals, false);
-    check.sift(update.writes, true);
-    check.failIfAnyIsInTheWay();
+    Check(root, database, unsaved, update).run();
 }
 
-WrittenTimes
-carryOut(common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start)
+WrittenTimes carryOut(
+    common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start,
+    std::function<void()> const& begin)
 {
     os::Batch batch(root.path().ansi_str());
     Restored const restored(root);
     WrittenTimes times = extractAll(root, storage, update.writes, timeForWrittenFiles(start), restored);
-    requireDone(batch.flush(), kRestoring);
+    requireDone(batch.flush(), kRestoring, kNothingYet);
+    requireAllUnchanged(batch, update);
+    begin();
     placeAll(batch, update, restored);
-    requireDone(batch.flush(), root.path());
+    requireDone(batch.flush(), root.path(), kAgain);
     return times;
 }
 

@@ -4,7 +4,13 @@
 #include "host/repository/local_database.h"
 #include "host/storage/local_storage.h"
 
+#include "platform/os/os_batch.h"
+
 #include <cstdint>
+#include <functional>
+#include <map>
+#include <set>
+#include <vector>
 
 namespace tav {
 
@@ -12,28 +18,36 @@ namespace tav {
 struct TreeUpdate {
     Tree writes;   ///< files that get another content
     Tree removals; ///< files that are in no later commit, with the content that they have been committed with
+    /// Those of them that only interrupted moves may have touched: what is unsaved there stays.
+    std::set<OdString> leftovers;
+    /// What stood at each of the paths when it was checked.
+    std::map<OdString, os::FileMark> marks;
 };
 
-/// What turns the files `from` into the files `to`.
-TreeUpdate updateBetween(Tree const& from, Tree const& to);
+/// What turns the files `from` into the files `to`. Files that differ only in `begun`, the files of interrupted moves
+/// to elsewhere, may be there by now: they go too.
+TreeUpdate updateBetween(Tree const& from, std::vector<Tree> const& begun, Tree const& to);
 
 /// Whether content that is in no commit may be lost.
 enum class Unsaved { isKept, mayGo };
 
 /// Checks that an update can be carried out, before a byte is written: no path leads out of the working folder or
-/// through a link, and, unless `unsaved` lets them go, no file holds a content that is in no commit. `from` are the
-/// files of the commit that the working folder stands on. Files that are as they shall be are taken out of the update.
-/// Throws `Failure`, which lists the files in the way.
-void checkUpdate(
-    common::RootPath const& root, LocalDatabase const& database, Tree const& from, Unsaved unsaved, TreeUpdate& update);
+/// through a link, no file takes the place of a folder in which others lie, and, unless `unsaved` lets them go, no file
+/// holds a content that is in no commit. The files are read: what an index says of them is no reason to overwrite them.
+/// Files that are as they shall be are taken out of the update. Throws `Failure`, which lists the files in the way.
+void checkUpdate(common::RootPath const& root, LocalDatabase const& database, Unsaved unsaved, TreeUpdate& update);
 
-/// Modification times of the files that were written, by path.
+/// Modification times of the files that were written, by path. As far as the file system tells them apart, no two are
+/// equal: a file that is moved over another of them shows.
 using WrittenTimes = std::map<OdString, std::uint64_t>;
 
 /// Carries out an update that has been checked. Every file is whole before it takes its name, and when this returns all
-/// of it is safe on the disk. Folders that become empty are removed. Throws `Failure`; what was written until then
-/// stays, and doing the same again completes it. The caller holds the lock of the repository since `start`.
-WrittenTimes
-carryOut(common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start);
+/// of it is safe on the disk. Folders that become empty are removed. `begin` is called when all contents lie ready and
+/// the working folder is still what it was. A file that somebody has changed since it was checked stays as it is, and
+/// ends it. Throws `Failure`; what was written until then stays, and doing the same again completes it. The caller
+/// holds the lock of the repository since `start`.
+WrittenTimes carryOut(
+    common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start,
+    std::function<void()> const& begin = [] {});
 
 } // namespace tav
