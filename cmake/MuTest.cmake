@@ -6,6 +6,8 @@ function(mu_test name)
     cmake_parse_arguments(TEST "" "" "SOURCES;LINK" ${ARGN})
     add_executable(${name} ${TEST_SOURCES})
     target_link_libraries(${name} PRIVATE mu_test_support ${TEST_LINK} GTest::gmock_main mu_warnings)
+    # Most of the time to compile a test goes into the headers of GoogleTest.
+    target_precompile_headers(${name} PRIVATE <gmock/gmock.h> <gtest/gtest.h> <string> <vector>)
     # The code under test is optimised; optimising the tests takes longer than running them.
     if(MU_COMMON_SANITIZE)
         target_compile_options(${name} PRIVATE -O0)
