@@ -4,6 +4,7 @@
 #include "host/repository/ignore_file.h"
 #include "host/repository/lock.h"
 #include "host/repository/open.h"
+#include "host/text/wide.h"
 
 #include <memory>
 #include <string>
@@ -20,10 +21,10 @@ struct Options {
 void addRule(common::RootPath const& root, std::string const& rule)
 {
     os::FileLock const lock = lockRepository(root, "ignore");
-    OdString const wide(rule.data(), rule.size(), CP_UTF_8);
+    OdString const pattern = wide(rule);
     print(
-        addIgnoreRule(root, wide) ? "Names that match '" + shown(wide) + "' are ignored from now on.\n"
-                                  : "The rule '" + shown(wide) + "' was there already.\n");
+        addIgnoreRule(root, pattern) ? "Names that match '" + shown(pattern) + "' are ignored from now on.\n"
+                                     : "The rule '" + shown(pattern) + "' was there already.\n");
 }
 
 void listRules(common::RootPath const& root, bool json)

@@ -11,7 +11,6 @@
 
 #include "common/mu_common_serialization.h"
 #include "json/json_reader.h"
-#include "json/json_writer.h"
 
 #include <algorithm>
 #include <filesystem>
@@ -47,9 +46,7 @@ OdString documentOf(std::string const& name)
 {
     kutils::json::Object object;
     object[L"name"] = jsonText(withoutControls(wide(name)));
-    kutils::json::Value document(std::move(object));
-    std::wstring const text = kutils::json::write_string(document, false);
-    return {text.c_str(), text.size()};
+    return compactText(std::move(object));
 }
 
 /// Makes a repository on the server and returns its identifier.

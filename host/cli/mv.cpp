@@ -8,6 +8,7 @@
 #include "host/repository/staging.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
+#include "host/text/wide.h"
 
 #include "platform/ut/Dir.h"
 #include "platform/ut/FileName.h"
@@ -40,8 +41,7 @@ OdString targetOf(OdString const& from, std::string const& typed, common::RootPa
         return to;
     }
     std::string const name = std::filesystem::path(from.ansi_str()).filename().string();
-    OdString const wideName(name.data(), name.size(), CP_UTF_8);
-    return to.isEmpty() ? wideName : to + L"/" + wideName;
+    return to.isEmpty() ? wide(name) : to + L"/" + wide(name);
 }
 
 /// A scan does not follow links to folders, so what lies behind one would be lost to the repository.

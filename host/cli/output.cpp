@@ -115,10 +115,4 @@ std::string coloured(Colour colour, std::string text)
     return (colour == Colour::red ? "\x1b[31m" : "\x1b[32m") + text + "\x1b[m";
 }
 
-kutils::json::Value jsonText(OdString const& text)
-{
-    OdString const pairs = withPairs(text);
-    return std::wstring(pairs.c_str(), pairs.getLength());
-}
-
 } // namespace tav

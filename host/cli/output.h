@@ -1,6 +1,8 @@
 /// What commands print: names, documents and errors.
 #pragma once
 
+#include "host/text/json_text.h"
+
 #include "platform/sdk/OdString.h"
 #include "json/json_value.h"
 
@@ -28,8 +30,5 @@ enum class Colour { none, red, green };
 
 /// `text` in that colour where people see it: on a terminal, unless the environment sets NO_COLOR.
 std::string coloured(Colour colour, std::string text);
-
-/// A text as a member of a document. Characters beyond 16 bits become surrogate pairs, which JSON asks for in escapes.
-kutils::json::Value jsonText(OdString const& text);
 
 } // namespace tav

@@ -11,11 +11,11 @@
 #include "host/server/commit_document.h"
 #include "host/storage/local_storage.h"
 #include "host/text/characters.h"
+#include "host/text/json_text.h"
 
 #include "common/mu_common_serialization.h"
 #include "common/mu_common_versions.h"
 #include "json/json_reader.h"
-#include "json/json_writer.h"
 
 #include "platform/ut/FileName.h"
 
@@ -154,9 +154,7 @@ OdString documentOf(Draft const& draft, CommitOrder const& order, OdString const
     info.message = withPairs(order.message);
     info.hash = hashOf(info);
     info.references.emplace_back(withPairs(branch), info.hash, common::EType::branch);
-    auto document = common::serializeCommitInfo(info);
-    std::wstring const text = kutils::json::write_string(document, false);
-    return {text.c_str(), text.size()};
+    return compactText(common::serializeCommitInfo(info));
 }
 
 void failIfNotAtTheEnd(LocalDatabase const& database, OdString const& branch)
@@ -294,7 +292,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
 {
     auto const cache = readState(root);
     common::State const& state = cache->read();
-    Connection{database}; // Without a server there is nothing to begin.
+    [[maybe_unused]] Connection const server(database); // Without one there is nothing to begin.
     failIfNotAtTheEnd(database, state.head);
     Draft draft{root, database, start, database.commits().files(database.base()), {}, {}};
     common::RepoChanges const changes = compareWithBase(draft, state);

@@ -1,6 +1,7 @@
 #include "host/repository/names.h"
 
 #include "host/failure.h"
+#include "host/text/wide.h"
 
 #include <filesystem>
 #include <regex>
@@ -11,11 +12,6 @@ namespace tav {
 namespace {
 
 namespace fs = std::filesystem;
-
-OdString wide(std::string const& text)
-{
-    return OdString(text.data(), text.size(), CP_UTF_8);
-}
 
 /// Without "." and "..", and without a separator at the end.
 fs::path normalized(fs::path const& path)

@@ -1,6 +1,7 @@
 #include "host/repository/open.h"
 
 #include "host/failure.h"
+#include "host/text/wide.h"
 
 #include <filesystem>
 
@@ -11,11 +12,6 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr char const* kHowToInit = "Run 'tav init' in the folder of your drawings to make it one.";
-
-OdString wide(std::string const& path)
-{
-    return OdString(path.data(), path.size(), CP_UTF_8);
-}
 
 fs::path currentFolder()
 {

@@ -4,28 +4,19 @@
 #include "host/repository/server_of.h"
 #include "host/server/commit_document.h"
 #include "host/text/characters.h"
-
-#include "json/json_writer.h"
+#include "host/text/json_text.h"
 
 namespace tav {
 
 namespace {
 
-std::wstring text(OdString const& string)
-{
-    OdString const pairs = withPairs(string);
-    return {pairs.c_str(), pairs.getLength()};
-}
-
 OdString documentOf(common::Reference const& reference)
 {
     kutils::json::Object object;
-    object[L"name"] = text(reference.name);
-    object[L"commitHash"] = text(reference.commitHash);
+    object[L"name"] = jsonText(reference.name);
+    object[L"commitHash"] = jsonText(reference.commitHash);
     object[L"refType"] = reference.type == common::EType::branch ? L"branch" : L"tag";
-    kutils::json::Value document(kutils::json::Array{std::move(object)});
-    std::wstring const written = kutils::json::write_string(document, false);
-    return {written.c_str(), written.size()};
+    return compactText(kutils::json::Array{std::move(object)});
 }
 
 } // namespace

@@ -2,10 +2,10 @@
 
 #include "host/failure.h"
 #include "host/text/characters.h"
+#include "host/text/json_text.h"
 
 #include "common/mu_common_json.h"
 #include "json/json_reader.h"
-#include "json/json_writer.h"
 
 #include <string>
 
@@ -17,12 +17,6 @@ using kutils::json::Array;
 using kutils::json::Object;
 using kutils::json::Value;
 
-std::wstring text(OdString const& string)
-{
-    OdString const pairs = withPairs(string);
-    return {pairs.c_str(), pairs.getLength()};
-}
-
 OdString textOf(Object const& object, OdString const& key)
 {
     return withoutPairs(common::getStringValue(object, key, OdString::kEmpty));
@@ -33,15 +27,15 @@ Object documentOf(CommitUnderWay const& work)
     Array contents;
     for (NewContent const& content : work.contents) {
         Object object;
-        object[L"url"] = text(content.url);
-        object[L"digest"] = text(content.digest);
+        object[L"url"] = jsonText(content.url);
+        object[L"digest"] = jsonText(content.digest);
         object[L"size"] = content.size;
         contents.emplace_back(std::move(object));
     }
     Array files;
     for (auto const& [path, record] : work.files) {
         Object object;
-        object[L"path"] = text(path);
+        object[L"path"] = jsonText(path);
         if (record) {
             object[L"time"] = record->lastChecked;
             object[L"modified"] = record->modified;
@@ -49,7 +43,7 @@ Object documentOf(CommitUnderWay const& work)
         files.emplace_back(std::move(object));
     }
     Object document;
-    document[L"document"] = text(work.document);
+    document[L"document"] = jsonText(work.document);
     document[L"contents"] = std::move(contents);
     document[L"files"] = std::move(files);
     return document;
@@ -58,12 +52,12 @@ Object documentOf(CommitUnderWay const& work)
 Object documentOf(MoveUnderWay const& work)
 {
     Object document;
-    document[L"target"] = text(work.target);
-    document[L"branch"] = text(work.branch);
+    document[L"target"] = jsonText(work.target);
+    document[L"branch"] = jsonText(work.branch);
     document[L"written"] = work.isWritten;
     Array begun;
     for (OdString const& target : work.begun) {
-        begun.emplace_back(text(target));
+        begun.emplace_back(jsonText(target));
     }
     document[L"begun"] = std::move(begun);
     return document;
@@ -136,8 +130,7 @@ void note(Unfinished const& work, LocalDatabase& database)
         database.setUnfinished(OdString::kEmpty);
         return;
     }
-    std::wstring const written = kutils::json::write_string(Value(std::move(document)), false);
-    database.setUnfinished(OdString(written.c_str(), written.size()));
+    database.setUnfinished(compactText(std::move(document)));
 }
 
 } // namespace tav

@@ -5,6 +5,7 @@
 #include "host/progress.h"
 #include "host/repository/digest.h"
 #include "host/repository/index_record.h"
+#include "host/text/wide.h"
 
 #include "platform/os/os_batch.h"
 #include "platform/os/os_files.h"
@@ -132,7 +133,7 @@ private:
         for (; !error && entry != fs::recursive_directory_iterator(); entry.increment(error)) {
             std::string const name = entry->path().string().substr(top.size() + 1);
             bool const isFolder = entry->symlink_status(error).type() == fs::file_type::directory;
-            if (!isFolder && update_.removals.count(OdString(name.data(), name.size(), CP_UTF_8)) == 0) {
+            if (!isFolder && update_.removals.count(wide(name)) == 0) {
                 throw Failure(
                     "'" + name + "' lies in a folder whose place a file of the commit takes.",
                     "Nothing has been written; move it away first.");

@@ -32,12 +32,6 @@ Value parsed(OdString const& text)
     return value;
 }
 
-Value textValue(OdString const& text)
-{
-    OdString const units = withPairs(text);
-    return std::wstring(units.c_str(), units.getLength());
-}
-
 Part Part::member(wchar_t const* key) const&
 {
     std::optional<Part> const found = optionalMember(key);

@@ -14,9 +14,6 @@ namespace tav {
 /// The value of a text that is JSON. Throws `Failure`.
 kutils::json::Value parsed(OdString const& text);
 
-/// A text as a value of a document: characters beyond 16 bits as surrogate pairs.
-kutils::json::Value textValue(OdString const& text);
-
 /// A value of a document and where it stands there. The value lives longer, and so does the part that this one was
 /// reached through. What has another shape than it is asked for is refused: all operations throw `Failure`.
 class Part {

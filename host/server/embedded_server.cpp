@@ -5,6 +5,7 @@
 #include "host/server/document.h"
 #include "host/server/fetch_document.h"
 #include "host/text/characters.h"
+#include "host/text/json_text.h"
 #include "host/text/wide.h"
 
 #include "common/mu_common_json_keys.h"
@@ -69,7 +70,7 @@ Value numbersDocument(CommitRecord const& commit)
 {
     Object pair;
     pair[L"commitNo"] = commit.number;
-    pair[keys::s_hash.c_str()] = textValue(commit.hash);
+    pair[keys::s_hash.c_str()] = jsonText(commit.hash);
     return Array{Value(std::move(pair))};
 }
 
@@ -161,7 +162,7 @@ OdString answerVersion(Request const&)
 {
     Object version;
     version[L"commandVersion"] = kCommandVersion;
-    return textOf(version);
+    return compactText(version);
 }
 
 OdString answerInit(Request const& request)
@@ -173,10 +174,10 @@ OdString answerInit(Request const& request)
     addRepository.with(name).run();
     Statement row = request.database.prepare("SELECT id FROM repositories WHERE key = last_insert_rowid()");
     Object answer;
-    answer[L"id"] = textValue(row.next() ? row.text(0) : OdString());
+    answer[L"id"] = jsonText(row.next() ? row.text(0) : OdString());
     row.reset();
     change.commit();
-    return textOf(answer);
+    return compactText(answer);
 }
 
 OdString answerRepositories(Request const& request)
@@ -186,7 +187,7 @@ OdString answerRepositories(Request const& request)
     while (rows.next()) {
         repositories.push_back(repositoryDocument(rows.text(0), rows.text(1)));
     }
-    return textOf(repositories);
+    return compactText(repositories);
 }
 
 OdString answerCommit(Request const& request, Force force)
@@ -201,7 +202,7 @@ OdString answerCommit(Request const& request, Force force)
         }
     }
     change.commit();
-    return textOf(numbersDocument(added.commit));
+    return compactText(numbersDocument(added.commit));
 }
 
 OdString answerReferences(Request const& request, Force force)
@@ -215,7 +216,7 @@ OdString answerReferences(Request const& request, Force force)
         }
         change.commit();
     }
-    return textOf(referencesDocument(tables.references()));
+    return compactText(referencesDocument(tables.references()));
 }
 
 OdString answerFetch(Request const& request)

@@ -1,6 +1,7 @@
 #include "host/server/fetch_document.h"
 
 #include "host/server/document.h"
+#include "host/text/json_text.h"
 
 #include "common/mu_common_json_keys.h"
 #include "json/json_writer.h"
@@ -96,11 +97,11 @@ Array filesDocument(Tree const& tree, std::map<OdString, OdString> const& rename
     for (auto const& [path, url] : tree) {
         Object file;
         auto const rename = renames.find(path);
-        file[keys::s_path.c_str()] = textValue(path);
+        file[keys::s_path.c_str()] = jsonText(path);
         if (rename != renames.end()) {
-            file[keys::s_previous_path.c_str()] = textValue(rename->second);
+            file[keys::s_previous_path.c_str()] = jsonText(rename->second);
         }
-        file[keys::s_storage_path.c_str()] = textValue(url);
+        file[keys::s_storage_path.c_str()] = jsonText(url);
         files.emplace_back(std::move(file));
     }
     return files;
@@ -109,9 +110,9 @@ Array filesDocument(Tree const& tree, std::map<OdString, OdString> const& rename
 Object annotationDocument(CommitRecord const& commit)
 {
     Object annotation;
-    annotation[L"author"] = textValue(commit.author);
+    annotation[L"author"] = jsonText(commit.author);
     annotation[L"date"] = static_cast<double>(commit.date);
-    annotation[L"message"] = textValue(commit.message);
+    annotation[L"message"] = jsonText(commit.message);
     return annotation;
 }
 
@@ -119,13 +120,13 @@ Object commitDocument(CommitRecord const& commit, Array files)
 {
     Array parents;
     for (OdString const& parent : commit.parents) {
-        parents.emplace_back(textValue(parent));
+        parents.emplace_back(jsonText(parent));
     }
     Object document;
     document[keys::s_annotation.c_str()] = annotationDocument(commit);
     document[L"commitNo"] = commit.number;
     document[L"files"] = std::move(files);
-    document[keys::s_hash.c_str()] = textValue(commit.hash);
+    document[keys::s_hash.c_str()] = jsonText(commit.hash);
     document[keys::s_parents.c_str()] = std::move(parents);
     return document;
 }
@@ -146,22 +147,16 @@ std::wstring commitsText(CommitTables const& tables, std::int64_t known)
 
 } // namespace
 
-OdString textOf(Value const& document)
-{
-    std::wstring const text = kutils::json::write_string(document, false);
-    return OdString(text.data(), text.size());
-}
-
 Value referencesDocument(std::vector<common::Reference> const& references)
 {
     Array array;
     array.reserve(references.size());
     for (common::Reference const& reference : references) {
         Object object;
-        object[keys::s_commitHash.c_str()] = textValue(reference.commitHash);
-        object[keys::s_ref_name.c_str()] = textValue(reference.name);
+        object[keys::s_commitHash.c_str()] = jsonText(reference.commitHash);
+        object[keys::s_ref_name.c_str()] = jsonText(reference.name);
         object[L"refType"] =
-            textValue(reference.type == common::EType::tag ? keys::s_ref_tag_type : keys::s_ref_branch_type);
+            jsonText(reference.type == common::EType::tag ? keys::s_ref_tag_type : keys::s_ref_branch_type);
         array.emplace_back(std::move(object));
     }
     return array;
@@ -170,8 +165,8 @@ Value referencesDocument(std::vector<common::Reference> const& references)
 Value repositoryDocument(OdString const& id, OdString const& name)
 {
     Object object;
-    object[L"id"] = textValue(id);
-    object[keys::s_ref_name.c_str()] = textValue(name);
+    object[L"id"] = jsonText(id);
+    object[keys::s_ref_name.c_str()] = jsonText(name);
     return object;
 }
 

@@ -7,9 +7,6 @@
 
 namespace tav {
 
-/// The text of a document, as short as it can be written.
-OdString textOf(kutils::json::Value const& document);
-
 /// A references document.
 kutils::json::Value referencesDocument(std::vector<common::Reference> const& references);
 

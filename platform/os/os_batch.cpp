@@ -234,8 +234,8 @@ std::error_code Batch::flush()
     if (std::error_code const error = outcome(retried([&] { return calls().syncfs(top_.get()); }))) {
         return error;
     }
-    for (auto const& [device, folder] : fileSystems_) {
-        if (retried([&] { return calls().syncfs(folder.get()); }) == -1) {
+    for (auto const& fileSystem : fileSystems_) {
+        if (retried([&] { return calls().syncfs(fileSystem.second.get()); }) == -1) {
             return lastError();
         }
     }

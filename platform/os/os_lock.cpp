@@ -2,6 +2,7 @@
 
 #include "platform/os/os_calls.h"
 #include "platform/os/os_files.h"
+#include "platform/os/os_handle.h"
 
 #include <cerrno>
 #include <fcntl.h>
@@ -14,10 +15,7 @@ namespace {
 
 constexpr std::chrono::milliseconds kPause(20);
 
-std::error_code lastError()
-{
-    return {errno, std::generic_category()};
-}
+using detail::lastError;
 
 bool lockWithin(int file, std::chrono::milliseconds patience)
 {

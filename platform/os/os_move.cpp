@@ -2,6 +2,7 @@
 
 #include "platform/os/os_calls.h"
 #include "platform/os/os_files.h"
+#include "platform/os/os_handle.h"
 
 #include <cerrno>
 #include <cstdio>
@@ -11,10 +12,7 @@
 namespace os {
 namespace {
 
-std::error_code lastError()
-{
-    return {errno, std::generic_category()};
-}
+using detail::lastError;
 
 std::string folderOf(std::string const& path)
 {
