@@ -111,7 +111,7 @@ inline std::string commit(
 
 class ServerTest : public testing::Test {
 protected:
-    ServerTest() : id_(init("bridge")) {}
+    ServerTest() { id_ = init("bridge"); } // Asking looks at the identifier already.
 
     /// The server's answer, or "error: " and its message.
     std::string ask(std::string const& verb, std::string const& document) { return ask(server_, verb, document); }
