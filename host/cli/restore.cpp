@@ -80,7 +80,7 @@ void enterFiles(Tree const& files, Tree const& base, WrittenTimes const& times, 
 
 void restoreFiles(Options const& options)
 {
-    Work work(openRepository(""), "restore");
+    Work work(openRepository(""), "restore", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
     CommitRecord const commit = findCommit(work.database(), options.commit);
     Tree const files = chosenFiles(options, work.database().commits().files(commit.hash), commit, root);

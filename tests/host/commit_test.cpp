@@ -354,6 +354,16 @@ TEST_F(Commit, GcRemovesNothingWhenTheServerKnowsMore)
     EXPECT_EQ(tav({"verify"}).code, 1);
 }
 
+TEST_F(Commit, TakesAFileOfAnUnsafeNameForNoRenamedOne)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    move("a.dwg", "b\n.dwg");
+    EXPECT_THAT(status(), testing::HasSubstr("removed:  a.dwg"));
+    EXPECT_EQ(tav({"commit", "-m", "removed"}).code, 0);
+    EXPECT_THAT(values({"show"}, "change"), ElementsAre("removed"));
+}
+
 TEST_F(Commit, RefusesAServerInTheWorkingFolder)
 {
     support::TempRepository const other;
