@@ -1,19 +1,32 @@
 include(GoogleTest)
 
+# The code under test is optimised; optimising the tests takes longer than running them.
+function(mu_test_options target)
+    if(MU_COMMON_SANITIZE)
+        target_compile_options(${target} PRIVATE -O0)
+    else()
+        target_compile_options(${target} PRIVATE -O1)
+    endif()
+endfunction()
+
+# Most of the time to compile a test goes into the headers of GoogleTest: they are compiled once, for all programs.
+file(WRITE "${PROJECT_BINARY_DIR}/mu_test_headers.cpp" "")
+add_library(mu_test_headers OBJECT "${PROJECT_BINARY_DIR}/mu_test_headers.cpp")
+target_link_libraries(mu_test_headers PRIVATE GTest::gmock_main mu_warnings)
+target_precompile_headers(mu_test_headers PRIVATE <gmock/gmock.h> <gtest/gtest.h> <string> <vector>)
+mu_test_options(mu_test_headers)
+
 # mu_test(<name> SOURCES <file>... [LINK <target>...]): one test program whose tests ctest runs one by one. Under the
 # sanitizers a process takes longer to start than most tests to run: there each program runs in a few shards.
 function(mu_test name)
     cmake_parse_arguments(TEST "" "" "SOURCES;LINK" ${ARGN})
     add_executable(${name} ${TEST_SOURCES})
     target_link_libraries(${name} PRIVATE mu_test_support ${TEST_LINK} GTest::gmock_main mu_warnings)
-    # Most of the time to compile a test goes into the headers of GoogleTest.
-    target_precompile_headers(${name} PRIVATE <gmock/gmock.h> <gtest/gtest.h> <string> <vector>)
-    # The code under test is optimised; optimising the tests takes longer than running them.
+    mu_test_options(${name})
+    target_precompile_headers(${name} REUSE_FROM mu_test_headers)
     if(MU_COMMON_SANITIZE)
-        target_compile_options(${name} PRIVATE -O0)
         mu_test_in_shards(${name} 4)
     else()
-        target_compile_options(${name} PRIVATE -O1)
         gtest_discover_tests(${name} DISCOVERY_MODE PRE_TEST NO_PRETTY_VALUES PROPERTIES TIMEOUT 120)
     endif()
 endfunction()

@@ -10,18 +10,12 @@
 #include "host/repository/working_state.h"
 
 #include <algorithm>
-#include <memory>
 #include <string>
 #include <vector>
 
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::vector<std::string> names;
-    bool all = false;
-};
 
 [[noreturn]] void
 failForUnknown(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
@@ -41,7 +35,7 @@ failForUnknown(std::string const& name, common::RepoChanges const& changes, comm
 }
 
 std::vector<common::StagedFile>
-chosenFiles(Options const& options, common::RepoChanges const& changes, common::RootPath const& root)
+chosenFiles(AddOptions const& options, common::RepoChanges const& changes, common::RootPath const& root)
 {
     NameFinder const finder(changes, root);
     std::vector<common::StagedFile> chosen;
@@ -58,7 +52,9 @@ chosenFiles(Options const& options, common::RepoChanges const& changes, common::
     return chosen;
 }
 
-void addFilesToStage(Options const& options)
+} // namespace
+
+void addFilesToStage(AddOptions const& options)
 {
     Work const work(openRepository(""), "add", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
@@ -73,24 +69,6 @@ void addFilesToStage(Options const& options)
     print(
         count == 0 ? "Nothing new to stage.\n"
                    : "Staged " + std::to_string(count) + (count == 1 ? " file.\n" : " files.\n"));
-}
-
-} // namespace
-
-void addAdd(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("add", "Stage changed and new files for the next commit");
-    auto const options = std::make_shared<Options>();
-    CLI::Option* const names = command->add_option(
-        "NAME", options->names, "Paths of files or folders, or the end of a path that only one changed file matches");
-    CLI::Option* const all = command->add_flag("--all", options->all, "Stage every changed and new file");
-    names->excludes(all);
-    command->callback([options] {
-        if (options->names.empty() && !options->all) {
-            throw CLI::RequiredError("NAME or --all");
-        }
-        addFilesToStage(*options);
-    });
 }
 
 } // namespace tav

@@ -8,18 +8,11 @@
 #include "host/repository/working_state.h"
 #include "host/text/wide.h"
 
-#include <memory>
 #include <string>
 
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::string name;
-    std::string commit;
-    bool json = false;
-};
 
 struct Kind {
     char const* name; ///< of the command, and of what it makes
@@ -65,7 +58,7 @@ void printDocument(std::vector<Listed> const& list, Kind const& kind)
     printJson(std::move(array));
 }
 
-void list(Options const& options, Kind const& kind)
+void list(ReferenceOptions const& options, Kind const& kind)
 {
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
@@ -83,42 +76,35 @@ void list(Options const& options, Kind const& kind)
     }
 }
 
-void make(Options const& options, Kind const& kind)
+void make(ReferenceOptions const& options, Kind const& kind)
 {
     Work work(openRepository(""), kind.name);
     CommitRecord const commit = findCommit(work.database(), options.commit);
-    makeReference(work.database(), {wide(options.name), commit.hash, kind.type});
+    makeReference(work.database(), {wide(*options.name), commit.hash, kind.type});
     print(
-        std::string("Made the ") + kind.name + " '" + shown(wide(options.name)) + "' at commit " +
+        std::string("Made the ") + kind.name + " '" + shown(wide(*options.name)) + "' at commit " +
         std::to_string(commit.number) + ".\n");
 }
 
-void addReferences(CLI::App& app, Kind const& kind, char const* description)
+void listOrMake(ReferenceOptions const& options, Kind const& kind)
 {
-    CLI::App* const command = app.add_subcommand(kind.name, description);
-    auto const options = std::make_shared<Options>();
-    CLI::Option* const name = command->add_option("NAME", options->name, "Name of a new one; without it, list them");
-    command->add_option("COMMIT", options->commit, "Where it begins; by default where you are")->needs(name);
-    command->add_flag("--json", options->json, "Print a document for programs")->excludes(name);
-    command->callback([options, name, &kind] {
-        if (name->count() > 0) {
-            make(*options, kind);
-        } else {
-            list(*options, kind);
-        }
-    });
+    if (options.name) {
+        make(options, kind);
+    } else {
+        list(options, kind);
+    }
 }
 
 } // namespace
 
-void addBranch(CLI::App& app)
+void branch(ReferenceOptions const& options)
 {
-    addReferences(app, kBranch, "List the branches, or make one");
+    listOrMake(options, kBranch);
 }
 
-void addTag(CLI::App& app)
+void tag(ReferenceOptions const& options)
 {
-    addReferences(app, kTag, "List the tags, or make one");
+    listOrMake(options, kTag);
 }
 
 } // namespace tav

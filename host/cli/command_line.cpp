@@ -1,11 +1,12 @@
 #include "host/cli/command_line.h"
 
-#include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/syntax.h"
 #include "host/failure.h"
 
 #include "platform/sdk/OdError.h"
 
+#include <CLI/CLI.hpp>
 #include <unistd.h>
 
 #include <algorithm>
@@ -99,7 +100,7 @@ void enterFolder(std::string const& folder)
     }
 }
 
-void addCommands(CLI::App& app)
+void prepareSyntax(CLI::App& app)
 {
     app.require_subcommand(1);
     app.set_help_flag("-h,--help", "Show this help and do nothing else");
@@ -107,27 +108,7 @@ void addCommands(CLI::App& app)
     app.add_option_function<std::string>("-C", enterFolder, "Work as if started in FOLDER")
         ->type_name("FOLDER")
         ->trigger_on_parse();
-    addInit(app);
-    addStatus(app);
-    addAdd(app);
-    addUnstage(app);
-    addMv(app);
-    addRm(app);
-    addCommit(app);
-    addLog(app);
-    addShow(app);
-    addDiff(app);
-    addRestore(app);
-    addCheckout(app);
-    addSwitch(app);
-    addBranch(app);
-    addTag(app);
-    addFiles(app);
-    addIgnore(app);
-    addProjects(app);
-    addVerify(app);
-    addGc(app);
-    addExport(app);
+    addCommands(app);
     takeMarksOff(app);
     for (CLI::App* const command : app.get_subcommands({})) {
         takeMarksOff(*command);
@@ -167,7 +148,7 @@ int run(int argc, char** argv)
 {
     prepareProcess();
     CLI::App app("Keeps the versions of a folder of drawings.", "tav");
-    addCommands(app);
+    prepareSyntax(app);
     return runCommand(app, argc, argv);
 }
 

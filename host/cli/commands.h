@@ -1,32 +1,104 @@
-/// The commands of tav, each in the file of its name.
+/// The commands of tav, each in the file of its name, and what may be asked of them. A command that fails throws
+/// `Failure`.
 #pragma once
 
-#include <CLI/CLI.hpp>
+#include <cstddef>
+#include <optional>
+#include <string>
+#include <vector>
 
 namespace tav {
 
-// Each adds its command with its options to the application; parsing the command line then runs it. A command that
-// fails throws `Failure`.
-void addInit(CLI::App& app);
-void addStatus(CLI::App& app);
-void addAdd(CLI::App& app);
-void addUnstage(CLI::App& app);
-void addMv(CLI::App& app);
-void addRm(CLI::App& app);
-void addCommit(CLI::App& app);
-void addLog(CLI::App& app);
-void addShow(CLI::App& app);
-void addDiff(CLI::App& app);
-void addRestore(CLI::App& app);
-void addCheckout(CLI::App& app);
-void addSwitch(CLI::App& app);
-void addBranch(CLI::App& app);
-void addTag(CLI::App& app);
-void addFiles(CLI::App& app);
-void addIgnore(CLI::App& app);
-void addProjects(CLI::App& app);
-void addVerify(CLI::App& app);
-void addGc(CLI::App& app);
-void addExport(CLI::App& app);
+struct InitOptions {
+    std::string folder = ".";
+    std::string server; ///< empty: where it was, or in the folder for data
+};
+void init(InitOptions const& options);
+
+struct StatusOptions {
+    bool ignored = false;
+    bool json = false;
+};
+void showStatus(StatusOptions const& options);
+
+struct AddOptions {
+    std::vector<std::string> names;
+    bool all = false; ///< instead of names
+};
+void addFilesToStage(AddOptions const& options);
+
+struct UnstageOptions {
+    std::vector<std::string> names;
+    bool all = false; ///< instead of names
+};
+void unstageFiles(UnstageOptions const& options);
+
+void moveFiles(std::string const& typedFrom, std::string const& typedTo);
+void removeFiles(std::vector<std::string> const& names);
+
+struct CommitOptions {
+    std::string message;
+    std::string author; ///< empty: the user on this machine
+};
+void makeCommit(CommitOptions const& options);
+
+struct LogOptions {
+    std::string start;
+    std::size_t count = 0; ///< 0: all
+    bool json = false;
+};
+void showLog(LogOptions const& options);
+
+struct ShowOptions {
+    std::string commit; ///< empty: where the user is
+    bool json = false;
+};
+void showCommit(ShowOptions const& options);
+
+struct DiffOptions {
+    std::vector<std::string> names; ///< none: all
+    bool json = false;
+};
+void showDifferences(DiffOptions const& options);
+
+struct RestoreOptions {
+    std::vector<std::string> names;
+    std::string commit; ///< empty: where the user is
+    bool force = false;
+};
+void restoreFiles(RestoreOptions const& options);
+
+struct MoveOptions {
+    std::string target;
+    bool force = false;
+};
+void checkOut(MoveOptions const& options);
+void switchBranch(MoveOptions const& options);
+
+struct ReferenceOptions {
+    std::optional<std::string> name; ///< of a new one; without it they are listed
+    std::string commit;              ///< empty: where the user is
+    bool json = false;
+};
+void branch(ReferenceOptions const& options);
+void tag(ReferenceOptions const& options);
+
+struct FilesOptions {
+    std::string folder; ///< empty: the repository that the user is in
+    bool hash = false;
+    bool json = false;
+};
+void listFiles(FilesOptions const& options);
+
+struct IgnoreOptions {
+    std::optional<std::string> rule; ///< to add; without it the rules are listed
+    bool json = false;
+};
+void ignore(IgnoreOptions const& options);
+
+void listProjects(bool json);
+void verifyAll(bool json);
+void collectGarbage();
+void exportCommit(std::string const& typed, std::string const& target);
 
 } // namespace tav

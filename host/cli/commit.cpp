@@ -7,17 +7,11 @@
 #include "host/text/wide.h"
 #include "host/user_folders.h"
 
-#include <memory>
 #include <string>
 
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::string message;
-    std::string author;
-};
 
 void checkText(std::string const& text, char const* what)
 {
@@ -40,7 +34,9 @@ bool isRepeated(CommitOrder const& order, Work const& work)
     return work.finished() && work.finished()->message == order.message && work.finished()->author == order.author;
 }
 
-void makeCommit(Options const& options)
+} // namespace
+
+void makeCommit(CommitOptions const& options)
 {
     CommitOrder const order{wide(options.author.empty() ? userName() : options.author), wide(options.message)};
     checkText(options.message, "message");
@@ -53,17 +49,6 @@ void makeCommit(Options const& options)
     }
     Committed const committed = commit(work.root(), work.database(), order, work.start());
     printCommit(committed.commit, committed.isNew ? "Made" : "Nothing has changed since");
-}
-
-} // namespace
-
-void addCommit(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("commit", "Keep what is staged, removed and renamed as a new commit");
-    auto const options = std::make_shared<Options>();
-    command->add_option("-m,--message", options->message, "What has changed, and why")->required();
-    command->add_option("--author", options->author, "Who made it; by default your name and machine");
-    command->callback([options] { makeCommit(*options); });
 }
 
 } // namespace tav

@@ -13,7 +13,6 @@
 #include "platform/os/os_files.h"
 
 #include <filesystem>
-#include <memory>
 #include <set>
 #include <sstream>
 #include <string>
@@ -22,11 +21,6 @@
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::vector<std::string> names;
-    bool json = false;
-};
 
 /// A content on one side of a difference.
 struct Side {
@@ -156,7 +150,9 @@ void printForPeople(Compared const& file, common::RootPath const& root)
     }
 }
 
-void showDifferences(Options const& options)
+} // namespace
+
+void showDifferences(DiffOptions const& options)
 {
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
@@ -172,17 +168,6 @@ void showDifferences(Options const& options)
     if (options.json) {
         printJson(std::move(array));
     }
-}
-
-} // namespace
-
-void addDiff(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("diff", "Show what is different from the last commit, in detail");
-    auto const options = std::make_shared<Options>();
-    command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path; by default all");
-    command->add_flag("--json", options->json, "Print a document for programs");
-    command->callback([options] { showDifferences(*options); });
 }
 
 } // namespace tav

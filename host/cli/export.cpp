@@ -6,13 +6,10 @@
 #include "host/repository/open.h"
 #include "host/text/wide.h"
 
-#include <memory>
 #include <string>
 #include <utility>
 
 namespace tav {
-
-namespace {
 
 void exportCommit(std::string const& typed, std::string const& target)
 {
@@ -23,17 +20,6 @@ void exportCommit(std::string const& typed, std::string const& target)
     print(
         "Wrote " + counted(count, "file") + " of commit " + std::to_string(commit.number) + " into '" +
         shown(wide(target)) + "'.\n");
-}
-
-} // namespace
-
-void addExport(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("export", "Write the files of a commit into a folder of their own");
-    auto const arguments = std::make_shared<std::pair<std::string, std::string>>();
-    command->add_option("COMMIT", arguments->first, "Number, hash, branch or tag")->required();
-    command->add_option("TARGET", arguments->second, "A folder that is empty or does not exist yet")->required();
-    command->callback([arguments] { exportCommit(arguments->first, arguments->second); });
 }
 
 } // namespace tav

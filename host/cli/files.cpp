@@ -8,7 +8,6 @@
 
 #include <unistd.h>
 
-#include <memory>
 #include <optional>
 #include <string>
 #include <vector>
@@ -16,12 +15,6 @@
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::string folder;
-    bool hash = false;
-    bool json = false;
-};
 
 struct Listed {
     OdString path;
@@ -94,7 +87,9 @@ void failForUnread(std::vector<Listed> const& list)
     }
 }
 
-void listFiles(Options const& options)
+} // namespace
+
+void listFiles(FilesOptions const& options)
 {
     common::RootPath const root = openRepository(options.folder);
     std::vector<common::File> const files = scan(root);
@@ -114,18 +109,6 @@ void listFiles(Options const& options)
     if (options.hash) {
         failForUnread(list);
     }
-}
-
-} // namespace
-
-void addFiles(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("files", "List the files that the repository keeps");
-    auto const options = std::make_shared<Options>();
-    command->add_option("FOLDER", options->folder, "The folder of a repository; by default the one you are in");
-    command->add_flag("--hash", options->hash, "Show the SHA-256 digest of each file, in the form of sha256sum");
-    command->add_flag("--json", options->json, "Print a document for programs");
-    command->callback([options] { listFiles(*options); });
 }
 
 } // namespace tav

@@ -13,8 +13,6 @@
 
 namespace tav {
 
-namespace {
-
 void collectGarbage()
 {
     Work work(openRepository(""), "gc");
@@ -27,14 +25,6 @@ void collectGarbage()
     print(
         "Removed " + counted(freed.contents, "stored version") + " that no commit needs; " + sizeText(freed.bytes) +
         " freed.\n");
-}
-
-} // namespace
-
-void addGc(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("gc", "Remove what no commit needs from the storage");
-    command->callback(collectGarbage);
 }
 
 } // namespace tav

@@ -6,17 +6,11 @@
 #include "host/repository/open.h"
 #include "host/text/wide.h"
 
-#include <memory>
 #include <string>
 
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::string rule;
-    bool json = false;
-};
 
 void addRule(common::RootPath const& root, std::string const& rule)
 {
@@ -44,22 +38,14 @@ void listRules(common::RootPath const& root, bool json)
 
 } // namespace
 
-void addIgnore(CLI::App& app)
+void ignore(IgnoreOptions const& options)
 {
-    CLI::App* const command = app.add_subcommand("ignore", "Show the rules for names to ignore, or add one");
-    auto const options = std::make_shared<Options>();
-    CLI::Option* const add = command->add_option(
-        "--add", options->rule, "A regular expression; files and folders whose whole name matches it are ignored");
-    command->add_flag("--json", options->json, "Print a document for programs")->excludes(add);
-    add->type_name("PATTERN");
-    command->callback([options, add] {
-        common::RootPath const root = openRepository("");
-        if (add->count() > 0) {
-            addRule(root, options->rule);
-        } else {
-            listRules(root, options->json);
-        }
-    });
+    common::RootPath const root = openRepository("");
+    if (options.rule) {
+        addRule(root, *options.rule);
+    } else {
+        listRules(root, options.json);
+    }
 }
 
 } // namespace tav

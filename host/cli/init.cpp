@@ -14,17 +14,11 @@
 
 #include <algorithm>
 #include <filesystem>
-#include <memory>
 #include <string>
 
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::string folder = ".";
-    std::string server;
-};
 
 std::string absolute(std::string const& folder)
 {
@@ -72,7 +66,8 @@ void failIfInside(std::string const& server, std::string const& workingFolder)
     }
 }
 
-void chooseServer(LocalDatabase& database, Options const& options, std::string const& folder, std::string const& name)
+void chooseServer(
+    LocalDatabase& database, InitOptions const& options, std::string const& folder, std::string const& name)
 {
     OdString const chosen = wide(absolute(options.server.empty() ? defaultServerFolder() : options.server));
     if (database.repositoryId().isEmpty()) {
@@ -95,7 +90,9 @@ void enterProject(LocalDatabase const& database, std::string const& folder, std:
     }
 }
 
-void init(Options const& options)
+} // namespace
+
+void init(InitOptions const& options)
 {
     OdString const path = wide(options.folder);
     bool const existed = common::RootPath::get(path, false).hasValue();
@@ -112,21 +109,6 @@ void init(Options const& options)
     print(
         existed ? "The repository in '" + shown(path) + "' was there already; it is complete.\n"
                 : "Made a repository in '" + shown(path) + "'.\n");
-}
-
-} // namespace
-
-void addInit(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("init", "Make a folder of drawings a repository, or complete one");
-    auto const options = std::make_shared<Options>();
-    command->add_option("FOLDER", options->folder, "The folder of your drawings; it is made when it is missing")
-        ->capture_default_str();
-    command
-        ->add_option(
-            "--server", options->server, "Where the history is kept; by default 'tav/server' in your folder for data")
-        ->type_name("FOLDER");
-    command->callback([options] { init(*options); });
 }
 
 } // namespace tav

@@ -9,18 +9,11 @@
 #include "common/mu_common_history.h"
 
 #include <map>
-#include <memory>
 #include <string>
 
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::string start;
-    std::size_t count = 0;
-    bool json = false;
-};
 
 common::HistoryItem itemOf(CommitRecord const& commit)
 {
@@ -70,7 +63,9 @@ void printDocument(std::vector<CommitRecord> const& commits)
     printJson(std::move(array));
 }
 
-void showLog(Options const& options)
+} // namespace
+
+void showLog(LogOptions const& options)
 {
     LocalDatabase const database = LocalDatabase::open(openRepository(""));
     if (std::string const unfinished = noteOnUnfinished(database); !unfinished.empty()) {
@@ -92,21 +87,6 @@ void showLog(Options const& options)
     if (commits.empty()) {
         print("There is no commit yet.\n");
     }
-}
-
-} // namespace
-
-void addLog(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("log", "Show the history, newest first");
-    auto const options = std::make_shared<Options>();
-    command->add_option(
-        "COMMIT", options->start, "Number, hash, branch or tag to begin with; by default where you are");
-    command->add_option("-n,--count", options->count, "Show so many commits at most")
-        ->type_name("COUNT")
-        ->check(CLI::PositiveNumber);
-    command->add_flag("--json", options->json, "Print a document for programs");
-    command->callback([options] { showLog(*options); });
 }
 
 } // namespace tav

@@ -14,7 +14,6 @@
 #include "platform/ut/FileName.h"
 
 #include <filesystem>
-#include <memory>
 #include <regex>
 #include <string>
 #include <utility>
@@ -90,6 +89,8 @@ std::vector<Move> movesOf(OdString const& from, OdString const& to, std::vector<
     return moves;
 }
 
+} // namespace
+
 void moveFiles(std::string const& typedFrom, std::string const& typedTo)
 {
     Work const work(openRepository(""), "mv", Work::Unfinished::mayStay);
@@ -110,17 +111,6 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     changeState(root, [&](common::Cache& cache) { stageMoves(moves, cache.write()); });
     onDisk.keep();
     print("Renamed '" + shown(from) + "' to '" + shown(to) + "'.\n");
-}
-
-} // namespace
-
-void addMv(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("mv", "Rename a file or folder, and stage that");
-    auto const names = std::make_shared<std::pair<std::string, std::string>>();
-    command->add_option("OLD", names->first, "Path of a file or folder of the repository")->required();
-    command->add_option("NEW", names->second, "Its new path, or an existing folder to move it into")->required();
-    command->callback([names] { moveFiles(names->first, names->second); });
 }
 
 } // namespace tav

@@ -2,8 +2,6 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 
-#include <memory>
-
 namespace tav {
 
 namespace {
@@ -21,6 +19,8 @@ void printDocument(common::ConfigData const& data)
     printJson(std::move(array));
 }
 
+} // namespace
+
 void listProjects(bool json)
 {
     common::ConfigData const data = readProjects();
@@ -34,16 +34,6 @@ void listProjects(bool json)
     if (data.projects.empty()) {
         print("No project is known yet; 'tav init' adds one.\n");
     }
-}
-
-} // namespace
-
-void addProjects(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("projects", "List the repositories that you have made");
-    auto const json = std::make_shared<bool>(false);
-    command->add_flag("--json", *json, "Print a document for programs");
-    command->callback([json] { listProjects(*json); });
 }
 
 } // namespace tav

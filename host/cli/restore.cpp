@@ -10,7 +10,6 @@
 #include "host/repository/working_tree.h"
 #include "host/text/wide.h"
 
-#include <memory>
 #include <string>
 #include <vector>
 
@@ -18,13 +17,8 @@ namespace tav {
 
 namespace {
 
-struct Options {
-    std::vector<std::string> names;
-    std::string commit;
-    bool force = false;
-};
-
-Tree chosenFiles(Options const& options, Tree const& files, CommitRecord const& commit, common::RootPath const& root)
+Tree chosenFiles(
+    RestoreOptions const& options, Tree const& files, CommitRecord const& commit, common::RootPath const& root)
 {
     std::vector<common::StagedFile> all;
     for (auto const& [path, url] : files) {
@@ -78,7 +72,9 @@ void enterFiles(Tree const& files, Tree const& base, WrittenTimes const& times, 
     unstage(unchanged, state);
 }
 
-void restoreFiles(Options const& options)
+} // namespace
+
+void restoreFiles(RestoreOptions const& options)
 {
     Work work(openRepository(""), "restore", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
@@ -94,19 +90,6 @@ void restoreFiles(Options const& options)
     print(
         counted(files.size(), "file") + " as in commit " + std::to_string(commit.number) + ", " +
         std::to_string(update.writes.size()) + " written.\n");
-}
-
-} // namespace
-
-void addRestore(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("restore", "Bring files back as a commit has them");
-    auto const options = std::make_shared<Options>();
-    command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path")->required();
-    command->add_option("--from", options->commit, "Number, hash, branch or tag; by default where you are")
-        ->type_name("COMMIT");
-    command->add_flag("--force", options->force, "Overwrite changes that are in no commit");
-    command->callback([options] { restoreFiles(*options); });
 }
 
 } // namespace tav

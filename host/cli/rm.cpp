@@ -14,7 +14,6 @@
 
 #include <algorithm>
 #include <filesystem>
-#include <memory>
 #include <string>
 #include <vector>
 
@@ -89,6 +88,8 @@ std::string waitingName(common::RootPath const& root, std::size_t number)
     return prefix + std::to_string(number);
 }
 
+} // namespace
+
 void removeFiles(std::vector<std::string> const& names)
 {
     Work const work(openRepository(""), "rm", Work::Unfinished::mayStay);
@@ -119,16 +120,6 @@ void removeFiles(std::vector<std::string> const& names)
         }
     }
     print("Removed " + std::to_string(count) + (count == 1 ? " file" : " files") + "; the next commit takes that.\n");
-}
-
-} // namespace
-
-void addRm(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("rm", "Remove committed files, and stage that");
-    auto const names = std::make_shared<std::vector<std::string>>();
-    command->add_option("NAME", *names, "Paths of files or folders, or the end of a path")->required();
-    command->callback([names] { removeFiles(*names); });
 }
 
 } // namespace tav

@@ -7,18 +7,12 @@
 #include "host/storage/storage_url.h"
 #include "host/text/wide.h"
 
-#include <memory>
 #include <sstream>
 #include <string>
 
 namespace tav {
 
 namespace {
-
-struct Options {
-    std::string commit;
-    bool json = false;
-};
 
 void addVersion(
     OdString const& url, LocalDatabase const& database, wchar_t const* size, wchar_t const* digest,
@@ -94,7 +88,9 @@ void printForPeople(
     }
 }
 
-void showCommit(Options const& options)
+} // namespace
+
+void showCommit(ShowOptions const& options)
 {
     LocalDatabase const database = LocalDatabase::open(openRepository(""));
     CommitRecord const commit = findCommit(database, options.commit);
@@ -106,17 +102,6 @@ void showCommit(Options const& options)
     kutils::json::Object document = documentOf(commit);
     document[L"changes"] = documentOf(changes, database);
     printJson(std::move(document));
-}
-
-} // namespace
-
-void addShow(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("show", "Show a commit and what it changed");
-    auto const options = std::make_shared<Options>();
-    command->add_option("COMMIT", options->commit, "Number, hash, branch or tag; by default where you are");
-    command->add_flag("--json", options->json, "Print a document for programs");
-    command->callback([options] { showCommit(*options); });
 }
 
 } // namespace tav

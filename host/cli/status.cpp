@@ -4,17 +4,11 @@
 #include "host/failure.h"
 #include "host/repository/open.h"
 
-#include <memory>
 #include <string>
 
 namespace tav {
 
 namespace {
-
-struct Options {
-    bool ignored = false;
-    bool json = false;
-};
 
 kutils::json::Array documentOf(std::vector<OdString> const& paths)
 {
@@ -173,7 +167,9 @@ void printForPeople(Status const& status)
     }
 }
 
-void showStatus(Options const& options)
+} // namespace
+
+void showStatus(StatusOptions const& options)
 {
     Status const status = statusOf(openRepository(""), options.ignored);
     if (!status.unfinishedWork.empty()) {
@@ -184,17 +180,6 @@ void showStatus(Options const& options)
     } else {
         printForPeople(status);
     }
-}
-
-} // namespace
-
-void addStatus(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("status", "Show what has changed and what is staged");
-    auto const options = std::make_shared<Options>();
-    command->add_flag("--ignored", options->ignored, "Show the files that the ignore rules keep out, too");
-    command->add_flag("--json", options->json, "Print a document for programs");
-    command->callback([options] { showStatus(*options); });
 }
 
 } // namespace tav

@@ -7,20 +7,12 @@
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
-#include <memory>
 #include <string>
 #include <vector>
 
 namespace tav {
 
-namespace {
-
-struct Options {
-    std::vector<std::string> names;
-    bool all = false;
-};
-
-void unstageFiles(Options const& options)
+void unstageFiles(UnstageOptions const& options)
 {
     Work const work(openRepository(""), "unstage", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
@@ -38,24 +30,6 @@ void unstageFiles(Options const& options)
         count = unstage(chosen, cache.write());
     });
     print("Took " + std::to_string(count) + (count == 1 ? " file" : " files") + " out of the next commit.\n");
-}
-
-} // namespace
-
-void addUnstage(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("unstage", "Take files out of the next commit; they stay as they are");
-    auto const options = std::make_shared<Options>();
-    CLI::Option* const names = command->add_option(
-        "NAME", options->names, "Paths of files or folders, or the end of a path that only one staged file matches");
-    CLI::Option* const all = command->add_flag("--all", options->all, "Take every staged file out");
-    names->excludes(all);
-    command->callback([options] {
-        if (options->names.empty() && !options->all) {
-            throw CLI::RequiredError("NAME or --all");
-        }
-        unstageFiles(*options);
-    });
 }
 
 } // namespace tav

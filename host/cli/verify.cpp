@@ -9,7 +9,6 @@
 
 #include "common/mu_common_file_storage.h"
 
-#include <memory>
 #include <string>
 #include <utility>
 #include <vector>
@@ -61,6 +60,8 @@ void printDocument(std::size_t count, std::vector<Damage> const& damages)
     printJson(std::move(document));
 }
 
+} // namespace
+
 void verifyAll(bool json)
 {
     common::RootPath const root = openRepository("");
@@ -88,16 +89,6 @@ void verifyAll(bool json)
         }
         throw failure;
     }
-}
-
-} // namespace
-
-void addVerify(CLI::App& app)
-{
-    CLI::App* const command = app.add_subcommand("verify", "Read every stored version and check it against its digest");
-    auto const json = std::make_shared<bool>(false);
-    command->add_flag("--json", *json, "Print a document for programs");
-    command->callback([json] { verifyAll(*json); });
 }
 
 } // namespace tav

@@ -1,5 +1,6 @@
 // Commits that are killed at some moment.
 #include "tests/host/history_test.h"
+#include "tests/support/sanitized.h"
 
 #include <gmock/gmock.h>
 
@@ -11,11 +12,7 @@
 namespace host_tests {
 namespace {
 
-#ifdef __SANITIZE_ADDRESS__
-constexpr int kRounds = 4; // Each process takes long to start.
-#else
-constexpr int kRounds = 50; // for each of the six seeds
-#endif
+constexpr int kRounds = support::kIsSanitized ? 4 : 50; // for each of the six seeds
 constexpr int kFiles = 8;
 
 class CommitCrash

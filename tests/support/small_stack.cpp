@@ -1,5 +1,7 @@
 #include "tests/support/small_stack.h"
 
+#include "tests/support/sanitized.h"
+
 #include <cstddef>
 #include <cstdio>
 #include <cstdlib>
@@ -8,17 +10,7 @@
 namespace support {
 namespace {
 
-#if defined(__SANITIZE_ADDRESS__)
-constexpr std::size_t kStackSize = 1024 * 1024;
-#elif defined(__has_feature)
-#if __has_feature(address_sanitizer)
-constexpr std::size_t kStackSize = 1024 * 1024;
-#else
-constexpr std::size_t kStackSize = 256 * 1024;
-#endif
-#else
-constexpr std::size_t kStackSize = 256 * 1024;
-#endif
+constexpr std::size_t kStackSize = (kIsSanitized ? 1024 : 256) * 1024;
 
 void require(int error, char const* step)
 {

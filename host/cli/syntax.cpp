@@ -1,0 +1,238 @@
+#include "host/cli/syntax.h"
+
+#include "host/cli/commands.h"
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+// All in one place: every source that sees the templates of CLI11 takes longer to compile than the rest of the host.
+namespace tav {
+
+namespace {
+
+void addJson(CLI::App& command, bool& json)
+{
+    command.add_flag("--json", json, "Print a document for programs");
+}
+
+void addInit(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("init", "Make a folder of drawings a repository, or complete one");
+    auto const options = std::make_shared<InitOptions>();
+    command->add_option("FOLDER", options->folder, "The folder of your drawings; it is made when it is missing")
+        ->capture_default_str();
+    command
+        ->add_option(
+            "--server", options->server, "Where the history is kept; by default 'tav/server' in your folder for data")
+        ->type_name("FOLDER");
+    command->callback([options] { init(*options); });
+}
+
+void addStatus(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("status", "Show what has changed and what is staged");
+    auto const options = std::make_shared<StatusOptions>();
+    command->add_flag("--ignored", options->ignored, "Show the files that the ignore rules keep out, too");
+    addJson(*command, options->json);
+    command->callback([options] { showStatus(*options); });
+}
+
+/// A command that takes names or --all; one of the two has to be there.
+template <class Options>
+void addNamesOrAll(CLI::App& command, char const* namesHelp, char const* allHelp, void (*run)(Options const& options))
+{
+    auto const options = std::make_shared<Options>();
+    CLI::Option* const names = command.add_option("NAME", options->names, namesHelp);
+    names->excludes(command.add_flag("--all", options->all, allHelp));
+    command.callback([options, run] {
+        if (options->names.empty() && !options->all) {
+            throw CLI::RequiredError("NAME or --all");
+        }
+        run(*options);
+    });
+}
+
+void addAdd(CLI::App& app)
+{
+    addNamesOrAll(
+        *app.add_subcommand("add", "Stage changed and new files for the next commit"),
+        "Paths of files or folders, or the end of a path that only one changed file matches",
+        "Stage every changed and new file", addFilesToStage);
+}
+
+void addUnstage(CLI::App& app)
+{
+    addNamesOrAll(
+        *app.add_subcommand("unstage", "Take files out of the next commit; they stay as they are"),
+        "Paths of files or folders, or the end of a path that only one staged file matches",
+        "Take every staged file out", unstageFiles);
+}
+
+void addMv(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("mv", "Rename a file or folder, and stage that");
+    auto const names = std::make_shared<std::pair<std::string, std::string>>();
+    command->add_option("OLD", names->first, "Path of a file or folder of the repository")->required();
+    command->add_option("NEW", names->second, "Its new path, or an existing folder to move it into")->required();
+    command->callback([names] { moveFiles(names->first, names->second); });
+}
+
+void addRm(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("rm", "Remove committed files, and stage that");
+    auto const names = std::make_shared<std::vector<std::string>>();
+    command->add_option("NAME", *names, "Paths of files or folders, or the end of a path")->required();
+    command->callback([names] { removeFiles(*names); });
+}
+
+void addCommit(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("commit", "Keep what is staged, removed and renamed as a new commit");
+    auto const options = std::make_shared<CommitOptions>();
+    command->add_option("-m,--message", options->message, "What has changed, and why")->required();
+    command->add_option("--author", options->author, "Who made it; by default your name and machine");
+    command->callback([options] { makeCommit(*options); });
+}
+
+void addLog(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("log", "Show the history, newest first");
+    auto const options = std::make_shared<LogOptions>();
+    command->add_option(
+        "COMMIT", options->start, "Number, hash, branch or tag to begin with; by default where you are");
+    command->add_option("-n,--count", options->count, "Show so many commits at most")
+        ->type_name("COUNT")
+        ->check(CLI::PositiveNumber);
+    addJson(*command, options->json);
+    command->callback([options] { showLog(*options); });
+}
+
+void addShow(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("show", "Show a commit and what it changed");
+    auto const options = std::make_shared<ShowOptions>();
+    command->add_option("COMMIT", options->commit, "Number, hash, branch or tag; by default where you are");
+    addJson(*command, options->json);
+    command->callback([options] { showCommit(*options); });
+}
+
+void addDiff(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("diff", "Show what is different from the last commit, in detail");
+    auto const options = std::make_shared<DiffOptions>();
+    command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path; by default all");
+    addJson(*command, options->json);
+    command->callback([options] { showDifferences(*options); });
+}
+
+void addRestore(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("restore", "Bring files back as a commit has them");
+    auto const options = std::make_shared<RestoreOptions>();
+    command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path")->required();
+    command->add_option("--from", options->commit, "Number, hash, branch or tag; by default where you are")
+        ->type_name("COMMIT");
+    command->add_flag("--force", options->force, "Overwrite changes that are in no commit");
+    command->callback([options] { restoreFiles(*options); });
+}
+
+std::shared_ptr<MoveOptions> addMoveOptions(CLI::App& command, char const* name, char const* description)
+{
+    auto const options = std::make_shared<MoveOptions>();
+    command.add_option(name, options->target, description)->required();
+    command.add_flag("--force", options->force, "Overwrite files with changes that are in no commit");
+    return options;
+}
+
+void addCheckout(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("checkout", "Make the working folder what it was at a commit");
+    auto const options = addMoveOptions(*command, "COMMIT", "Number, hash, branch or tag");
+    command->callback([options] { checkOut(*options); });
+}
+
+void addSwitch(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("switch", "Go on with the work on another branch");
+    auto const options = addMoveOptions(*command, "BRANCH", "Name of the branch");
+    command->callback([options] { switchBranch(*options); });
+}
+
+void addReferences(CLI::App& command, void (*run)(ReferenceOptions const& options))
+{
+    auto const options = std::make_shared<ReferenceOptions>();
+    CLI::Option* const name = command.add_option("NAME", options->name, "Name of a new one; without it, list them");
+    command.add_option("COMMIT", options->commit, "Where it begins; by default where you are")->needs(name);
+    command.add_flag("--json", options->json, "Print a document for programs")->excludes(name);
+    command.callback([options, run] { run(*options); });
+}
+
+void addFiles(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("files", "List the files that the repository keeps");
+    auto const options = std::make_shared<FilesOptions>();
+    command->add_option("FOLDER", options->folder, "The folder of a repository; by default the one you are in");
+    command->add_flag("--hash", options->hash, "Show the SHA-256 digest of each file, in the form of sha256sum");
+    addJson(*command, options->json);
+    command->callback([options] { listFiles(*options); });
+}
+
+void addIgnore(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("ignore", "Show the rules for names to ignore, or add one");
+    auto const options = std::make_shared<IgnoreOptions>();
+    CLI::Option* const add = command->add_option(
+        "--add", options->rule, "A regular expression; files and folders whose whole name matches it are ignored");
+    add->type_name("PATTERN");
+    command->add_flag("--json", options->json, "Print a document for programs")->excludes(add);
+    command->callback([options] { ignore(*options); });
+}
+
+void addOnlyJson(CLI::App& command, void (*run)(bool json))
+{
+    auto const json = std::make_shared<bool>(false);
+    addJson(command, *json);
+    command.callback([json, run] { run(*json); });
+}
+
+void addExport(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("export", "Write the files of a commit into a folder of their own");
+    auto const arguments = std::make_shared<std::pair<std::string, std::string>>();
+    command->add_option("COMMIT", arguments->first, "Number, hash, branch or tag")->required();
+    command->add_option("TARGET", arguments->second, "A folder that is empty or does not exist yet")->required();
+    command->callback([arguments] { exportCommit(arguments->first, arguments->second); });
+}
+
+} // namespace
+
+void addCommands(CLI::App& app)
+{
+    addInit(app);
+    addStatus(app);
+    addAdd(app);
+    addUnstage(app);
+    addMv(app);
+    addRm(app);
+    addCommit(app);
+    addLog(app);
+    addShow(app);
+    addDiff(app);
+    addRestore(app);
+    addCheckout(app);
+    addSwitch(app);
+    addReferences(*app.add_subcommand("branch", "List the branches, or make one"), branch);
+    addReferences(*app.add_subcommand("tag", "List the tags, or make one"), tag);
+    addFiles(app);
+    addIgnore(app);
+    addOnlyJson(*app.add_subcommand("projects", "List the repositories that you have made"), listProjects);
+    addOnlyJson(*app.add_subcommand("verify", "Read every stored version and check it against its digest"), verifyAll);
+    app.add_subcommand("gc", "Remove what no commit needs from the storage")->callback(collectGarbage);
+    addExport(app);
+}
+
+} // namespace tav
