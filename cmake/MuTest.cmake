@@ -1,9 +1,10 @@
 include(GoogleTest)
 
-# The code under test is optimised; optimising the tests takes longer than running them.
+# The code under test is optimised, and checked by the sanitizers; to do so with the tests takes longer than to run them.
 function(mu_test_options target)
     if(MU_COMMON_SANITIZE)
-        target_compile_options(${target} PRIVATE -O0)
+        target_compile_options(${target} PRIVATE -O0 -g0 -fno-sanitize=all)
+        target_compile_definitions(${target} PRIVATE MU_SANITIZED)
     else()
         target_compile_options(${target} PRIVATE -O1)
     endif()

@@ -14,10 +14,12 @@ namespace common {
 
 namespace {
 
-OdString textOf(kutils::json::Value const& document)
+void check(bool isRead, kutils::json::Value const& document)
 {
-    std::wstring const text = kutils::json::write_string(document, true);
-    return OdString(text.c_str(), text.size());
+    if (!isRead) {
+        throw OdError(translate(L"Unable to parse json, please check if syntax is valid"));
+    }
+    checkType(document, kutils::json::Value_type::object, OdString::kEmpty, OdString::kEmpty);
 }
 
 } // namespace
@@ -25,18 +27,27 @@ OdString textOf(kutils::json::Value const& document)
 kutils::json::Value readDocument(OdString const& path)
 {
     kutils::json::Value document;
-    if (!kutils::json::read_string(document, ut::readEntireFile(path))) {
-        throw OdError(translate(L"Unable to parse json, please check if syntax is valid"));
-    }
-    checkType(document, kutils::json::Value_type::object, OdString::kEmpty, OdString::kEmpty);
+    check(kutils::json::read_string(document, ut::readEntireFile(path)), document);
+    return document;
+}
+
+kutils::json::Value readDocument(OdString const& path, kutils::json::detail::Element_sink& sink)
+{
+    kutils::json::Value document;
+    check(kutils::json::detail::read_string(document, ut::readEntireFile(path), sink), document);
     return document;
 }
 
 WriteOutcome writeDocument(OdString const& path, kutils::json::Value const& document)
 {
+    return writeText(path, kutils::json::write_string(document, true));
+}
+
+WriteOutcome writeText(OdString const& path, std::wstring const& text)
+{
     ut::TextFile file(path);
     file.create();
-    file.addLine(textOf(document));
+    file.addLine(OdString(text.c_str(), text.size()));
     if (!file.write()) {
         return ErrorMessage(translate(L"Error writing to file '%ls'"), path.c_str());
     }

@@ -4,7 +4,10 @@
 #include "common/mu_common_expected.h"
 
 #include "platform/sdk/OdString.h"
+#include "json/json_reader.h"
 #include "json/json_value.h"
+
+#include <string>
 
 namespace common {
 
@@ -12,8 +15,14 @@ namespace common {
 /// else than an object.
 kutils::json::Value readDocument(OdString const& path);
 
+/// The same; arrays that `sink` wants go there, element by element.
+kutils::json::Value readDocument(OdString const& path, kutils::json::detail::Element_sink& sink);
+
 /// Replaces the content of the file `path` by `document`, in the pretty layout. Error: the file cannot be written; it
 /// holds then what it held before.
 WriteOutcome writeDocument(OdString const& path, kutils::json::Value const& document);
+
+/// The same for the text of a document.
+WriteOutcome writeText(OdString const& path, std::wstring const& text);
 
 } // namespace common

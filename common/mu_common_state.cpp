@@ -5,11 +5,15 @@
 #include "common/mu_common_json_keys.h"
 #include "common/mu_common_translate.h"
 
+#include "json/json_writer.h"
+
 #include <string>
+#include <string_view>
 #include <utility>
 
 namespace common {
 
+using Generator = kutils::json::detail::Generator<kutils::json::Value, std::wostringstream>;
 using kutils::json::Array;
 using kutils::json::Object;
 using kutils::json::Value;
@@ -27,6 +31,11 @@ OdString const s_index_map_modified = L"modified";
 std::wstring wide(OdString const& text)
 {
     return std::wstring(text.c_str(), text.getLength());
+}
+
+OdString toOdString(std::wstring const& text)
+{
+    return OdString(text.c_str(), text.size());
 }
 
 Expected<Object> serializeStagedFile(StagedFile const& file)
@@ -49,17 +58,6 @@ Object serializeRename(OdString const& newPath, OdString const& previousPath)
     return object;
 }
 
-Object serializeIndexEntry(OdString const& path, IndexData const& data)
-{
-    Object record;
-    record[wide(s_index_map_last_checked)] = data.lastChecked;
-    record[wide(s_index_map_modified)] = data.modified;
-    Object object;
-    object[wide(s_index_map_path)] = wide(path);
-    object[wide(s_index_map_data)] = std::move(record);
-    return object;
-}
-
 Object serializeHead(State const& state)
 {
     Object head;
@@ -70,24 +68,63 @@ Object serializeHead(State const& state)
     return head;
 }
 
-Expected<Value> serializeState(State const& state)
+std::wstring_view view(OdString const& text)
 {
-    Object root;
-    root[wide(json::s_head)] = serializeHead(state);
-    if (!state.stagedFiles.empty()) {
-        Expected<Array> stagedFiles = toJson(state.stagedFiles, serializeStagedFile);
-        if (!stagedFiles.hasValue()) {
-            return stagedFiles.error();
-        }
-        root[wide(json::s_staged_files)] = std::move(stagedFiles).visit(GetRValueOrThrow<Array>{});
+    return {text.c_str(), text.getLength()};
+}
+
+void writeIndex(std::map<OdString, IndexData> const& index, Generator& out)
+{
+    out.begin_array();
+    for (auto const& [path, data] : index) {
+        out.element();
+        out.begin_object();
+        out.key(view(s_index_map_data));
+        out.begin_object();
+        out.key(view(s_index_map_last_checked));
+        out.value(data.lastChecked);
+        out.key(view(s_index_map_modified));
+        out.value(data.modified);
+        out.end();
+        out.key(view(s_index_map_path));
+        out.value(view(path));
+        out.end();
+    }
+    out.end();
+}
+
+// The members in the order of their names.
+void writeState(State const& state, Array stagedFiles, Generator& out)
+{
+    out.begin_object();
+    out.key(view(json::s_head));
+    out.value(serializeHead(state));
+    if (!state.index.empty()) {
+        out.key(view(s_index_map));
+        writeIndex(state.index, out);
     }
     if (!state.renames.empty()) {
-        root[wide(json::s_renames)] = toJson(state.renames, serializeRename);
+        out.key(view(json::s_renames));
+        out.value(toJson(state.renames, serializeRename));
     }
-    if (!state.index.empty()) {
-        root[wide(s_index_map)] = toJson(state.index, serializeIndexEntry);
+    if (!stagedFiles.empty()) {
+        out.key(view(json::s_staged_files));
+        out.value(std::move(stagedFiles));
     }
-    return Value(std::move(root));
+    out.end();
+}
+
+/// The index is most of a large state: its text is written straight from it, without a value between the two.
+Expected<std::wstring> textOf(State const& state)
+{
+    Expected<Array> stagedFiles = toJson(state.stagedFiles, serializeStagedFile);
+    if (!stagedFiles.hasValue()) {
+        return stagedFiles.error();
+    }
+    std::size_t const perRecord = state.index.empty() ? 0 : 200 + state.index.begin()->first.getLength();
+    return kutils::json::detail::write_pieces(state.index.size() * perRecord, true, [&](Generator& out) {
+        writeState(state, std::move(stagedFiles).visit(GetRValueOrThrow<Array>{}), out);
+    });
 }
 
 Expected<StagedFile> deserializeStagedFile(Object const& object)
@@ -105,7 +142,7 @@ std::pair<OdString, OdString> deserializeRename(Object object)
     return {std::move(newPath), getStringValue(object, json::s_previous_name, OdString::kEmpty)};
 }
 
-std::pair<OdString, IndexData> deserializeIndexEntry(Object object)
+std::pair<OdString, IndexData> deserializeIndexEntry(Object const& object)
 {
     Object const& record = getObjectValue(object, s_index_map_data, OdString::kEmpty);
     OdString path = getStringValue(object, s_index_map_path, OdString::kEmpty);
@@ -115,6 +152,110 @@ std::pair<OdString, IndexData> deserializeIndexEntry(Object object)
     data.modified = getBoolValue(record, s_index_map_modified, OdString::kEmpty);
     return {std::move(path), data};
 }
+
+using kutils::json::detail::Token_kind;
+using Tokens = kutils::json::detail::Element_sink::Tokens;
+
+bool isNext(Tokens& tokens, Token_kind kind)
+{
+    return tokens.nextToken().kind == kind;
+}
+
+bool isMemberNext(Tokens& tokens, OdString const& key)
+{
+    auto const& token = tokens.nextToken();
+    return token.kind == Token_kind::string && token.text == view(key) && isNext(tokens, Token_kind::colon);
+}
+
+bool readLastChecked(Tokens& tokens, IndexData& data)
+{
+    auto const& token = tokens.nextToken();
+    data.lastChecked = token.number;
+    return token.kind == Token_kind::unsigned_integer || token.kind == Token_kind::signed_integer;
+}
+
+bool readModified(Tokens& tokens, IndexData& data)
+{
+    Token_kind const kind = tokens.nextToken().kind;
+    data.modified = kind == Token_kind::true_value;
+    return data.modified || kind == Token_kind::false_value;
+}
+
+bool readPath(Tokens& tokens, OdString& path)
+{
+    auto const& token = tokens.nextToken();
+    path = toOdString(token.text);
+    return token.kind == Token_kind::string;
+}
+
+/// Makes the index while the document is read: there are as many records as files in the working folder, and all of
+/// them as values at one time would need four times the memory and most of the time.
+class IndexReader final : public kutils::json::detail::Element_sink {
+public:
+    bool begin(std::wstring const& key) override
+    {
+        if (key != wide(s_index_map)) {
+            return false;
+        }
+        index_.clear();
+        error_ = std::nullopt;
+        return true;
+    }
+
+    /// A record as it is written, its members in order.
+    bool take(Tokens& tokens) override
+    {
+        IndexData data;
+        OdString path;
+        bool const isUsual = isMemberNext(tokens, s_index_map_data) && isNext(tokens, Token_kind::open_object) &&
+                             isMemberNext(tokens, s_index_map_last_checked) && readLastChecked(tokens, data) &&
+                             isNext(tokens, Token_kind::comma) && isMemberNext(tokens, s_index_map_modified) &&
+                             readModified(tokens, data) && isNext(tokens, Token_kind::close_object) &&
+                             isNext(tokens, Token_kind::comma) && isMemberNext(tokens, s_index_map_path) &&
+                             readPath(tokens, path) && isNext(tokens, Token_kind::close_object);
+        if (isUsual) {
+            add(std::move(path), data);
+        }
+        return isUsual;
+    }
+
+    void take(Value element) override
+    {
+        try {
+            if (element.type() != Value_type::object) {
+                fail(composeMessage(element, Value_type::object, L"parsing json map."));
+            } else {
+                auto [path, data] = deserializeIndexEntry(element.get_object());
+                add(std::move(path), data);
+            }
+        } catch (OdError const& error) {
+            fail(ErrorMessage(error.description()));
+        }
+    }
+
+    /// The index, or what is wrong with the first record that is not as it should be.
+    Expected<std::map<OdString, IndexData>> result()
+    {
+        if (error_) {
+            return *error_;
+        }
+        return std::move(index_);
+    }
+
+private:
+    /// Of several records of one path the first counts. Written ones are in ascending order, so the end is the hint.
+    void add(OdString path, IndexData data) { index_.emplace_hint(index_.end(), std::move(path), data); }
+
+    void fail(ErrorMessage error)
+    {
+        if (!error_) {
+            error_ = std::move(error);
+        }
+    }
+
+    std::map<OdString, IndexData> index_;
+    std::optional<ErrorMessage> error_;
+};
 
 /// The member's array, taken out of the object: a state of a large repository is not copied on its way.
 Array takeArray(Object& object, OdString const& key)
@@ -151,7 +292,8 @@ std::optional<ErrorMessage> deserializeHead(Object const& root, State& state)
     return std::nullopt;
 }
 
-Expected<State> deserializeState(Object& root)
+/// `index` has got the elements of the member of that name.
+Expected<State> deserializeState(Object& root, IndexReader& index)
 {
     State state;
     std::optional<ErrorMessage> error = deserializeHead(root, state);
@@ -162,7 +304,8 @@ Expected<State> deserializeState(Object& root)
         error = take(fromJsonMap(takeArray(root, json::s_renames), deserializeRename), state.renames);
     }
     if (!error && hasKey(root, s_index_map)) {
-        error = take(fromJsonMap(takeArray(root, s_index_map), deserializeIndexEntry), state.index);
+        getArrayValue(root, s_index_map, OdString::kEmpty);
+        error = take(index.result(), state.index);
     }
     if (error) {
         return *error;
@@ -196,8 +339,9 @@ Expected<std::shared_ptr<Cache>> Cache::get(RootPath const& root, IoInterface co
         return ErrorMessage(translate(L"No state file found at %ls"), file.getFullPath().c_str());
     }
     try {
-        Value document = readDocument(file.getFullPath());
-        Expected<State> state = deserializeState(document.get_object());
+        IndexReader index;
+        Value document = readDocument(file.getFullPath(), index);
+        Expected<State> state = deserializeState(document.get_object(), index);
         if (!state.hasValue()) {
             return state.error();
         }
@@ -228,9 +372,8 @@ Transaction Cache::getTransaction()
 WriteOutcome Cache::save() const
 {
     try {
-        Expected<Value> const document = serializeState(state_);
-        return document.hasValue() ? writeDocument(stateFile_.getFullPath(), document.value())
-                                   : WriteOutcome(document.error());
+        Expected<std::wstring> const text = textOf(state_);
+        return text.hasValue() ? writeText(stateFile_.getFullPath(), text.value()) : WriteOutcome(text.error());
     } catch (...) {
         return ErrorMessage(translate(L"An unexpected error occurred while deserializing the state file."));
     }

@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <cstdlib>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -65,6 +66,50 @@ void tryWriting(Value const& value, bool pretty, bool isExact)
     require(third == second);
 }
 
+/// Puts every array of the document's object together again from what it gets.
+class Collector final : public kutils::json::detail::Element_sink {
+public:
+    kutils::json::Object arrays;
+
+    bool begin(std::wstring const& key) override
+    {
+        array_ = &arrays[key];
+        *array_ = kutils::json::Array();
+        return true;
+    }
+    bool take(Tokens& tokens) override
+    {
+        if (tokens.nextToken().kind != kutils::json::detail::Token_kind::close_object) {
+            return false;
+        }
+        array_->get_array().emplace_back(kutils::json::Object());
+        return true;
+    }
+    void take(Value element) override { array_->get_array().push_back(std::move(element)); }
+
+private:
+    Value* array_ = nullptr;
+};
+
+// Reading element by element comes to the same as reading whole.
+void tryElements(OdString const& text, bool isRead, Value const& whole)
+{
+    Collector collector;
+    Value document;
+    require(kutils::json::detail::read_string(document, text, collector) == isRead);
+    if (!isRead || document.type() != Value_type::object) {
+        require(!isRead || write_string(document, false) == write_string(whole, false));
+        return;
+    }
+    for (auto& [key, member] : document.get_object()) {
+        if (member.type() == Value_type::array) {
+            require(member.get_array().empty());
+            member = std::move(collector.arrays[key]);
+        }
+    }
+    require(write_string(document, false) == write_string(whole, false));
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size)
@@ -77,7 +122,9 @@ extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size
     OdString const text(reinterpret_cast<char const*>(data) + 1, size - 1, CP_UTF_8);
 
     Value value = L"before";
-    if (!read_string(value, text)) {
+    bool const isRead = read_string(value, text);
+    tryElements(text, isRead, value);
+    if (!isRead) {
         require(value == Value(L"before"));
         return 0;
     }

@@ -359,12 +359,12 @@ Token<String>& Scanner<String, Iterator>::refuse(Char c)
 }
 
 template <class Value, class Iterator>
-bool Parser<Value, Iterator>::parse(Iterator& begin, Iterator end, Value& out)
+bool Parser<Value, Iterator>::parse(Iterator& begin, Iterator end, Value& out, Element_sink* sink)
 {
     if (begin == end) {
         return false;
     }
-    Parser parser(begin, end);
+    Parser parser(begin, end, sink);
     try {
         parser.get(out, false);
     } catch (Error const&) {
@@ -422,7 +422,10 @@ void Parser<Value, Iterator>::readItem()
 {
     Value& container = *open_.back();
     bool const isArray = container.type() == Value_type::array;
-    if (!(isArray ? readElement(container.get_array()) : readMember(container.get_object()))) {
+    bool const goesOn = &container == handedOver_ ? handOverElement(container.get_array())
+                        : isArray                 ? readElement(container.get_array())
+                                                  : readMember(container.get_object());
+    if (!goesOn) {
         open_.pop_back();
     }
 }
@@ -438,6 +441,32 @@ bool Parser<Value, Iterator>::readElement(Array& array)
     return true;
 }
 
+// The element that was read as a value before is whole now, and goes to the sink.
+template <class Value, class Iterator>
+bool Parser<Value, Iterator>::handOverElement(Array& array)
+{
+    if (!array.empty()) {
+        sink_->take(std::move(array.back()));
+        array.clear();
+    }
+    auto& token = nextItem(isFirstElement_, Token_kind::close_array);
+    isFirstElement_ = false;
+    if (token.kind == Token_kind::close_array) {
+        handedOver_ = nullptr;
+        return false;
+    }
+    if (token.kind != Token_kind::open_object) {
+        place(array.emplace_back(), token);
+        return true;
+    }
+    Iterator const start = scanner_.position();
+    if (!sink_->take(scanner_)) {
+        scanner_.moveTo(start);
+        open(array.emplace_back(), Object());
+    }
+    return true;
+}
+
 template <class Value, class Iterator>
 bool Parser<Value, Iterator>::readMember(Object& object)
 {
@@ -449,11 +478,16 @@ bool Parser<Value, Iterator>::readMember(Object& object)
         throw Error();
     }
     // Written documents are in ascending order: the end is where nearly every key goes.
-    Value& slot = object.insert_or_assign(object.end(), std::move(token.text), Value())->second;
+    auto const member = object.insert_or_assign(object.end(), std::move(token.text), Value());
     if (scanner_.nextToken().kind != Token_kind::colon) {
         throw Error();
     }
-    place(slot, scanner_.nextToken());
+    place(member->second, scanner_.nextToken());
+    bool const isArrayOfDocument = open_.size() == 2 && member->second.type() == Value_type::array;
+    if (sink_ && isArrayOfDocument && sink_->begin(member->first)) {
+        handedOver_ = open_.back();
+        isFirstElement_ = true;
+    }
     return true;
 }
 
@@ -473,6 +507,12 @@ Token<typename Value::String>& Parser<Value, Iterator>::nextItem(bool isFirst, T
 
 template class Scanner<std::wstring, wchar_t const*>;
 template class Parser<Value, wchar_t const*>;
+
+bool read_string(Value& out, OdString const& text, Element_sink& sink)
+{
+    wchar_t const* begin = text.c_str();
+    return Parser<Value, wchar_t const*>::parse(begin, begin + text.getLength(), out, &sink);
+}
 
 } // namespace detail
 

@@ -26,6 +26,12 @@ KUTILS_JSON_EXPORT bool read_string(Value& out, OdString const& text);
 
 namespace detail {
 
+class Element_sink;
+
+/// As above, but the elements of arrays that `sink` wants go there, and these arrays are empty in `out`. After a syntax
+/// error what the sink has got is of no use.
+KUTILS_JSON_EXPORT bool read_string(Value& out, OdString const& text, Element_sink& sink);
+
 enum class Token_kind : std::int32_t {
     open_array,
     close_array,
@@ -74,6 +80,8 @@ public:
 
     /// Where the next character is read.
     Iterator position() const { return at_; }
+    /// Reads on from a position that this scanner was at.
+    void moveTo(Iterator position) { at_ = position; }
 
 private:
     Char next() { return at_ == end_ ? Char() : *at_++; }
@@ -98,6 +106,24 @@ private:
     Token<String> token_;
 };
 
+/// Takes long arrays element by element while the document is read: as values they need many times the memory of what
+/// becomes of them, and most of the time goes into making and destroying them.
+class KUTILS_JSON_EXPORT Element_sink {
+public:
+    using Tokens = Scanner<std::wstring, wchar_t const*>;
+
+    virtual ~Element_sink() = default;
+
+    /// Whether the sink wants the elements of the array that is the member `key` of the document's object. What came
+    /// from an earlier member of that name counts no longer.
+    virtual bool begin(std::wstring const& key) = 0;
+    /// Takes an element that is an object straight from its tokens, from the one behind `{` up to `}`, when it has the
+    /// shape that is usual for it. On false the element is read again, as a value.
+    virtual bool take(Tokens& tokens) = 0;
+    /// Takes an element of any other shape.
+    virtual void take(Value element) = 0;
+};
+
 /// Builds values from the tokens of a range. The range must outlive the parser.
 template <class Value, class Iterator>
 class KUTILS_JSON_EXPORT Parser {
@@ -105,11 +131,11 @@ public:
     /// A syntax error.
     struct Error {};
 
-    Parser(Iterator begin, Iterator end) : scanner_(begin, end) {}
+    Parser(Iterator begin, Iterator end, Element_sink* sink = nullptr) : scanner_(begin, end), sink_(sink) {}
 
     /// Reads one value into `out` and moves `begin` behind the last character that was used. False on a syntax error or
     /// an empty range; `out` is then as it was.
-    static bool parse(Iterator& begin, Iterator end, Value& out);
+    static bool parse(Iterator& begin, Iterator end, Value& out, Element_sink* sink = nullptr);
 
     /// Reads the next value into `out`. False if there was a `]` instead and `closeAllowed` is set; throws `Error` on
     /// anything else that is no value. `out` changes only when a whole value was read.
@@ -123,11 +149,15 @@ private:
     void open(Value& slot, Value container);
     void readItem();
     bool readElement(Array& array);
+    bool handOverElement(Array& array);
     bool readMember(Object& object);
     Token<typename Value::String>& nextItem(bool isFirst, Token_kind close);
 
     Scanner<typename Value::String, Iterator> scanner_;
     std::vector<Value*> open_; ///< The containers being read, each the last item of the one before.
+    Element_sink* sink_;
+    Value* handedOver_ = nullptr; ///< The array whose elements go to the sink; it holds the last one at most.
+    bool isFirstElement_ = false; ///< Whether none of them has been read.
 };
 
 extern template class Scanner<std::wstring, wchar_t const*>;

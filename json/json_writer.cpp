@@ -41,7 +41,7 @@ void addHexEscape(unsigned c, std::wstring& text)
     }
 }
 
-std::wstring escape(std::wstring const& text, Plain_chars const& plain)
+std::wstring escape(std::wstring_view text, Plain_chars const& plain)
 {
     std::wstring escaped;
     for (wchar_t const c : text) {
@@ -231,28 +231,30 @@ template <class Value, class Stream>
 void Generator<Value, Stream>::output(Value const& value)
 {
     place(value);
-    finish();
+    finish(0);
+    flush();
 }
 
 template <class Value, class Stream>
 void Generator<Value, Stream>::output(String const& text)
 {
-    place(text);
-    finish();
+    placeText(text);
+    flush();
 }
 
 template <class Value, class Stream>
 void Generator<Value, Stream>::output(bool value)
 {
     place(value);
-    finish();
+    flush();
 }
 
 template <class Value, class Stream>
 void Generator<Value, Stream>::output(Member const& member)
 {
     place(member);
-    finish();
+    finish(0);
+    flush();
 }
 
 template <class Value, class Stream>
@@ -260,16 +262,39 @@ template <class Container>
 void Generator<Value, Stream>::output_array_or_obj(Container const& container, Char open, Char close)
 {
     enter(container, open, close);
-    finish();
+    finish(0);
+    flush();
 }
 
 template <class Value, class Stream>
-void Generator<Value, Stream>::finish()
+void Generator<Value, Stream>::key(std::basic_string_view<Char> text)
 {
-    while (!levels_.empty()) {
+    startItem();
+    placeKey(text);
+}
+
+template <class Value, class Stream>
+void Generator<Value, Stream>::value(Value const& value)
+{
+    std::size_t const depth = levels_.size();
+    place(value);
+    finish(depth);
+}
+
+template <class Value, class Stream>
+void Generator<Value, Stream>::value(std::uint64_t value)
+{
+    NumberText text;
+    append(text.data(), std::to_chars(text.data(), text.data() + text.size(), value).ptr);
+}
+
+// Writes the rest of the open containers but for the outermost `depth`.
+template <class Value, class Stream>
+void Generator<Value, Stream>::finish(std::size_t depth)
+{
+    while (levels_.size() > depth) {
         placeItem();
     }
-    flush();
 }
 
 template <class Value, class Stream>
@@ -278,7 +303,7 @@ void Generator<Value, Stream>::place(Value const& value)
     switch (value.type()) {
     case Value_type::object: return enter(value.get_object(), L'{', L'}');
     case Value_type::array: return enter(value.get_array(), L'[', L']');
-    case Value_type::string: return place(value.get_string());
+    case Value_type::string: return placeText(value.get_string());
     case Value_type::boolean: return place(value.get_bool());
     case Value_type::integer: {
         NumberText text;
@@ -290,7 +315,7 @@ void Generator<Value, Stream>::place(Value const& value)
 }
 
 template <class Value, class Stream>
-void Generator<Value, Stream>::place(String const& text)
+void Generator<Value, Stream>::placeText(std::basic_string_view<Char> text)
 {
     append(L'"');
     if (!appendPlain(text)) {
@@ -313,13 +338,19 @@ void Generator<Value, Stream>::place(bool value)
 template <class Value, class Stream>
 void Generator<Value, Stream>::place(Member const& member)
 {
-    place(member.first);
+    placeKey(member.first);
+    place(member.second);
+}
+
+template <class Value, class Stream>
+void Generator<Value, Stream>::placeKey(std::basic_string_view<Char> text)
+{
+    placeText(text);
     if (pretty_) {
         append(L" : ", 3);
     } else {
         append(L':');
     }
-    place(member.second);
 }
 
 template <class Value, class Stream>
@@ -331,17 +362,34 @@ void Generator<Value, Stream>::placeReal(double value)
 }
 
 template <class Value, class Stream>
+void Generator<Value, Stream>::begin(Level level, Char open)
+{
+    levels_.push_back(level);
+    append(open);
+}
+
+template <class Value, class Stream>
 void Generator<Value, Stream>::enter(Array const& array, Char open, Char close)
 {
-    levels_.push_back({&array, nullptr, array.begin(), {}, close});
-    append(open);
+    begin({close, &array, nullptr, array.begin(), {}}, open);
 }
 
 template <class Value, class Stream>
 void Generator<Value, Stream>::enter(Object const& object, Char open, Char close)
 {
-    levels_.push_back({nullptr, &object, {}, object.begin(), close});
-    append(open);
+    begin({close, nullptr, &object, {}, object.begin()}, open);
+}
+
+// Goes to where the next item of the innermost container stands.
+template <class Value, class Stream>
+void Generator<Value, Stream>::startItem()
+{
+    bool& isEmpty = levels_.back().isEmpty;
+    if (!isEmpty) {
+        append(L',');
+    }
+    isEmpty = false;
+    startLine();
 }
 
 // Writes the item that is due in the innermost open container, or the end of the container.
@@ -352,10 +400,7 @@ void Generator<Value, Stream>::placeItem()
     if (level.array ? level.element == level.array->end() : level.member == level.object->end()) {
         return leave();
     }
-    if (level.array ? level.element != level.array->begin() : level.member != level.object->begin()) {
-        append(L',');
-    }
-    startLine();
+    startItem();
     if (level.array) {
         place(*level.element++);
     } else {
@@ -406,7 +451,7 @@ void Generator<Value, Stream>::append(char const* begin, char const* end)
 }
 
 template <class Value, class Stream>
-bool Generator<Value, Stream>::appendPlain(String const& text)
+bool Generator<Value, Stream>::appendPlain(std::basic_string_view<Char> text)
 {
     if (text.size() > kBufferSize) {
         return false;
@@ -442,6 +487,17 @@ void Generator<Value, Stream>::flush()
 template class Generator<Value, std::wostringstream>;
 template void Generator<Value, std::wostringstream>::output_array_or_obj(Array const&, wchar_t, wchar_t);
 template void Generator<Value, std::wostringstream>::output_array_or_obj(Object const&, wchar_t, wchar_t);
+
+std::wstring write_pieces(
+    std::size_t expectedLength, bool pretty,
+    std::function<void(Generator<Value, std::wostringstream>& generator)> const& write)
+{
+    TextStream stream(expectedLength);
+    Generator<Value, std::wostringstream> generator(stream, pretty);
+    write(generator);
+    generator.flush();
+    return stream.take();
+}
 
 } // namespace detail
 

@@ -8,8 +8,10 @@
 #include <cstddef>
 #include <cstdint>
 #include <cwctype>
+#include <functional>
 #include <sstream>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace kutils::json {
@@ -79,27 +81,48 @@ public:
     template <class Container>
     void output_array_or_obj(Container const& container, Char open, Char close);
 
+    /// Write a document piece by piece, for one that is too large to be made as a value first: containers are begun and
+    /// ended, a member is a key and then a value or container, an element is announced in the same way.
+    ///@{
+    void begin_object() { begin({L'}'}, L'{'); }
+    void begin_array() { begin({L']'}, L'['); }
+    void key(std::basic_string_view<Char> text);
+    void element() { startItem(); }
+    void value(Value const& value);
+    void value(std::basic_string_view<Char> text) { placeText(text); }
+    void value(bool value) { place(value); }
+    void value(std::uint64_t value);
+    /// Ends the innermost container.
+    void end() { leave(); }
+    /// Lets the stream have what was written so far.
+    void flush();
+    ///@}
+
 private:
-    /// An open container, one of the two, and the item that is due.
+    /// An open container. One that is a value has the item that is due in `array` or `object`.
     struct Level {
-        Array const* array;
-        Object const* object;
-        typename Array::const_iterator element;
-        typename Object::const_iterator member;
         Char close;
+        Array const* array = nullptr;
+        Object const* object = nullptr;
+        typename Array::const_iterator element{};
+        typename Object::const_iterator member{};
+        bool isEmpty = true; ///< Nothing has been written of it yet.
     };
 
     void place(Value const& value);
-    void place(String const& text);
+    void placeText(std::basic_string_view<Char> text);
     void place(bool value);
     void place(Member const& member);
+    void placeKey(std::basic_string_view<Char> text);
     void placeReal(double value);
+    void begin(Level level, Char open);
     void enter(Array const& array, Char open, Char close);
     void enter(Object const& object, Char open, Char close);
+    void startItem();
     void placeItem();
     void leave();
     void startLine();
-    void finish();
+    void finish(std::size_t depth);
 
     void append(Char c)
     {
@@ -109,9 +132,8 @@ private:
     void append(Char const* text, std::size_t length);
     void append(char const* begin, char const* end);
     /// Does nothing and returns false for a text that has to be escaped, or is too long for the buffer.
-    bool appendPlain(String const& text);
+    bool appendPlain(std::basic_string_view<Char> text);
     Char* room(std::size_t length);
-    void flush();
 
     Stream& stream_;
     bool const pretty_;
@@ -123,6 +145,11 @@ private:
 };
 
 extern template class Generator<Value, std::wostringstream>;
+
+/// The text of a document that `write` writes piece by piece, and that is likely to be `expectedLength` long.
+KUTILS_JSON_EXPORT std::wstring write_pieces(
+    std::size_t expectedLength, bool pretty,
+    std::function<void(Generator<Value, std::wostringstream>& generator)> const& write);
 
 } // namespace detail
 } // namespace kutils::json

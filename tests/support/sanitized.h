@@ -1,16 +1,10 @@
-/// Whether the tests run under the address sanitizer, which makes them ten times slower and their stacks larger.
+/// Whether what is tested runs under the sanitizers, which make it ten times slower and its stack frames larger.
 #pragma once
 
 namespace support {
 
-#ifdef __SANITIZE_ADDRESS__
+#ifdef MU_SANITIZED
 inline constexpr bool kIsSanitized = true;
-#elif defined(__has_feature)
-#if __has_feature(address_sanitizer)
-inline constexpr bool kIsSanitized = true;
-#else
-inline constexpr bool kIsSanitized = false;
-#endif
 #else
 inline constexpr bool kIsSanitized = false;
 #endif

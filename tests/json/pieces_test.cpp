@@ -1,0 +1,157 @@
+// Documents whose long arrays are read element by element, and documents that are written piece by piece.
+#include "tests/json/documents.h"
+
+#include <gmock/gmock.h>
+#include <utility>
+#include <vector>
+
+namespace {
+
+using namespace documents;
+using kutils::json::write_string;
+using kutils::json::detail::Element_sink;
+using kutils::json::detail::Token_kind;
+using testing::ElementsAre;
+
+/// Wants the array "list". Takes `{"n":NUMBER}` from its tokens and all else as values, and notes both.
+class Notes final : public Element_sink {
+public:
+    std::vector<std::wstring> notes;
+    std::vector<std::wstring> offered;
+
+    bool begin(std::wstring const& key) override
+    {
+        offered.push_back(key);
+        if (key == L"list") {
+            notes.clear();
+        }
+        return key == L"list";
+    }
+
+    bool take(Tokens& tokens) override
+    {
+        if (tokens.nextToken().text != L"n" || tokens.nextToken().kind != Token_kind::colon) {
+            return false;
+        }
+        auto const& number = tokens.nextToken();
+        std::wstring const note = L"n=" + std::to_wstring(number.number);
+        if (number.kind != Token_kind::unsigned_integer || tokens.nextToken().kind != Token_kind::close_object) {
+            return false;
+        }
+        notes.push_back(note);
+        return true;
+    }
+
+    void take(Value element) override { notes.push_back(write_string(element, false)); }
+};
+
+struct Result {
+    bool isRead = false;
+    Value document;
+    Notes sink;
+};
+
+Result readInPieces(std::wstring const& text)
+{
+    Result result;
+    OdString const characters(text.data(), text.size());
+    result.isRead = kutils::json::detail::read_string(result.document, characters, result.sink);
+    return result;
+}
+
+TEST(JsonElements, ComeInOrderWhateverTheirShape)
+{
+    Result const result =
+        readInPieces(LR"({"list":[{"n":1},5,{"n":2},{},[],{"n":"x"},{"n":3,"m":[{}]},null,{"n":4},]})");
+    EXPECT_TRUE(result.isRead);
+    EXPECT_THAT(
+        result.sink.notes,
+        ElementsAre(L"n=1", L"5", L"n=2", L"{}", L"[]", LR"({"n":"x"})", LR"({"m":[{}],"n":3})", L"null", L"n=4"));
+}
+
+TEST(JsonElements, AreNotInTheDocument)
+{
+    Result const result = readInPieces(LR"({"a":[1],"list":[{"n":1},5],"z":{"list":[2]}})");
+    EXPECT_EQ(result.document, read(LR"({"a":[1],"list":[],"z":{"list":[2]}})"));
+}
+
+TEST(JsonElements, AreOfferedOfTheMembersOfTheDocumentOnly)
+{
+    Result const result =
+        readInPieces(LR"({"a":[[1],{"list":[2]}],"list":[{"list":[3]}],"o":{"list":[4]},"s":"list"})");
+    EXPECT_THAT(result.sink.offered, ElementsAre(L"a", L"list"));
+    EXPECT_THAT(result.sink.notes, ElementsAre(LR"({"list":[3]})"));
+}
+
+TEST(JsonElements, OfARepeatedMemberBeginAnew)
+{
+    EXPECT_THAT(readInPieces(LR"({"list":[1,{"n":1}],"list":[2]})").sink.notes, ElementsAre(L"2"));
+    EXPECT_THAT(readInPieces(LR"({"list":[1,{"n":1}],"list":[]})").sink.notes, ElementsAre());
+}
+
+TEST(JsonElements, AreNotLookedForInAnArray)
+{
+    Result const result = readInPieces(LR"([{"list":[1]},[{"list":[2]}]])");
+    EXPECT_THAT(result.sink.offered, ElementsAre());
+    EXPECT_EQ(result.document, read(LR"([{"list":[1]},[{"list":[2]}]])"));
+}
+
+TEST(JsonElements, NeedTheSyntaxThatAllDocumentsNeed)
+{
+    for (wchar_t const* const text :
+         {LR"({"list":[,1]})", LR"({"list":[1 2]})", LR"({"list":[{"n":1}{"n":2}]})", LR"({"list":[1,,2]})",
+          LR"({"list":[{"n":1},})", LR"({"list":[{"n" 1}]})", LR"({"list":[{"n":1]})", LR"({"list":[1]]})",
+          LR"({"list":[tru]})", LR"({"list":[{"n":1}:]})"}) {
+        EXPECT_FALSE(readInPieces(text).isRead) << OdString(text).ansi_str();
+        EXPECT_FALSE(reads(text)) << OdString(text).ansi_str();
+    }
+}
+
+TEST(JsonElements, OfADocumentThatIsCutOffAreRefused)
+{
+    std::wstring const text = LR"({"list":[{"n":1},{"m":[2]},3]})";
+    ASSERT_TRUE(readInPieces(text).isRead);
+    for (std::size_t length = 0; length < text.size(); ++length) {
+        EXPECT_FALSE(readInPieces(text.substr(0, length)).isRead) << length;
+    }
+}
+
+std::wstring inPieces(bool pretty)
+{
+    return kutils::json::detail::write_pieces(0, pretty, [](auto& out) {
+        out.begin_object();
+        out.key(L"empty array");
+        out.begin_array();
+        out.end();
+        out.key(L"empty object");
+        out.begin_object();
+        out.end();
+        out.key(L"in\"side");
+        out.begin_array();
+        out.element();
+        out.value(read(LR"({"a":[1,{}],"b":"x"})"));
+        out.element();
+        out.begin_object();
+        out.key(L"number");
+        out.value(std::uint64_t{18'446'744'073'709'551'615U});
+        out.key(L"true");
+        out.value(true);
+        out.end();
+        out.element();
+        out.value(std::wstring_view(L"line\nend"));
+        out.end();
+        out.key(L"last");
+        out.value(Value());
+        out.end();
+    });
+}
+
+TEST(JsonPieces, MakeTheTextThatTheValueHas)
+{
+    Value const value = read(LR"({"empty array":[],"empty object":{},"in\"side":[{"a":[1,{}],"b":"x"},)"
+                             LR"({"number":18446744073709551615,"true":true},"line\nend"],"last":null})");
+    EXPECT_EQ(inPieces(true), write_string(value, true));
+    EXPECT_EQ(inPieces(false), write_string(value, false));
+}
+
+} // namespace
