@@ -169,25 +169,39 @@ std::int64_t CommitTables::lastNumber() const
     return row.with(repository_).next() ? row.integer(0) : 0;
 }
 
-Tree CommitTables::files(OdString const& hash) const
+std::vector<std::int64_t> CommitTables::line(OdString const& hash) const
 {
     Statement rows = database_->prepare(R"(
         WITH RECURSIVE line(n) AS (
             SELECT number FROM commits WHERE repository = ?1 AND hash = ?2
             UNION ALL
-            SELECT parent FROM parents JOIN line ON repository = ?1 AND number = n AND position = 0)
-        SELECT path, url FROM line CROSS JOIN changes ON repository = ?1 AND number = n ORDER BY n, path)");
+            SELECT parent FROM parents JOIN line ON repository = ?1 AND number = n AND position = 0 AND parent < n)
+        SELECT n FROM line ORDER BY n)");
     rows.with(repository_).with(hash);
-    Tree tree;
+    std::vector<std::int64_t> numbers;
     while (rows.next()) {
-        OdString path = rows.text(0);
-        OdString url = rows.text(1);
-        if (url.isEmpty()) {
-            tree.erase(path);
-            continue;
+        numbers.push_back(rows.integer(0));
+    }
+    return numbers;
+}
+
+Tree CommitTables::files(OdString const& hash) const
+{
+    // Asked for commit by commit, the rows come in the order of the table; all at once, they would be sorted on disk.
+    Statement rows =
+        database_->prepare("SELECT path, url FROM changes WHERE repository = ? AND number = ? ORDER BY path");
+    Tree tree;
+    for (std::int64_t const number : line(hash)) {
+        rows.with(repository_).with(number);
+        while (rows.next()) {
+            OdString path = rows.text(0);
+            OdString url = rows.text(1);
+            if (url.isEmpty()) {
+                tree.erase(path);
+            } else {
+                tree.insert_or_assign(tree.end(), std::move(path), OdString())->second = std::move(url);
+            }
         }
-        auto const place = tree.insert_or_assign(tree.end(), std::move(path), OdString());
-        place->second = std::move(url);
     }
     return tree;
 }

@@ -83,6 +83,8 @@ public:
 private:
     std::int64_t numberOf(OdString const& hash) const;
     std::vector<OdString> parentsOf(std::int64_t number) const;
+    /// Numbers of the commit and its first parents, the oldest first.
+    std::vector<std::int64_t> line(OdString const& hash) const;
     std::vector<CommitRecord> readAll(Statement statement) const;
 
     Database* database_;

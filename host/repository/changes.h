@@ -32,6 +32,9 @@ struct FolderMatch {
 /// Finds out what there is of the files `committed`, and what else. Reads no file. Throws as `scan` does.
 FolderMatch matchFolder(common::RootPath const& root, Tree committed);
 
+/// The same for files that are `scanned` already.
+FolderMatch matchFolder(common::RootPath const& root, std::vector<common::File> scanned, Tree committed);
+
 /// Modification times of files that were read and found to be as the last commit has them, by path.
 using VerifiedTimes = std::map<OdString, std::uint64_t>;
 

@@ -1,14 +1,15 @@
 #include "host/repository/status.h"
 
 #include "host/repository/changes.h"
-#include "host/repository/last_commit.h"
 #include "host/repository/local_database.h"
+#include "host/repository/scan_order.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
 #include "common/mu_common_file_utils.h"
 
 #include <algorithm>
+#include <functional>
 #include <future>
 #include <set>
 #include <utility>
@@ -18,15 +19,6 @@ namespace tav {
 namespace {
 
 using Paths = std::set<OdString>;
-
-/// Scans are nearly in order: often only the last folder stands elsewhere. Sorting what follows the ordered beginning
-/// takes the status of 200,000 new files from 0.21 s of processor time to 0.07 s.
-void sortScanned(std::vector<OdString>& paths)
-{
-    auto const middle = std::is_sorted_until(paths.begin(), paths.end());
-    std::sort(middle, paths.end());
-    std::inplace_merge(paths.begin(), middle, paths.end());
-}
 
 /// Takes the paths out of `list`, but for those in `left`.
 template <class List, class PathOf>
@@ -39,7 +31,7 @@ std::vector<OdString> takeSorted(List& list, Paths const& left, PathOf const& pa
             paths.push_back(std::move(pathOf(item)));
         }
     }
-    sortScanned(paths);
+    sortScanned(paths, std::less<>());
     return paths;
 }
 
@@ -127,12 +119,13 @@ void enterRenames(Renames const& renames, Paths& left, Status& status)
 
 Status statusOf(common::RootPath const& root, bool withIgnored)
 {
-    // Reading the state takes as long as looking at the folder.
-    auto matching = std::async(std::launch::async, [&] { return matchFolder(root, lastCommitFiles(root)); });
+    // Looking for the files takes as long as reading what is known of them.
+    auto scanning = std::async(std::launch::async, [&] { return scan(root); });
     auto const cache = readState(root);
     common::State const& state = cache->read();
     LocalDatabase const database = LocalDatabase::open(root);
-    FolderMatch match = matching.get();
+    Tree committed = database.commits().files(database.base());
+    FolderMatch match = matchFolder(root, scanning.get(), std::move(committed));
 
     Status status;
     enterPlace(database, state, status);
@@ -152,7 +145,7 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     status.removed = takeSorted(changes.removed, left, committedPath);
     if (withIgnored) {
         status.ignored = ignoredFiles(root);
-        sortScanned(status.ignored);
+        sortScanned(status.ignored, std::less<>());
     }
     return status;
 }
