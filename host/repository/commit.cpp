@@ -6,7 +6,6 @@
 #include "host/repository/changes.h"
 #include "host/repository/index_record.h"
 #include "host/repository/server_of.h"
-#include "host/repository/staging.h"
 #include "host/repository/working_state.h"
 #include "host/server/commit_document.h"
 #include "host/storage/local_storage.h"
@@ -214,20 +213,6 @@ void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& d
     change.commit();
 }
 
-void clearStaging(CommitUnderWay const& work, common::State& state)
-{
-    std::vector<common::StagedFile> committed;
-    for (auto const& [path, record] : work.files) {
-        committed.emplace_back(path, common::FileChange::added);
-        if (record) {
-            state.index.insert_or_assign(path, *record);
-        } else {
-            state.index.erase(path);
-        }
-    }
-    unstage(committed, state);
-}
-
 common::RepoChanges compareWithBase(Draft& draft, common::State const& state)
 {
     VerifiedTimes verified;
@@ -322,7 +307,7 @@ CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database,
     NewCommit commit = readCommitInfo(work.document);
     commit.commit.number = sentNumber(commit, work.document, database);
     enter(commit, work, database);
-    changeState(root, [&](common::Cache& cache) { clearStaging(work, cache.write()); });
+    changeState(root, [&](common::Cache& cache) { settle(work.files, cache.write()); });
     note(std::monostate(), database);
     return commit.commit;
 }

@@ -1,8 +1,6 @@
 #include "host/repository/moving.h"
 
 #include "host/repository/index_record.h"
-#include "host/repository/staging.h"
-#include "host/repository/unfinished.h"
 #include "host/repository/working_state.h"
 
 #include <algorithm>
@@ -35,20 +33,26 @@ std::vector<Tree> filesOf(std::vector<OdString> const& commits, LocalDatabase co
     return files;
 }
 
-/// `update` as it was before the check: also a file that was found as it shall be is no change any more.
-void enterFiles(TreeUpdate const& update, WrittenTimes const& times, common::State& state)
+/// `whole` is the update before the check: also a file that was found as it shall be is no change any more. What stays
+/// of an interrupted move may be no file of the commit.
+SettledFiles
+settledBy(TreeUpdate const& whole, TreeUpdate const& update, WrittenTimes const& times, std::uint64_t start)
 {
-    std::vector<common::StagedFile> settled;
-    for (Tree const* const files : {&update.writes, &update.removals}) {
-        for (auto const& [path, url] : *files) {
-            state.index.erase(path);
-            settled.emplace_back(path, common::FileChange::modified);
+    SettledFiles files;
+    for (auto const& [path, url] : whole.removals) {
+        files.emplace(path, std::nullopt);
+    }
+    for (auto const& [path, url] : whole.writes) {
+        auto const time = times.find(path);
+        if (time != times.end()) {
+            files[path] = common::IndexData{time->second, false};
+        } else if (update.leftovers.count(path) == 0) {
+            files[path] = indexRecord(static_cast<std::uint64_t>(update.marks.at(path).modified), start);
+        } else {
+            files[path] = std::nullopt;
         }
     }
-    for (auto const& [path, time] : times) {
-        state.index.insert_or_assign(path, common::IndexData{time, false});
-    }
-    unstage(settled, state);
+    return files;
 }
 
 } // namespace
@@ -69,19 +73,19 @@ Moved moveTo(
     Change change(database.database());
     database.setBase(destination.commit);
     move.isWritten = true;
+    move.files = settledBy(whole, update, times, start);
     note(move, database);
     change.commit();
-    changeState(root, [&](common::Cache& cache) {
-        cache.write().head = destination.branch;
-        enterFiles(whole, times, cache.write());
-    });
-    note(std::monostate(), database);
+    finishMove(root, database, move);
     return {update.writes.size(), update.removals.size()};
 }
 
-void finishMove(common::RootPath const& root, LocalDatabase& database, Destination const& destination)
+void finishMove(common::RootPath const& root, LocalDatabase& database, MoveUnderWay const& move)
 {
-    changeState(root, [&](common::Cache& cache) { cache.write().head = destination.branch; });
+    changeState(root, [&](common::Cache& cache) {
+        cache.write().head = move.branch;
+        settle(move.files, cache.write());
+    });
     note(std::monostate(), database);
 }
 

@@ -1,7 +1,7 @@
 /// Going to another commit or branch.
 #pragma once
 
-#include "host/repository/local_database.h"
+#include "host/repository/unfinished.h"
 #include "host/repository/working_tree.h"
 
 #include <cstdint>
@@ -28,6 +28,6 @@ Moved moveTo(
     std::uint64_t start);
 
 /// Ends a move whose files are written, unless that has been done.
-void finishMove(common::RootPath const& root, LocalDatabase& database, Destination const& destination);
+void finishMove(common::RootPath const& root, LocalDatabase& database, MoveUnderWay const& move);
 
 } // namespace tav

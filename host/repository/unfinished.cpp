@@ -1,6 +1,7 @@
 #include "host/repository/unfinished.h"
 
 #include "host/failure.h"
+#include "host/repository/staging.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
 
@@ -22,6 +23,35 @@ OdString textOf(Object const& object, OdString const& key)
     return withoutPairs(common::getStringValue(object, key, OdString::kEmpty));
 }
 
+Array arrayOf(SettledFiles const& files)
+{
+    Array array;
+    for (auto const& [path, record] : files) {
+        Object object;
+        object[L"path"] = jsonText(path);
+        if (record) {
+            object[L"time"] = record->lastChecked;
+            object[L"modified"] = record->modified;
+        }
+        array.emplace_back(std::move(object));
+    }
+    return array;
+}
+
+SettledFiles filesOf(Object const& document)
+{
+    SettledFiles files;
+    for (Value const& element : common::getArrayValue(document, L"files", L"")) {
+        Object const& file = element.get_object();
+        std::optional<common::IndexData> record;
+        if (common::hasKey(file, L"time")) {
+            record = {common::getUInt64Value(file, L"time", L""), common::getBoolValue(file, L"modified", L"")};
+        }
+        files.emplace(textOf(file, L"path"), record);
+    }
+    return files;
+}
+
 Object documentOf(CommitUnderWay const& work)
 {
     Array contents;
@@ -32,20 +62,10 @@ Object documentOf(CommitUnderWay const& work)
         object[L"size"] = content.size;
         contents.emplace_back(std::move(object));
     }
-    Array files;
-    for (auto const& [path, record] : work.files) {
-        Object object;
-        object[L"path"] = jsonText(path);
-        if (record) {
-            object[L"time"] = record->lastChecked;
-            object[L"modified"] = record->modified;
-        }
-        files.emplace_back(std::move(object));
-    }
     Object document;
     document[L"document"] = jsonText(work.document);
     document[L"contents"] = std::move(contents);
-    document[L"files"] = std::move(files);
+    document[L"files"] = arrayOf(work.files);
     return document;
 }
 
@@ -60,6 +80,7 @@ Object documentOf(MoveUnderWay const& work)
         begun.emplace_back(jsonText(target));
     }
     document[L"begun"] = std::move(begun);
+    document[L"files"] = arrayOf(work.files);
     return document;
 }
 
@@ -72,14 +93,7 @@ CommitUnderWay commitOf(Object const& document)
         work.contents.push_back(
             {textOf(content, L"url"), textOf(content, L"digest"), common::getUInt64Value(content, L"size", L"")});
     }
-    for (Value const& element : common::getArrayValue(document, L"files", L"")) {
-        Object const& file = element.get_object();
-        std::optional<common::IndexData> record;
-        if (common::hasKey(file, L"time")) {
-            record = {common::getUInt64Value(file, L"time", L""), common::getBoolValue(file, L"modified", L"")};
-        }
-        work.files.emplace(textOf(file, L"path"), record);
-    }
+    work.files = filesOf(document);
     return work;
 }
 
@@ -92,6 +106,9 @@ MoveUnderWay moveOf(Object const& document)
             std::wstring const& target = element.get_string();
             work.begun.push_back(withoutPairs(OdString(target.c_str(), target.size())));
         }
+    }
+    if (common::hasKey(document, L"files")) { // Earlier versions of tav did not note them.
+        work.files = filesOf(document);
     }
     return work;
 }
@@ -117,6 +134,20 @@ Unfinished unfinishedOf(LocalDatabase const& database)
             "What an interrupted command noted in '" + database.path() + "' cannot be read.",
             "Put a copy of that file from a backup in its place.");
     }
+}
+
+void settle(SettledFiles const& files, common::State& state)
+{
+    std::vector<common::StagedFile> settled;
+    for (auto const& [path, record] : files) {
+        settled.emplace_back(path, common::FileChange::modified);
+        if (record) {
+            state.index.insert_or_assign(path, *record);
+        } else {
+            state.index.erase(path);
+        }
+    }
+    unstage(settled, state);
 }
 
 void note(Unfinished const& work, LocalDatabase& database)

@@ -49,7 +49,7 @@ void Work::finish()
     }
     auto const* const move = std::get_if<MoveUnderWay>(&unfinished);
     if (move && move->isWritten) {
-        finishMove(root_, database_, {move->target, move->branch});
+        finishMove(root_, database_, *move);
     }
 }
 

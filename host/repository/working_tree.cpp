@@ -117,6 +117,11 @@ private:
                 "'" + path.ansi_str() + "' is no ordinary file.", "Nothing has been written; move it away first.");
         }
         auto const digest = fileDigest(root_.pathTo(path));
+        if (!digest && unsaved_ == Unsaved::isKept) {
+            throw Failure(
+                "'" + path.ansi_str() + "' cannot be read, and may hold changes that are in no commit.",
+                "Nothing has been written; check the disk and your rights to the file.");
+        }
         if (digest && wanted && digest == digestOf(*wanted)) {
             return Finding::isAsWanted;
         }

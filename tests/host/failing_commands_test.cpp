@@ -1,0 +1,99 @@
+// What commands leave behind when a call of the system fails, or the process dies in it, SQLite's calls included.
+#include "tests/host/run_here.h"
+#include "tests/host/scene.h"
+#include "tests/support/failing_call.h"
+#include "tests/support/sanitized.h"
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <csignal>
+#include <iostream>
+#include <tuple>
+
+namespace host_tests {
+namespace {
+
+constexpr int kAllCallsWorked = 77;
+constexpr int kSlowness = support::kIsSanitized ? 7 : 1;
+
+struct ErrorRow {
+    friend void PrintTo(ErrorRow const& row, std::ostream* stream) { *stream << row.name; }
+
+    char const* name;
+    int error;
+    int step; ///< from call to call; most answers do not depend on the error
+};
+
+class FailingCommand : public testing::TestWithParam<std::tuple<SceneRow, ErrorRow>> {
+protected:
+    FailingCommand()
+    {
+        EXPECT_EQ(scene_.tav(command_.arguments).code, 0);
+        after_ = scene_.situation();
+        filesAfter_ = scene_.files();
+    }
+
+    /// Runs the command with its n-th call failing.
+    Outcome fail(int n) const
+    {
+        return scene_.inCopy([&] {
+            support::FailingCall const failing(n, error_.error);
+            int const code = runHere(command_.arguments);
+            return failing.hasFailed() ? code : kAllCallsWorked;
+        });
+    }
+
+    /// What is wrong with the way the command ended; empty when nothing is.
+    std::string faultOf(Outcome const& outcome) const
+    {
+        if (error_.error == support::FailingCall::kKillProcess) {
+            return outcome.code == -SIGKILL ? "" : "it lives";
+        }
+        if (outcome.code != 0) {
+            return faultOfFailure(outcome);
+        }
+        return !outcome.err.empty() ? "it complains" : scene_.situation() == after_ ? "" : "not everything is done";
+    }
+
+    SceneRow const command_ = std::get<0>(GetParam());
+    ErrorRow const error_ = std::get<1>(GetParam());
+    Scene const scene_{command_.prepare};
+    Files const before_ = scene_.files();
+    Files filesAfter_;
+    std::string after_;
+};
+
+TEST_P(FailingCommand, LosesNothingAndSucceedsWhenItIsRepeated)
+{
+    int failures = 0;
+    for (int n = 0;; n += error_.step * kSlowness) {
+        scene_.reset();
+        Outcome const outcome = fail(n);
+        if (outcome.code == kAllCallsWorked) {
+            break;
+        }
+        ++failures;
+        SCOPED_TRACE("call " + std::to_string(n) + ": " + testing::PrintToString(outcome));
+        EXPECT_EQ(faultOf(outcome), "");
+        EXPECT_TRUE(areOldOrNew(scene_.files(), before_, filesAfter_));
+        Outcome const repeated = scene_.verifyAndRepeat(command_.arguments);
+        EXPECT_TRUE(repeated.code == 0 && repeated.err.empty()) << testing::PrintToString(repeated);
+        EXPECT_EQ(difference(after_, scene_.situation()), "");
+    }
+    EXPECT_GT(failures, 90 / error_.step / kSlowness);
+    RecordProperty("failing calls", failures);
+    std::cout << failures << " failing calls\n";
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Commands, FailingCommand,
+    testing::Combine(
+        testing::ValuesIn(sceneRows()),
+        testing::Values(
+            ErrorRow{"FullDisk", ENOSPC, 1}, ErrorRow{"BrokenDisk", EIO, 3}, ErrorRow{"NoRights", EACCES, 3},
+            ErrorRow{"Signal", EINTR, 3}, ErrorRow{"Death", support::FailingCall::kKillProcess, 1})),
+    [](auto const& row) { return std::string(std::get<0>(row.param).name) + std::get<1>(row.param).name; });
+
+} // namespace
+} // namespace host_tests
