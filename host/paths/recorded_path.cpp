@@ -52,15 +52,60 @@ std::vector<OdString> partsOf(OdString const& path)
     return parts;
 }
 
-/// What is left of a part on a file system that passes over invisible characters, letter case, and dots and blanks at
-/// the end.
+bool isHex(wchar_t c)
+{
+    return isDigit(c) || (c >= L'a' && c <= L'f');
+}
+
+/// Characters that Unicode's compatibility forms fold to a row of plain ones, which repeats after `period`.
+struct Compatible {
+    wchar_t first;
+    wchar_t last;
+    wchar_t plain;
+    int period;
+};
+
+// Those that can spell a name of the own folder; some file systems compare names so.
+constexpr std::array kCompatible = {
+    Compatible{0xAA, 0xAA, L'a', 1},        Compatible{0x1D2C, 0x1D2C, L'a', 1},
+    Compatible{0x1D40, 0x1D40, L't', 1},    Compatible{0x1D43, 0x1D43, L'a', 1},
+    Compatible{0x1D57, 0x1D57, L't', 1},    Compatible{0x1D5B, 0x1D5B, L'v', 1},
+    Compatible{0x1D65, 0x1D65, L'v', 1},    Compatible{0x2024, 0x2024, L'.', 1},
+    Compatible{0x2090, 0x2090, L'a', 1},    Compatible{0x209C, 0x209C, L't', 1},
+    Compatible{0x2164, 0x2164, L'v', 1},    Compatible{0x2174, 0x2174, L'v', 1},
+    Compatible{0x24B6, 0x24E9, L'a', 26},   Compatible{0x2C7D, 0x2C7D, L'v', 1},
+    Compatible{0xFE52, 0xFE52, L'.', 1},    Compatible{0xFF01, 0xFF5E, L'!', 94},
+    Compatible{0x1D400, 0x1D6A3, L'a', 26}, Compatible{0x1D7CE, 0x1D7FF, L'0', 10},
+    Compatible{0x1F130, 0x1F149, L'a', 26},
+};
+
+wchar_t inSmall(wchar_t c)
+{
+    return (c >= L'A' && c <= L'Z') ? static_cast<wchar_t>(c - L'A' + L'a') : c;
+}
+
+wchar_t plain(wchar_t c)
+{
+    if (c < kCompatible.front().first) {
+        return inSmall(c);
+    }
+    for (Compatible const& range : kCompatible) {
+        if (c >= range.first && c <= range.last) {
+            return inSmall(static_cast<wchar_t>(range.plain + (c - range.first) % range.period));
+        }
+    }
+    return inSmall(c);
+}
+
+/// What is left of a part on a file system that passes over invisible characters, letter case, compatibility forms, and
+/// dots and blanks at the end.
 OdString barePart(OdString const& part)
 {
     OdString bare;
     for (std::size_t i = 0; i < part.getLength(); ++i) {
         wchar_t const c = part.getAt(i);
         if (!isInvisible(c)) {
-            bare += (c >= L'A' && c <= L'Z') ? static_cast<wchar_t>(c - L'A' + L'a') : c;
+            bare += plain(c);
         }
     }
     std::size_t length = bare.getLength();
@@ -79,14 +124,25 @@ OdString withoutStream(OdString const& part)
     return part.left(length);
 }
 
+bool isNumbered(OdString const& text, OdString const& stem)
+{
+    std::size_t const length = stem.getLength();
+    bool const isNumbered = text.getLength() > length && text.left(length) == stem;
+    return isNumbered && !hasAny(text.mid(length), [](wchar_t c) { return !isDigit(c); });
+}
+
+/// "tav~1", or "ta3f0c~1" where many names begin alike.
+bool isShortName(OdString const& bare)
+{
+    OdString const digits = bare.mid(2, 4);
+    bool const isHashed = digits.getLength() == 4 && !hasAny(digits, [](wchar_t c) { return !isHex(c); });
+    return isNumbered(bare, L"tav~") || (isHashed && isNumbered(bare.left(2) + bare.mid(6), L"ta~"));
+}
+
 bool isOwnFolder(OdString const& part)
 {
     OdString const bare = barePart(withoutStream(part));
-    if (bare == L".tav") {
-        return true;
-    }
-    bool const isShortName = bare.left(4) == L"tav~" && bare.getLength() > 4;
-    return isShortName && !hasAny(bare.mid(4), [](wchar_t c) { return !isDigit(c); });
+    return bare == L".tav" || isShortName(bare);
 }
 
 bool isAbsolute(OdString const& path)

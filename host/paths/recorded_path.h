@@ -18,8 +18,9 @@ namespace tav {
 /// Refused are: the empty path; absolute paths, drives and backslashes; parts that are empty or of nothing but dots and
 /// blanks, "." and ".." among them; control characters and line ends; characters that do not come back from the disk as
 /// they were; parts of more than 255 bytes and paths of more than 4,096; and the repository's own folder ".tav" under
-/// every name that some file system takes for it: letter case, invisible characters, dots and blanks at the end, short
-/// names, streams. Of its content only files below ".tav/properties", spelled so, may be recorded.
+/// every name that some file system takes for it: letter case, invisible characters, compatibility forms, dots and
+/// blanks at the end, short names, streams. Of its content only files below ".tav/properties", spelled so, may be
+/// recorded.
 ///
 /// Hidden names and names that begin with a dash may be used.
 std::optional<std::string> whyUnsafe(OdString const& path);

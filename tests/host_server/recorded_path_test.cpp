@@ -4,6 +4,7 @@
 
 #include <gtest/gtest.h>
 
+#include <optional>
 #include <string>
 
 namespace {
@@ -87,7 +88,11 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"LongestPath", longPath(4096), "safe"}, Row{"Properties", L".tav/properties/ignore", "safe"},
         Row{"PropertiesInFolders", L".tav/properties/a/b", "safe"}, Row{"LongerThanTheOwnFolder", L".tavern", "safe"},
         Row{"TavWithoutDot", L"tav", "safe"}, Row{"LongerThanAShortName", L"TAV~1.dwg", "safe"},
-        Row{"TildeWithoutNumber", L"TAV~", "safe"}, Row{"NumberAndMore", L"TAV~1a", "safe"}),
+        Row{"TildeWithoutNumber", L"TAV~", "safe"}, Row{"NumberAndMore", L"TAV~1a", "safe"},
+        Row{"NoHexadecimalDigitsInAShortName", L"TAXXXX~1", "safe"}, Row{"DashFirst", L"--all/-", "safe"},
+        Row{"WideLettersWithoutADot", L"\uFF54\uFF41\uFF56", "safe"}, Row{"WideSlash", L"a\uFF0Fb", "safe"},
+        Row{"Ellipsis", L"\u2026", "safe"}, Row{"Composed", L"\u00E9.dwg", "safe"},
+        Row{"Decomposed", L"e\u0301.dwg", "safe"}, Row{"DeviceOfAnotherSystem", L"nul.dwg", "safe"}),
     rowName);
 
 INSTANTIATE_TEST_SUITE_P(
@@ -103,8 +108,11 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"UpLast", L"a/..", because("a/..", kDots)}, Row{"Here", L".", because(".", kDots)},
         Row{"HereInside", L"a/./b", because("a/./b", kDots)}, Row{"UpAndBlank", L".. /a", because(".. /a", kDots)},
         Row{"UpAndInvisible", L".\u200B./a", because(".\\u200B./a", kDots)},
-        Row{"ThreeDots", L"a/...", because("a/...", kDots)}, Row{"Blank", L"a/ /b", because("a/ /b", kDots)},
-        Row{"EmptyInside", L"a//b", because("a//b", kEmptyPart)},
+        Row{"UpInWideDots", L"\uFF0E\uFF0E/a", because("\uFF0E\uFF0E/a", kDots)},
+        Row{"DriveBehindSlashes", L"//c:/a", because("//c:/a", kAbsolute)},
+        Row{"DeviceSpace", L"\\\\?\\c:\\a", because("\\\\?\\c:\\a", kBackslash)},
+        Row{"OnlyABackslash", L"\\", because("\\", kBackslash)}, Row{"ThreeDots", L"a/...", because("a/...", kDots)},
+        Row{"Blank", L"a/ /b", because("a/ /b", kDots)}, Row{"EmptyInside", L"a//b", because("a//b", kEmptyPart)},
         Row{"SlashAtTheEnd", L"a/", because("a/", kEmptyPart)}),
     rowName);
 
@@ -167,6 +175,18 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"ShortName", L"TAV~1/a", because("TAV~1/a", kOwn)},
         Row{"ShortNameInSmall", L"tav~2", because("tav~2", kOwn)},
         Row{"LaterShortName", L"TAV~12", because("TAV~12", kOwn)},
+        Row{"HashedShortName", L"TA3F0C~1/a", because("TA3F0C~1/a", kOwn)},
+        Row{"ShortNameAndStream", L"TAV~1::$DATA", because("TAV~1::$DATA", kOwn)},
+        Row{"InvisibleInAShortName", L"TAV\u2061~1", because("TAV\\u2061~1", kOwn)},
+        Row{"WideLetters", L".\uFF34\uFF41\uFF56", because(".\uFF34\uFF41\uFF56", kOwn)},
+        Row{"WideDot", L"\uFF0Etav/a", because("\uFF0Etav/a", kOwn)},
+        Row{"DotLeader", L"\u2024tav", because("\u2024tav", kOwn)},
+        Row{"MathematicalLetters", L".\U0001D42D\U0001D41A\U0001D42F",
+            because(".\U0001D42D\U0001D41A\U0001D42F", kOwn)},
+        Row{"CircledLetters", L".\u24E3\u24B6\u24E5", because(".\u24E3\u24B6\u24E5", kOwn)},
+        Row{"RomanNumeral", L".ta\u2174", because(".ta\u2174", kOwn)},
+        Row{"RaisedLetters", L".\u1D57\u1D43\u1D5B", because(".\u1D57\u1D43\u1D5B", kOwn)},
+        Row{"WideShortName", L"TAV\uFF5E\uFF11", because("TAV\uFF5E\uFF11", kOwn)},
         Row{"ShortNameAndDot", L"TAV~1.", because("TAV~1.", kOwn)}, Row{"Stream", L".tav:x", because(".tav:x", kOwn)},
         Row{"StreamOfAFolder", L".tav::$INDEX_ALLOCATION/a", because(".tav::$INDEX_ALLOCATION/a", kOwn)},
         Row{"BlankBeforeAStream", L".tav :x", because(".tav :x", kOwn)},
@@ -179,6 +199,47 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"SlashBehindProperties", L".tav/properties/", because(".tav/properties/", kEmptyPart)},
         Row{"InProperties", L".tav/properties/.tav/a", because(".tav/properties/.tav/a", kOwn)}),
     rowName);
+
+struct Range {
+    char const* name;
+    wchar_t first;
+    wchar_t last;
+};
+
+class InvisibleCharacters : public testing::TestWithParam<Range> {};
+
+TEST_P(InvisibleCharacters, HideNoNameOfTheOwnFolder)
+{
+    std::wstring const own = L".tav";
+    for (wchar_t c = GetParam().first; c <= GetParam().last; ++c) {
+        for (std::size_t place = 0; place <= own.size(); ++place) {
+            std::wstring name = own;
+            name.insert(place, 1, c);
+            std::optional<std::string> const fault = tav::whyUnsafe(name.c_str());
+            ASSERT_TRUE(fault.has_value()) << std::hex << static_cast<unsigned>(c);
+            EXPECT_NE(fault->find(kOwn), std::string::npos) << *fault;
+        }
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Ranges, InvisibleCharacters,
+    testing::Values(
+        Range{"JoinersAndMarks", 0x200B, 0x200F}, Range{"Directions", 0x202A, 0x202E},
+        Range{"InvisibleOperators", 0x2060, 0x206F}, Range{"VariationSelectors", 0xFE00, 0xFE0F},
+        Range{"ByteOrderMark", 0xFEFF, 0xFEFF}, Range{"Tags", 0xE0000, 0xE007F}),
+    [](testing::TestParamInfo<Range> const& range) { return std::string(range.param.name); });
+
+TEST(ControlCharacters, StandInNoPath)
+{
+    for (wchar_t c = 0; c < 0xA0; ++c) {
+        bool const isControl = c < 0x20 || c >= 0x7F;
+        wchar_t const path[] = {L'a', c, L'b'};
+        std::optional<std::string> const fault = tav::whyUnsafe(OdString(path, 3));
+        bool const isNamed = fault && fault->find(kControl) != std::string::npos;
+        EXPECT_EQ(isNamed, isControl) << std::hex << static_cast<unsigned>(c);
+    }
+}
 
 std::string obstacle(support::TempFolder const& folder, wchar_t const* path)
 {
@@ -224,6 +285,13 @@ TEST(LinkOnTheWay, LetsTheWorkingFolderItselfBeALink)
     folder.write("work/a", "");
     folder.makeLink("link", folder.pathTo("work"));
     EXPECT_EQ(tav::linkOnTheWay(folder.pathTo("link"), L"a").value_or("none"), "none");
+}
+
+TEST(LinkOnTheWay, IsALinkThatNamesItself)
+{
+    support::TempFolder const folder;
+    folder.makeLink("loop", folder.pathTo("loop"));
+    EXPECT_EQ(obstacle(folder, L"loop/a"), "'loop' is a symbolic link, which may lead out of the working folder.");
 }
 
 TEST(LinkOnTheWay, SaysWhatCannotBeExamined)
