@@ -8,6 +8,8 @@
 #include "platform/ut/TextFile.h"
 #include "platform/ut/text.h"
 
+#include <algorithm>
+#include <string>
 #include <variant>
 
 namespace common {
@@ -176,6 +178,14 @@ std::vector<std::regex> RepoIgnore::expressions() const
 std::vector<OdString> RepoIgnore::rules() const
 {
     return rules_;
+}
+
+bool RepoIgnore::matches(OdString const& name) const
+{
+    std::string const narrow = name.ansi_str();
+    return std::any_of(expressions_.begin(), expressions_.end(), [&](std::regex const& expression) {
+        return matchesWhole(expression, narrow);
+    });
 }
 
 WriteOutcome RepoIgnore::write(RootPath const& root)

@@ -86,6 +86,9 @@ public:
     std::vector<std::regex> expressions() const;
     /// The texts of the rules, in the same order.
     std::vector<OdString> rules() const;
+    /// Whether a scan skips `name`: any rule covers the whole of it. Takes bounded time for a name that a file can
+    /// have. Throws `std::regex_error` for a rule with a back reference and a name of more than 1,024 bytes.
+    bool matches(OdString const& name) const;
 
     /// Creates the ignore file with the default rules; an existing file is left untouched, which is success. The
     /// properties folder must exist. Error: the file could not be written.

@@ -1,6 +1,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
+#include "host/paths/recorded_path.h"
 #include "host/repository/changes.h"
 #include "host/repository/file_moves.h"
 #include "host/repository/names.h"
@@ -13,8 +14,8 @@
 #include "platform/ut/Dir.h"
 #include "platform/ut/FileName.h"
 
+#include <algorithm>
 #include <filesystem>
-#include <regex>
 #include <string>
 #include <utility>
 #include <vector>
@@ -57,21 +58,26 @@ void checkFolders(OdString const& to, common::RootPath const& root)
     }
 }
 
+template <class Predicate>
+void failIfAnyPart(OdString const& to, Predicate const& isLeftOut)
+{
+    std::filesystem::path const path = to.ansi_str();
+    if (std::any_of(path.begin(), path.end(), isLeftOut)) {
+        throw Failure(
+            "The repository would not keep '" + to.ansi_str() + "': its name is hidden or ignored.",
+            "Choose another name, or see 'tav ignore'.");
+    }
+}
+
+/// Rules come last: they are slow on names that are too long for any file.
 void checkTarget(OdString const& to, common::RootPath const& root)
 {
-    auto const rules = common::RepoIgnore(root).expressions();
-    for (auto const& part : std::filesystem::path(to.ansi_str())) {
-        std::string const name = part.string();
-        bool isLeftOut = name.front() == '.';
-        for (std::regex const& rule : rules) {
-            isLeftOut = isLeftOut || std::regex_match(name, rule);
-        }
-        if (isLeftOut) {
-            throw Failure(
-                "The repository would not keep '" + to.ansi_str() + "': its name is hidden or ignored.",
-                "Choose another name, or see 'tav ignore'.");
-        }
+    failIfAnyPart(to, [](std::filesystem::path const& part) { return part.string().front() == '.'; });
+    if (auto const fault = whyUnsafe(to)) {
+        throw Failure(*fault, "Choose another name.");
     }
+    common::RepoIgnore const rules(root);
+    failIfAnyPart(to, [&](std::filesystem::path const& part) { return rules.matches(wide(part.string())); });
 }
 
 /// The files that move when `from` becomes `to`: itself, or all that lie in it.

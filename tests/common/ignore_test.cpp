@@ -290,6 +290,18 @@ INSTANTIATE_TEST_SUITE_P(
         Rule{"EscapedBackslash", "^a\\\\$", "a\\", ignored}, Rule{"Placeholders", "^%s%n$", "%s%n", ignored}),
     [](auto const& row) { return row.param.name; });
 
+TEST(IgnoreRulesOfARepository, TellWhatAScanSkips)
+{
+    TempRepository const repository;
+    repository.ignore("^.*\\.bak$\n(a*)*b\n^(a*)\\1c$");
+    RepoIgnore const rules(repository.root());
+    EXPECT_TRUE(rules.matches(L"plan.bak"));
+    EXPECT_FALSE(rules.matches(L"plan.bak.dwg"));
+    EXPECT_FALSE(rules.matches(toWide(std::string(255, 'a'))));
+    EXPECT_TRUE(rules.matches(toWide(std::string(254, 'a') + "c")));
+    EXPECT_THROW(static_cast<void>(rules.matches(toWide(std::string(2'000, 'a')))), std::regex_error);
+}
+
 char const* const kInvalid[] = {"(",      ")",    "a)",    "[",     "[a",       "*a",   "+",       "?",   "a{2",
                                 "a{3,2}", "a{x}", "\\",    "[b-a]", "[[:x:]]",  "(?a",  "(?<n>a)", "\\1", "(a",
                                 "a{,2}",  "\\x1", "\\u12", "(*)",   "[[.ab.]]", "(?=a", "a**+(",   "^*",  "(\\2)"};

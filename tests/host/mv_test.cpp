@@ -224,9 +224,8 @@ TEST_F(Mv, RenamesFilesOfOddNames)
 {
     repo.add({"a (1).dwg", "\xff\n.dwg"});
     EXPECT_EQ(tav({"mv", "a (1).dwg", "[План].dwg"}), done("Renamed 'a (1).dwg' to '[План].dwg'.\n"));
-    EXPECT_EQ(
-        tavOnTerminal({"mv", "\xff\n.dwg", "\xfe\x1b.dwg"}), done("Renamed '\\xFF\\x0A.dwg' to '\\xFE\\x1B.dwg'.\n"));
-    EXPECT_EQ(state(), stateWithRenames({{"a (1).dwg", "[План].dwg"}, {"\\uDCFF\\n.dwg", "\\uDCFE\\u001B.dwg"}}));
+    EXPECT_EQ(tavOnTerminal({"mv", "\xff\n.dwg", "\xfe.dwg"}), done("Renamed '\\xFF\\x0A.dwg' to '\\xFE.dwg'.\n"));
+    EXPECT_EQ(state(), stateWithRenames({{"a (1).dwg", "[План].dwg"}, {"\\uDCFF\\n.dwg", "\\uDCFE.dwg"}}));
 }
 
 TEST_F(Mv, TakesAFileForNewThatNoCommitCanHold)
@@ -346,8 +345,49 @@ TEST_F(Mv, MovesTheFileBackWhenTheStateCannotHoldItsName)
 TEST_F(Mv, FailsForNamesThatAreTooLong)
 {
     repo.add({"a.dwg"});
-    std::string const name(300, 'x');
-    expectRefusal({"a.dwg", name}, cannotMove("a.dwg", name, "File name too long"));
+    expectRefusal(
+        {"a.dwg", std::string(256, 'x')},
+        "The path '" + std::string(100, 'x') + "...' has a part that is longer than 255 bytes. Choose another name.");
+}
+
+TEST_F(Mv, FailsForNamesThatNoCommitTakes)
+{
+    repo.add({"a.dwg"});
+    repo.makeFolder("plans");
+    auto const refused = [](std::string const& name, std::string const& fault) {
+        return "The path '" + name + "' " + fault + ". Choose another name.";
+    };
+    std::string const control = "holds a control character or a line end";
+    expectRefusal({"a.dwg", "b\n.dwg"}, refused("b\\u000A.dwg", control));
+    expectRefusal({"a.dwg", "plans/\x1b[2J.dwg"}, refused("plans/\\u001B[2J.dwg", control));
+    expectRefusal(
+        {"a.dwg", "plans/b\\c.dwg"},
+        refused("plans/b\\c.dwg", "holds a backslash, which separates folders on other systems"));
+    expectRefusal(
+        {"a.dwg", "TAV~1"}, refused("TAV~1", "leads into the folder '.tav', which belongs to the repository"));
+}
+
+/// Expressions that take a matcher of the usual kind longer than anybody waits.
+TEST_F(Mv, IsDoneWhateverTheRulesAre)
+{
+    std::string const name(30, 'a');
+    std::string const longest(255, 'a');
+    repo.add({"x", "y", "z"});
+    repo.ignore("(a*)*b\n(a|a|aa)+$b\n(.*)*\\.bak\n(x+x+)+y\n");
+    EXPECT_EQ(tav({"mv", "x", name}), done("Renamed 'x' to '" + name + "'.\n"));
+    EXPECT_EQ(tav({"mv", "y", longest}), done("Renamed 'y' to '" + longest + "'.\n"));
+    expectRefusal(
+        {"z", name + "b"}, "The repository would not keep '" + name +
+                               "b': its name is hidden or ignored. Choose another name, or see 'tav ignore'.");
+}
+
+TEST_F(Mv, AsksNoRuleAboutANameThatNoFileHas)
+{
+    repo.add({"a.dwg"});
+    repo.ignore("(.*a){40}b\n^(a*)\\1b$\n");
+    expectRefusal(
+        {"a.dwg", std::string(100'000, 'a')},
+        "The path '" + std::string(100, 'a') + "...' is longer than 4096 bytes. Choose another name.");
 }
 
 } // namespace
