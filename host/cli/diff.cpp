@@ -129,7 +129,7 @@ void printLines(std::string const& text)
     std::istringstream lines(text);
     for (std::string line; std::getline(lines, line);) {
         Colour const colour = line[0] == '+' ? Colour::green : line[0] == '-' ? Colour::red : Colour::none;
-        print("    " + coloured(colour, shown(wide(line))) + "\n");
+        print("    " + coloured(colour, shownLine(wide(line))) + "\n");
     }
 }
 

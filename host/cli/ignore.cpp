@@ -28,7 +28,7 @@ void listRules(common::RootPath const& root, bool json)
         if (json) {
             array.push_back(jsonText(rule));
         } else {
-            print(shown(rule) + "\n");
+            print(shownLine(rule) + "\n");
         }
     }
     if (json) {

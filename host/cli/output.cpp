@@ -21,29 +21,36 @@ bool isTerminal()
     return is;
 }
 
-bool isControl(wchar_t c)
-{
-    return c < 0x20 || (c >= 0x7F && c < 0xA0);
-}
-
 /// A byte of a name that is not valid UTF-8. A terminal of another character set may take it for a control character.
 bool isStrayByte(wchar_t c)
 {
     return c >= 0xDC80 && c <= 0xDCFF;
 }
 
-OdString withControlsEscaped(OdString const& text)
+bool cannotBeSeen(wchar_t c)
 {
-    OdString escaped;
+    return isControl(c) || isInvisible(c) || isStrayByte(c);
+}
+
+bool cannotBeSeenInALine(wchar_t c)
+{
+    return c != L'\t' && cannotBeSeen(c);
+}
+
+std::string escaped(OdString const& text, bool (*mustBe)(wchar_t))
+{
+    OdString result;
     for (std::size_t i = 0; i < text.getLength(); ++i) {
         wchar_t const c = text.getAt(i);
-        if (isControl(c) || isStrayByte(c)) {
-            escaped += OdString().format(L"\\x%02X", static_cast<unsigned>(c) & 0xFF);
+        bool const isByte = c <= 0xFF || isStrayByte(c);
+        if (mustBe(c)) {
+            auto const code = static_cast<unsigned>(c);
+            result += OdString().format(isByte ? L"\\x%02X" : L"\\u%04X", isByte ? code & 0xFF : code);
         } else {
-            escaped += c;
+            result += c;
         }
     }
-    return escaped;
+    return result.ansi_str();
 }
 
 /// Messages of several lines become one; whatever else could move the cursor is escaped.
@@ -55,7 +62,7 @@ std::string onOneLine(std::string text)
     for (char& c : text) {
         c = c == '\n' || c == '\t' ? ' ' : c;
     }
-    return withControlsEscaped(wide(text)).ansi_str();
+    return escaped(wide(text), cannotBeSeen);
 }
 
 std::string asSentence(std::string const& text)
@@ -102,7 +109,12 @@ bool flushOutput()
 
 std::string shown(OdString const& name)
 {
-    return isTerminal() ? withControlsEscaped(name).ansi_str() : name.ansi_str();
+    return escaped(name, isTerminal() ? cannotBeSeen : isControl);
+}
+
+std::string shownLine(OdString const& line)
+{
+    return isTerminal() ? escaped(line, cannotBeSeenInALine) : line.ansi_str();
 }
 
 std::string coloured(Colour colour, std::string text)

@@ -23,9 +23,13 @@ void printErrorDetail(std::string const& detail);
 /// Hands over what was printed; false when anything could not be written.
 bool flushOutput();
 
-/// A file name as people see it: on a terminal control characters are escaped, since a name may hold any of them and a
-/// terminal obeys them. Elsewhere the bytes of the name.
+/// A name as people see it. Control characters are escaped: a name may hold any of them, a terminal obeys them, and a
+/// line feed would make two names of one. On a terminal so are characters that cannot be seen, and bytes that are no
+/// UTF-8; elsewhere these stay as they are.
 std::string shown(OdString const& name);
+/// A line of a message or of a file: on a terminal with the same escapes, tabs excepted; elsewhere as it stands.
+std::string shownLine(OdString const& line);
+
 enum class Colour { none, red, green };
 
 /// `text` in that colour where people see it: on a terminal, unless the environment sets NO_COLOR.

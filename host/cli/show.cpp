@@ -62,7 +62,7 @@ void printMessage(OdString const& message)
     std::istringstream lines(message.ansi_str());
     print("\n");
     for (std::string line; std::getline(lines, line);) {
-        print("    " + shown(wide(line)) + "\n");
+        print("    " + shownLine(wide(line)) + "\n");
     }
     print("\n");
 }

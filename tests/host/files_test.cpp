@@ -109,12 +109,19 @@ protected:
     }
 };
 
-TEST_F(FilesWithOddNames, AreShownWholeInPipes)
+TEST_F(FilesWithOddNames, AreOneLineEachInPipes)
 {
     EXPECT_EQ(
         tav({"files"}),
-        done("a b.dwg\nback\\slash\nbell\a\nc1\xc2\x9b.dwg\ncarriage\rreturn\nesc\x1b[31m.dwg\nline\nfeed\n"
+        done("a b.dwg\nback\\slash\nbell\\x07\nc1\\x9B.dwg\ncarriage\\x0Dreturn\nesc\\x1B[31m.dwg\nline\\x0Afeed\n"
              "not\xff\xfeutf8.dwg\nПлан.dwg\n図面.dwg\n\xf0\x9f\x8f\xa0.dwg\n"));
+}
+
+TEST_F(Files, ShowsOnATerminalWhatCannotBeSeen)
+{
+    repo.add({"direction\xe2\x80\xae.dwg", "join\xe2\x80\x8d.dwg", "line\xe2\x80\xa8.dwg"});
+    EXPECT_EQ(tavOnTerminal({"files"}), done("direction\\u202E.dwg\njoin\\u200D.dwg\nline\\u2028.dwg\n"));
+    EXPECT_EQ(tav({"files"}), done("direction\xe2\x80\xae.dwg\njoin\xe2\x80\x8d.dwg\nline\\u2028.dwg\n"));
 }
 
 TEST_F(FilesWithOddNames, AreEscapedOnATerminal)

@@ -281,7 +281,7 @@ New, not staged:
 )"));
 }
 
-TEST_F(Status, EscapesNamesOnATerminalOnly)
+TEST_F(Status, EscapesNames)
 {
     repo.add({"esc\x1b[31m\n\xff.dwg"});
     repo.write(".tav/tav.state", R"({ "head" : { "reference" : "a\u001B]b" } })");
@@ -291,8 +291,8 @@ TEST_F(Status, EscapesNamesOnATerminalOnly)
              "        esc\\x1B[31m\\x0A\\xFF.dwg\n\n"));
     EXPECT_EQ(
         tav({"status"}),
-        done("On branch a\x1b]b\n\nNew, not staged:\n  (use 'tav add NAME' or 'tav add --all' to stage)\n"
-             "        esc\x1b[31m\n\xff.dwg\n\n"));
+        done("On branch a\\x1B]b\n\nNew, not staged:\n  (use 'tav add NAME' or 'tav add --all' to stage)\n"
+             "        esc\\x1B[31m\\x0A\xff.dwg\n\n"));
 }
 
 TEST_F(Status, ShowsAStagedPathOutsideOfTheFolderAsItStands)
