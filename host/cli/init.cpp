@@ -3,6 +3,7 @@
 #include "host/failure.h"
 #include "host/projects.h"
 #include "host/repository/ignore_file.h"
+#include "host/repository/open.h"
 #include "host/repository/server_of.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
@@ -98,6 +99,7 @@ void init(InitOptions const& options)
     bool const existed = common::RootPath::get(path, false).hasValue();
     common::RootPath const root =
         valueOrFail(common::RootPath::get(path, true), "Check that the folder is one and that you may write there.");
+    requireOwnFolders(root);
     std::string const folder = absolute(options.folder);
     std::string const name = std::filesystem::path(folder).filename().string();
     os::FileLock const lock = lockRepository(root, "init");

@@ -1,6 +1,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
+#include "host/paths/recorded_path.h"
 #include "host/repository/changes.h"
 #include "host/repository/file_moves.h"
 #include "host/repository/last_commit.h"
@@ -9,11 +10,13 @@
 #include "host/repository/staging.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
+#include "host/text/wide.h"
 
 #include "platform/os/os_files.h"
 
 #include <algorithm>
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -78,6 +81,19 @@ NameFinder finderOfCommitted(common::RepoChanges const& changes, common::RootPat
     return {files, root};
 }
 
+/// The paths come from a database that anybody may have made, and folders may have become links meanwhile.
+void checkPath(OdString const& path, common::RootPath const& root)
+{
+    if (auto const fault = whyUnsafe(path)) {
+        throw Failure(*fault, "Nothing has been removed.");
+    }
+    std::filesystem::path const folder = std::filesystem::path(path.ansi_str()).parent_path();
+    auto const link = folder.empty() ? std::nullopt : linkOnTheWay(root.path().ansi_str(), wide(folder.string()));
+    if (link) {
+        throw Failure(*link, "Nothing has been removed; move that away first.");
+    }
+}
+
 /// Where a removed file waits until the new state is safe. A command that was killed may have left such files.
 std::string waitingName(common::RootPath const& root, std::size_t number)
 {
@@ -107,6 +123,7 @@ void removeFiles(std::vector<std::string> const& names)
         }
         for (common::StagedFile const& file : staged) {
             if (ut::FileName::fileExists(root.pathTo(file.path))) {
+                checkPath(file.path, root);
                 waiting.push_back(waitingName(root, waiting.size()));
                 moves.move(root.pathTo(file.path).ansi_str(), waiting.back());
             }

@@ -271,6 +271,15 @@ void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
     readBack(draft, plan, storage);
 }
 
+CommitRecord finish(common::RootPath const& root, LocalDatabase& database, CommitUnderWay const& work, NewCommit commit)
+{
+    commit.commit.number = sentNumber(commit, work.document, database);
+    enter(commit, work, database);
+    changeState(root, [&](common::Cache& cache) { settle(work.files, cache.write()); });
+    note(std::monostate(), database);
+    return commit.commit;
+}
+
 } // namespace
 
 Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start)
@@ -298,18 +307,14 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     keepContents(draft, plan);
     failIfBack(plan, state, root);
     draft.work.document = documentOf(draft, order, state.head);
+    NewCommit checked = readCommitInfo(draft.work.document); // What is refused must not be noted: it could never end.
     note(draft.work, database);
-    return {finishCommit(root, database, draft.work), true};
+    return {finish(root, database, draft.work, std::move(checked)), true};
 }
 
 CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, CommitUnderWay const& work)
 {
-    NewCommit commit = readCommitInfo(work.document);
-    commit.commit.number = sentNumber(commit, work.document, database);
-    enter(commit, work, database);
-    changeState(root, [&](common::Cache& cache) { settle(work.files, cache.write()); });
-    note(std::monostate(), database);
-    return commit.commit;
+    return finish(root, database, work, readCommitInfo(work.document));
 }
 
 } // namespace tav

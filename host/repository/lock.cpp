@@ -19,6 +19,13 @@ std::string hostName()
     return gethostname(name.data(), name.size() - 1) == 0 ? name.data() : "this machine";
 }
 
+/// Whether something else has the name of the lock.
+bool isNoLock(std::error_code const& error)
+{
+    return error == std::errc::too_many_symbolic_link_levels || error == std::errc::too_many_links ||
+           error == std::errc::is_a_directory || error == std::errc::not_supported;
+}
+
 } // namespace
 
 os::FileLock lockRepository(common::RootPath const& root, std::string const& name)
@@ -30,6 +37,11 @@ os::FileLock lockRepository(common::RootPath const& root, std::string const& nam
     if (error == std::errc::operation_would_block) {
         throw Failure(
             os::FileLock::holder(path) + ", is changing the repository.", "Run the command again when that is done.");
+    }
+    if (isNoLock(error)) {
+        throw Failure(
+            "The repository cannot be locked: " + error.message() + ".",
+            "Move '" + path + "' away; the next command makes a new one.");
     }
     if (error) {
         throw Failure(

@@ -23,9 +23,7 @@ fs::path currentFolder()
     return current;
 }
 
-} // namespace
-
-common::RootPath openRepository(std::string const& folder)
+common::RootPath findRepository(std::string const& folder)
 {
     if (!folder.empty()) {
         return valueOrFail(common::RootPath::get(wide(folder), false), kHowToInit);
@@ -39,6 +37,34 @@ common::RootPath openRepository(std::string const& folder)
         if (place == place.parent_path()) {
             return valueOrFail(common::RootPath::get(wide(start.string()), false), kHowToInit);
         }
+    }
+}
+
+} // namespace
+
+common::RootPath openRepository(std::string const& folder)
+{
+    common::RootPath root = findRepository(folder);
+    requireOwnFolders(root);
+    return root;
+}
+
+void requireOwnFolders(common::RootPath const& root)
+{
+    for (wchar_t const* const name : {L".tav", L".tav/objects", L".tav/properties", L".tav/restoring", L".tav/tf"}) {
+        std::string const folder = root.pathTo(name).ansi_str();
+        std::error_code error;
+        if (fs::is_symlink(fs::symlink_status(folder, error))) {
+            throw Failure(
+                "'" + folder + "' is a link, and may lead to another repository.",
+                "Put the folder itself in its place.");
+        }
+    }
+    std::string const rules = root.pathTo(L".tav/properties/ignore").ansi_str();
+    std::error_code error;
+    fs::file_type const type = fs::status(rules, error).type();
+    if (type != fs::file_type::not_found && type != fs::file_type::regular && type != fs::file_type::none) {
+        throw Failure("'" + rules + "' is no file.", "Move it away; 'tav init' makes a new one.");
     }
 }
 

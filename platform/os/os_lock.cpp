@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <fcntl.h>
 #include <sys/file.h>
+#include <sys/stat.h>
 #include <thread>
 #include <utility>
 
@@ -27,6 +28,19 @@ bool lockWithin(int file, std::chrono::milliseconds patience)
         std::this_thread::sleep_for(kPause);
     }
     return true;
+}
+
+/// What serves for something else is no lock: the note would go into it.
+std::error_code requireOwn(int file)
+{
+    struct stat status;
+    if (fstat(file, &status) == -1) {
+        return lastError();
+    }
+    if (!S_ISREG(status.st_mode)) {
+        return std::make_error_code(std::errc::not_supported);
+    }
+    return status.st_nlink > 1 ? std::make_error_code(std::errc::too_many_links) : std::error_code();
 }
 
 } // namespace
@@ -52,6 +66,9 @@ std::error_code FileLock::acquire(std::string const& path, std::string const& no
     lock.file_ = calls().openat(AT_FDCWD, path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC, 0666);
     if (lock.file_ == -1 || !lockWithin(lock.file_, patience)) {
         return lastError();
+    }
+    if (std::error_code const error = requireOwn(lock.file_)) {
+        return error;
     }
     // Only the first line counts, so a longer note of before need not be cut off. A disk too full for the note is no
     // reason to refuse the lock.

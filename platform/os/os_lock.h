@@ -19,7 +19,8 @@ public:
     ~FileLock();
 
     /// Makes the file `path` if need be, waits up to `patience` for its lock, and writes `note` into it, one line that
-    /// tells others who holds it. `std::errc::operation_would_block` when another process held it all the time.
+    /// tells others who holds it. `std::errc::operation_would_block` when another process held it all the time,
+    /// `too_many_links` when the file has other names, `not_supported` when it is no file.
     [[nodiscard]] std::error_code
     acquire(std::string const& path, std::string const& note, std::chrono::milliseconds patience);
 

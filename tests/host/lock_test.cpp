@@ -117,10 +117,9 @@ TEST_F(Lock, IsNotTakenThroughALink)
     ASSERT_EQ(unlink(repo.pathTo(".tav/tav.lock").c_str()), 0);
     repo.makeLink(".tav/tav.lock", elsewhere.pathTo("precious"));
     EXPECT_EQ(
-        tav({"add", "a.dwg"}),
-        failed(
-            "tav: The repository cannot be locked: Too many levels of symbolic links. Check your rights to '" +
-            repo.pathTo(".tav") + "'.\n"));
+        tav({"add", "a.dwg"}), failed(
+                                   "tav: The repository cannot be locked: Too many levels of symbolic links. Move '" +
+                                   repo.pathTo(".tav/tav.lock") + "' away; the next command makes a new one.\n"));
     EXPECT_EQ(elsewhere.read("precious"), "content");
 }
 

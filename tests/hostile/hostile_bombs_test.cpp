@@ -1,0 +1,147 @@
+// Small files that unfold into a lot. The commands on them run with little memory.
+#include "host/failure.h"
+#include "host/server/commit_document.h"
+#include "host/text/wide.h"
+
+#include "tests/host/history_test.h"
+#include "tests/host/run_here.h"
+#include "tests/support/sanitized.h"
+
+#include <gmock/gmock.h>
+
+#include <sys/resource.h>
+
+namespace host_tests {
+namespace {
+
+using testing::AnyOf;
+using testing::HasSubstr;
+
+std::string repeated(std::string const& text, std::size_t count)
+{
+    std::string result;
+    result.reserve(text.size() * count);
+    for (std::size_t i = 0; i < count; ++i) {
+        result += text;
+    }
+    return result;
+}
+
+/// The address sanitizer takes terabytes of addresses for itself.
+void limitMemory(rlim_t bytes)
+{
+    rlimit const limit{bytes, bytes};
+    if (!support::kIsSanitized && setrlimit(RLIMIT_AS, &limit) != 0) {
+        _exit(99);
+    }
+}
+
+constexpr rlim_t kMemory = rlim_t{512} << 20U;
+
+class Bombs : public HistoryTest {
+protected:
+    Outcome limited(Arguments const& arguments, std::vector<std::string> const& environment = {}) const
+    {
+        Setting with = setting();
+        with.environment = environment;
+        Process process(with, [&] {
+            limitMemory(kMemory);
+            return runHere(arguments);
+        });
+        return process.wait();
+    }
+};
+
+struct Bomb {
+    char const* name;
+    std::string (*text)();
+};
+
+std::string withMember(std::string const& member)
+{
+    return R"({"head": {"reference": "master"}, "projects_map": [], "more": )" + member + "}";
+}
+
+std::vector<Bomb> const kBombs = {
+    {"Nested", [] { return withMember(repeated("[", 3'000'000) + repeated("]", 3'000'000)); }},
+    {"NestedObjects", [] { return withMember(repeated("{\"a\":", 1'000'000) + "1" + repeated("}", 1'000'000)); }},
+    {"NestedAndOpen", [] { return withMember(repeated("[", 3'000'000)); }},
+    {"LongText", [] { return withMember('"' + std::string(100'000'000, 'x') + '"'); }},
+    {"LongTextWithoutEnd", [] { return withMember('"' + std::string(20'000'000, 'x')); }},
+    {"LongNumber", [] { return withMember(std::string(10'000'000, '9')); }},
+    {"OneKeyAMillionTimes",
+     [] { return "{" + repeated(R"("head": {"reference": "master"}, )", 1'000'000) + R"("a": 1})"; }},
+    {"Escapes", [] { return withMember('"' + repeated("\\u0041", 2'000'000) + '"'); }},
+};
+
+class BombInAFile
+    : public Bombs
+    , public testing::WithParamInterface<Bomb> {};
+
+/// It is read, or refused with what to do; then nothing has changed.
+void expectAnswer(Outcome const& outcome)
+{
+    bool const isTold = outcome.code == 1 && outcome.err.compare(0, 5, "tav: ") == 0 && outcome.err.size() < 1000;
+    EXPECT_TRUE(outcome.code == 0 || isTold) << outcome.code << " " << outcome.err.substr(0, 1000);
+}
+
+TEST_P(BombInAFile, IsAnsweredWhereTheStateStands)
+{
+    std::string const text = GetParam().text();
+    repo.write(".tav/tav.state", text);
+    repo.write("a.dwg", "new");
+    for (Arguments const& command : {Arguments{"status"}, {"unstage", "--all"}}) {
+        Outcome const outcome = limited(command);
+        expectAnswer(outcome);
+        EXPECT_TRUE(outcome.code == 0 || repo.read(".tav/tav.state") == text);
+    }
+}
+
+TEST_P(BombInAFile, IsAnsweredWhereTheListOfProjectsStands)
+{
+    support::TempFolder const config;
+    std::string const text = GetParam().text();
+    config.write("tav/directories.state", text);
+    expectAnswer(limited({"projects"}, {"XDG_CONFIG_HOME=" + config.path()}));
+    EXPECT_TRUE(config.read("tav/directories.state") == text);
+}
+
+TEST_P(BombInAFile, IsAnsweredWhereTheRulesStand)
+{
+    std::string const text = GetParam().text();
+    repo.ignore(text);
+    for (Arguments const& command : {Arguments{"status"}, {"add", "--all"}}) {
+        Outcome const outcome = limited(command);
+        expectAnswer(outcome);
+        EXPECT_EQ(outcome.code, 1);
+    }
+    EXPECT_TRUE(repo.read(".tav/properties/ignore") == text);
+}
+
+TEST_P(BombInAFile, IsRefusedAsADocumentForTheServer)
+{
+    Process process(setting(), [&] {
+        limitMemory(4 * kMemory);
+        try {
+            tav::readCommitInfo(tav::wide(GetParam().text()));
+        } catch (tav::Failure const&) {
+            return 1;
+        } catch (std::bad_alloc const&) {
+            return 2;
+        }
+        return 0;
+    });
+    EXPECT_THAT(process.wait().code, AnyOf(1, 2));
+}
+
+INSTANTIATE_TEST_SUITE_P(Kinds, BombInAFile, testing::ValuesIn(kBombs), rowName<Bomb>);
+
+TEST_F(Bombs, OfManyRulesAreAnswered)
+{
+    repo.write("a.dwg", "new");
+    repo.ignore(repeated("^.*\\.bak$\n", 20'000) + "^ignore$\n");
+    EXPECT_EQ(limited({"files"}), done("a.dwg\n"));
+}
+
+} // namespace
+} // namespace host_tests
