@@ -396,7 +396,7 @@ bool NameFilter::matchesSimple(Rule const& rule, std::string const& name)
 bool NameFilter::matches(std::string const& name) const
 {
     // `.` matches no line end, so a name that holds one is left to the expressions.
-    bool const hasLineEnd = name.find_first_of("\r\n") != name.npos;
+    bool const hasLineEnd = std::any_of(name.begin(), name.end(), [](char c) { return c == '\n' || c == '\r'; });
     return std::any_of(rules_.begin(), rules_.end(), [&](Rule const& rule) {
         return hasLineEnd ? matchesWhole(rule.expression, name) : matchesSimple(rule, name);
     });

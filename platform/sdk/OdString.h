@@ -73,7 +73,15 @@ public:
 
     /// Both texts, one behind the other.
     ///@{
-    friend OdString operator+(OdString left, OdString const& right) { return left += right, left; }
+    friend OdString operator+(OdString const& left, OdString const& right)
+    {
+        std::wstring text;
+        text.reserve(left.text_.size() + right.text_.size());
+        text += left.text_;
+        text += right.text_;
+        return OdString(std::move(text));
+    }
+    friend OdString operator+(OdString&& left, OdString const& right) { return std::move(left += right); }
     friend OdString operator+(OdString left, wchar_t const* right) { return left += right, left; }
     friend OdString operator+(OdString left, wchar_t right) { return left += right, left; }
     ///@}
