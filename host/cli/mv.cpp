@@ -4,6 +4,7 @@
 #include "host/paths/recorded_path.h"
 #include "host/repository/changes.h"
 #include "host/repository/file_moves.h"
+#include "host/repository/last_commit.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/staging.h"
@@ -95,6 +96,24 @@ std::vector<Move> movesOf(OdString const& from, OdString const& to, std::vector<
     return moves;
 }
 
+/// The files that are back where the last commit has them, with another content than it has. Where they come from the
+/// next commit would have taken that content; so it does here.
+std::vector<common::StagedFile>
+changedAndBack(std::vector<Move> const& moves, common::State const& state, common::RootPath const& root)
+{
+    std::vector<common::StagedFile> changed;
+    Tree const committed = lastCommitFiles(root);
+    for (Move const& move : moves) {
+        auto const rename = state.renames.find(move.from);
+        auto const file = committed.find(move.to);
+        bool const isBack = rename != state.renames.end() && rename->second == move.to && file != committed.end();
+        if (isBack && hasOtherContent(move.to, file->second, root)) {
+            changed.emplace_back(move.to, common::FileChange::modified);
+        }
+    }
+    return changed;
+}
+
 } // namespace
 
 void moveFiles(std::string const& typedFrom, std::string const& typedTo)
@@ -114,7 +133,11 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     checkFolders(to, root);
     FileMoves onDisk;
     onDisk.move(root.pathTo(from).ansi_str(), root.pathTo(to).ansi_str());
-    changeState(root, [&](common::Cache& cache) { stageMoves(moves, cache.write()); });
+    changeState(root, [&](common::Cache& cache) {
+        std::vector<common::StagedFile> const changed = changedAndBack(moves, cache.read(), root);
+        stageMoves(moves, cache.write());
+        stage(changed, cache.write());
+    });
     onDisk.keep();
     print("Renamed '" + shown(from) + "' to '" + shown(to) + "'.\n");
 }

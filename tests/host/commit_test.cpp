@@ -397,5 +397,22 @@ TEST_F(Commit, IsShownWithItsControlCharactersEscapedOnATerminal)
     }
 }
 
+TEST_F(Commit, TakesTheChangedContentOfAFileThatWasMovedThereAndBack)
+{
+    repo.write("a.dwg", "old");
+    repo.write("b.dwg", "same");
+    commitAll("first");
+    repo.write("a.dwg", "new");
+    tav({"add", "a.dwg"});
+    tav({"mv", "a.dwg", "away.dwg"});
+    tav({"mv", "b.dwg", "off.dwg"});
+    tav({"mv", "away.dwg", "a.dwg"});
+    tav({"mv", "off.dwg", "b.dwg"});
+    EXPECT_EQ(values({"status"}, "path"), (std::vector<std::string>{"a.dwg"}));
+    EXPECT_EQ(values({"status"}, "change"), (std::vector<std::string>{"modified"}));
+    EXPECT_EQ(tav({"commit", "-m", "second", "--author", "ann@studio"}).code, 0);
+    EXPECT_EQ(status(), kClean);
+}
+
 } // namespace
 } // namespace host_tests
