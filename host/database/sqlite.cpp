@@ -169,8 +169,8 @@ Change::~Change()
     }
     try {
         database_.run("ROLLBACK");
-    } catch (Failure const&) {
-        // The journal undoes the change when the database is opened next.
+    } catch (...) {
+        // There may be no memory even for the message. The journal undoes the change when the database is opened next.
     }
 }
 

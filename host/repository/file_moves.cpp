@@ -21,8 +21,11 @@ bool entryExists(std::string const& path)
 FileMoves::~FileMoves()
 {
     for (auto move = done_.rbegin(); move != done_.rend(); ++move) {
-        // Nobody is left to tell; the file lies whole under its new name.
-        [[maybe_unused]] std::error_code const ignored = os::moveEntry(move->second, move->first);
+        try {
+            [[maybe_unused]] std::error_code const ignored = os::moveEntry(move->second, move->first);
+        } catch (...) {
+            // Nobody is left to tell; the file lies whole under its new name.
+        }
     }
 }
 

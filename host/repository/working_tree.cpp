@@ -185,7 +185,14 @@ public:
     }
     Restored(Restored const&) = delete;
     Restored& operator=(Restored const&) = delete;
-    ~Restored() { removeAll(); }
+    ~Restored()
+    {
+        try {
+            removeAll();
+        } catch (...) {
+            // There is no memory; the next command removes what is left.
+        }
+    }
 
     std::string pathOf(std::size_t number) const { return folder_ + "/" + std::to_string(number); }
 

@@ -11,16 +11,30 @@
 
 namespace host_tests {
 
+/// A command line as the system hands it over. The arguments outlive it.
+class Words {
+public:
+    explicit Words(Arguments const& arguments)
+    {
+        for (std::string const& argument : arguments) {
+            words_.push_back(const_cast<char*>(argument.c_str()));
+        }
+        words_.push_back(nullptr);
+    }
+
+    int count() const { return static_cast<int>(words_.size() - 1); }
+    char** begin() { return words_.data(); }
+
+private:
+    std::vector<char*> words_ = {const_cast<char*>("tav")};
+};
+
 /// Runs the command that `arguments` name and returns its exit code. It prints on the streams of this process: call it
 /// in a `Process`.
 inline int runHere(Arguments const& arguments)
 {
-    std::vector<char*> words = {const_cast<char*>("tav")};
-    for (std::string const& argument : arguments) {
-        words.push_back(const_cast<char*>(argument.c_str()));
-    }
-    words.push_back(nullptr);
-    return tav::run(static_cast<int>(words.size() - 1), words.data());
+    Words words(arguments);
+    return tav::run(words.count(), words.begin());
 }
 
 } // namespace host_tests

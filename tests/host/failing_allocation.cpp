@@ -1,0 +1,101 @@
+#include "tests/host/failing_allocation.h"
+
+#include <cstdlib>
+#include <new>
+#include <sqlite3.h>
+
+namespace {
+
+struct Plan {
+    bool isActive = false;
+    bool goesOn = false;
+    long failing = 0;
+    long count = 0; // requests so far
+};
+
+Plan plan;
+sqlite3_mem_methods ofSqlite;
+
+bool mustFail() noexcept
+{
+    if (!plan.isActive) {
+        return false;
+    }
+    long const number = plan.count++;
+    return plan.goesOn ? number >= plan.failing : number == plan.failing;
+}
+
+void* requestForSqlite(int size)
+{
+    return mustFail() ? nullptr : ofSqlite.xMalloc(size);
+}
+
+void* repeatForSqlite(void* memory, int size)
+{
+    return mustFail() ? nullptr : ofSqlite.xRealloc(memory, size);
+}
+
+/// The settings count from the next start of SQLite.
+void setForSqlite(sqlite3_mem_methods& methods)
+{
+    sqlite3_shutdown();
+    sqlite3_config(SQLITE_CONFIG_MALLOC, &methods);
+    sqlite3_config(SQLITE_CONFIG_LOOKASIDE, 0, 0); // Small pieces are requests too.
+}
+
+} // namespace
+
+void* operator new(std::size_t size)
+{
+    void* const memory = mustFail() ? nullptr : std::malloc(size == 0 ? 1 : size);
+    if (memory == nullptr) {
+        throw std::bad_alloc();
+    }
+    return memory;
+}
+
+void operator delete(void* memory) noexcept
+{
+    std::free(memory);
+}
+
+void operator delete(void* memory, std::size_t /*size*/) noexcept
+{
+    std::free(memory);
+}
+
+namespace host_tests {
+
+FailingAllocation::FailingAllocation(long n, Lasts lasts)
+{
+    sqlite3_shutdown();
+    sqlite3_config(SQLITE_CONFIG_GETMALLOC, &ofSqlite);
+    sqlite3_mem_methods failing = ofSqlite;
+    failing.xMalloc = requestForSqlite;
+    failing.xRealloc = repeatForSqlite;
+    setForSqlite(failing);
+    plan = {false, lasts == Lasts::on, n, 0};
+}
+
+FailingAllocation::~FailingAllocation()
+{
+    end();
+    setForSqlite(ofSqlite);
+}
+
+void FailingAllocation::begin()
+{
+    plan.isActive = true;
+}
+
+bool FailingAllocation::hasFailed()
+{
+    return plan.count > plan.failing;
+}
+
+void FailingAllocation::end()
+{
+    plan.isActive = false;
+}
+
+} // namespace host_tests
