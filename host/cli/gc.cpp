@@ -3,6 +3,7 @@
 #include "host/cli/output.h"
 #include "host/failure.h"
 #include "host/repository/open.h"
+#include "host/repository/removed_files.h"
 #include "host/repository/server_of.h"
 #include "host/repository/work.h"
 #include "host/storage/local_storage.h"
@@ -22,9 +23,20 @@ void collectGarbage()
     Freed const freed = valueOrFail(
         storage.keepOnly(work.root(), std::set<OdString>(urls.begin(), urls.end())),
         "Run 'tav verify' to see whether anything is damaged.");
+    RemovedFiles const files = cleanRemovedFiles(work.root(), work.database(), storage);
     print(
         "Removed " + counted(freed.contents, "stored version") + " that no commit needs; " + sizeText(freed.bytes) +
         " freed.\n");
+    if (files.freed.contents > 0) {
+        print(
+            "Removed " + counted(files.freed.contents, "file") + " that a killed 'tav rm' had left; " +
+            sizeText(files.freed.bytes) + " freed.\n");
+    }
+    for (std::string const& file : files.kept) {
+        printNote(
+            "'" + file +
+            "' is left of a killed 'tav rm' and holds what no commit has. Keep it elsewhere or delete it.");
+    }
 }
 
 } // namespace tav
