@@ -1,8 +1,10 @@
 #include "common/mu_common_pattern.h"
 
 #include <algorithm>
+#include <array>
 #include <cstddef>
 #include <locale>
+#include <numeric>
 #include <string_view>
 #include <utility>
 #include <vector>
@@ -181,8 +183,24 @@ private:
     bool quantifiedGroup_ = false;
 };
 
+/// The standard library notes in the classic locale which characters it has been asked about, without any guard: what
+/// it has been asked about all of them at once, it only reads.
+void askAboutAllCharacters()
+{
+    static bool const isDone = [] {
+        std::array<char, 256> characters{};
+        std::iota(characters.begin(), characters.end(), '\0');
+        std::array<char, 256> narrow{};
+        auto const& type = std::use_facet<std::ctype<char>>(std::locale::classic());
+        type.narrow(characters.data(), characters.data() + characters.size(), '\0', narrow.data());
+        return true;
+    }();
+    static_cast<void>(isDone);
+}
+
 std::regex compile(std::string const& expression, std::regex::flag_type flags)
 {
+    askAboutAllCharacters();
     std::regex compiled;
     compiled.imbue(std::locale::classic());
     compiled.assign(expression, flags);

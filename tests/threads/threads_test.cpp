@@ -26,6 +26,15 @@
 #include <string>
 #include <thread>
 
+#ifdef __SANITIZE_THREAD__
+// wxWidgets is not built for the sanitizer, which cannot see how its static objects are guarded.
+// NOLINTNEXTLINE(bugprone-reserved-identifier)
+extern "C" __attribute__((visibility("default"))) char const* __tsan_default_suppressions()
+{
+    return "race:libwx_base";
+}
+#endif
+
 namespace {
 
 using common::Cache;
@@ -103,8 +112,9 @@ TEST(CopiesOfARoot, AreReadByEachThread)
     common::RootPath const root = repository.root();
     Results results;
     onTwoThreads([&](int number) {
-        common::RootPath const own = root;
         for (int i = 0; i < kRounds; ++i) {
+            common::RootPath own(L"/");
+            own = root;
             results[static_cast<std::size_t>(number)] = own.relativePathTo(own.statePath()).value().ansi_str();
         }
     });
@@ -332,7 +342,8 @@ TEST(HistoryItems, AreUsedOnAThreadEach)
     common::HistoryItem const shared(date, L"ann@studio", L"moves the stairs", L"", 1);
     onTwoThreads([&](int number) {
         for (int i = 0; i < kRounds; ++i) {
-            common::HistoryItem const own = shared;
+            common::HistoryItem own = shared;
+            own.detail = numbered(L"of thread ", number);
             results[static_cast<std::size_t>(number)] = own.getName().toStdString() + own.getInfo().toStdString();
         }
     });
