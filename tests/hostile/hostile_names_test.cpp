@@ -107,7 +107,7 @@ TEST_F(Names, ThatAreNoTextComeBackByteForByte)
         {"$(rm -rf x) `y` 'z' \"q\" %ls%n.dwg", "quotes"},
         {" *?~#;&|<>! ", "blanks around"},
         {"-", "a dash"},
-        {"\xe2\x80\xae.dwg", "a direction"}};
+        {"\xe2\x81\xa6.dwg\xe2\x81\xa9", "a direction"}};
     write(first);
     ASSERT_EQ(commitAll("first").code, 0);
     EXPECT_EQ(status(), kClean);

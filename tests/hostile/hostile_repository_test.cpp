@@ -18,7 +18,6 @@ namespace host_tests {
 namespace {
 
 using testing::MatchesRegex;
-using testing::StartsWith;
 
 /// A repository with a commit and a new file.
 class OddRepository : public HistoryTest {
