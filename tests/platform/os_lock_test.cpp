@@ -8,6 +8,7 @@
 #include <string>
 #include <sys/stat.h>
 #include <system_error>
+#include <unistd.h>
 #include <utility>
 
 namespace {
@@ -74,7 +75,17 @@ TEST(FileLock, FollowsNoLinkAndWaitsForNoPipe)
     EXPECT_EQ(acquire(lock, folder, "somebody"), fails(ELOOP));
     EXPECT_EQ(folder.read("target"), "kept");
     ASSERT_EQ(mkfifo(folder.pathTo("pipe").c_str(), 0600), 0);
-    EXPECT_EQ(lock.acquire(folder.pathTo("pipe"), "somebody", milliseconds(0)), std::error_code());
+    EXPECT_EQ(lock.acquire(folder.pathTo("pipe"), "somebody", milliseconds(0)), fails(ENOTSUP));
+}
+
+TEST(FileLock, WritesNothingIntoAFileWithOtherNames)
+{
+    TempFolder const folder;
+    folder.write("target", "kept");
+    ASSERT_EQ(link(folder.pathTo("target").c_str(), folder.pathTo("lock").c_str()), 0);
+    os::FileLock lock;
+    EXPECT_EQ(acquire(lock, folder, "somebody"), fails(EMLINK));
+    EXPECT_EQ(folder.read("target"), "kept");
 }
 
 TEST(FileLock, IsHeldOnAFullDiskToo)
