@@ -6,8 +6,10 @@
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
+#include <fcntl.h>
 #include <limits>
 #include <type_traits>
+#include <unistd.h>
 
 namespace support {
 namespace {
@@ -16,6 +18,7 @@ struct Plan {
     bool active = false;
     int failing = 0; // the number of the call that fails
     int error = 0;
+    FailingCall::Lasts lasts = FailingCall::Lasts::once;
     int count = 0; // calls so far
     char const* failed = nullptr;
 };
@@ -23,16 +26,30 @@ struct Plan {
 Plan plan;
 os::Calls real;
 
-bool mustFail(char const* name)
+bool isHit(int number, bool needsRoom)
 {
-    if (plan.count++ != plan.failing) {
+    if (plan.lasts == FailingCall::Lasts::once) {
+        return number == plan.failing;
+    }
+    return number >= plan.failing && (needsRoom || plan.error != ENOSPC);
+}
+
+bool mustFail(char const* name, bool needsRoom)
+{
+    if (!isHit(plan.count++, needsRoom)) {
         return false;
     }
     if (plan.error == FailingCall::kKillProcess) {
         std::raise(SIGKILL);
     }
-    plan.failed = name;
+    plan.failed = plan.failed == nullptr ? name : plan.failed;
     return true;
+}
+
+bool makesFile(int folder, char const* path, int flags, mode_t /*mode*/)
+{
+    bool const isUnnamed = (flags & O_TMPFILE) == O_TMPFILE;
+    return isUnnamed || ((flags & O_CREAT) != 0 && faccessat(folder, path, F_OK, AT_SYMLINK_NOFOLLOW) == -1);
 }
 
 template <auto Member>
@@ -42,9 +59,24 @@ template <class Result, class... Arguments, Result (*os::Calls::*Member)(Argumen
 struct StandIn<Member> {
     static inline char const* name = nullptr;
 
+    static bool needsRoom([[maybe_unused]] Arguments... arguments)
+    {
+        if constexpr (std::is_same_v<StandIn, StandIn<&os::Calls::openat>>) {
+            return makesFile(arguments...);
+        }
+        return isAnyOf<
+            &os::Calls::write, &os::Calls::pwrite, &os::Calls::linkat, &os::Calls::mkdir, &os::Calls::mkdirat>();
+    }
+
+    template <auto... Members>
+    static constexpr bool isAnyOf()
+    {
+        return (std::is_same_v<StandIn, StandIn<Members>> || ...);
+    }
+
     static Result call(Arguments... arguments)
     {
-        if (!mustFail(name)) {
+        if (!mustFail(name, needsRoom(arguments...))) {
             return (real.*Member)(arguments...);
         }
         if constexpr (std::is_same_v<StandIn, StandIn<&os::Calls::close>>) {
@@ -89,13 +121,13 @@ void standInForAll()
 
 } // namespace
 
-FailingCall::FailingCall(int n, int error)
+FailingCall::FailingCall(int n, int error, Lasts lasts)
 {
     if (plan.active) {
         std::fputs("FailingCall: one is active already\n", stderr);
         std::abort();
     }
-    plan = {true, n, error, 0, nullptr};
+    plan = {true, n, error, lasts, 0, nullptr};
     real = os::calls();
     standInForAll();
 }
