@@ -114,6 +114,23 @@ void writeState(State const& state, Array stagedFiles, Generator& out)
     out.end();
 }
 
+/// About how long the text of `state` will be, as if nothing had to be escaped.
+std::size_t expectedLength(State const& state)
+{
+    constexpr std::size_t kAroundRecord = 200; // and around a rename or a staged file, less
+    std::size_t length = kAroundRecord * (state.index.size() + state.renames.size() + state.stagedFiles.size());
+    for (auto const& [path, data] : state.index) {
+        length += path.getLength();
+    }
+    for (auto const& [path, previous] : state.renames) {
+        length += path.getLength() + previous.getLength();
+    }
+    for (StagedFile const& file : state.stagedFiles) {
+        length += file.path.getLength();
+    }
+    return length;
+}
+
 /// The index is most of a large state: its text is written straight from it, without a value between the two.
 Expected<std::wstring> textOf(State const& state)
 {
@@ -121,8 +138,7 @@ Expected<std::wstring> textOf(State const& state)
     if (!stagedFiles.hasValue()) {
         return stagedFiles.error();
     }
-    std::size_t const perRecord = state.index.empty() ? 0 : 200 + state.index.begin()->first.getLength();
-    return kutils::json::detail::write_pieces(state.index.size() * perRecord, true, [&](Generator& out) {
+    return kutils::json::detail::write_pieces(expectedLength(state), true, [&](Generator& out) {
         writeState(state, std::move(stagedFiles).visit(GetRValueOrThrow<Array>{}), out);
     });
 }

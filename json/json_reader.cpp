@@ -384,6 +384,7 @@ bool Parser<Value, Iterator>::get(Value& out, bool closeAllowed)
     }
     Value root;
     open_.clear();
+    handedOver_ = nullptr;
     place(root, token);
     while (!open_.empty()) {
         readItem();

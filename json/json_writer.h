@@ -82,7 +82,8 @@ public:
     void output_array_or_obj(Container const& container, Char open, Char close);
 
     /// Write a document piece by piece, for one that is too large to be made as a value first: containers are begun and
-    /// ended, a member is a key and then a value or container, an element is announced in the same way.
+    /// ended, a member is a key and then a value or container, an element is announced in the same way. The operations
+    /// above are not for such a document: they end all that is open.
     ///@{
     void begin_object() { begin({L'}'}, L'{'); }
     void begin_array() { begin({L']'}, L'['); }
@@ -91,6 +92,9 @@ public:
     void value(Value const& value);
     void value(std::basic_string_view<Char> text) { placeText(text); }
     void value(bool value) { place(value); }
+    /// Only a bool is written as one, not any pointer that happens to come by.
+    template <class T>
+    void value(T const*) = delete;
     void value(std::uint64_t value);
     /// Ends the innermost container.
     void end() { leave(); }

@@ -187,6 +187,7 @@ std::vector<std::int64_t> CommitTables::line(OdString const& hash) const
 
 Tree CommitTables::files(OdString const& hash) const
 {
+    Snapshot const snapshot(*database_);
     // Asked for commit by commit, the rows come in the order of the table; all at once, they would be sorted on disk.
     Statement rows =
         database_->prepare("SELECT path, url FROM changes WHERE repository = ? AND number = ? ORDER BY path");

@@ -53,15 +53,6 @@ Statement& Statement::with(OdString const& text)
     return *this;
 }
 
-Statement& Statement::withNull()
-{
-    int const code = sqlite3_bind_null(handle_.get(), ++parameters_);
-    if (code != SQLITE_OK) {
-        database_->fail(code);
-    }
-    return *this;
-}
-
 bool Statement::next()
 {
     int const code = sqlite3_step(handle_.get());
@@ -155,6 +146,21 @@ std::string Database::damage() const
 void Database::fail(int code) const
 {
     throw Failure("The database '" + path_ + "' cannot be used: " + sqlite3_errstr(code) + ".", adviceFor(code, path_));
+}
+
+// A savepoint, unlike a transaction, may stand inside of a change.
+Snapshot::Snapshot(Database& database) : database_(database)
+{
+    database_.run("SAVEPOINT reading");
+}
+
+Snapshot::~Snapshot()
+{
+    try {
+        database_.run("RELEASE reading");
+    } catch (...) {
+        // There may be no memory even for the message. Closing the database ends it as well.
+    }
 }
 
 Change::Change(Database& database) : database_(database)

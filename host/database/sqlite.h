@@ -24,7 +24,6 @@ public:
     /// Sets the next parameter, in the order of the statement.
     Statement& with(std::int64_t value);
     Statement& with(OdString const& text);
-    Statement& withNull();
 
     /// Goes to the next row; false behind the last. The statement can then be given new parameters and run again.
     bool next();
@@ -74,6 +73,19 @@ public:
 private:
     std::string path_;
     std::unique_ptr<sqlite3, int (*)(sqlite3*)> handle_;
+};
+
+/// While it lives everything that is read is of one moment, whatever others change meanwhile. Other programs have to
+/// wait with their changes, so it is not held for long.
+class Snapshot {
+public:
+    explicit Snapshot(Database& database);
+    Snapshot(Snapshot const&) = delete;
+    Snapshot& operator=(Snapshot const&) = delete;
+    ~Snapshot();
+
+private:
+    Database& database_;
 };
 
 /// Makes changes one: all of them are in the file when `commit` returns, and none when it is not called or a crash

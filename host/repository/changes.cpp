@@ -44,16 +44,17 @@ void readTimes(CommittedFiles::iterator first, CommittedFiles::iterator last, co
 void readTimes(CommittedFiles& files, common::RootPath const& root)
 {
     auto const middle = files.begin() + static_cast<std::ptrdiff_t>(files.size() / 2);
-    auto const other = std::async(std::launch::async, [&] { readTimes(middle, files.end(), root); });
+    auto other = std::async([&] { readTimes(middle, files.end(), root); }); // Or later, where no thread is to be had.
     readTimes(files.begin(), middle, root);
+    other.get();
 }
 
 using Index = std::map<OdString, common::IndexData>;
 
 /// Goes through the index beside a list of paths that is in the same order, which saves looking each path up.
-class IndexReader {
+class IndexCursor {
 public:
-    explicit IndexReader(Index const& index) : next_(index.begin()), end_(index.end()) {}
+    explicit IndexCursor(Index const& index) : next_(index.begin()), end_(index.end()) {}
 
     /// Whether the index says that `file`, which comes behind the ones asked for before, is as it was committed.
     bool isUntouched(CommittedFile const& file)
@@ -111,7 +112,7 @@ common::RepoChanges
 compare(common::RootPath const& root, FolderMatch match, common::State const& state, VerifiedTimes* verified)
 {
     common::RepoChanges changes;
-    IndexReader index(state.index);
+    IndexCursor index(state.index);
     for (CommittedFile& file : match.committed) {
         bool const isUntouched = file.isThere && index.isUntouched(file);
         bool const isUnchanged = isUntouched || (file.isThere && !hasOtherContent(file.path, file.url, root));

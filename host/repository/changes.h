@@ -29,7 +29,8 @@ struct FolderMatch {
     std::vector<common::File> untracked;
 };
 
-/// Finds out what there is of the files `committed`, and what else. Reads no file. Throws as `scan` does.
+/// Finds out what there is of the files `committed`, and what else. Reads no file. Throws as `scan` does. Asks the disk
+/// in two threads, where a second one is to be had.
 FolderMatch matchFolder(common::RootPath const& root, Tree committed);
 
 /// The same for files that are `scanned` already.

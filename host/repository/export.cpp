@@ -3,6 +3,7 @@
 #include "host/failure.h"
 #include "host/paths/recorded_path.h"
 #include "host/progress.h"
+#include "host/repository/working_tree.h"
 #include "host/storage/local_storage.h"
 
 #include "platform/os/os_batch.h"
@@ -59,7 +60,7 @@ std::size_t exportFiles(common::RootPath const& root, Tree const& files, std::st
         if (!isExported(path)) {
             continue;
         }
-        valueOrFail(storage.extract(root, url, incoming), "Run 'tav verify' to see what is damaged.");
+        extract(root, storage, {path, url}, incoming);
         if (std::error_code const error = batch.place(incoming, path.ansi_str())) {
             [[maybe_unused]] std::error_code const ignored = batch.remove(".tav-export");
             throw Failure("'" + path.ansi_str() + "' cannot be written: " + error.message() + ".", "Try again.");

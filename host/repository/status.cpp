@@ -89,9 +89,8 @@ std::vector<common::ConflictInfo> conflictsOf(common::RootPath const& root)
     return conflicts;
 }
 
-void enterPlace(LocalDatabase const& database, common::State const& state, Status& status)
+void enterPlace(LocalDatabase const& database, OdString const& base, common::State const& state, Status& status)
 {
-    OdString const base = database.base();
     auto const commit = database.commits().find(base);
     auto const end = database.commits().reference(state.head);
     status.branch = state.head;
@@ -115,20 +114,27 @@ void enterRenames(Renames const& renames, Paths& left, Status& status)
     }
 }
 
+/// Enters where the working folder stands, and gives the files of that commit.
+Tree readHistory(LocalDatabase& database, common::State const& state, Status& status)
+{
+    Snapshot const snapshot(database.database());
+    OdString const base = database.base();
+    enterPlace(database, base, state, status);
+    return database.commits().files(base);
+}
+
 } // namespace
 
 Status statusOf(common::RootPath const& root, bool withIgnored)
 {
     // Looking for the files takes as long as reading what is known of them.
-    auto scanning = std::async(std::launch::async, [&] { return scan(root); });
+    auto scanning = std::async([&] { return scan(root); });
     auto const cache = readState(root);
     common::State const& state = cache->read();
-    LocalDatabase const database = LocalDatabase::open(root);
-    Tree committed = database.commits().files(database.base());
-    FolderMatch match = matchFolder(root, scanning.get(), std::move(committed));
-
+    LocalDatabase database = LocalDatabase::open(root);
     Status status;
-    enterPlace(database, state, status);
+    Tree committed = readHistory(database, state, status);
+    FolderMatch match = matchFolder(root, scanning.get(), std::move(committed));
     status.conflicts = conflictsOf(root);
     status.staged = stagedEntries(state, match, root);
     common::RepoChanges changes = compare(root, std::move(match), state);

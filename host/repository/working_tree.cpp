@@ -216,18 +216,6 @@ void requireDone(std::error_code const& error, OdString const& path, char const*
     }
 }
 
-void extract(
-    common::RootPath const& root, LocalStorage& storage, Tree::value_type const& file, std::string const& target)
-{
-    auto const& [path, url] = file;
-    if (auto const done = storage.extract(root, url, target); !done.hasValue()) {
-        bool const isDamaged = !storage.verify(root, url).hasValue();
-        throw Failure(
-            "'" + path.ansi_str() + "' cannot be brought back: " + done.error().message.ansi_str(),
-            isDamaged ? "Run 'tav verify' to see what is damaged." : "Check the free space.");
-    }
-}
-
 WrittenTimes extractAll(
     common::RootPath const& root, LocalStorage& storage, Tree const& files, std::uint64_t time,
     Restored const& restored)
@@ -295,6 +283,18 @@ void addLeftovers(Tree const& begun, Tree const& to, TreeUpdate& update)
 }
 
 } // namespace
+
+void extract(
+    common::RootPath const& root, LocalStorage& storage, Tree::value_type const& file, std::string const& target)
+{
+    auto const& [path, url] = file;
+    if (auto const done = storage.extract(root, url, target); !done.hasValue()) {
+        bool const isDamaged = !storage.verify(root, url).hasValue();
+        throw Failure(
+            "'" + path.ansi_str() + "' cannot be brought back: " + done.error().message.ansi_str(),
+            isDamaged ? "Run 'tav verify' to see what is damaged." : "Check the free space.");
+    }
+}
 
 TreeUpdate updateBetween(Tree const& from, std::vector<Tree> const& begun, Tree const& to)
 {

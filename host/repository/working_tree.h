@@ -50,4 +50,8 @@ WrittenTimes carryOut(
     common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start,
     std::function<void()> const& begin = [] {});
 
+/// Writes the content of `file` to the path `target`. Throws `Failure`, whose advice tells damage from a full disk.
+void extract(
+    common::RootPath const& root, LocalStorage& storage, Tree::value_type const& file, std::string const& target);
+
 } // namespace tav

@@ -2,6 +2,7 @@
 
 #include "host/paths/recorded_path.h"
 #include "host/server/document.h"
+#include "host/storage/storage_url.h"
 #include "host/text/characters.h"
 
 #include "common/mu_common_json_keys.h"
@@ -25,11 +26,6 @@ bool isDigit(wchar_t c)
     return c >= L'0' && c <= L'9';
 }
 
-bool isLetter(wchar_t c)
-{
-    return (c >= L'a' && c <= L'z') || (c >= L'A' && c <= L'Z');
-}
-
 bool isLowerHex(wchar_t c)
 {
     return isDigit(c) || (c >= L'a' && c <= L'f');
@@ -38,11 +34,6 @@ bool isLowerHex(wchar_t c)
 bool isHex(wchar_t c)
 {
     return isLowerHex(c) || (c >= L'A' && c <= L'F');
-}
-
-bool isStoreCharacter(wchar_t c)
-{
-    return isLetter(c) || isDigit(c) || c == L'-' || c == L'_';
 }
 
 template <class Predicate>
@@ -372,15 +363,7 @@ bool isHash(OdString const& hash)
 
 bool isContentUrl(OdString const& url)
 {
-    if (beginsWith(url, L"po:")) {
-        return isHash(url.mid(3));
-    }
-    if (!beginsWith(url, L"tf:") || url.getLength() < kHashLength + 5) {
-        return false;
-    }
-    OdString const name = url.mid(3, url.getLength() - kHashLength - 4);
-    bool const hasMark = url.getAt(url.getLength() - kHashLength - 1) == L'#';
-    return hasMark && isHash(url.right(kHashLength)) && name.getLength() <= kLongestName && all(name, isStoreCharacter);
+    return parseUrl(url).has_value();
 }
 
 std::optional<std::int64_t> secondsOf(OdString const& time)

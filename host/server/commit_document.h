@@ -36,8 +36,7 @@ OdString readRepositoryName(OdString const& document);
 /// Whether `hash` is the name of a commit or content: 64 lower-case hexadecimal digits.
 bool isHash(OdString const& hash);
 
-/// Whether `url` names a content in the object folder ("po:" and a hash) or in a revision store ("tf:", a name of
-/// letters, digits, '-' and '_', "#" and a hash).
+/// Whether `url` names a content that a client can store and find: it has one of the two forms of `parseUrl`.
 bool isContentUrl(OdString const& url);
 
 /// The second of a time written as "2024-03-05T14:07:09Z"; none for any other text.

@@ -45,6 +45,7 @@ void setForSqlite(sqlite3_mem_methods& methods)
 
 } // namespace
 
+// All of a kind: the address sanitizer has its own, and sees when memory comes from one kind and goes to another.
 void* operator new(std::size_t size)
 {
     void* const memory = mustFail() ? nullptr : std::malloc(size == 0 ? 1 : size);
@@ -54,12 +55,37 @@ void* operator new(std::size_t size)
     return memory;
 }
 
+void* operator new(std::size_t size, std::nothrow_t const& /*nothrow*/) noexcept
+{
+    return mustFail() ? nullptr : std::malloc(size == 0 ? 1 : size);
+}
+
+void* operator new[](std::size_t size)
+{
+    return operator new(size);
+}
+
+void* operator new[](std::size_t size, std::nothrow_t const& nothrow) noexcept
+{
+    return operator new(size, nothrow);
+}
+
 void operator delete(void* memory) noexcept
 {
     std::free(memory);
 }
 
 void operator delete(void* memory, std::size_t /*size*/) noexcept
+{
+    std::free(memory);
+}
+
+void operator delete[](void* memory) noexcept
+{
+    std::free(memory);
+}
+
+void operator delete[](void* memory, std::size_t /*size*/) noexcept
 {
     std::free(memory);
 }

@@ -58,7 +58,7 @@ TEST_F(DatabaseTest, KeepsTextsOfAnyCharacters)
 
 TEST_F(DatabaseTest, ReadsNullAsZeroAndEmpty)
 {
-    database.prepare("INSERT INTO notes VALUES (?, ?)").withNull().withNull().run();
+    database.run("INSERT INTO notes VALUES (NULL, NULL)");
     EXPECT_EQ(notes(database), "0 ;");
 }
 
@@ -68,6 +68,33 @@ TEST_F(DatabaseTest, RunsAStatementAgainWithOtherParameters)
     insert.with(1).with(L"one").run();
     insert.with(2).with(L"two").run();
     EXPECT_EQ(notes(database), "1 one;2 two;");
+}
+
+TEST_F(DatabaseTest, ReadsOneMomentWhileASnapshotLives)
+{
+    add(1, L"one");
+    tav::Database other(path);
+    {
+        tav::Snapshot const snapshot(database);
+        EXPECT_EQ(notes(database), "1 one;");
+        EXPECT_THROW(
+            tav::Database(path, std::chrono::milliseconds(0)).run("INSERT INTO notes VALUES (2, 'two')"), tav::Failure);
+        EXPECT_EQ(notes(database), "1 one;");
+    }
+    other.run("INSERT INTO notes VALUES (3, 'three')");
+    EXPECT_EQ(notes(database), "1 one;3 three;");
+}
+
+TEST_F(DatabaseTest, TakesASnapshotInsideOfAChange)
+{
+    tav::Change change(database);
+    add(1, L"one");
+    {
+        tav::Snapshot const snapshot(database);
+        EXPECT_EQ(notes(database), "1 one;");
+    }
+    change.commit();
+    EXPECT_EQ(notes(database), "1 one;");
 }
 
 TEST_F(DatabaseTest, KeepsAChangeThatWasCommitted)

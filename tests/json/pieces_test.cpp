@@ -2,6 +2,7 @@
 #include "tests/json/documents.h"
 
 #include <gmock/gmock.h>
+#include <sstream>
 #include <utility>
 #include <vector>
 
@@ -107,6 +108,17 @@ TEST(JsonElements, NeedTheSyntaxThatAllDocumentsNeed)
     }
 }
 
+TEST(JsonElements, AreForgottenBehindAnError)
+{
+    std::wstring const text = LR"({"list":[1:{"more":[5]})";
+    Notes sink;
+    kutils::json::detail::Parser<Value, wchar_t const*> parser(text.data(), text.data() + text.size(), &sink);
+    Value value;
+    EXPECT_THROW(parser.get(value, false), decltype(parser)::Error);
+    ASSERT_TRUE(parser.get(value, false));
+    EXPECT_EQ(value, read(LR"({"more":[5]})"));
+}
+
 TEST(JsonElements, OfADocumentThatIsCutOffAreRefused)
 {
     std::wstring const text = LR"({"list":[{"n":1},{"m":[2]},3]})";
@@ -116,9 +128,11 @@ TEST(JsonElements, OfADocumentThatIsCutOffAreRefused)
     }
 }
 
+using Generator = kutils::json::detail::Generator<Value, std::wostringstream>;
+
 std::wstring inPieces(bool pretty)
 {
-    return kutils::json::detail::write_pieces(0, pretty, [](auto& out) {
+    return kutils::json::detail::write_pieces(0, pretty, [](Generator& out) {
         out.begin_object();
         out.key(L"empty array");
         out.begin_array();
@@ -146,12 +160,48 @@ std::wstring inPieces(bool pretty)
     });
 }
 
-TEST(JsonPieces, MakeTheTextThatTheValueHas)
+TEST(JsonPieces, MakeACompactText)
 {
-    Value const value = read(LR"({"empty array":[],"empty object":{},"in\"side":[{"a":[1,{}],"b":"x"},)"
-                             LR"({"number":18446744073709551615,"true":true},"line\nend"],"last":null})");
-    EXPECT_EQ(inPieces(true), write_string(value, true));
-    EXPECT_EQ(inPieces(false), write_string(value, false));
+    EXPECT_EQ(
+        inPieces(false), LR"({"empty array":[],"empty object":{},"in\"side":[{"a":[1,{}],"b":"x"},)"
+                         LR"({"number":18446744073709551615,"true":true},"line\nend"],"last":null})");
+}
+
+TEST(JsonPieces, MakeAPrettyText)
+{
+    EXPECT_EQ(inPieces(true), LR"({
+    "empty array" : [
+    ],
+    "empty object" : {
+    },
+    "in\"side" : [
+        {
+            "a" : [
+                1,
+                {
+                }
+            ],
+            "b" : "x"
+        },
+        {
+            "number" : 18446744073709551615,
+            "true" : true
+        },
+        "line\nend"
+    ],
+    "last" : null
+})");
+}
+
+TEST(JsonPieces, GoToTheStreamWhenTheyAreFlushed)
+{
+    std::wostringstream stream;
+    Generator out(stream, false);
+    out.begin_array();
+    out.element();
+    out.value(true);
+    out.flush();
+    EXPECT_EQ(stream.str(), L"[true");
 }
 
 } // namespace

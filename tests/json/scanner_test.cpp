@@ -185,6 +185,18 @@ TEST(JsonScanner, DoesNotCombineSurrogates)
     EXPECT_EQ(scanner.nextToken().text, L"\xD83D\xDE00");
 }
 
+TEST(JsonScanner, ReadsAgainFromAPositionThatItWasAt)
+{
+    std::wstring const text = L"{\"a\":1}";
+    Scanner scanner(text.data(), text.data() + text.size());
+    scanner.nextToken();
+    auto const behindBrace = scanner.position();
+    EXPECT_EQ(scanner.nextToken().text, L"a");
+    scanner.nextToken();
+    scanner.moveTo(behindBrace);
+    EXPECT_EQ(scanner.nextToken().text, L"a");
+}
+
 TEST(JsonScanner, PutsTheCharacterBackThatEndsATokenBadly)
 {
     for (std::wstring const text : {L"\"\\x]", L"\"\\u0x]", L"trux]", L"-x]", L"1ex]", L"1e+x]"}) {

@@ -48,6 +48,20 @@ TEST(LargeState, IsSavedAndLoadedWhole)
     EXPECT_TRUE(repository.loaded() == inWords(state));
 }
 
+/// The room for the text is found out beforehand; one path says little of the others.
+TEST(LargeState, IsSavedWhenOnePathIsMuchLongerThanTheOthers)
+{
+    State state;
+    OdString const longPath = wide(std::string(100'000, 'a'));
+    state.index[longPath] = {1, false};
+    for (std::size_t i = 0; i < kFiles; ++i) {
+        state.index[pathOf(i)] = {i, false};
+    }
+    Repository repository;
+    repository.saved(state);
+    EXPECT_EQ(repository.open()->read().index.size(), kFiles + 1);
+}
+
 TEST(LargeState, IsRolledBackWhole)
 {
     State state;

@@ -42,7 +42,7 @@ TEST_F(MemoryOfLargeState, ForLoadingIsAFewTimesTheFile)
     PeakOfMemory const peak;
     ASSERT_EQ(repository_.open()->read().index.size(), 200'000U);
     RecordProperty("times_the_file_in_percent", std::to_string(100 * peak.bytes() / fileSize_));
-    EXPECT_LT(peak.bytes(), 12 * fileSize_);
+    EXPECT_LT(peak.bytes(), 7 * fileSize_);
 }
 
 TEST_F(MemoryOfLargeState, ForSavingIsAFewTimesTheFile)
