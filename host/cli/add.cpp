@@ -8,6 +8,7 @@
 #include "host/repository/staging.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
+#include "host/text/wide.h"
 
 #include <algorithm>
 #include <string>
@@ -66,9 +67,7 @@ void addFilesToStage(AddOptions const& options)
         enterVerified(verified, work.start(), cache.write());
         count = stage(chosenFiles(options, changes, root), cache.write());
     });
-    print(
-        count == 0 ? "Nothing new to stage.\n"
-                   : "Staged " + std::to_string(count) + (count == 1 ? " file.\n" : " files.\n"));
+    print(count == 0 ? "Nothing new to stage.\n" : "Staged " + counted(count, "file") + ".\n");
 }
 
 } // namespace tav

@@ -136,7 +136,7 @@ void removeFiles(std::vector<std::string> const& names)
             printError("'" + file + "' is left over: " + error.message() + ".", "Delete it yourself.");
         }
     }
-    print("Removed " + std::to_string(count) + (count == 1 ? " file" : " files") + "; the next commit takes that.\n");
+    print("Removed " + counted(count, "file") + "; the next commit takes that.\n");
 }
 
 } // namespace tav

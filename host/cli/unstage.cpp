@@ -6,6 +6,7 @@
 #include "host/repository/staging.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
+#include "host/text/wide.h"
 
 #include <string>
 #include <vector>
@@ -29,7 +30,7 @@ void unstageFiles(UnstageOptions const& options)
         }
         count = unstage(chosen, cache.write());
     });
-    print("Took " + std::to_string(count) + (count == 1 ? " file" : " files") + " out of the next commit.\n");
+    print("Took " + counted(count, "file") + " out of the next commit.\n");
 }
 
 } // namespace tav

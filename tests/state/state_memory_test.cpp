@@ -52,7 +52,7 @@ TEST_F(MemoryOfLargeState, ForSavingIsAFewTimesTheFile)
     PeakOfMemory const peak;
     cache.reset();
     RecordProperty("times_the_file_in_percent", std::to_string(100 * peak.bytes() / fileSize_));
-    EXPECT_LT(peak.bytes(), 18 * fileSize_);
+    EXPECT_LT(peak.bytes(), 12 * fileSize_);
 }
 
 std::string const kOld = golden("escaped.json");
