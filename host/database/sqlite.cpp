@@ -103,8 +103,19 @@ Database::Database(std::string const& path, std::chrono::milliseconds patience)
         fail(code);
     }
     sqlite3_busy_timeout(handle_.get(), static_cast<int>(patience.count()));
+    distrustSchema();
     // EXTRA: a journal that comes back after a power failure would undo a change that others rely on already.
     run("PRAGMA foreign_keys = ON; PRAGMA synchronous = EXTRA;");
+}
+
+// The file travels with the repository: nothing that a stranger put into its schema is run.
+void Database::distrustSchema()
+{
+    for (int const option :
+         {SQLITE_DBCONFIG_ENABLE_TRIGGER, SQLITE_DBCONFIG_ENABLE_VIEW, SQLITE_DBCONFIG_TRUSTED_SCHEMA}) {
+        sqlite3_db_config(handle_.get(), option, 0, nullptr);
+    }
+    sqlite3_db_config(handle_.get(), SQLITE_DBCONFIG_DEFENSIVE, 1, nullptr);
 }
 
 void Database::run(char const* statements)

@@ -52,7 +52,8 @@ public:
     static constexpr std::chrono::milliseconds kPatience{5000};
 
     /// Opens the file `path`, in bytes, making it when it is missing; its folder must exist. Where the file may not be
-    /// written it is opened for reading. While another program holds the file an operation waits up to `patience`.
+    /// written it is opened for reading. Triggers and views of the file are not run. While another program holds the
+    /// file an operation waits up to `patience`.
     explicit Database(std::string const& path, std::chrono::milliseconds patience = kPatience);
 
     std::string const& path() const { return path_; }
@@ -71,6 +72,8 @@ public:
     [[noreturn]] void fail(int code) const;
 
 private:
+    void distrustSchema();
+
     std::string path_;
     std::unique_ptr<sqlite3, int (*)(sqlite3*)> handle_;
 };

@@ -70,6 +70,15 @@ TEST_F(DatabaseTest, RunsAStatementAgainWithOtherParameters)
     EXPECT_EQ(notes(database), "1 one;2 two;");
 }
 
+TEST_F(DatabaseTest, RunsNothingThatAStrangerPutIntoTheFile)
+{
+    database.run("CREATE TRIGGER trap AFTER INSERT ON notes BEGIN DELETE FROM notes; END;"
+                 "CREATE VIEW shown AS SELECT * FROM notes;");
+    add(1, L"one");
+    EXPECT_EQ(notes(database), "1 one;");
+    EXPECT_THROW(database.prepare("SELECT * FROM shown"), tav::Failure);
+}
+
 TEST_F(DatabaseTest, ReadsOneMomentWhileASnapshotLives)
 {
     add(1, L"one");
