@@ -2,6 +2,8 @@
 
 #include "host/failure.h"
 #include "host/repository/digest.h"
+#include "host/storage/cleaning.h"
+#include "host/storage/storage_error.h"
 #include "host/text/wide.h"
 
 #include "platform/os/os_files.h"
@@ -26,19 +28,18 @@ bool isOfRemoval(std::string_view name)
 
 std::vector<std::string> filesOfRemovals(common::RootPath const& root)
 {
+    std::string const folder = root.tavPath().ansi_str();
     std::vector<std::string> files;
-    std::error_code error;
-    for (fs::directory_iterator entry(root.tavPath().ansi_str(), error), end; !error && entry != end;
-         entry.increment(error)) {
-        if (isOfRemoval(entry->path().filename().string())) {
-            files.push_back(entry->path().string());
+    try {
+        for (std::string const& name :
+             entriesOf(folder)) { // The standard iterator ends the process for lack of memory.
+            if (isOfRemoval(name)) {
+                files.push_back(std::string(folder).append("/").append(name));
+            }
         }
+    } catch (StorageError const& error) {
+        throw Failure(error.what, "Check your rights to it.");
     }
-    if (error) {
-        throw Failure(
-            "'" + root.tavPath().ansi_str() + "' cannot be read: " + error.message() + ".", "Check your rights to it.");
-    }
-    std::sort(files.begin(), files.end());
     return files;
 }
 
