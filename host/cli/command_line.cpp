@@ -118,6 +118,7 @@ void prepareSyntax(CLI::App& app)
 int runCommand(CLI::App& app, int argc, char** argv)
 {
     try {
+        prepareSyntax(app);
         parse(app, argc, argv);
         if (!flushOutput()) {
             throw Failure("The output could not be written.", "Check the disk or the program that reads it.");
@@ -148,7 +149,6 @@ int run(int argc, char** argv)
 {
     prepareProcess();
     CLI::App app("Keeps the versions of a folder of drawings.", "tav");
-    prepareSyntax(app);
     return runCommand(app, argc, argv);
 }
 

@@ -371,10 +371,10 @@ private:
     int claimName(Make const& make)
     {
         for (;;) {
-            std::string const name = newTempName(target_.name);
+            std::string name = newTempName(target_.name);
             int const result = retried([&] { return make(name.c_str()); });
             if (result != -1) {
-                name_ = name;
+                name_ = std::move(name); // Must not fail: the file is there already.
             }
             if (result != -1 || errno != EEXIST) {
                 return result;
