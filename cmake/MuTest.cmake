@@ -2,11 +2,10 @@ include(GoogleTest)
 
 # The code under test is optimised, and checked by the sanitizers; to do so with the tests takes longer than to run them.
 function(mu_test_options target)
+    target_compile_options(${target} PRIVATE -O0)
     if(MU_COMMON_SANITIZE)
-        target_compile_options(${target} PRIVATE -O0 -g0 -fno-sanitize=all)
+        target_compile_options(${target} PRIVATE -g0 -fno-sanitize=all)
         target_compile_definitions(${target} PRIVATE MU_SANITIZED)
-    else()
-        target_compile_options(${target} PRIVATE -O1)
     endif()
 endfunction()
 

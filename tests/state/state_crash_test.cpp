@@ -2,6 +2,7 @@
 #include "tests/state/generations.h"
 
 #include "tests/support/failing_call.h"
+#include "tests/support/sanitized.h"
 
 #include <algorithm>
 #include <array>
@@ -93,7 +94,7 @@ protected:
 
 TEST_F(Crash, LeavesAWholeStateWheneverTheWriterIsKilled)
 {
-    constexpr int kKills = 500;
+    constexpr int kKills = support::kIsSanitized ? 50 : 500;
     auto const longest = std::clamp<std::chrono::microseconds>(
         2 * duration(), std::chrono::milliseconds(2), std::chrono::milliseconds(100));
     std::mt19937 random(20'240'305);
