@@ -240,7 +240,7 @@ Save saveConfig(support::TempRepository const& repository, std::function<void()>
     SimpleIo const io;
     auto config = common::Config::load(repository.widePathTo("config"), io).value();
     for (int i = 0; i < 20; ++i) {
-        config->write()->add(OdString(L"/work/") + std::to_wstring(i).c_str(), L"bridge", L"cloud");
+        config->write()->add(OdString(L"/projects/") + std::to_wstring(i).c_str(), L"bridge", L"cloud");
     }
     begin();
     config.reset();
