@@ -102,7 +102,8 @@ std::vector<common::StagedFile>
 changedAndBack(std::vector<Move> const& moves, common::State const& state, common::RootPath const& root)
 {
     std::vector<common::StagedFile> changed;
-    Tree const committed = lastCommitFiles(root);
+    FileList const files = lastCommitFiles(root);
+    Tree const committed(files.begin(), files.end());
     for (Move const& move : moves) {
         auto const rename = state.renames.find(move.from);
         auto const file = committed.find(move.to);

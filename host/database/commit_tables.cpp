@@ -2,6 +2,8 @@
 
 #include "host/failure.h"
 
+#include <algorithm>
+#include <iterator>
 #include <utility>
 
 namespace tav {
@@ -68,6 +70,57 @@ std::vector<FileRecord> changesBetween(Tree parent, std::vector<FileRecord> cons
     }
     return changes;
 }
+
+bool isBefore(FileList::value_type const& a, FileList::value_type const& b)
+{
+    return a.first < b.first;
+}
+
+/// What commits changed, one after the other. Two neighbours become one when they are of about the same size, so that
+/// no file is moved more often than there are doublings from one commit to all of them.
+class Layers {
+public:
+    /// Takes the changes of the next commit. The database has its own order for paths that are no UTF-8.
+    void add(FileList changes)
+    {
+        if (!std::is_sorted(changes.begin(), changes.end(), isBefore)) {
+            std::sort(changes.begin(), changes.end(), isBefore);
+        }
+        layers_.push_back(std::move(changes));
+        while (layers_.size() > 1 && layers_.rbegin()[1].size() < 2 * layers_.back().size()) {
+            joinLastTwo();
+        }
+    }
+
+    /// The files that are left in the end.
+    FileList files() &&
+    {
+        while (layers_.size() > 1) {
+            joinLastTwo();
+        }
+        FileList files = layers_.empty() ? FileList() : std::move(layers_.front());
+        auto const isGone = [](FileList::value_type const& file) { return file.second.isEmpty(); };
+        files.erase(std::remove_if(files.begin(), files.end(), isGone), files.end());
+        return files;
+    }
+
+private:
+    void joinLastTwo()
+    {
+        FileList later = std::move(layers_.back());
+        layers_.pop_back();
+        FileList& earlier = layers_.back();
+        FileList both;
+        both.reserve(earlier.size() + later.size());
+        // Of a path that both have, the first list's file is taken.
+        std::set_union(
+            std::move_iterator(later.begin()), std::move_iterator(later.end()), std::move_iterator(earlier.begin()),
+            std::move_iterator(earlier.end()), std::back_inserter(both), isBefore);
+        earlier = std::move(both);
+    }
+
+    std::vector<FileList> layers_;
+};
 
 common::Reference referenceOf(Statement const& row)
 {
@@ -187,24 +240,26 @@ std::vector<std::int64_t> CommitTables::line(OdString const& hash) const
 
 Tree CommitTables::files(OdString const& hash) const
 {
+    FileList list = fileList(hash);
+    return Tree(std::move_iterator(list.begin()), std::move_iterator(list.end()));
+}
+
+FileList CommitTables::fileList(OdString const& hash) const
+{
     Snapshot const snapshot(*database_);
     // Asked for commit by commit, the rows come in the order of the table; all at once, they would be sorted on disk.
     Statement rows =
         database_->prepare("SELECT path, url FROM changes WHERE repository = ? AND number = ? ORDER BY path");
-    Tree tree;
+    Layers layers;
     for (std::int64_t const number : line(hash)) {
         rows.with(repository_).with(number);
+        FileList changes;
         while (rows.next()) {
-            OdString path = rows.text(0);
-            OdString url = rows.text(1);
-            if (url.isEmpty()) {
-                tree.erase(path);
-            } else {
-                tree.insert_or_assign(tree.end(), std::move(path), OdString())->second = std::move(url);
-            }
+            changes.emplace_back(rows.text(0), rows.text(1));
         }
+        layers.add(std::move(changes));
     }
-    return tree;
+    return std::move(layers).files();
 }
 
 std::vector<FileRecord> CommitTables::changes(OdString const& hash) const

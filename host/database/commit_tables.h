@@ -12,6 +12,7 @@
 #include <cstdint>
 #include <map>
 #include <optional>
+#include <utility>
 #include <vector>
 
 namespace tav {
@@ -42,6 +43,9 @@ struct FileVersion {
 /// The files of a commit: storage URL by path.
 using Tree = std::map<OdString, OdString>;
 
+/// The same in the order of paths, which takes half the time to make and to go through.
+using FileList = std::vector<std::pair<OdString, OdString>>;
+
 class CommitTables {
 public:
     /// The tables of the repository `repository` in `database`, which lives longer.
@@ -65,7 +69,10 @@ public:
     std::int64_t lastNumber() const;                                     ///< 0 when there is no commit
 
     /// The files of a commit; none for an empty `hash`, which stands for what is before the first commit.
+    ///@{
     Tree files(OdString const& hash) const;
+    FileList fileList(OdString const& hash) const;
+    ///@}
     /// What a commit changed against its first parent, in the order of paths.
     std::vector<FileRecord> changes(OdString const& hash) const;
     /// The URLs of all files of all commits, in ascending order.

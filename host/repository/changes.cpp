@@ -11,6 +11,7 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <functional>
 #include <future>
 #include <iterator>
 #include <regex>
@@ -27,26 +28,6 @@ bool isThere(OdString const& path, common::RootPath const& root)
     std::error_code error;
     auto const type = std::filesystem::symlink_status(root.pathTo(path).ansi_str(), error).type();
     return type != std::filesystem::file_type::not_found && type != std::filesystem::file_type::directory;
-}
-
-using CommittedFiles = std::vector<CommittedFile>;
-
-void readTimes(CommittedFiles::iterator first, CommittedFiles::iterator last, common::RootPath const& root)
-{
-    for (; first != last; ++first) {
-        if (first->isThere) {
-            first->time = common::modifyTime(first->path, root);
-        }
-    }
-}
-
-/// Asking for the times takes longer than finding the files; two ask in half the time.
-void readTimes(CommittedFiles& files, common::RootPath const& root)
-{
-    auto const middle = files.begin() + static_cast<std::ptrdiff_t>(files.size() / 2);
-    auto other = std::async([&] { readTimes(middle, files.end(), root); }); // Or later, where no thread is to be had.
-    readTimes(files.begin(), middle, root);
-    other.get();
 }
 
 using Index = std::map<OdString, common::IndexData>;
@@ -83,12 +64,17 @@ std::vector<common::File> scan(common::RootPath const& root)
     }
 }
 
-FolderMatch matchFolder(common::RootPath const& root, Tree committed)
+FolderMatch matchFolder(common::RootPath const& root, FileList committed)
 {
-    return matchFolder(root, scan(root), std::move(committed));
+    FolderMatch match = matchPaths(root, scan(root), std::move(committed));
+    TimeReading times(match.committed, root);
+    auto other = std::async([&] { times.run(); }); // Or later, where no thread is to be had.
+    times.run();
+    other.get();
+    return match;
 }
 
-FolderMatch matchFolder(common::RootPath const& root, std::vector<common::File> scanned, Tree committed)
+FolderMatch matchPaths(common::RootPath const& root, std::vector<common::File> scanned, FileList committed)
 {
     auto const byPath = [](common::File const& a, common::File const& b) { return a.path < b.path; };
     sortScanned(scanned, byPath);
@@ -100,12 +86,25 @@ FolderMatch matchFolder(common::RootPath const& root, std::vector<common::File> 
             match.untracked.push_back(std::move(*file));
         }
         bool const isScanned = file != scanned.end() && file->path == path;
-        match.committed.push_back({path, std::move(url), isScanned || isThere(path, root), 0});
+        bool const isThere = isScanned || tav::isThere(path, root);
+        match.committed.push_back({std::move(path), std::move(url), isThere, 0});
         file += isScanned ? 1 : 0;
     }
     std::move(file, scanned.end(), std::back_inserter(match.untracked));
-    readTimes(match.committed, root);
     return match;
+}
+
+void TimeReading::run()
+{
+    constexpr std::size_t kBatch = 500;
+    for (std::size_t begin = next_.fetch_add(kBatch); begin < files_.size(); begin = next_.fetch_add(kBatch)) {
+        std::size_t const end = std::min(begin + kBatch, files_.size());
+        for (std::size_t i = begin; i < end; ++i) {
+            if (files_[i].isThere) {
+                files_[i].time = common::modifyTime(files_[i].path, root_);
+            }
+        }
+    }
 }
 
 common::RepoChanges
@@ -132,6 +131,14 @@ compare(common::RootPath const& root, FolderMatch match, common::State const& st
         changes.untracked.push_back({nullptr, std::move(file), 0});
     }
     return changes;
+}
+
+void dropUntouched(FolderMatch& match, common::State const& state)
+{
+    IndexCursor index(state.index);
+    auto const isUntouched = [&](CommittedFile const& file) { return file.isThere && index.isUntouched(file); };
+    auto const kept = std::remove_if(match.committed.begin(), match.committed.end(), std::cref(isUntouched));
+    match.committed.erase(kept, match.committed.end());
 }
 
 void enterVerified(VerifiedTimes const& verified, std::uint64_t start, common::State& state)

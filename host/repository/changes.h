@@ -6,6 +6,8 @@
 #include "common/mu_common_diff.h"
 #include "common/mu_common_state.h"
 
+#include <atomic>
+#include <cstddef>
 #include <cstdint>
 #include <map>
 #include <vector>
@@ -31,10 +33,25 @@ struct FolderMatch {
 
 /// Finds out what there is of the files `committed`, and what else. Reads no file. Throws as `scan` does. Asks the disk
 /// in two threads, where a second one is to be had.
-FolderMatch matchFolder(common::RootPath const& root, Tree committed);
+FolderMatch matchFolder(common::RootPath const& root, FileList committed);
 
-/// The same for files that are `scanned` already.
-FolderMatch matchFolder(common::RootPath const& root, std::vector<common::File> scanned, Tree committed);
+/// The same for files that are `scanned` already, but for the modification times.
+FolderMatch matchPaths(common::RootPath const& root, std::vector<common::File> scanned, FileList committed);
+
+/// Asks the disk for the modification times of a list of files, which takes longer than finding the files.
+class TimeReading {
+public:
+    /// Enters the times into `files`. Both arguments live longer.
+    TimeReading(std::vector<CommittedFile>& files, common::RootPath const& root) : files_(files), root_(root) {}
+
+    /// Returns when no file is left to ask for. Threads that call this at the same time share the work.
+    void run();
+
+private:
+    std::vector<CommittedFile>& files_;
+    common::RootPath const& root_;
+    std::atomic<std::size_t> next_{0};
+};
 
 /// Modification times of files that were read and found to be as the last commit has them, by path.
 using VerifiedTimes = std::map<OdString, std::uint64_t>;
@@ -44,6 +61,9 @@ using VerifiedTimes = std::map<OdString, std::uint64_t>;
 /// lists of the result are in the order of paths.
 common::RepoChanges
 compare(common::RootPath const& root, FolderMatch match, common::State const& state, VerifiedTimes* verified = nullptr);
+
+/// Takes the files out that `compare` would take for unchanged without reading them, and would list.
+void dropUntouched(FolderMatch& match, common::State const& state);
 
 /// Enters the files that were read into the index, for a command that began at `start`.
 void enterVerified(VerifiedTimes const& verified, std::uint64_t start, common::State& state);

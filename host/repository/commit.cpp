@@ -216,7 +216,8 @@ void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& d
 common::RepoChanges compareWithBase(Draft& draft, common::State const& state)
 {
     VerifiedTimes verified;
-    common::RepoChanges changes = compare(draft.root, matchFolder(draft.root, draft.files), state, &verified);
+    FileList committed(draft.files.begin(), draft.files.end());
+    common::RepoChanges changes = compare(draft.root, matchFolder(draft.root, std::move(committed)), state, &verified);
     for (auto const& [path, time] : verified) {
         draft.work.files.emplace(path, indexRecord(time, draft.start));
     }

@@ -4,10 +4,10 @@
 
 namespace tav {
 
-Tree lastCommitFiles(common::RootPath const& root)
+FileList lastCommitFiles(common::RootPath const& root)
 {
     LocalDatabase const database = LocalDatabase::open(root);
-    return database.commits().files(database.base());
+    return database.commits().fileList(database.base());
 }
 
 } // namespace tav

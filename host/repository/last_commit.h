@@ -8,6 +8,6 @@
 namespace tav {
 
 /// The files of that commit. Throws `Failure` when the database cannot be used.
-Tree lastCommitFiles(common::RootPath const& root);
+FileList lastCommitFiles(common::RootPath const& root);
 
 } // namespace tav

@@ -11,6 +11,8 @@
 #include <algorithm>
 #include <functional>
 #include <future>
+#include <memory>
+#include <optional>
 #include <set>
 #include <utility>
 
@@ -89,14 +91,51 @@ std::vector<common::ConflictInfo> conflictsOf(common::RootPath const& root)
     return conflicts;
 }
 
-void enterPlace(LocalDatabase const& database, OdString const& base, common::State const& state, Status& status)
+/// What the database knows.
+struct History {
+    std::optional<CommitRecord> base; ///< the commit that the working folder stands on
+    FileList files;                   ///< of that commit
+    std::vector<common::Reference> references;
+};
+
+History readHistory(LocalDatabase& database)
 {
-    auto const commit = database.commits().find(base);
-    auto const end = database.commits().reference(state.head);
+    Snapshot const snapshot(database.database());
+    CommitTables const& commits = database.commits();
+    OdString const base = database.base();
+    return {commits.find(base), commits.fileList(base), commits.references()};
+}
+
+struct Findings {
+    History history;
+    FolderMatch match;
+    std::shared_ptr<common::Cache const> cache;
+};
+
+/// Looking for the files takes as long as reading what has been committed, and asking for their times longer than
+/// reading the state; so each goes on beside the other.
+Findings lookAround(common::RootPath const& root, LocalDatabase& database)
+{
+    Findings found;
+    auto scanning = std::async([&] { return scan(root); });
+    found.history = readHistory(database);
+    found.match = matchPaths(root, scanning.get(), std::move(found.history.files));
+    TimeReading times(found.match.committed, root);
+    auto asking = std::async([&] { times.run(); });
+    found.cache = readState(root);
+    times.run();
+    asking.get();
+    return found;
+}
+
+void enterPlace(History const& history, common::State const& state, Status& status)
+{
+    auto const isHead = [&](common::Reference const& reference) { return reference.name == state.head; };
+    auto const end = std::find_if(history.references.begin(), history.references.end(), isHead);
+    OdString const base = history.base ? history.base->hash : OdString();
     status.branch = state.head;
-    status.commit = commit ? commit->number : 0;
-    status.isAtEnd = !end || end->commitHash == base;
-    status.unfinishedWork = noteOnUnfinished(database);
+    status.commit = history.base ? history.base->number : 0;
+    status.isAtEnd = end == history.references.end() || end->commitHash == base;
 }
 
 /// A staged file that turns out to be renamed is shown so; other renamed files are a group of their own.
@@ -114,29 +153,19 @@ void enterRenames(Renames const& renames, Paths& left, Status& status)
     }
 }
 
-/// Enters where the working folder stands, and gives the files of that commit.
-Tree readHistory(LocalDatabase& database, common::State const& state, Status& status)
-{
-    Snapshot const snapshot(database.database());
-    OdString const base = database.base();
-    enterPlace(database, base, state, status);
-    return database.commits().files(base);
-}
-
 } // namespace
 
 Status statusOf(common::RootPath const& root, bool withIgnored)
 {
-    // Looking for the files takes as long as reading what is known of them.
-    auto scanning = std::async([&] { return scan(root); });
-    auto const cache = readState(root);
-    common::State const& state = cache->read();
-    LocalDatabase database = LocalDatabase::open(root);
     Status status;
-    Tree committed = readHistory(database, state, status);
-    FolderMatch match = matchFolder(root, scanning.get(), std::move(committed));
+    LocalDatabase database = LocalDatabase::open(root);
+    auto [history, match, cache] = lookAround(root, database);
+    common::State const& state = cache->read();
+    enterPlace(history, state, status);
+    status.unfinishedWork = noteOnUnfinished(database);
     status.conflicts = conflictsOf(root);
     status.staged = stagedEntries(state, match, root);
+    dropUntouched(match, state);
     common::RepoChanges changes = compare(root, std::move(match), state);
     Paths left = pathsLeft(state);
     enterRenames(findRenames(changes, state, database, root), left, status);

@@ -52,7 +52,7 @@ std::vector<WorkingChange> workingChanges(common::RootPath const& root, LocalDat
 {
     auto const cache = readState(root);
     common::RepoChanges const changes =
-        compare(root, matchFolder(root, database.commits().files(database.base())), cache->read());
+        compare(root, matchFolder(root, database.commits().fileList(database.base())), cache->read());
     ByPath all = plainChanges(changes);
     joinRenamed(cache->read().renames, all);
     joinRenamed(findRenames(changes, cache->read(), database, root), all);

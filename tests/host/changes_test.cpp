@@ -30,7 +30,7 @@ protected:
 
     common::RepoChanges compare() const
     {
-        return tav::compare(repo.root(), tav::matchFolder(repo.root(), committed_), state_);
+        return tav::compare(repo.root(), tav::matchFolder(repo.root(), {committed_.begin(), committed_.end()}), state_);
     }
 
     static OdString wide(std::string const& name) { return OdString(name.data(), name.size(), CP_UTF_8); }

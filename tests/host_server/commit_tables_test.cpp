@@ -5,6 +5,11 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <map>
+#include <random>
+#include <sstream>
+
 namespace {
 
 using server::wideText;
@@ -12,6 +17,11 @@ using server::wideText;
 OdString hashOf(char c)
 {
     return wideText(std::string(64, c));
+}
+
+bool isSameFile(tav::FileList::value_type const& listed, tav::Tree::value_type const& file)
+{
+    return listed.first == file.first && listed.second == file.second;
 }
 
 class CommitTablesTest : public testing::Test {
@@ -118,6 +128,37 @@ TEST_F(CommitTablesTest, PutTreesOfBranchesAndMergesTogether)
     EXPECT_EQ(files('e'), "notes 3;plan 2;");
     EXPECT_EQ(inWords({*tables.find(hashOf('d'))}), "4d(bc)");
     EXPECT_EQ(inWords({*tables.find(5)}), "5e(cb)");
+}
+
+TEST_F(CommitTablesTest, PutTreesTogetherAfterManyCommitsOfAllSizes)
+{
+    std::mt19937 random(7);
+    // Some names are no UTF-8, and others have characters beyond those that stand for the bytes of such names.
+    std::map<std::string, int> content;
+    std::string before;
+    for (int number = 1; number <= 60; ++number) {
+        for (unsigned changed = 1U << random() % 8; changed > 0; --changed) {
+            char const byte = static_cast<char>(0x80 + random() % 0x40);
+            std::string const path = (random() % 2 == 0 ? "\xF0\x9F\x98" : "\xFF") + std::string(1, byte);
+            if (random() % 3 == 0) {
+                content.erase(path);
+            } else {
+                content[path] = number;
+            }
+        }
+        std::vector<std::string> lines;
+        std::map<OdString, OdString> expected;
+        for (auto const& [path, url] : content) {
+            lines.push_back(path + " " + std::to_string(url));
+            expected.emplace(wideText(path), wideText(std::to_string(url)));
+        }
+        char const hash = static_cast<char>(number + '0');
+        add(hash, before, lines);
+        before = hash;
+        EXPECT_EQ(tables.files(hashOf(hash)), expected) << number;
+        tav::FileList const list = tables.fileList(hashOf(hash));
+        EXPECT_TRUE(std::equal(list.begin(), list.end(), expected.begin(), expected.end(), isSameFile)) << number;
+    }
 }
 
 TEST_F(CommitTablesTest, KnowWhichCommitsLieBefore)
