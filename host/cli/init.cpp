@@ -99,7 +99,8 @@ void init(InitOptions const& options)
     bool const existed = common::RootPath::get(path, false).hasValue();
     common::RootPath const root =
         valueOrFail(common::RootPath::get(path, true), "Check that the folder is one and that you may write there.");
-    requireOwnFolders(root);
+    requireOwnFiles(root);
+    requireOwnDatabase(root);
     std::string const folder = absolute(options.folder);
     std::string const name = std::filesystem::path(folder).filename().string();
     os::FileLock const lock = lockRepository(root, "init");

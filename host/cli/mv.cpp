@@ -132,8 +132,8 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     }
     checkTarget(to, root);
     checkFolders(to, root);
-    FileMoves onDisk;
-    onDisk.move(root.pathTo(from).ansi_str(), root.pathTo(to).ansi_str());
+    FileMoves onDisk(root.path().ansi_str());
+    onDisk.move(from.ansi_str(), to.ansi_str());
     changeState(root, [&](common::Cache& cache) {
         std::vector<common::StagedFile> const changed = changedAndBack(moves, cache.read(), root);
         stageMoves(moves, cache.write());

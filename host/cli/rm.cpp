@@ -97,8 +97,9 @@ void checkPath(OdString const& path, common::RootPath const& root)
 /// Where a removed file waits until the new state is safe. A command that was killed may have left such files.
 std::string waitingName(common::RootPath const& root, std::size_t number)
 {
-    std::string const prefix = (root.tavPath() + L"/removed-").ansi_str();
-    while (std::filesystem::exists(std::filesystem::symlink_status(prefix + std::to_string(number)))) {
+    std::string const prefix = ".tav/removed-";
+    std::string const top = root.path().ansi_str() + "/";
+    while (std::filesystem::exists(std::filesystem::symlink_status(top + prefix + std::to_string(number)))) {
         ++number;
     }
     return prefix + std::to_string(number);
@@ -110,7 +111,8 @@ void removeFiles(std::vector<std::string> const& names)
 {
     Work const work(openRepository(""), "rm", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
-    FileMoves moves;
+    std::string const top = root.path().ansi_str();
+    FileMoves moves(top);
     std::vector<std::string> waiting;
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
@@ -125,13 +127,14 @@ void removeFiles(std::vector<std::string> const& names)
             if (ut::FileName::fileExists(root.pathTo(file.path))) {
                 checkPath(file.path, root);
                 waiting.push_back(waitingName(root, waiting.size()));
-                moves.move(root.pathTo(file.path).ansi_str(), waiting.back());
+                moves.move(file.path.ansi_str(), waiting.back());
             }
         }
         count = stage(staged, cache.write());
     });
     moves.keep();
-    for (std::string const& file : waiting) {
+    for (std::string const& name : waiting) {
+        std::string const file = top + "/" + name;
         if (std::error_code const error = os::removeFile(file)) {
             printError("'" + file + "' is left over: " + error.message() + ".", "Delete it yourself.");
         }

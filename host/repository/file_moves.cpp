@@ -22,7 +22,7 @@ FileMoves::~FileMoves()
 {
     for (auto move = done_.rbegin(); move != done_.rend(); ++move) {
         try {
-            [[maybe_unused]] std::error_code const ignored = os::moveEntry(move->second, move->first);
+            [[maybe_unused]] std::error_code const ignored = os::moveEntry(top_, move->second, move->first);
         } catch (...) {
             // Nobody is left to tell; the file lies whole under its new name.
         }
@@ -31,21 +31,23 @@ FileMoves::~FileMoves()
 
 void FileMoves::move(std::string const& from, std::string const& to)
 {
-    bool const wasThere = entryExists(from);
+    std::string const fullFrom = top_ + "/" + from;
+    std::string const fullTo = top_ + "/" + to;
+    bool const wasThere = entryExists(fullFrom);
     done_.emplace_back(from, to);
-    std::error_code const error = os::moveEntry(from, to);
+    std::error_code const error = os::moveEntry(top_, from, to);
     if (!error) {
         return;
     }
-    bool const hasMovedUnflushed = wasThere && !entryExists(from);
+    bool const hasMovedUnflushed = wasThere && !entryExists(fullFrom);
     if (!hasMovedUnflushed) {
         done_.pop_back();
     }
     if (error == std::errc::file_exists) {
-        throw Failure("'" + to + "' exists already.", "Choose another name, or move that one away first.");
+        throw Failure("'" + fullTo + "' exists already.", "Choose another name, or move that one away first.");
     }
     throw Failure(
-        "'" + from + "' cannot be moved to '" + to + "': " + error.message() + ".",
+        "'" + fullFrom + "' cannot be moved to '" + fullTo + "': " + error.message() + ".",
         "Check that the folder exists and that you may write there.");
 }
 

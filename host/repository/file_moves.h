@@ -7,10 +7,11 @@
 
 namespace tav {
 
-/// Moves entries, and moves them back in reverse order when it goes without `keep`. Paths are full, in bytes.
+/// Moves entries, and moves them back in reverse order when it goes without `keep`. Paths are below the folder `top`,
+/// in bytes, and lead through no link.
 class FileMoves {
 public:
-    FileMoves() = default;
+    explicit FileMoves(std::string top) : top_(std::move(top)) {}
     FileMoves(FileMoves const&) = delete;
     FileMoves& operator=(FileMoves const&) = delete;
     ~FileMoves();
@@ -20,6 +21,7 @@ public:
     void keep() { done_.clear(); }
 
 private:
+    std::string top_;
     std::vector<std::pair<std::string, std::string>> done_;
 };
 

@@ -3,6 +3,8 @@
 #include "host/failure.h"
 #include "host/text/wide.h"
 
+#include "platform/os/os_open_file.h"
+
 #include <filesystem>
 
 namespace tav {
@@ -40,31 +42,56 @@ common::RootPath findRepository(std::string const& folder)
     }
 }
 
+void failIfLink(std::string const& path, std::string const& kind)
+{
+    std::error_code error;
+    if (fs::is_symlink(fs::symlink_status(path, error))) {
+        throw Failure(
+            "'" + path + "' is a link, and may lead to another repository.",
+            "Put the " + kind + " itself in its place.");
+    }
+}
+
 } // namespace
 
 common::RootPath openRepository(std::string const& folder)
 {
     common::RootPath root = findRepository(folder);
-    requireOwnFolders(root);
+    requireOwnFiles(root);
     return root;
 }
 
-void requireOwnFolders(common::RootPath const& root)
+void requireOwnFiles(common::RootPath const& root)
 {
     for (wchar_t const* const name : {L".tav", L".tav/objects", L".tav/properties", L".tav/restoring", L".tav/tf"}) {
-        std::string const folder = root.pathTo(name).ansi_str();
-        std::error_code error;
-        if (fs::is_symlink(fs::symlink_status(folder, error))) {
-            throw Failure(
-                "'" + folder + "' is a link, and may lead to another repository.",
-                "Put the folder itself in its place.");
-        }
+        failIfLink(root.pathTo(name).ansi_str(), "folder");
+    }
+    // A database that is in use has files beside it.
+    for (wchar_t const* const name :
+         {L".tav/tav.state", L".tav/tav.db", L".tav/tav.db-journal", L".tav/tav.db-shm", L".tav/tav.db-wal"}) {
+        failIfLink(root.pathTo(name).ansi_str(), "file");
     }
     std::string const rules = root.pathTo(L".tav/properties/ignore").ansi_str();
     std::error_code error;
     fs::file_type const type = fs::status(rules, error).type();
     if (type != fs::file_type::not_found && type != fs::file_type::regular && type != fs::file_type::none) {
         throw Failure("'" + rules + "' is no file.", "Move it away; 'tav init' makes a new one.");
+    }
+    os::OpenFile probe;
+    error = probe.openForReading(rules);
+    if (error && error != std::errc::no_such_file_or_directory) {
+        throw Failure("'" + rules + "' cannot be read: " + error.message() + ".", "Check your rights to it.");
+    }
+}
+
+void requireOwnDatabase(common::RootPath const& root)
+{
+    std::string const database = root.dbPath().ansi_str();
+    std::error_code error;
+    if (fs::hard_link_count(database, error) > 1 && !error) {
+        throw Failure(
+            "'" + database + "' has another name (a hard link), and what is written would show there too.",
+            "Put a copy in its place.");
     }
 }
 

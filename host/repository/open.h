@@ -9,12 +9,15 @@ namespace tav {
 
 /// The repository whose working folder is `folder`; with an empty `folder`, the one that the current folder lies in,
 /// looked for upwards. `folder` is in bytes, as the command line gave it.
-/// Throws `Failure` when there is none, and as `requireOwnFolders` does.
+/// Throws `Failure` when there is none, and as `requireOwnFiles` does.
 common::RootPath openRepository(std::string const& folder);
 
-/// Throws `Failure` when ".tav" or a folder in it is a link: commands remove there what is not needed, and what a link
-/// leads to may be another repository's, or not even a repository. Also when the ignore file is there and is no file:
-/// files would be offered for a commit that were meant to stay out.
-void requireOwnFolders(common::RootPath const& root);
+/// Throws `Failure` when ".tav", a folder in it, its state or its database is a link: commands write and remove there,
+/// and what a link leads to may be another repository's, or not even a repository. Also when the ignore file is there
+/// and cannot be read: files would be offered for a commit that were meant to stay out.
+void requireOwnFiles(common::RootPath const& root);
+
+/// Throws `Failure` when the database has another name: it is changed in place, and would change under that name too.
+void requireOwnDatabase(common::RootPath const& root);
 
 } // namespace tav

@@ -28,7 +28,12 @@ RecordFile RecordFile::openForReading(std::string const& path, std::string name)
 RecordFile RecordFile::openForChanging(std::string const& path, std::string name)
 {
     os::OpenFile file;
-    check(file.openForChanging(path), name + " cannot be opened");
+    std::error_code const error = file.openForChanging(path);
+    if (error == std::errc::too_many_links || error == std::errc::too_many_symbolic_link_levels) {
+        throw StorageError(
+            name + " has another name, and what is written would show there too: put a copy in its place.");
+    }
+    check(error, name + " cannot be opened");
     RecordFile records(std::move(file), std::move(name));
     records.list();
     return records;

@@ -14,25 +14,21 @@ namespace os {
 namespace {
 
 using detail::Handle;
+using detail::kFolderFlags;
 using detail::lastError;
 using detail::openAt;
 using detail::outcome;
+using detail::Place;
+using detail::placeOf;
 using detail::retried;
 
-constexpr int kFolderFlags = O_RDONLY | O_DIRECTORY | O_NOFOLLOW;
 constexpr mode_t kFolderPermissions = 0777; // less the process's umask
 constexpr std::uint64_t kNanosecondsPerSecond = 1'000'000'000;
 constexpr char const* kCopy = ".placing.tmp";
 
-struct Place {
-    std::string folder;
-    std::string name;
-};
-
-Place placeOf(std::string const& path)
+Handle openFolderIn(int folder, std::string const& name)
 {
-    std::size_t const slash = path.rfind('/');
-    return slash == std::string::npos ? Place{"", path} : Place{path.substr(0, slash), path.substr(slash + 1)};
+    return openAt(folder, name, kFolderFlags);
 }
 
 Handle openOrMake(int folder, std::string const& name)
@@ -261,13 +257,7 @@ std::error_code Batch::enter(std::string const& folder, Missing missing)
     if (current_.isOpen() && currentPath_ == folder) {
         return {};
     }
-    Handle place = openAt(top_.get(), ".", kFolderFlags);
-    for (std::size_t begin = 0; place.isOpen() && begin < folder.size();) {
-        std::size_t const end = std::min(folder.find('/', begin), folder.size());
-        std::string const name = folder.substr(begin, end - begin);
-        place = missing == Missing::isMade ? openOrMake(place.get(), name) : openAt(place.get(), name, kFolderFlags);
-        begin = end + 1;
-    }
+    Handle place = detail::walk(top_.get(), folder, missing == Missing::isMade ? openOrMake : openFolderIn);
     if (!place.isOpen()) {
         return lastError();
     }

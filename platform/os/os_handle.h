@@ -3,13 +3,17 @@
 
 #include "platform/os/os_calls.h"
 
+#include <algorithm>
 #include <cerrno>
+#include <cstddef>
 #include <fcntl.h>
 #include <string>
 #include <system_error>
 #include <utility>
 
 namespace os::detail {
+
+constexpr int kFolderFlags = O_RDONLY | O_DIRECTORY | O_NOFOLLOW;
 
 inline std::error_code lastError()
 {
@@ -30,6 +34,18 @@ auto retried(Call const& call)
 inline std::error_code outcome(int result)
 {
     return result == -1 ? lastError() : std::error_code();
+}
+
+/// A path, cut in two.
+struct Place {
+    std::string folder; ///< empty when the path has one part only
+    std::string name;
+};
+
+inline Place placeOf(std::string const& path)
+{
+    std::size_t const slash = path.rfind('/');
+    return slash == std::string::npos ? Place{"", path} : Place{path.substr(0, slash), path.substr(slash + 1)};
 }
 
 /// An open file or folder; closes itself.
@@ -62,6 +78,20 @@ private:
 inline Handle openAt(int folder, std::string const& path, int flags, mode_t mode = 0)
 {
     return Handle(retried([&] { return calls().openat(folder, path.c_str(), flags | O_CLOEXEC, mode); }));
+}
+
+/// Opens the folder `path` below the open folder `top` part by part, each with `open(folder, name)`; an empty `path` is
+/// `top` itself. A part that is a link, or becomes one meanwhile, is no folder.
+template <class Open>
+Handle walk(int top, std::string const& path, Open const& open)
+{
+    Handle place = openAt(top, ".", kFolderFlags);
+    for (std::size_t begin = 0; place.isOpen() && begin < path.size();) {
+        std::size_t const end = std::min(path.find('/', begin), path.size());
+        place = open(place.get(), path.substr(begin, end - begin));
+        begin = end + 1;
+    }
+    return place;
 }
 
 } // namespace os::detail

@@ -97,7 +97,19 @@ std::error_code OpenFile::openForReading(std::string const& path)
 
 std::error_code OpenFile::openForChanging(std::string const& path)
 {
-    return openRegular(path, O_RDWR);
+    OpenFile opened;
+    if (auto const error = opened.openRegular(path, O_RDWR | O_NOFOLLOW)) {
+        return error;
+    }
+    struct stat status;
+    if (fstat(opened.file_, &status) == -1) {
+        return lastError();
+    }
+    if (status.st_nlink > 1) {
+        return systemError(EMLINK);
+    }
+    std::swap(file_, opened.file_);
+    return {};
 }
 
 std::error_code OpenFile::openFolder(std::string const& path)

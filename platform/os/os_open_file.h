@@ -25,7 +25,8 @@ public:
 
     /// The regular file `path`, links followed. Anything else is refused without waiting for it.
     [[nodiscard]] std::error_code openForReading(std::string const& path);
-    /// The regular file `path`, links followed, to be read and written.
+    /// The regular file `path`, to be read and written. A link is refused (`too_many_symbolic_link_levels`), and so is
+    /// a file that has other names (`too_many_links`): what is written would show there as well.
     [[nodiscard]] std::error_code openForChanging(std::string const& path);
     /// The folder `path`, for `flushFileSystem`.
     [[nodiscard]] std::error_code openFolder(std::string const& path);

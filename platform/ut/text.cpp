@@ -3,6 +3,7 @@
 #include "platform/os/os_files.h"
 
 #include <cstring>
+#include <new>
 #include <string_view>
 
 namespace ut {
@@ -20,6 +21,9 @@ OdString reasonOf(std::error_code const& error)
 
 [[noreturn]] void throwUnreadable(OdString const& path, std::error_code const& error)
 {
+    if (error == std::errc::not_enough_memory) { // Says nothing about the file, which must not count as empty.
+        throw std::bad_alloc();
+    }
     OdString message;
     throw OdError(message.format(L"Could not read file '%ls': %ls", path.c_str(), reasonOf(error).c_str()));
 }

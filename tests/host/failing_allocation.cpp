@@ -1,8 +1,12 @@
 #include "tests/host/failing_allocation.h"
 
+#include <cstddef>
 #include <cstdlib>
+#include <dlfcn.h>
 #include <new>
 #include <sqlite3.h>
+#include <zstd.h>
+#include <zstd_errors.h>
 
 namespace {
 
@@ -33,6 +37,13 @@ void* requestForSqlite(int size)
 void* repeatForSqlite(void* memory, int size)
 {
     return mustFail() ? nullptr : ofSqlite.xRealloc(memory, size);
+}
+
+/// The operation of zstd that this file stands in for.
+template <class Operation>
+Operation next(char const* name)
+{
+    return reinterpret_cast<Operation>(dlsym(RTLD_NEXT, name));
 }
 
 /// The settings count from the next start of SQLite.
@@ -89,6 +100,30 @@ void operator delete[](void* memory, std::size_t /*size*/) noexcept
 {
     std::free(memory);
 }
+
+// zstd asks for memory where nobody can stand in; its operations say so.
+extern "C" {
+
+ZSTD_CCtx* ZSTD_createCCtx()
+{
+    return mustFail() ? nullptr : next<ZSTD_CCtx* (*)()>("ZSTD_createCCtx")();
+}
+
+ZSTD_DCtx* ZSTD_createDCtx()
+{
+    return mustFail() ? nullptr : next<ZSTD_DCtx* (*)()>("ZSTD_createDCtx")();
+}
+
+std::size_t ZSTD_compress2(ZSTD_CCtx* context, void* frame, std::size_t room, void const* bytes, std::size_t count)
+{
+    if (mustFail()) {
+        return std::size_t{0} - ZSTD_error_memory_allocation;
+    }
+    using Compress = std::size_t (*)(ZSTD_CCtx*, void*, std::size_t, void const*, std::size_t);
+    return next<Compress>("ZSTD_compress2")(context, frame, room, bytes, count);
+}
+
+} // extern "C"
 
 namespace host_tests {
 

@@ -20,11 +20,6 @@ protected:
         place.write("folder/c", "C");
     }
 
-    void move(tav::FileMoves& moves, char const* from, char const* to) const
-    {
-        moves.move(place.pathTo(from), place.pathTo(to));
-    }
-
     /// Names and contents of all files.
     std::string files() const
     {
@@ -42,9 +37,9 @@ protected:
 TEST_F(FileMoves, StandWhenTheyAreKept)
 {
     {
-        tav::FileMoves moves;
-        move(moves, "a", "folder/a");
-        move(moves, "b", "a");
+        tav::FileMoves moves(place.path());
+        moves.move("a", "folder/a");
+        moves.move("b", "a");
         moves.keep();
     }
     EXPECT_EQ(files(), "a=B folder/a=A folder/c=C ");
@@ -53,11 +48,11 @@ TEST_F(FileMoves, StandWhenTheyAreKept)
 TEST_F(FileMoves, AreUndoneInReverseOrderOtherwise)
 {
     {
-        tav::FileMoves moves;
-        move(moves, "a", "x");
-        move(moves, "b", "a");
-        move(moves, "folder", "b");
-        move(moves, "x", "b/x");
+        tav::FileMoves moves(place.path());
+        moves.move("a", "x");
+        moves.move("b", "a");
+        moves.move("folder", "b");
+        moves.move("x", "b/x");
         EXPECT_EQ(files(), "a=B b/c=C b/x=A ");
     }
     EXPECT_EQ(files(), before);
@@ -65,10 +60,10 @@ TEST_F(FileMoves, AreUndoneInReverseOrderOtherwise)
 
 TEST_F(FileMoves, NeverReplaceAFile)
 {
-    tav::FileMoves moves;
-    move(moves, "a", "x");
+    tav::FileMoves moves(place.path());
+    moves.move("a", "x");
     try {
-        move(moves, "x", "b");
+        moves.move("x", "b");
         FAIL() << "no failure";
     } catch (tav::Failure const& failure) {
         EXPECT_EQ(failure.what, "'" + place.pathTo("b") + "' exists already.");
@@ -80,10 +75,10 @@ TEST_F(FileMoves, NeverReplaceAFile)
 TEST_F(FileMoves, FailWithTheReasonOfTheSystem)
 {
     {
-        tav::FileMoves moves;
-        move(moves, "b", "x");
+        tav::FileMoves moves(place.path());
+        moves.move("b", "x");
         try {
-            move(moves, "nothing", "y");
+            moves.move("nothing", "y");
             FAIL() << "no failure";
         } catch (tav::Failure const& failure) {
             EXPECT_EQ(
@@ -98,8 +93,8 @@ TEST_F(FileMoves, FailWithTheReasonOfTheSystem)
 TEST_F(FileMoves, DoNotTakeBackWhatNeverHappened)
 {
     {
-        tav::FileMoves moves;
-        EXPECT_THROW(move(moves, "nothing", "b"), tav::Failure);
+        tav::FileMoves moves(place.path());
+        EXPECT_THROW(moves.move("nothing", "b"), tav::Failure);
     }
     EXPECT_EQ(files(), before);
 }
@@ -109,11 +104,11 @@ TEST_F(FileMoves, AreUndoneWhicheverCallFails)
     int n = 0;
     for (bool hasFailed = true; hasFailed; ++n) {
         {
-            tav::FileMoves moves;
+            tav::FileMoves moves(place.path());
             support::FailingCall const failing(n, EIO);
             try {
-                move(moves, "a", "x");
-                move(moves, "b", "a");
+                moves.move("a", "x");
+                moves.move("b", "a");
             } catch (tav::Failure const&) {
                 EXPECT_TRUE(failing.hasFailed());
             }
@@ -127,8 +122,8 @@ TEST_F(FileMoves, AreUndoneWhicheverCallFails)
 TEST_F(FileMoves, LeaveAFileUnderItsNewNameWhenTheOldOneIsTakenByThen)
 {
     {
-        tav::FileMoves moves;
-        move(moves, "a", "x");
+        tav::FileMoves moves(place.path());
+        moves.move("a", "x");
         place.write("a", "another");
     }
     EXPECT_EQ(files(), "a=another b=B folder/c=C x=A ");

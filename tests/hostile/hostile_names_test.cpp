@@ -246,6 +246,35 @@ TEST_F(HardLink, IsReplacedWhereTheStateAndTheRulesStand)
     EXPECT_EQ(elsewhere.read("other"), rules);
 }
 
+TEST_F(HardLink, OfTheDatabaseStopsCommandsThatWouldChangeBoth)
+{
+    giveSecondName(".tav/tav.db");
+    std::string const before = elsewhere.read("other");
+    repo.write("a.dwg", "changed");
+    EXPECT_EQ(tav({"status"}).code, 0);
+    std::string const complaint =
+        ".tav/tav.db' has another name (a hard link), and what is written would show there too. Put a copy in its "
+        "place.\n";
+    for (Arguments const& command : {Arguments{"add", "--all"}, {"commit", "-m", "x"}, {"gc"}}) {
+        EXPECT_EQ(tav(command), failed("tav: '" + repo.pathTo("") + complaint)) << command.front();
+    }
+    EXPECT_EQ(tav({"init"}), failed("tav: './" + complaint));
+    EXPECT_EQ(elsewhere.read("other"), before);
+}
+
+TEST_F(HardLink, OfARevisionStoreStopsCommits)
+{
+    std::string const store =
+        ".tav/tf/" + std::filesystem::directory_iterator(repo.pathTo(".tav/tf"))->path().filename().string();
+    giveSecondName(store);
+    std::string const before = elsewhere.read("other");
+    repo.write("a.dwg", "changed");
+    EXPECT_EQ(commitAll("second").code, 1);
+    EXPECT_EQ(elsewhere.read("other"), before);
+    std::filesystem::remove(elsewhere.pathTo("other"));
+    EXPECT_EQ(commitAll("second").code, 0);
+}
+
 TEST_F(HardLink, IsNoLock)
 {
     ASSERT_EQ(unlink(repo.pathTo(".tav/tav.lock").c_str()), 0);
@@ -288,6 +317,16 @@ struct Meanwhile {
         os::calls().syncfs = [](int file) {
             once();
             return real.syncfs(file);
+        };
+    }
+
+    static void whenMoved(std::function<void()> const& what)
+    {
+        act = what;
+        real = os::calls();
+        os::calls().renameat2 = [](int fromFolder, char const* from, int toFolder, char const* to, unsigned flags) {
+            once();
+            return real.renameat2(fromFolder, from, toFolder, to, flags);
         };
     }
 
@@ -356,6 +395,36 @@ INSTANTIATE_TEST_SUITE_P(
         SwapRow{"RestoreWhenItFlushes", {"restore", "sub", "--from", "1"}, Meanwhile::whenFlushed},
         SwapRow{"RestoreWhenItRenames", {"restore", "sub", "--from", "1"}, Meanwhile::whenRenamed}),
     rowName<SwapRow>);
+
+class MovedFromSwappedFolder
+    : public HistoryTest
+    , public testing::WithParamInterface<Arguments> {};
+
+TEST_P(MovedFromSwappedFolder, TouchesNothingElsewhere)
+{
+    repo.write("sub/a.dwg", "one");
+    commitAll("first");
+    support::TempFolder const elsewhere;
+    elsewhere.write("a.dwg", "precious");
+    auto const swap = [&] {
+        std::filesystem::rename(repo.pathTo("sub"), repo.pathTo("aside"));
+        repo.makeLink("sub", elsewhere.path());
+    };
+    Process process(setting(), [&] {
+        Meanwhile::whenMoved(swap);
+        return runHere(GetParam());
+    });
+    process.wait();
+    EXPECT_TRUE(repo.has("aside"));
+    EXPECT_THAT(elsewhere.list(), ElementsAre("a.dwg"));
+    EXPECT_EQ(elsewhere.read("a.dwg"), "precious");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Commands, MovedFromSwappedFolder,
+    testing::Values(
+        Arguments{"mv", "sub/a.dwg", "sub/b.dwg"}, Arguments{"mv", "sub/a.dwg", "b.dwg"},
+        Arguments{"rm", "sub/a.dwg"}));
 
 TEST_F(Names, AreExportedThroughNoLinkThatComesMeanwhile)
 {

@@ -19,6 +19,11 @@ namespace {
 
 using testing::MatchesRegex;
 
+std::string toldBy(Outcome const& outcome)
+{
+    return std::to_string(outcome.code) + "\n" + outcome.err;
+}
+
 /// A repository with a commit and a new file.
 class OddRepository : public HistoryTest {
 protected:
@@ -143,6 +148,16 @@ TEST_F(OddRepository, WithAPipeAmongItsFilesIsNotHeldUp)
         failed("tav: 'a.dwg' is no ordinary file. Nothing has been written; move it away first.\n"));
 }
 
+TEST_F(OddRepository, WhoseRulesMayNotBeReadOffersNothingForACommit)
+{
+    chmod(repo.path().c_str(), 0777);
+    chmod(repo.pathTo(".tav/properties/ignore").c_str(), 0);
+    std::string const told = support::asOrdinaryUser([&] { return toldBy(tav({"status"})); });
+    EXPECT_EQ(
+        told, "1\ntav: '" + repo.pathTo(".tav/properties/ignore") +
+                  "' cannot be read: Permission denied. Check your rights to it.\n");
+}
+
 TEST_F(OddRepository, WhoseFolderIsAFileIsNone)
 {
     takeAway(".tav");
@@ -212,6 +227,35 @@ INSTANTIATE_TEST_SUITE_P(
         LinkRow{"Restoring", ".tav/restoring"}, LinkRow{"Properties", ".tav/properties"}),
     rowName<LinkRow>);
 
+/// A file of the repository is a link to a file of somebody else.
+class LinkInAFilesPlace
+    : public OddRepository
+    , public testing::WithParamInterface<char const*> {};
+
+TEST_P(LinkInAFilesPlace, IsFollowedByNoCommand)
+{
+    std::string const file = std::string(".tav/") + GetParam();
+    support::TempFolder const elsewhere;
+    elsewhere.write("kept", "precious");
+    if (repo.has(file)) {
+        std::filesystem::rename(repo.pathTo(file), elsewhere.pathTo("kept"));
+    }
+    repo.makeLink(file, elsewhere.pathTo("kept"));
+    std::vector<std::string> const before = imageOf(elsewhere);
+    std::string const complaint =
+        "' is a link, and may lead to another repository. Put the file itself in its place.\n";
+    for (Arguments const& command :
+         {Arguments{"status"}, {"add", "--all"}, {"commit", "-m", "x"}, {"checkout", "1", "--force"}, {"gc"}}) {
+        EXPECT_EQ(tav(command), failed("tav: '" + repo.pathTo(file) + complaint)) << command.front();
+    }
+    EXPECT_EQ(tav({"init"}), failed("tav: './" + file + complaint));
+    EXPECT_EQ(imageOf(elsewhere), before);
+    EXPECT_EQ(repo.read("a.dwg"), "two");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Files, LinkInAFilesPlace, testing::Values("tav.state", "tav.db", "tav.db-journal", "tav.db-shm", "tav.db-wal"));
+
 /// Takes the right to write away from everybody, in `folder` and below.
 void makeReadOnly(std::string const& folder)
 {
@@ -262,11 +306,6 @@ void expectItOnlyReads(Command const& command, std::string const& told)
 {
     std::string const oneLine = "1\ntav: [^\n]*\\. [^\n]*\\.\n";
     EXPECT_THAT(told, MatchesRegex(command.onlyReads ? "0\n" : oneLine)) << command.words.front();
-}
-
-std::string toldBy(Outcome const& outcome)
-{
-    return std::to_string(outcome.code) + "\n" + outcome.err;
 }
 
 class ReadOnlyRepository : public OddRepository {

@@ -22,7 +22,7 @@ std::error_code fails(int error)
 
 std::error_code move(TempFolder const& folder, std::string const& from, std::string const& to)
 {
-    return os::moveEntry(folder.pathTo(from), folder.pathTo(to));
+    return os::moveEntry(folder.path(), from, to);
 }
 
 void withoutOneStep(int error)
@@ -76,6 +76,20 @@ TEST(MoveEntry, SaysWhyNothingWasMoved)
     EXPECT_EQ(move(folder, "file", "nowhere/free"), fails(ENOENT));
     EXPECT_EQ(move(folder, "file", std::string("a\0b", 3)), fails(EINVAL));
     EXPECT_THAT(folder.list(), ElementsAre("file"));
+}
+
+TEST(MoveEntry, LeadsThroughNoLink)
+{
+    TempFolder const folder;
+    folder.write("real/file", "1");
+    folder.makeFolder("real/inner");
+    folder.makeLink("link", "real");
+    EXPECT_EQ(move(folder, "link/file", "free"), fails(ENOTDIR));
+    EXPECT_EQ(move(folder, "real/file", "link/free"), fails(ENOTDIR));
+    EXPECT_EQ(move(folder, "real/file", "link/inner/free"), fails(ENOTDIR));
+    EXPECT_EQ(os::moveEntry(folder.pathTo("link"), "file", "moved"), std::error_code());
+    EXPECT_EQ(move(folder, "link", "renamed"), std::error_code());
+    EXPECT_THAT(folder.list(), ElementsAre("real/", "real/inner/", "real/moved", "renamed"));
 }
 
 TEST(MoveEntry, HasOneOfBothNamesWhenACallFails)

@@ -87,6 +87,21 @@ TEST(OpenFile, SaysWhyNothingWasOpened)
     EXPECT_EQ(folder.read("file"), "old");
 }
 
+TEST(OpenFile, ChangesNoFileThatHasAnotherName)
+{
+    TempFolder const folder;
+    folder.write("file", "content");
+    folder.makeLink("link", "file");
+    os::OpenFile file;
+    EXPECT_EQ(file.openForChanging(folder.pathTo("link")), fails(ELOOP));
+    ASSERT_EQ(link(folder.pathTo("file").c_str(), folder.pathTo("other").c_str()), 0);
+    EXPECT_EQ(file.openForChanging(folder.pathTo("file")), fails(EMLINK));
+    EXPECT_FALSE(file.isOpen());
+    EXPECT_EQ(file.openForReading(folder.pathTo("link")), std::error_code());
+    ASSERT_EQ(unlink(folder.pathTo("other").c_str()), 0);
+    EXPECT_EQ(file.openForChanging(folder.pathTo("file")), std::error_code());
+}
+
 TEST(OpenFile, StaysOpenWhenAnotherCannotBeOpened)
 {
     TempFolder const folder;

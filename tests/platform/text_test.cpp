@@ -48,6 +48,14 @@ TEST(ReadEntireFile, SkipsOneByteOrderMark)
     EXPECT_EQ(readBack("\xEF\xBB"), "\xEF\xBB");
 }
 
+TEST(ReadEntireFile, TakesNoFileForEmptyThatMemoryIsTooShortFor)
+{
+    TempFolder const folder;
+    folder.write("file", "content");
+    FailingCall const failing(0, ENOMEM);
+    EXPECT_THROW(ut::readEntireFile(folder.widePathTo("file")), std::bad_alloc);
+}
+
 TEST(ReadEntireFile, ReadsThroughALink)
 {
     TempFolder const folder;
