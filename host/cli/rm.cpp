@@ -134,7 +134,7 @@ void removeFiles(std::vector<std::string> const& names)
     });
     moves.keep();
     for (std::string const& name : waiting) {
-        std::string const file = top + "/" + name;
+        std::string const file = std::string(top).append("/").append(name);
         if (std::error_code const error = os::removeFile(file)) {
             printError("'" + file + "' is left over: " + error.message() + ".", "Delete it yourself.");
         }
