@@ -79,7 +79,8 @@ void requireOwnFiles(common::RootPath const& root)
     }
     os::OpenFile probe;
     error = probe.openForReading(rules);
-    if (error && error != std::errc::no_such_file_or_directory) {
+    bool const isMissing = error == std::errc::no_such_file_or_directory || error == std::errc::not_a_directory;
+    if (error && !isMissing) {
         throw Failure("'" + rules + "' cannot be read: " + error.message() + ".", "Check your rights to it.");
     }
 }
