@@ -170,7 +170,8 @@ std::pair<OdString, IndexData> deserializeIndexEntry(Object const& object)
 }
 
 using kutils::json::detail::Token_kind;
-using Tokens = kutils::json::detail::Element_sink::Tokens;
+using Sink = kutils::json::detail::Element_sink<char const*>;
+using Tokens = Sink::Tokens;
 
 bool isNext(Tokens& tokens, Token_kind kind)
 {
@@ -206,7 +207,7 @@ bool readPath(Tokens& tokens, OdString& path)
 
 /// Makes the index while the document is read: there are as many records as files in the working folder, and all of
 /// them as values at one time would need four times the memory and most of the time.
-class IndexReader final : public kutils::json::detail::Element_sink {
+class IndexReader final : public Sink {
 public:
     bool begin(std::wstring const& key) override
     {

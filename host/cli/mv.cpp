@@ -102,13 +102,14 @@ std::vector<common::StagedFile>
 changedAndBack(std::vector<Move> const& moves, common::State const& state, common::RootPath const& root)
 {
     std::vector<common::StagedFile> changed;
-    FileList const files = lastCommitFiles(root);
-    Tree const committed(files.begin(), files.end());
+    FileList const committed = lastCommitFiles(root);
+    auto const isBefore = [](ListedFile const& file, OdString const& path) { return file.path < path; };
     for (Move const& move : moves) {
         auto const rename = state.renames.find(move.from);
-        auto const file = committed.find(move.to);
-        bool const isBack = rename != state.renames.end() && rename->second == move.to && file != committed.end();
-        if (isBack && hasOtherContent(move.to, file->second, root)) {
+        bool const isBack = rename != state.renames.end() && rename->second == move.to;
+        auto const file = std::lower_bound(committed.begin(), committed.end(), move.to, isBefore);
+        bool const isCommitted = file != committed.end() && file->path == move.to;
+        if (isBack && isCommitted && hasOtherContent(move.to, wide(file->url), root)) {
             changed.emplace_back(move.to, common::FileChange::modified);
         }
     }

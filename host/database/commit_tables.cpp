@@ -1,6 +1,7 @@
 #include "host/database/commit_tables.h"
 
 #include "host/failure.h"
+#include "host/text/wide.h"
 
 #include <algorithm>
 #include <iterator>
@@ -71,9 +72,9 @@ std::vector<FileRecord> changesBetween(Tree parent, std::vector<FileRecord> cons
     return changes;
 }
 
-bool isBefore(FileList::value_type const& a, FileList::value_type const& b)
+bool isBefore(ListedFile const& a, ListedFile const& b)
 {
-    return a.first < b.first;
+    return a.path < b.path;
 }
 
 /// What commits changed, one after the other. Two neighbours become one when they are of about the same size, so that
@@ -99,7 +100,7 @@ public:
             joinLastTwo();
         }
         FileList files = layers_.empty() ? FileList() : std::move(layers_.front());
-        auto const isGone = [](FileList::value_type const& file) { return file.second.isEmpty(); };
+        auto const isGone = [](ListedFile const& file) { return file.url.empty(); };
         files.erase(std::remove_if(files.begin(), files.end(), isGone), files.end());
         return files;
     }
@@ -240,8 +241,11 @@ std::vector<std::int64_t> CommitTables::line(OdString const& hash) const
 
 Tree CommitTables::files(OdString const& hash) const
 {
-    FileList list = fileList(hash);
-    return Tree(std::move_iterator(list.begin()), std::move_iterator(list.end()));
+    Tree tree;
+    for (ListedFile& file : fileList(hash)) {
+        tree.emplace_hint(tree.end(), std::move(file.path), wide(file.url));
+    }
+    return tree;
 }
 
 FileList CommitTables::fileList(OdString const& hash) const
@@ -255,7 +259,7 @@ FileList CommitTables::fileList(OdString const& hash) const
         rows.with(repository_).with(number);
         FileList changes;
         while (rows.next()) {
-            changes.emplace_back(rows.text(0), rows.text(1));
+            changes.push_back({rows.text(0), std::string(rows.bytes(1))});
         }
         layers.add(std::move(changes));
     }

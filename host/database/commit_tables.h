@@ -12,7 +12,7 @@
 #include <cstdint>
 #include <map>
 #include <optional>
-#include <utility>
+#include <string>
 #include <vector>
 
 namespace tav {
@@ -43,8 +43,13 @@ struct FileVersion {
 /// The files of a commit: storage URL by path.
 using Tree = std::map<OdString, OdString>;
 
-/// The same in the order of paths, which takes half the time to make and to go through.
-using FileList = std::vector<std::pair<OdString, OdString>>;
+struct ListedFile {
+    OdString path;
+    std::string url; ///< as bytes: few of the URLs of a list are ever looked at
+};
+
+/// The files of a commit in the order of paths, which takes half the time to make and to go through.
+using FileList = std::vector<ListedFile>;
 
 class CommitTables {
 public:
@@ -69,10 +74,8 @@ public:
     std::int64_t lastNumber() const;                                     ///< 0 when there is no commit
 
     /// The files of a commit; none for an empty `hash`, which stands for what is before the first commit.
-    ///@{
-    Tree files(OdString const& hash) const;
     FileList fileList(OdString const& hash) const;
-    ///@}
+    Tree files(OdString const& hash) const; ///< the same
     /// What a commit changed against its first parent, in the order of paths.
     std::vector<FileRecord> changes(OdString const& hash) const;
     /// The URLs of all files of all commits, in ascending order.

@@ -83,11 +83,17 @@ std::int64_t Statement::integer(int column) const
     return sqlite3_column_int64(handle_.get(), column);
 }
 
-OdString Statement::text(int column) const
+std::string_view Statement::bytes(int column) const
 {
     auto const* const bytes = reinterpret_cast<char const*>(sqlite3_column_text(handle_.get(), column));
     auto const length = static_cast<std::size_t>(sqlite3_column_bytes(handle_.get(), column));
-    return bytes ? OdString(bytes, length, CP_UTF_8) : OdString();
+    return bytes ? std::string_view(bytes, length) : std::string_view();
+}
+
+OdString Statement::text(int column) const
+{
+    std::string_view const text = bytes(column);
+    return {text.data(), text.size(), CP_UTF_8};
 }
 
 Database::Database(std::string const& path, std::chrono::milliseconds patience)

@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <string_view>
 
 struct sqlite3;
 struct sqlite3_stmt;
@@ -35,6 +36,7 @@ public:
     /// Columns of the row, counted from 0. A null is 0, and an empty text.
     std::int64_t integer(int column) const;
     OdString text(int column) const;
+    std::string_view bytes(int column) const; ///< of a text; valid until the next row is asked for
 
 private:
     friend class Database;

@@ -5,6 +5,7 @@
 #include "host/repository/index_record.h"
 #include "host/repository/scan_order.h"
 #include "host/storage/local_storage.h"
+#include "host/text/wide.h"
 
 #include "common/mu_common_file_storage.h"
 #include "common/mu_common_file_utils.h"
@@ -114,11 +115,12 @@ compare(common::RootPath const& root, FolderMatch match, common::State const& st
     IndexCursor index(state.index);
     for (CommittedFile& file : match.committed) {
         bool const isUntouched = file.isThere && index.isUntouched(file);
-        bool const isUnchanged = isUntouched || (file.isThere && !hasOtherContent(file.path, file.url, root));
+        OdString url = wide(file.url);
+        bool const isUnchanged = isUntouched || (file.isThere && !hasOtherContent(file.path, url, root));
         if (isUnchanged && !isUntouched && verified) {
             verified->emplace(file.path, file.time);
         }
-        common::VersionedFile version{std::move(file.path), std::move(file.url)};
+        common::VersionedFile version{std::move(file.path), std::move(url)};
         if (isUnchanged) {
             changes.unchanged.push_back(std::move(version));
         } else if (file.isThere) {

@@ -10,6 +10,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <map>
+#include <string>
 #include <vector>
 
 namespace tav {
@@ -20,7 +21,7 @@ std::vector<common::File> scan(common::RootPath const& root);
 /// A file of a commit, beside what lies in the working folder.
 struct CommittedFile {
     OdString path;
-    OdString url;
+    std::string url;        ///< as bytes
     bool isThere = false;   ///< the ignore rules may leave it out of the scan all the same
     std::uint64_t time = 0; ///< its modification time now
 };

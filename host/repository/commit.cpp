@@ -216,7 +216,10 @@ void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& d
 common::RepoChanges compareWithBase(Draft& draft, common::State const& state)
 {
     VerifiedTimes verified;
-    FileList committed(draft.files.begin(), draft.files.end());
+    FileList committed;
+    for (auto const& [path, url] : draft.files) {
+        committed.push_back({path, url.ansi_str()});
+    }
     common::RepoChanges changes = compare(draft.root, matchFolder(draft.root, std::move(committed)), state, &verified);
     for (auto const& [path, time] : verified) {
         draft.work.files.emplace(path, indexRecord(time, draft.start));

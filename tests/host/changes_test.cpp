@@ -30,7 +30,11 @@ protected:
 
     common::RepoChanges compare() const
     {
-        return tav::compare(repo.root(), tav::matchFolder(repo.root(), {committed_.begin(), committed_.end()}), state_);
+        tav::FileList files;
+        for (auto const& [path, url] : committed_) {
+            files.push_back({path, url.ansi_str()});
+        }
+        return tav::compare(repo.root(), tav::matchFolder(repo.root(), std::move(files)), state_);
     }
 
     static OdString wide(std::string const& name) { return OdString(name.data(), name.size(), CP_UTF_8); }

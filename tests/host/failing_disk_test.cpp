@@ -233,7 +233,8 @@ TEST_F(WithoutRights, ReportsEveryFileThatCannotBeDigested)
 TEST_F(WithoutRights, LeavesTheDigestOutOfADocumentWhereAFileCannotBeRead)
 {
     chmod(repo.pathTo("a.dwg").c_str(), 0);
-    chmod(repo.pathTo(".tav/properties").c_str(), 0);
+    chmod(repo.pathTo(".tav/properties").c_str(), 0111);
+    chmod(repo.pathTo(".tav/properties/ignore").c_str(), 0444);
     EXPECT_EQ(
         asOrdinaryUser({"files", "--hash", "--json"}),
         text(

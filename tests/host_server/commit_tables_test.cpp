@@ -19,9 +19,9 @@ OdString hashOf(char c)
     return wideText(std::string(64, c));
 }
 
-bool isSameFile(tav::FileList::value_type const& listed, tav::Tree::value_type const& file)
+bool isSameFile(tav::ListedFile const& listed, tav::Tree::value_type const& file)
 {
-    return listed.first == file.first && listed.second == file.second;
+    return listed.path == file.first && wideText(listed.url) == file.second;
 }
 
 class CommitTablesTest : public testing::Test {
