@@ -4,6 +4,7 @@
 set(MU_INTERNAL_HEADERS
     common/mu_common_document.h
     common/mu_common_pattern.h
+    common/mu_common_state_document.h
     common/mu_common_translate.h)
 
 file(GLOB MU_PLATFORM_HEADERS CONFIGURE_DEPENDS RELATIVE "${PROJECT_SOURCE_DIR}"
