@@ -6,6 +6,7 @@
 #include "host/repository/changes.h"
 #include "host/repository/index_record.h"
 #include "host/repository/server_of.h"
+#include "host/repository/staging.h"
 #include "host/repository/working_state.h"
 #include "host/server/commit_document.h"
 #include "host/storage/local_storage.h"
@@ -247,10 +248,7 @@ void checkNames(std::vector<PlannedFile> const& plan)
 /// Programs that save by renaming let a file be gone for a moment: that is no removal.
 void failIfBack(std::vector<PlannedFile> const& plan, common::State const& state, common::RootPath const& root)
 {
-    std::set<OdString> wanted;
-    for (common::StagedFile const& file : state.stagedFiles) {
-        wanted.insert(file.path);
-    }
+    std::set<OdString> const wanted = stagedPaths(state);
     for (PlannedFile const& file : plan) {
         bool const isNoticed = file.change == common::FileChange::removed && wanted.count(file.path) == 0;
         if (isNoticed && ut::FileName::fileExists(root.pathTo(file.path))) {

@@ -2,6 +2,7 @@
 
 #include "host/paths/recorded_path.h"
 #include "host/repository/digest.h"
+#include "host/repository/staging.h"
 #include "host/storage/local_storage.h"
 
 #include <algorithm>
@@ -15,15 +16,6 @@ namespace {
 using Sizes = std::set<std::uintmax_t>;
 using Paths = std::set<OdString>;
 using PathsByDigest = std::multimap<OdString, OdString>;
-
-Paths stagedPaths(common::State const& state)
-{
-    Paths paths;
-    for (common::StagedFile const& file : state.stagedFiles) {
-        paths.insert(file.path);
-    }
-    return paths;
-}
 
 /// Removed files that nobody told of.
 std::vector<common::VersionedFile>

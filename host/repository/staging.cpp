@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cwctype>
 #include <map>
-#include <set>
 #include <utility>
 
 namespace tav {
@@ -76,6 +75,15 @@ std::size_t stage(std::vector<common::StagedFile> const& files, common::State& s
         }
     }
     return count;
+}
+
+std::set<OdString> stagedPaths(common::State const& state)
+{
+    Paths paths;
+    for (common::StagedFile const& file : state.stagedFiles) {
+        paths.insert(file.path);
+    }
+    return paths;
 }
 
 std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state)

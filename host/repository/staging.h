@@ -4,6 +4,7 @@
 #include "common/mu_common_state.h"
 
 #include <cstddef>
+#include <set>
 #include <vector>
 
 namespace tav {
@@ -11,6 +12,9 @@ namespace tav {
 /// Stages `files` behind what is staged already; what is staged under the same path gets the new change in its place.
 /// Returns how many were not staged before. Throws `Failure` for a path that the state file cannot hold.
 std::size_t stage(std::vector<common::StagedFile> const& files, common::State& state);
+
+/// The paths of all staged files.
+std::set<OdString> stagedPaths(common::State const& state);
 
 /// Takes `files` out of the staged ones, with what was noted of their renames. Returns how many were staged.
 std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state);

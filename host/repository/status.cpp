@@ -3,6 +3,7 @@
 #include "host/repository/changes.h"
 #include "host/repository/local_database.h"
 #include "host/repository/scan_order.h"
+#include "host/repository/staging.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
@@ -61,15 +62,6 @@ stagedEntries(common::State const& state, FolderMatch const& match, common::Root
     auto const byPath = [](StagedEntry const& a, StagedEntry const& b) { return a.path < b.path; };
     std::stable_sort(entries.begin(), entries.end(), byPath);
     return entries;
-}
-
-Paths stagedPaths(common::State const& state)
-{
-    Paths paths;
-    for (common::StagedFile const& file : state.stagedFiles) {
-        paths.insert(file.path);
-    }
-    return paths;
 }
 
 /// Committed files that are accounted for when they are missing: staged as removed, or renamed.
