@@ -222,6 +222,24 @@ TEST(Staging, OfEqualCandidatesReachesTheFirstOnly)
     EXPECT_TRUE(explorer.hasFilesToStage());
 }
 
+TEST(Staging, AnswersAlikeInWhateverOrderItIsAsked)
+{
+    StagedFile const a(L"a.dwg", FileChange::added);
+    StagedFile const b(L"b.dwg", FileChange::added);
+    StagedFile const c(L"c.dwg", FileChange::added);
+    for (std::vector<StagedFile> const& order :
+         {std::vector{a, b, c}, {a, c, b}, {b, a, c}, {b, c, a}, {c, a, b}, {c, b, a}}) {
+        RepoFileExplorer explorer = explorerOf({{}, {"a.dwg", "b.dwg", "a.dwg", "c.dwg"}, {}, {}});
+        for (StagedFile const& file : order) {
+            EXPECT_TRUE(explorer.stage(file)) << file.path.ansi_str();
+        }
+        for (StagedFile const& file : order) {
+            EXPECT_FALSE(explorer.stage(file)) << file.path.ansi_str();
+        }
+        EXPECT_TRUE(explorer.hasFilesToStage());
+    }
+}
+
 TEST(FilesToStage, AreLeftUntilAllCandidatesAreStaged)
 {
     RepoFileExplorer explorer = explorerOf({{"m"}, {"u"}, {"r"}, {}});
