@@ -200,9 +200,9 @@ private:
     void removeAll() const
     {
         os::Batch batch(folder_);
-        std::error_code error;
-        for (fs::directory_iterator entry(folder_, error), end; !error && entry != end; entry.increment(error)) {
-            [[maybe_unused]] std::error_code const ignored = batch.remove(entry->path().filename().string());
+        os::FolderReader const reader = os::openFolder(folder_);
+        while (dirent const* const entry = reader ? readdir(reader.get()) : nullptr) {
+            [[maybe_unused]] std::error_code const ignored = batch.remove(entry->d_name); // Folders stay.
         }
     }
 
