@@ -27,14 +27,14 @@ void check(bool isRead, kutils::json::Value const& document)
 kutils::json::Value readDocument(OdString const& path)
 {
     kutils::json::Value document;
-    check(kutils::json::detail::read_bytes(document, ut::detail::readBytes(path)), document);
+    check(kutils::json::read_string(document, ut::readEntireFile(path)), document);
     return document;
 }
 
-kutils::json::Value readDocument(OdString const& path, kutils::json::detail::Element_sink<char const*>& sink)
+kutils::json::Value readDocument(OdString const& path, kutils::json::detail::Element_sink& sink)
 {
     kutils::json::Value document;
-    check(kutils::json::detail::read_bytes(document, ut::detail::readBytes(path), &sink), document);
+    check(kutils::json::detail::read_string(document, ut::readEntireFile(path), sink), document);
     return document;
 }
 

@@ -16,7 +16,7 @@ namespace common {
 kutils::json::Value readDocument(OdString const& path);
 
 /// The same; arrays that `sink` wants go there, element by element.
-kutils::json::Value readDocument(OdString const& path, kutils::json::detail::Element_sink<char const*>& sink);
+kutils::json::Value readDocument(OdString const& path, kutils::json::detail::Element_sink& sink);
 
 /// Replaces the content of the file `path` by `document`, in the pretty layout. Error: the file cannot be written; it
 /// holds then what it held before.

@@ -158,8 +158,7 @@ std::pair<OdString, IndexData> deserializeIndexEntry(Object const& object)
 }
 
 using kutils::json::detail::Token_kind;
-using Sink = kutils::json::detail::Element_sink<char const*>;
-using Tokens = Sink::Tokens;
+using Tokens = kutils::json::detail::Element_sink::Tokens;
 
 bool isNext(Tokens& tokens, Token_kind kind)
 {
@@ -195,7 +194,7 @@ bool readPath(Tokens& tokens, OdString& path)
 
 /// Makes the index while the document is read: there are as many records as files in the working folder, and all of
 /// them as values at one time would need four times the memory and most of the time.
-class IndexReader final : public Sink {
+class IndexReader final : public kutils::json::detail::Element_sink {
 public:
     bool begin(std::wstring const& key) override
     {

@@ -9,7 +9,6 @@
 #include <cstdint>
 #include <cstdlib>
 #include <string>
-#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -19,7 +18,6 @@ using kutils::json::read_string;
 using kutils::json::Value;
 using kutils::json::Value_type;
 using kutils::json::write_string;
-using kutils::json::detail::read_bytes;
 
 void require(bool holds)
 {
@@ -69,7 +67,7 @@ void tryWriting(Value const& value, bool pretty, bool isExact)
 }
 
 /// Puts every array of the document's object together again from what it gets.
-class Collector final : public kutils::json::detail::Element_sink<char const*> {
+class Collector final : public kutils::json::detail::Element_sink {
 public:
     kutils::json::Object arrays;
 
@@ -93,12 +91,12 @@ private:
     Value* array_ = nullptr;
 };
 
-// Bytes that are read element by element come to the same as the text of them, read as a whole.
-void tryElements(std::string_view text, bool isRead, Value const& whole)
+// Reading element by element comes to the same as reading whole.
+void tryElements(OdString const& text, bool isRead, Value const& whole)
 {
     Collector collector;
     Value document;
-    require(read_bytes(document, text, &collector) == isRead);
+    require(kutils::json::detail::read_string(document, text, collector) == isRead);
     if (!isRead || document.type() != Value_type::object) {
         require(!isRead || write_string(document, false) == write_string(whole, false));
         return;
@@ -121,12 +119,11 @@ extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size
     }
     bool const pretty = (data[0] & 1U) != 0;
     std::setlocale(LC_CTYPE, (data[0] & 2U) != 0 ? "C.UTF-8" : "C");
-    std::string_view const bytes(reinterpret_cast<char const*>(data) + 1, size - 1);
-    OdString const text(bytes.data(), bytes.size(), CP_UTF_8);
+    OdString const text(reinterpret_cast<char const*>(data) + 1, size - 1, CP_UTF_8);
 
     Value value = L"before";
     bool const isRead = read_string(value, text);
-    tryElements(bytes, isRead, value);
+    tryElements(text, isRead, value);
     if (!isRead) {
         require(value == Value(L"before"));
         return 0;

@@ -159,24 +159,6 @@ double toReal(wchar_t first, Iterator rest, Iterator end)
     return decimal.value();
 }
 
-void append(std::wstring& text, wchar_t const* first, wchar_t const* last)
-{
-    text.append(first, last);
-}
-
-void append(std::wstring& text, char const* first, char const* last)
-{
-    auto const isAscii = [](char c) { return static_cast<unsigned char>(c) < 0x80; };
-    auto const length = static_cast<std::size_t>(last - first);
-    if (std::all_of(first, last, isAscii)) {
-        text.resize(text.size() + length);
-        std::copy(first, last, text.end() - (last - first));
-    } else {
-        OdString const decoded(first, length, CP_UTF_8);
-        text.append(decoded.c_str(), decoded.getLength());
-    }
-}
-
 std::uint64_t bitsOf(double real)
 {
     std::uint64_t bits = 0;
@@ -313,7 +295,7 @@ Token<String>& Scanner<String, Iterator>::readString()
         while (at_ != end_ && *at_ != L'"' && *at_ != L'\\') {
             ++at_;
         }
-        append(token_.text, run, at_);
+        token_.text.append(run, at_);
         if (at_ == end_) {
             return give(Token_kind::invalid);
         }
@@ -377,7 +359,7 @@ Token<String>& Scanner<String, Iterator>::refuse(Char c)
 }
 
 template <class Value, class Iterator>
-bool Parser<Value, Iterator>::parse(Iterator& begin, Iterator end, Value& out, Element_sink<Iterator>* sink)
+bool Parser<Value, Iterator>::parse(Iterator& begin, Iterator end, Value& out, Element_sink* sink)
 {
     if (begin == end) {
         return false;
@@ -525,14 +507,12 @@ Token<typename Value::String>& Parser<Value, Iterator>::nextItem(bool isFirst, T
 }
 
 template class Scanner<std::wstring, wchar_t const*>;
-template class Scanner<std::wstring, char const*>;
 template class Parser<Value, wchar_t const*>;
-template class Parser<Value, char const*>;
 
-bool read_bytes(Value& out, std::string_view text, Element_sink<char const*>* sink)
+bool read_string(Value& out, OdString const& text, Element_sink& sink)
 {
-    char const* begin = text.data();
-    return Parser<Value, char const*>::parse(begin, begin + text.size(), out, sink);
+    wchar_t const* begin = text.c_str();
+    return Parser<Value, wchar_t const*>::parse(begin, begin + text.getLength(), out, &sink);
 }
 
 } // namespace detail

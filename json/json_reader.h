@@ -7,7 +7,6 @@
 
 #include <cstdint>
 #include <string>
-#include <string_view>
 #include <vector>
 
 namespace kutils::json {
@@ -27,15 +26,11 @@ KUTILS_JSON_EXPORT bool read_string(Value& out, OdString const& text);
 
 namespace detail {
 
-template <class Iterator>
 class Element_sink;
 
-/// Reads what `read_string` reads from the text that the bytes `text` stand for, see `OdString`. That text is never
-/// made as a whole: in wide characters it takes four times the memory, which costs more time than reading it.
-///
-/// The elements of arrays that `sink` wants go there, and these arrays are empty in `out`. After a syntax error what
-/// the sink has got is of no use.
-KUTILS_JSON_EXPORT bool read_bytes(Value& out, std::string_view text, Element_sink<char const*>* sink = nullptr);
+/// As above, but the elements of arrays that `sink` wants go there, and these arrays are empty in `out`. After a syntax
+/// error what the sink has got is of no use.
+KUTILS_JSON_EXPORT bool read_string(Value& out, OdString const& text, Element_sink& sink);
 
 enum class Token_kind : std::int32_t {
     open_array,
@@ -64,9 +59,6 @@ struct Token {
 
 /// Cuts a range of characters into tokens. The range must outlive the scanner.
 ///
-/// A range of bytes stands for the text that `OdString` makes of them. Whatever is not ASCII belongs into strings, so
-/// they are all that has to be decoded.
-///
 /// The range is read as if the character 0 followed it for ever. A character that turns out not to belong to a token
 /// is put back for the next one, except the character 0: as a mark for the end of a number it is used up.
 template <class String, class Iterator>
@@ -92,7 +84,7 @@ public:
     void moveTo(Iterator position) { at_ = position; }
 
 private:
-    Char next() { return at_ == end_ ? Char() : toChar(*at_++); }
+    Char next() { return at_ == end_ ? Char() : *at_++; }
     void putBack(Char c)
     {
         if (c != Char()) {
@@ -100,8 +92,6 @@ private:
         }
     }
 
-    static Char toChar(wchar_t c) { return c; }
-    static Char toChar(char c) { return static_cast<unsigned char>(c); }
     void skipBlanks();
     Token<String>& readReal(Char first, Iterator rest, Char c);
     Token<String>& readWord(Char const* rest, Token_kind kind);
@@ -118,10 +108,9 @@ private:
 
 /// Takes long arrays element by element while the document is read: as values they need many times the memory of what
 /// becomes of them, and most of the time goes into making and destroying them.
-template <class Iterator>
 class KUTILS_JSON_EXPORT Element_sink {
 public:
-    using Tokens = Scanner<std::wstring, Iterator>;
+    using Tokens = Scanner<std::wstring, wchar_t const*>;
 
     virtual ~Element_sink() = default;
 
@@ -142,11 +131,11 @@ public:
     /// A syntax error.
     struct Error {};
 
-    Parser(Iterator begin, Iterator end, Element_sink<Iterator>* sink = nullptr) : scanner_(begin, end), sink_(sink) {}
+    Parser(Iterator begin, Iterator end, Element_sink* sink = nullptr) : scanner_(begin, end), sink_(sink) {}
 
     /// Reads one value into `out` and moves `begin` behind the last character that was used. False on a syntax error or
     /// an empty range; `out` is then as it was.
-    static bool parse(Iterator& begin, Iterator end, Value& out, Element_sink<Iterator>* sink = nullptr);
+    static bool parse(Iterator& begin, Iterator end, Value& out, Element_sink* sink = nullptr);
 
     /// Reads the next value into `out`. False if there was a `]` instead and `closeAllowed` is set; throws `Error` on
     /// anything else that is no value. `out` changes only when a whole value was read.
@@ -166,15 +155,13 @@ private:
 
     Scanner<typename Value::String, Iterator> scanner_;
     std::vector<Value*> open_; ///< The containers being read, each the last item of the one before.
-    Element_sink<Iterator>* sink_;
+    Element_sink* sink_;
     Value* handedOver_ = nullptr; ///< The array whose elements go to the sink; it holds the last one at most.
     bool isFirstElement_ = false; ///< Whether none of them has been read.
 };
 
 extern template class Scanner<std::wstring, wchar_t const*>;
-extern template class Scanner<std::wstring, char const*>;
 extern template class Parser<Value, wchar_t const*>;
-extern template class Parser<Value, char const*>;
 
 } // namespace detail
 } // namespace kutils::json

@@ -28,25 +28,22 @@ OdString reasonOf(std::error_code const& error)
     throw OdError(message.format(L"Could not read file '%ls': %ls", path.c_str(), reasonOf(error).c_str()));
 }
 
+std::string_view withoutByteOrderMark(std::string_view bytes)
+{
+    constexpr std::string_view kMark = "\xEF\xBB\xBF";
+    return bytes.substr(0, kMark.size()) == kMark ? bytes.substr(kMark.size()) : bytes;
+}
+
 } // namespace
 
-std::string detail::readBytes(OdString const& path)
+OdString readEntireFile(OdString const& path)
 {
     std::string bytes;
     if (auto const error = os::readFile(path.ansi_str(), bytes)) {
         throwUnreadable(path, error);
     }
-    constexpr std::string_view kByteOrderMark = "\xEF\xBB\xBF";
-    if (bytes.compare(0, kByteOrderMark.size(), kByteOrderMark) == 0) {
-        bytes.erase(0, kByteOrderMark.size());
-    }
-    return bytes;
-}
-
-OdString readEntireFile(OdString const& path)
-{
-    std::string const bytes = detail::readBytes(path);
-    return {bytes.data(), bytes.size(), CP_UTF_8};
+    std::string_view const text = withoutByteOrderMark(bytes);
+    return {text.data(), text.size(), CP_UTF_8};
 }
 
 OdString correctSlashes(OdString const& path)

@@ -5,21 +5,12 @@
 #include "platform/sdk/OdArray.h"
 #include "platform/sdk/OdString.h"
 
-#include <string>
-
 namespace ut {
 
 /// The whole content of the text file `path`, a byte-order mark skipped, line ends as they stand; UTF-8, see `OdString`
 /// for bytes that are not. Throws `OdError`, naming the file, when it is no regular file or cannot be read, and
 /// `std::bad_alloc` when it does not fit into memory.
 MU_PLATFORM_EXPORT OdString readEntireFile(OdString const& path);
-
-namespace detail {
-
-/// What `readEntireFile` reads, as bytes, for who decodes a part at a time. Throws likewise.
-MU_PLATFORM_EXPORT std::string readBytes(OdString const& path);
-
-} // namespace detail
 
 /// `path` with the separators of this platform. The slash is the only one here, so every path is left as it is: a
 /// backslash may belong to a name.

@@ -2,9 +2,7 @@
 #include "tests/json/documents.h"
 
 #include <gmock/gmock.h>
-#include <random>
 #include <sstream>
-#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -12,12 +10,12 @@ namespace {
 
 using namespace documents;
 using kutils::json::write_string;
-using kutils::json::detail::read_bytes;
+using kutils::json::detail::Element_sink;
 using kutils::json::detail::Token_kind;
 using testing::ElementsAre;
 
 /// Wants the array "list". Takes `{"n":NUMBER}` from its tokens and all else as values, and notes both.
-class Notes final : public kutils::json::detail::Element_sink<char const*> {
+class Notes final : public Element_sink {
 public:
     std::vector<std::wstring> notes;
     std::vector<std::wstring> offered;
@@ -57,7 +55,8 @@ struct Result {
 Result readInPieces(std::wstring const& text)
 {
     Result result;
-    result.isRead = read_bytes(result.document, OdString(text.data(), text.size()).ansi_str(), &result.sink);
+    OdString const characters(text.data(), text.size());
+    result.isRead = kutils::json::detail::read_string(result.document, characters, result.sink);
     return result;
 }
 
@@ -111,9 +110,9 @@ TEST(JsonElements, NeedTheSyntaxThatAllDocumentsNeed)
 
 TEST(JsonElements, AreForgottenBehindAnError)
 {
-    std::string const text = R"({"list":[1:{"more":[5]})";
+    std::wstring const text = LR"({"list":[1:{"more":[5]})";
     Notes sink;
-    kutils::json::detail::Parser<Value, char const*> parser(text.data(), text.data() + text.size(), &sink);
+    kutils::json::detail::Parser<Value, wchar_t const*> parser(text.data(), text.data() + text.size(), &sink);
     Value value;
     EXPECT_THROW(parser.get(value, false), decltype(parser)::Error);
     ASSERT_TRUE(parser.get(value, false));
@@ -127,85 +126,6 @@ TEST(JsonElements, OfADocumentThatIsCutOffAreRefused)
     for (std::size_t length = 0; length < text.size(); ++length) {
         EXPECT_FALSE(readInPieces(text.substr(0, length)).isRead) << length;
     }
-}
-
-TEST(JsonBytes, AreDecodedInStrings)
-{
-    // A sequence that the end of the string or an escape cuts off is held byte by byte, like others that are no UTF-8.
-    std::string const bytes = "{\"\xC3\xA4\":\"a\xF0\x9F\x98\x80z\",\"b\":\"\xFF\xC3\",\"c\":\"\xE2\x82\\n\xC3\\t\","
-                              "\"d\":\"\xED\xA0\x80\"}";
-    Value value;
-    ASSERT_TRUE(read_bytes(value, bytes));
-    Value const expected = Object{
-        {L"\u00e4", L"a\U0001f600z"},
-        {L"b", std::wstring{0xDCFF, 0xDCC3}},
-        {L"c", std::wstring{0xDCE2, 0xDC82, L'\n', 0xDCC3, L'\t'}},
-        {L"d", std::wstring{0xDCED, 0xDCA0, 0xDC80}}};
-    EXPECT_EQ(value, expected);
-}
-
-TEST(JsonBytes, AreAsciiOutsideOfStrings)
-{
-    for (char const* const text :
-         {"\xC3\xA4", "[\xA0]", "\xC2\xA0[]", "\xE2\x80\x83[]", "[1\xC3\xA4]", "[1,\xEF\xBC\x91]", "{\"a\"\xC2\x85:1}",
-          "[tru\xE5]", "[\"\\\xC3\xA4\"]", "[\"\\u00\xEF\xBC\x91\xEF\xBC\x91\"]"}) {
-        Value value;
-        EXPECT_FALSE(read_bytes(value, text)) << text;
-    }
-}
-
-TEST(JsonBytes, EndWithTheFirstNulOutsideOfAString)
-{
-    Value value;
-    EXPECT_TRUE(read_bytes(value, std::string_view("[\"a\0b\"]\0]", 9)));
-    EXPECT_EQ(value, Value(Array{std::wstring(L"a\0b", 3)}));
-    EXPECT_FALSE(read_bytes(value, std::string_view("[1,\0]", 6)));
-    EXPECT_FALSE(read_bytes(value, std::string_view()));
-}
-
-TEST(JsonBytes, ReadAsTheTextThatTheyStandFor)
-{
-    std::vector<std::string> const pieces = {
-        "{",
-        "}",
-        "[",
-        "]",
-        ":",
-        ",",
-        "\"a\"",
-        "\"",
-        "\\",
-        "\\u00e4",
-        "1",
-        "-0",
-        "1.5",
-        "1e3",
-        "true",
-        "null",
-        " ",
-        "\n",
-        "\xC3",
-        "\xA4",
-        "\xC3\xA4",
-        "\xFF",
-        "\xF0\x9F\x98\x80",
-        std::string(1, '\0')};
-    std::mt19937 random(11);
-    int documents = 0;
-    for (int round = 0; round < 30'000; ++round) {
-        std::string bytes = round % 2 == 0 ? "" : "[\"";
-        for (unsigned count = random() % 8; count > 0; --count) {
-            bytes += pieces[random() % pieces.size()];
-        }
-        bytes += round % 2 == 0 ? "" : "\"]";
-        Value ofBytes;
-        Value ofText;
-        bool const isRead = read_bytes(ofBytes, bytes);
-        ASSERT_EQ(isRead, kutils::json::read_string(ofText, OdString(bytes.data(), bytes.size(), CP_UTF_8))) << bytes;
-        ASSERT_EQ(ofBytes, ofText) << bytes;
-        documents += isRead ? 1 : 0;
-    }
-    EXPECT_GT(documents, 3'000);
 }
 
 using Generator = kutils::json::detail::Generator<Value, std::wostringstream>;
