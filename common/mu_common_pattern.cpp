@@ -16,6 +16,8 @@ namespace {
 // An expression of this many states compiles and matches within some 520 KiB of stack (measured with libstdc++ 12) and
 // takes some milliseconds for a file name at worst. Lists of names are far smaller.
 constexpr std::size_t kMaxStates = 4000;
+constexpr std::size_t kMaxDigitsOfBackReference =
+    4; // The standard library reads longer numbers past the end of their type.
 // A look-ahead starts a match of its own at every character, one inside another multiplies that once more.
 constexpr std::size_t kMaxStatesWithLookAhead = 400;
 // One level of nesting takes some 850 bytes of stack to compile.
@@ -103,6 +105,10 @@ private:
     {
         bool const isDigit = rest_.size() > 1 && rest_[1] >= '1' && rest_[1] <= '9';
         backReference_ = backReference_ || isDigit;
+        std::size_t const end = std::min(rest_.find_first_not_of("0123456789", 1), rest_.size());
+        if (isDigit && end - 1 > kMaxDigitsOfBackReference) {
+            refuse();
+        }
         atom(2);
         last_ = isDigit ? Last::group : Last::other;
     }

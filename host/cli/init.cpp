@@ -100,7 +100,6 @@ void init(InitOptions const& options)
     common::RootPath const root =
         valueOrFail(common::RootPath::get(path, true), "Check that the folder is one and that you may write there.");
     requireOwnFiles(root);
-    requireOwnDatabase(root);
     std::string const folder = absolute(options.folder);
     std::string const name = std::filesystem::path(folder).filename().string();
     os::FileLock const lock = lockRepository(root, "init");

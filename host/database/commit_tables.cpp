@@ -77,8 +77,8 @@ bool isBefore(ListedFile const& a, ListedFile const& b)
     return a.path < b.path;
 }
 
-/// What commits changed, one after the other. Two neighbours become one when they are of about the same size, so that
-/// no file is moved more often than there are doublings from one commit to all of them.
+/// What commits changed, one after the other. Two neighbours become one when they are of about the same size: joining
+/// each commit with all before it would take quadratic time.
 class Layers {
 public:
     /// Takes the changes of the next commit. The database has its own order for paths that are no UTF-8.

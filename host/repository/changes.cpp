@@ -2,6 +2,7 @@
 
 #include "host/failure.h"
 #include "host/repository/digest.h"
+#include "host/repository/ignore_file.h"
 #include "host/repository/index_record.h"
 #include "host/repository/scan_order.h"
 #include "host/storage/local_storage.h"
@@ -12,7 +13,6 @@
 
 #include <algorithm>
 #include <filesystem>
-#include <functional>
 #include <future>
 #include <iterator>
 #include <regex>
@@ -56,6 +56,7 @@ private:
 
 std::vector<common::File> scan(common::RootPath const& root)
 {
+    requireRules(root);
     try {
         return valueOrFail(common::collectRepoFiles(root), "Check the path of the repository.");
     } catch (std::regex_error const&) {
@@ -139,7 +140,7 @@ void dropUntouched(FolderMatch& match, common::State const& state)
 {
     IndexCursor index(state.index);
     auto const isUntouched = [&](CommittedFile const& file) { return file.isThere && index.isUntouched(file); };
-    auto const kept = std::remove_if(match.committed.begin(), match.committed.end(), std::cref(isUntouched));
+    auto const kept = std::remove_if(match.committed.begin(), match.committed.end(), isUntouched);
     match.committed.erase(kept, match.committed.end());
 }
 

@@ -63,7 +63,7 @@ using VerifiedTimes = std::map<OdString, std::uint64_t>;
 common::RepoChanges
 compare(common::RootPath const& root, FolderMatch match, common::State const& state, VerifiedTimes* verified = nullptr);
 
-/// Takes the files out that `compare` would take for unchanged without reading them, and would list.
+/// Leaves out the files that are unchanged by the index alone: `compare` would only list them.
 void dropUntouched(FolderMatch& match, common::State const& state);
 
 /// Enters the files that were read into the index, for a command that began at `start`.

@@ -218,6 +218,7 @@ common::RepoChanges compareWithBase(Draft& draft, common::State const& state)
 {
     VerifiedTimes verified;
     FileList committed;
+    committed.reserve(draft.files.size());
     for (auto const& [path, url] : draft.files) {
         committed.push_back({path, url.ansi_str()});
     }

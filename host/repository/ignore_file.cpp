@@ -2,6 +2,7 @@
 
 #include "host/failure.h"
 
+#include "platform/os/os_open_file.h"
 #include "platform/ut/FileName.h"
 #include "platform/ut/TextFile.h"
 #include "platform/ut/text.h"
@@ -69,8 +70,21 @@ OdString withRule(OdString const& text, OdString const& rule)
 
 } // namespace
 
+void requireRules(common::RootPath const& root)
+{
+    std::string const path = pathOf(root).ansi_str();
+    os::OpenFile probe;
+    std::error_code const error = probe.openForReading(path);
+    if (error && error != std::errc::no_such_file_or_directory && error != std::errc::not_a_directory) {
+        throw Failure(
+            "The ignore file '" + path + "' cannot be read: " + error.message() + ".",
+            "Check it and your rights to it.");
+    }
+}
+
 std::vector<OdString> ignoreRules(common::RootPath const& root)
 {
+    requireRules(root);
     try {
         return common::RepoIgnore(root).rules();
     } catch (std::regex_error const&) {

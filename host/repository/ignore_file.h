@@ -8,7 +8,12 @@
 
 namespace tav {
 
-/// The rules in effect, in order: those of the ignore file, or the defaults when there is none.
+/// Throws `Failure` when the ignore file is there and cannot be read: the library would take it for empty then, and
+/// files would be offered for a commit that were meant to stay out.
+void requireRules(common::RootPath const& root);
+
+/// The rules in effect, in order: those of the ignore file, or the defaults when there is none. Throws `Failure` when
+/// they cannot be used.
 std::vector<OdString> ignoreRules(common::RootPath const& root);
 
 /// Makes the properties folder and the ignore file with the default rules, as far as they are missing.

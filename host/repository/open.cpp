@@ -3,8 +3,6 @@
 #include "host/failure.h"
 #include "host/text/wide.h"
 
-#include "platform/os/os_open_file.h"
-
 #include <filesystem>
 
 namespace tav {
@@ -52,6 +50,17 @@ void failIfLink(std::string const& path, std::string const& kind)
     }
 }
 
+void failIfShared(std::string const& path)
+{
+    std::error_code error;
+    bool const isFile = fs::is_regular_file(path, error);
+    if (isFile && fs::hard_link_count(path, error) > 1 && !error) {
+        throw Failure(
+            "'" + path + "' has another name (a hard link), and what is written would show there too.",
+            "Put a copy in its place.");
+    }
+}
+
 } // namespace
 
 common::RootPath openRepository(std::string const& folder)
@@ -63,36 +72,15 @@ common::RootPath openRepository(std::string const& folder)
 
 void requireOwnFiles(common::RootPath const& root)
 {
-    for (wchar_t const* const name : {L".tav", L".tav/objects", L".tav/properties", L".tav/restoring", L".tav/tf"}) {
+    for (wchar_t const* const name :
+         {L".tav", L".tav/objects", L".tav/objects/incoming", L".tav/properties", L".tav/restoring", L".tav/tf"}) {
         failIfLink(root.pathTo(name).ansi_str(), "folder");
     }
-    // A database that is in use has files beside it.
-    for (wchar_t const* const name :
-         {L".tav/tav.state", L".tav/tav.db", L".tav/tav.db-journal", L".tav/tav.db-shm", L".tav/tav.db-wal"}) {
-        failIfLink(root.pathTo(name).ansi_str(), "file");
-    }
-    std::string const rules = root.pathTo(L".tav/properties/ignore").ansi_str();
-    std::error_code error;
-    fs::file_type const type = fs::status(rules, error).type();
-    if (type != fs::file_type::not_found && type != fs::file_type::regular && type != fs::file_type::none) {
-        throw Failure("'" + rules + "' is no file.", "Move it away; 'tav init' makes a new one.");
-    }
-    os::OpenFile probe;
-    error = probe.openForReading(rules);
-    bool const isMissing = error == std::errc::no_such_file_or_directory || error == std::errc::not_a_directory;
-    if (error && !isMissing) {
-        throw Failure("'" + rules + "' cannot be read: " + error.message() + ".", "Check your rights to it.");
-    }
-}
-
-void requireOwnDatabase(common::RootPath const& root)
-{
-    std::string const database = root.dbPath().ansi_str();
-    std::error_code error;
-    if (fs::hard_link_count(database, error) > 1 && !error) {
-        throw Failure(
-            "'" + database + "' has another name (a hard link), and what is written would show there too.",
-            "Put a copy in its place.");
+    failIfLink(root.statePath().ansi_str(), "file");
+    for (wchar_t const* const end : {L"", L"-journal", L"-shm", L"-wal"}) { // A database in use has files beside it.
+        std::string const file = (root.dbPath() + end).ansi_str();
+        failIfLink(file, "file");
+        failIfShared(file);
     }
 }
 

@@ -13,11 +13,8 @@ namespace tav {
 common::RootPath openRepository(std::string const& folder);
 
 /// Throws `Failure` when ".tav", a folder in it, its state or its database is a link: commands write and remove there,
-/// and what a link leads to may be another repository's, or not even a repository. Also when the ignore file is there
-/// and cannot be read: files would be offered for a commit that were meant to stay out.
+/// and what a link leads to may be another repository's, or not even a repository. Also when the database has another
+/// name: it is changed in place, by readers too when they find a change that was interrupted.
 void requireOwnFiles(common::RootPath const& root);
-
-/// Throws `Failure` when the database has another name: it is changed in place, and would change under that name too.
-void requireOwnDatabase(common::RootPath const& root);
 
 } // namespace tav

@@ -13,7 +13,6 @@
 #include <functional>
 #include <future>
 #include <memory>
-#include <optional>
 #include <set>
 #include <utility>
 
@@ -85,9 +84,11 @@ std::vector<common::ConflictInfo> conflictsOf(common::RootPath const& root)
 
 /// What the database knows.
 struct History {
-    std::optional<CommitRecord> base; ///< the commit that the working folder stands on
-    FileList files;                   ///< of that commit
+    OdString base; ///< hash of the commit that the working folder stands on
+    std::int64_t number = 0;
+    FileList files; ///< of that commit
     std::vector<common::Reference> references;
+    std::string unfinishedWork;
 };
 
 History readHistory(LocalDatabase& database)
@@ -95,7 +96,9 @@ History readHistory(LocalDatabase& database)
     Snapshot const snapshot(database.database());
     CommitTables const& commits = database.commits();
     OdString const base = database.base();
-    return {commits.find(base), commits.fileList(base), commits.references()};
+    auto const commit = commits.find(base);
+    return {
+        base, commit ? commit->number : 0, commits.fileList(base), commits.references(), noteOnUnfinished(database)};
 }
 
 struct Findings {
@@ -106,7 +109,7 @@ struct Findings {
 
 /// Looking for the files takes as long as reading what has been committed, and asking for their times longer than
 /// reading the state; so each goes on beside the other.
-Findings lookAround(common::RootPath const& root, LocalDatabase& database)
+Findings lookOnce(common::RootPath const& root, LocalDatabase& database)
 {
     Findings found;
     auto scanning = std::async([&] { return scan(root); });
@@ -120,14 +123,25 @@ Findings lookAround(common::RootPath const& root, LocalDatabase& database)
     return found;
 }
 
+/// A commit may come to its end between reading the database and reading the state, which speak of different commits
+/// then: each file that it took would seem to be as committed.
+Findings lookAround(common::RootPath const& root, LocalDatabase& database)
+{
+    Findings found = lookOnce(root, database);
+    while (database.base() != found.history.base) {
+        found = lookOnce(root, database);
+    }
+    return found;
+}
+
 void enterPlace(History const& history, common::State const& state, Status& status)
 {
     auto const isHead = [&](common::Reference const& reference) { return reference.name == state.head; };
     auto const end = std::find_if(history.references.begin(), history.references.end(), isHead);
-    OdString const base = history.base ? history.base->hash : OdString();
     status.branch = state.head;
-    status.commit = history.base ? history.base->number : 0;
-    status.isAtEnd = end == history.references.end() || end->commitHash == base;
+    status.commit = history.number;
+    status.isAtEnd = end == history.references.end() || end->commitHash == history.base;
+    status.unfinishedWork = history.unfinishedWork;
 }
 
 /// A staged file that turns out to be renamed is shown so; other renamed files are a group of their own.
@@ -154,7 +168,6 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     auto [history, match, cache] = lookAround(root, database);
     common::State const& state = cache->read();
     enterPlace(history, state, status);
-    status.unfinishedWork = noteOnUnfinished(database);
     status.conflicts = conflictsOf(root);
     status.staged = stagedEntries(state, match, root);
     dropUntouched(match, state);

@@ -4,7 +4,6 @@
 #include "host/repository/commit.h"
 #include "host/repository/index_record.h"
 #include "host/repository/moving.h"
-#include "host/repository/open.h"
 #include "host/repository/unfinished.h"
 
 namespace tav {
@@ -33,7 +32,6 @@ Work::Work(common::RootPath const& root, std::string const& name, Unfinished unf
     , start_(commandStart(root))
     , database_(LocalDatabase::open(root))
 {
-    requireOwnDatabase(root);
     try {
         finish();
     } catch (Failure const&) {

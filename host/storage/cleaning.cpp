@@ -79,7 +79,7 @@ void reduceStore(
     std::string const& path, std::string const& name, std::set<DigestBytes> const& digests, std::string const& scratch,
     Freed& freed)
 {
-    RecordFile const old = RecordFile::openForReading(path, name);
+    RecordFile const old = RecordFile::openForChanging(path, name);
     std::set<std::size_t> const needed = neededOf(old, digests, name);
     std::size_t const dropped = old.entries().size() - needed.size();
     if (needed.empty()) {

@@ -28,19 +28,19 @@ constexpr char const* kCopy = ".placing.tmp";
 
 Handle openFolderIn(int folder, std::string const& name)
 {
-    return openAt(folder, name, kFolderFlags);
+    return openAt(folder, name, detail::kPassingFlags);
 }
 
 Handle openOrMake(int folder, std::string const& name)
 {
-    Handle opened = openAt(folder, name, kFolderFlags);
+    Handle opened = openFolderIn(folder, name);
     if (opened.isOpen() || errno != ENOENT) {
         return opened;
     }
     if (calls().mkdirat(folder, name.c_str(), kFolderPermissions) == -1 && errno != EEXIST) {
         return opened;
     }
-    return openAt(folder, name, kFolderFlags);
+    return openFolderIn(folder, name);
 }
 
 /// Gives the file `from` the permissions of the file that it replaces.

@@ -51,13 +51,6 @@ std::error_code flush(Handle const& file)
     return outcome(retried([&] { return calls().fsync(file.get()); }));
 }
 
-// Some file systems keep their folders safe themselves and know no flushing of them.
-std::error_code flushEntries(Handle const& folder)
-{
-    std::error_code const error = flush(folder);
-    return error == std::errc::invalid_argument ? std::error_code() : error;
-}
-
 std::error_code writeAll(Handle const& file, std::string_view content)
 {
     while (!content.empty()) {

@@ -14,6 +14,7 @@
 namespace os::detail {
 
 constexpr int kFolderFlags = O_RDONLY | O_DIRECTORY | O_NOFOLLOW;
+constexpr int kPassingFlags = O_PATH | O_DIRECTORY | O_NOFOLLOW; // Needs no right to list the folder.
 
 inline std::error_code lastError()
 {
@@ -80,12 +81,20 @@ inline Handle openAt(int folder, std::string const& path, int flags, mode_t mode
     return Handle(retried([&] { return calls().openat(folder, path.c_str(), flags | O_CLOEXEC, mode); }));
 }
 
+/// Waits until the entries of a folder are safe on the disk. Some file systems keep their folders safe themselves and
+/// know no flushing of them.
+inline std::error_code flushEntries(Handle const& folder)
+{
+    std::error_code const error = outcome(retried([&] { return calls().fsync(folder.get()); }));
+    return error == std::errc::invalid_argument ? std::error_code() : error;
+}
+
 /// Opens the folder `path` below the open folder `top` part by part, each with `open(folder, name)`; an empty `path` is
 /// `top` itself. A part that is a link, or becomes one meanwhile, is no folder.
 template <class Open>
 Handle walk(int top, std::string const& path, Open const& open)
 {
-    Handle place = openAt(top, ".", kFolderFlags);
+    Handle place = openAt(top, ".", kPassingFlags);
     for (std::size_t begin = 0; place.isOpen() && begin < path.size();) {
         std::size_t const end = std::min(path.find('/', begin), path.size());
         place = open(place.get(), path.substr(begin, end - begin));

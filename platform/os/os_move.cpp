@@ -12,11 +12,11 @@
 namespace os {
 namespace {
 
+using detail::flushEntries;
 using detail::Handle;
 using detail::lastError;
 using detail::openAt;
 using detail::outcome;
-using detail::retried;
 
 /// An entry of a folder that is held open.
 struct Entry {
@@ -24,13 +24,17 @@ struct Entry {
     std::string name;
 };
 
-Entry entryAt(Handle const& top, std::string const& path)
+std::error_code findEntry(std::string const& top, std::string const& path, Entry& entry)
 {
-    auto const openFolder = [](int folder, std::string const& name) {
-        return openAt(folder, name, detail::kFolderFlags);
-    };
+    auto const pass = [](int folder, std::string const& name) { return openAt(folder, name, detail::kPassingFlags); };
     detail::Place place = detail::placeOf(path);
-    return {detail::walk(top.get(), place.folder, openFolder), std::move(place.name)};
+    Handle const start = openAt(AT_FDCWD, top, O_PATH | O_DIRECTORY);
+    Handle const folder = start.isOpen() ? detail::walk(start.get(), place.folder, pass) : Handle();
+    if (!folder.isOpen()) {
+        return lastError();
+    }
+    entry = {openAt(folder.get(), ".", detail::kFolderFlags), std::move(place.name)};
+    return entry.folder.isOpen() ? std::error_code() : lastError();
 }
 
 /// For file systems that cannot check and move in one step.
@@ -51,35 +55,29 @@ std::error_code move(Entry const& from, Entry const& to)
     return isUnknown ? moveAfterLook(from, to) : outcome(result);
 }
 
-std::error_code flush(Handle const& folder)
-{
-    return outcome(retried([&] { return calls().fsync(folder.get()); }));
-}
-
 } // namespace
 
-std::error_code moveEntry(std::string const& top, std::string const& from, std::string const& to)
+std::error_code moveEntry(std::string const& top, std::string const& from, std::string const& to, bool& hasMoved)
 {
+    hasMoved = false;
     if ((top + from + to).find('\0') != std::string::npos) {
         return std::make_error_code(std::errc::invalid_argument);
     }
-    Handle const folder = openAt(AT_FDCWD, top, O_RDONLY | O_DIRECTORY);
-    if (!folder.isOpen()) {
-        return lastError();
+    Entry source;
+    if (std::error_code const error = findEntry(top, from, source)) {
+        return error;
     }
-    Entry const source = entryAt(folder, from);
-    if (!source.folder.isOpen()) {
-        return lastError();
+    Entry target;
+    if (std::error_code const error = findEntry(top, to, target)) {
+        return error;
     }
-    Entry const target = entryAt(folder, to);
-    if (!target.folder.isOpen()) {
-        return lastError();
-    }
+    bool const isOneFolder = detail::placeOf(from).folder == detail::placeOf(to).folder;
     if (std::error_code const error = move(source, target)) {
         return error;
     }
-    std::error_code const error = flush(target.folder);
-    return error ? error : flush(source.folder);
+    hasMoved = true;
+    std::error_code const error = flushEntries(target.folder);
+    return error || isOneFolder ? error : flushEntries(source.folder);
 }
 
 } // namespace os

@@ -434,6 +434,8 @@ INSTANTIATE_TEST_SUITE_P(
         Hostile{"Doubled", "^(.)\\1$", "aa", "match"}, Hostile{"NotDoubled", "^(.)\\1$", "ab", "no match"},
         Hostile{"DoubledText", "^(.*)\\1$", kLong, "match"}, Hostile{"ToTheSecondGroup", "(a)(b)\\2", "abb", "match"},
         Hostile{"WithAFewAlternatives", "^(plan|site)_(a|b)\\2$", "site_bb", "match"},
+        Hostile{"ToAGroupBeyondAllNumbers", "(a)\\" + std::string(60, '2'), "aa", "refused"},
+        Hostile{"ToTheLastGroupThatCouldBe", "(a)\\99999", "aa", "refused"},
         Hostile{"BesideALoopOfLoops", "(a*)*\\1b", kLong, "refused"},
         Hostile{"InALoop", "(a)(\\1)*b", kLong, "refused"}, Hostile{"RepeatedItself", "(a)\\1*b", kLong, "refused"},
         Hostile{"BesideManyLoops", "(a*)(a*)(a*)\\1b", kLong, "refused"},

@@ -30,11 +30,16 @@ protected:
 
     common::RepoChanges compare() const
     {
+        return tav::compare(repo.root(), tav::matchFolder(repo.root(), committedFiles()), state_);
+    }
+
+    tav::FileList committedFiles() const
+    {
         tav::FileList files;
         for (auto const& [path, url] : committed_) {
             files.push_back({path, url.ansi_str()});
         }
-        return tav::compare(repo.root(), tav::matchFolder(repo.root(), std::move(files)), state_);
+        return files;
     }
 
     static OdString wide(std::string const& name) { return OdString(name.data(), name.size(), CP_UTF_8); }
@@ -138,6 +143,36 @@ TEST_F(Compare, TakesAFileForRemovedThatAFolderHasReplaced)
     ASSERT_EQ(unlink(repo.pathTo("a.dwg").c_str()), 0);
     repo.makeFolder("a.dwg");
     EXPECT_THAT(removed(compare()), ElementsAre("a.dwg"));
+}
+
+TEST_F(Compare, AsksForTheTimesOfAllOfManyFiles)
+{
+    std::vector<std::string> names;
+    for (int i = 1'000; i < 2'200; ++i) {
+        names.push_back(std::to_string(i) + ".dwg");
+        repo.write(names.back(), "not as committed");
+        committed_[wide(names.back())] = L"po:";
+        index(names.back(), i == 1'500 || i == 2'199);
+    }
+    common::RepoChanges const changes = compare();
+    EXPECT_THAT(modified(changes), ElementsAre("1500.dwg", "2199.dwg"));
+    EXPECT_EQ(unchanged(changes).size(), 1'198);
+}
+
+TEST_F(Compare, LeavesOutWhatTheIndexVouchesForOnRequest)
+{
+    for (char const* const name : {"a.dwg", "b.dwg", "c.dwg", "gone.dwg"}) {
+        commit(name);
+        index(name, std::string(name) == "b.dwg");
+    }
+    unlink(repo.pathTo("gone.dwg").c_str());
+    tav::FolderMatch match = tav::matchFolder(repo.root(), committedFiles());
+    tav::dropUntouched(match, state_);
+    std::vector<std::string> left;
+    for (tav::CommittedFile const& file : match.committed) {
+        left.push_back(file.path.ansi_str());
+    }
+    EXPECT_THAT(left, ElementsAre("b.dwg", "gone.dwg"));
 }
 
 TEST_F(Compare, TrustsTheIndexForAFileOfUnchangedTime)

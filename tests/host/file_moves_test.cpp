@@ -1,6 +1,7 @@
 #include "host/failure.h"
 #include "host/repository/file_moves.h"
 
+#include "platform/os/os_calls.h"
 #include "tests/support/failing_call.h"
 #include "tests/support/temp_folder.h"
 
@@ -8,6 +9,7 @@
 
 #include <cerrno>
 #include <string>
+#include <unistd.h>
 
 namespace {
 
@@ -97,6 +99,22 @@ TEST_F(FileMoves, DoNotTakeBackWhatNeverHappened)
         EXPECT_THROW(moves.move("nothing", "b"), tav::Failure);
     }
     EXPECT_EQ(files(), before);
+}
+
+TEST_F(FileMoves, LeaveTheFileOfAnotherWhereItIsWhenTheirOwnIsGone)
+{
+    os::Calls const real = os::calls();
+    os::calls().renameat2 = [](int folder, char const* from, int, char const*, unsigned) {
+        unlinkat(folder, from, 0); // by another program, just before
+        errno = ENOENT;
+        return -1;
+    };
+    {
+        tav::FileMoves moves(place.path());
+        EXPECT_THROW(moves.move("a", "b"), tav::Failure);
+        os::calls() = real;
+    }
+    EXPECT_EQ(files(), "b=B folder/c=C ");
 }
 
 TEST_F(FileMoves, AreUndoneWhicheverCallFails)

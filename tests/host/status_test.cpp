@@ -1,6 +1,12 @@
+#include "tests/host/history_test.h"
+#include "tests/host/run_here.h"
 #include "tests/host/tav_test.h"
 
+#include "platform/os/os_calls.h"
+
+#include <functional>
 #include <unistd.h>
+#include <utility>
 
 namespace host_tests {
 namespace {
@@ -28,6 +34,38 @@ TEST_F(Status, SaysThatNothingHasChanged)
     ]
 }
 )"));
+}
+
+/// Gone through once, and in the copy of the process that runs a command.
+std::function<void()> meanwhile;
+os::Calls realCalls;
+
+int openMeanwhile(int folder, char const* path, int flags, mode_t mode)
+{
+    if (std::string(path).find("/tav.state") != std::string::npos) {
+        if (auto const act = std::exchange(meanwhile, nullptr)) {
+            act();
+        }
+    }
+    return realCalls.openat(folder, path, flags, mode);
+}
+
+using StatusOfHistory = HistoryTest;
+
+TEST_F(StatusOfHistory, IsOfOneMomentWhenACommitIsMadeMeanwhile)
+{
+    repo.write("a.dwg", "one");
+    commitAll("first");
+    repo.write("a.dwg", "two");
+    repo.write("b.dwg", "two");
+    EXPECT_EQ(tav({"add", "--all"}).code, 0);
+    Process process(setting(), [&] {
+        meanwhile = [&] { tav({"commit", "-m", "second"}); };
+        realCalls = os::calls();
+        os::calls().openat = openMeanwhile;
+        return runHere({"status"});
+    });
+    EXPECT_EQ(process.wait(), done("On branch master\n\nNothing has changed since the last commit.\n"));
 }
 
 /// A repository in which there is something of every group that can be without a commit.

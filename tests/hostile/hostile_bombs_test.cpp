@@ -42,13 +42,12 @@ constexpr rlim_t kMemory = rlim_t{256} << 20U;
 
 class Bombs : public HistoryTest {
 protected:
-    Outcome
-    limited(Arguments const& arguments, std::vector<std::string> const& environment = {}, rlim_t memory = kMemory) const
+    Outcome limited(Arguments const& arguments, std::vector<std::string> const& environment = {}) const
     {
         Setting with = setting();
         with.environment = environment;
         Process process(with, [&] {
-            limitMemory(memory);
+            limitMemory(kMemory);
             return runHere(arguments);
         });
         return process.wait();
@@ -158,11 +157,9 @@ TEST_F(Bombs, OfAGigabyteAreToldWhereMemoryIsShort)
         repo.write(name, begin);
         ASSERT_EQ(truncate(repo.pathTo(name).c_str(), length), 0);
         auto const time = std::filesystem::last_write_time(repo.pathTo(name));
-        for (rlim_t const memory : {kMemory, 5 * kMemory}) {
-            Outcome const outcome = limited({"add", "--all"}, {}, memory);
-            expectAnswer(outcome);
-            EXPECT_EQ(outcome.code, 1) << name;
-        }
+        Outcome const outcome = limited({"add", "--all"});
+        expectAnswer(outcome);
+        EXPECT_EQ(outcome.code, 1) << name;
         EXPECT_EQ(std::filesystem::file_size(repo.pathTo(name)), length);
         EXPECT_EQ(std::filesystem::last_write_time(repo.pathTo(name)), time);
         repo.write(name, before);

@@ -246,16 +246,15 @@ TEST_F(HardLink, IsReplacedWhereTheStateAndTheRulesStand)
     EXPECT_EQ(elsewhere.read("other"), rules);
 }
 
-TEST_F(HardLink, OfTheDatabaseStopsCommandsThatWouldChangeBoth)
+TEST_F(HardLink, OfTheDatabaseStopsAllCommands)
 {
     giveSecondName(".tav/tav.db");
     std::string const before = elsewhere.read("other");
     repo.write("a.dwg", "changed");
-    EXPECT_EQ(tav({"status"}).code, 0);
     std::string const complaint =
         ".tav/tav.db' has another name (a hard link), and what is written would show there too. Put a copy in its "
         "place.\n";
-    for (Arguments const& command : {Arguments{"add", "--all"}, {"commit", "-m", "x"}, {"gc"}}) {
+    for (Arguments const& command : {Arguments{"status"}, {"log"}, {"add", "--all"}, {"commit", "-m", "x"}, {"gc"}}) {
         EXPECT_EQ(tav(command), failed("tav: '" + repo.pathTo("") + complaint)) << command.front();
     }
     EXPECT_EQ(tav({"init"}), failed("tav: './" + complaint));
@@ -269,10 +268,42 @@ TEST_F(HardLink, OfARevisionStoreStopsCommits)
     giveSecondName(store);
     std::string const before = elsewhere.read("other");
     repo.write("a.dwg", "changed");
-    EXPECT_EQ(commitAll("second").code, 1);
+    std::string const name = std::filesystem::path(store).stem();
+    EXPECT_EQ(
+        commitAll("second"),
+        failed(
+            "tav: The revision store '" + name +
+            "' has another name, and what is written would show there too: put a copy in its place. Nothing has been "
+            "committed; mend that and run the command again.\n"));
     EXPECT_EQ(elsewhere.read("other"), before);
     std::filesystem::remove(elsewhere.pathTo("other"));
     EXPECT_EQ(commitAll("second").code, 0);
+}
+
+TEST_F(HardLink, BesideTheDatabaseIsNotWrittenThrough)
+{
+    repo.write("a.dwg", "changed");
+    for (std::string const end : {"-journal", "-shm", "-wal"}) {
+        elsewhere.write("other", std::string("\0precious", 9));
+        std::filesystem::create_hard_link(elsewhere.pathTo("other"), repo.pathTo(".tav/tav.db" + end));
+        EXPECT_EQ(tav({"commit", "-m", "x"}).code, 1) << end;
+        EXPECT_EQ(elsewhere.read("other"), std::string("\0precious", 9)) << end;
+        std::filesystem::remove(repo.pathTo(".tav/tav.db" + end));
+    }
+}
+
+TEST_F(Names, OfRevisionStoresThatAreLinksAreNotCleaned)
+{
+    repo.write("a.dwg", "one");
+    commitAll("first");
+    std::filesystem::path const store = std::filesystem::directory_iterator(repo.pathTo(".tav/tf"))->path();
+    support::TempFolder const elsewhere;
+    std::filesystem::rename(store, elsewhere.pathTo("store"));
+    elsewhere.write("store", elsewhere.read("store") + "torn");
+    std::filesystem::create_symlink(elsewhere.pathTo("store"), store);
+    std::string const before = elsewhere.read("store");
+    EXPECT_EQ(tav({"gc"}).code, 1);
+    EXPECT_EQ(elsewhere.read("store"), before);
 }
 
 TEST_F(HardLink, IsNoLock)

@@ -154,8 +154,9 @@ TEST_F(OddRepository, WhoseRulesMayNotBeReadOffersNothingForACommit)
     chmod(repo.pathTo(".tav/properties/ignore").c_str(), 0);
     std::string const told = support::asOrdinaryUser([&] { return toldBy(tav({"status"})); });
     EXPECT_EQ(
-        told, "1\ntav: '" + repo.pathTo(".tav/properties/ignore") +
-                  "' cannot be read: Permission denied. Check your rights to it.\n");
+        told, "1\ntav: The ignore file '" + repo.pathTo(".tav/properties/ignore") +
+                  "' cannot be read: Permission denied. Check it and your rights to it.\n");
+    EXPECT_EQ(support::asOrdinaryUser([&] { return toldBy(tav({"log"})); }), "0\n");
 }
 
 TEST_F(OddRepository, WhoseFolderIsAFileIsNone)
@@ -224,7 +225,8 @@ INSTANTIATE_TEST_SUITE_P(
     Folders, LinkInItsPlace,
     testing::Values(
         LinkRow{"Own", ".tav"}, LinkRow{"Objects", ".tav/objects"}, LinkRow{"Stores", ".tav/tf"},
-        LinkRow{"Restoring", ".tav/restoring"}, LinkRow{"Properties", ".tav/properties"}),
+        LinkRow{"Incoming", ".tav/objects/incoming"}, LinkRow{"Restoring", ".tav/restoring"},
+        LinkRow{"Properties", ".tav/properties"}),
     rowName<LinkRow>);
 
 /// A file of the repository is a link to a file of somebody else.

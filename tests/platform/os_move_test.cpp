@@ -1,12 +1,14 @@
 #include "kept_calls.h"
 
 #include "platform/os/os_move.h"
+#include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
 #include "tests/support/temp_folder.h"
 
 #include <cerrno>
 #include <gmock/gmock.h>
 #include <string>
+#include <sys/stat.h>
 #include <system_error>
 
 namespace {
@@ -22,7 +24,10 @@ std::error_code fails(int error)
 
 std::error_code move(TempFolder const& folder, std::string const& from, std::string const& to)
 {
-    return os::moveEntry(folder.path(), from, to);
+    bool hasMoved = false;
+    std::error_code const error = os::moveEntry(folder.path(), from, to, hasMoved);
+    EXPECT_EQ(hasMoved, folder.has(to) && !folder.has(from));
+    return error;
 }
 
 void withoutOneStep(int error)
@@ -87,9 +92,36 @@ TEST(MoveEntry, LeadsThroughNoLink)
     EXPECT_EQ(move(folder, "link/file", "free"), fails(ENOTDIR));
     EXPECT_EQ(move(folder, "real/file", "link/free"), fails(ENOTDIR));
     EXPECT_EQ(move(folder, "real/file", "link/inner/free"), fails(ENOTDIR));
-    EXPECT_EQ(os::moveEntry(folder.pathTo("link"), "file", "moved"), std::error_code());
+    bool hasMoved = false;
+    EXPECT_EQ(os::moveEntry(folder.pathTo("link"), "file", "moved", hasMoved), std::error_code());
     EXPECT_EQ(move(folder, "link", "renamed"), std::error_code());
     EXPECT_THAT(folder.list(), ElementsAre("real/", "real/inner/", "real/moved", "renamed"));
+}
+
+TEST(MoveEntry, NeedsNoFileSystemThatFlushesFolders)
+{
+    TempFolder const folder;
+    folder.write("file", "1");
+    KeptCalls const kept;
+    os::calls().fsync = [](int) {
+        errno = EINVAL;
+        return -1;
+    };
+    EXPECT_EQ(move(folder, "file", "moved"), std::error_code());
+}
+
+TEST(MoveEntry, PassesThroughFoldersThatMayNotBeListed)
+{
+    TempFolder const folder;
+    folder.write("hidden/inner/file", "1");
+    for (char const* const name : {"", "hidden/inner"}) {
+        chmod(folder.pathTo(name).c_str(), 0777);
+    }
+    chmod(folder.pathTo("hidden").c_str(), 0311);
+    EXPECT_EQ(
+        support::asOrdinaryUser([&] { return move(folder, "hidden/inner/file", "hidden/inner/moved").message(); }),
+        "Success");
+    chmod(folder.pathTo("hidden").c_str(), 0777);
 }
 
 TEST(MoveEntry, HasOneOfBothNamesWhenACallFails)
