@@ -1,8 +1,8 @@
+#include "host/checkout/checkout.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/commits/commit_names.h"
 #include "host/failure.h"
-#include "host/repository/commit_names.h"
-#include "host/repository/moving.h"
 #include "host/repository/open.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
@@ -14,28 +14,29 @@ namespace tav {
 
 namespace {
 
-Unsaved unsavedOf(MoveOptions const& options)
+Unsaved unsavedOf(CheckoutOptions const& options)
 {
     return options.force ? Unsaved::mayGo : Unsaved::isKept;
 }
 
-std::string described(Moved const& moved)
+std::string described(CheckedOut const& result)
 {
-    return counted(moved.written, "file") + " written, " + std::to_string(moved.removed) + " removed.\n";
+    return counted(result.written, "file") + " written, " + std::to_string(result.removed) + " removed.\n";
 }
 
 } // namespace
 
-void checkOut(MoveOptions const& options)
+void checkOut(CheckoutOptions const& options)
 {
     Work work(openRepository(""), "checkout");
     CommitRecord const commit = findCommit(work.database(), options.target);
     OdString const branch = readState(work.root())->read().head;
-    Moved const moved = moveTo(work.root(), work.database(), {commit.hash, branch}, unsavedOf(options), work.start());
-    print("The working folder is at commit " + std::to_string(commit.number) + " now: " + described(moved));
+    CheckedOut const result =
+        checkOutCommit(work.root(), work.database(), {commit.hash, branch}, unsavedOf(options), work.start());
+    print("The working folder is at commit " + std::to_string(commit.number) + " now: " + described(result));
 }
 
-void switchBranch(MoveOptions const& options)
+void switchBranch(CheckoutOptions const& options)
 {
     Work work(openRepository(""), "switch");
     auto const branch = work.database().commits().reference(wide(options.target));
@@ -47,9 +48,9 @@ void switchBranch(MoveOptions const& options)
             "There is no branch '" + options.target + "'.",
             "Run 'tav branch' to see those that there are, or 'tav branch NAME' to make one.");
     }
-    Moved const moved =
-        moveTo(work.root(), work.database(), {branch->commitHash, branch->name}, unsavedOf(options), work.start());
-    print("On branch " + shown(branch->name) + " now: " + described(moved));
+    CheckedOut const result = checkOutCommit(
+        work.root(), work.database(), {branch->commitHash, branch->name}, unsavedOf(options), work.start());
+    print("On branch " + shown(branch->name) + " now: " + described(result));
 }
 
 } // namespace tav

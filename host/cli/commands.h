@@ -68,12 +68,12 @@ struct RestoreOptions {
 };
 void restoreFiles(RestoreOptions const& options);
 
-struct MoveOptions {
+struct CheckoutOptions {
     std::string target;
     bool force = false;
 };
-void checkOut(MoveOptions const& options);
-void switchBranch(MoveOptions const& options);
+void checkOut(CheckoutOptions const& options);
+void switchBranch(CheckoutOptions const& options);
 
 struct ReferenceOptions {
     std::optional<std::string> name; ///< of a new one; without it they are listed

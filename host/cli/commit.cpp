@@ -1,4 +1,4 @@
-#include "host/repository/commit.h"
+#include "host/commits/commit.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"

@@ -1,7 +1,7 @@
 /// Commits and what they changed, for people and for programs.
 #pragma once
 
-#include "host/repository/committed_changes.h"
+#include "host/changes/committed_changes.h"
 #include "host/repository/local_database.h"
 
 #include "json/json_value.h"

@@ -1,8 +1,8 @@
-#include "host/repository/export.h"
+#include "host/checkout/export.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/commits/commit_names.h"
 #include "host/failure.h"
-#include "host/repository/commit_names.h"
 #include "host/repository/open.h"
 #include "host/text/wide.h"
 

@@ -1,9 +1,9 @@
+#include "host/changes/changes.h"
+#include "host/changes/digest.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
 #include "host/progress.h"
-#include "host/repository/changes.h"
-#include "host/repository/digest.h"
 #include "host/repository/open.h"
 
 #include <unistd.h>

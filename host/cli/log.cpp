@@ -1,7 +1,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
-#include "host/repository/commit_names.h"
+#include "host/commits/commit_names.h"
 #include "host/repository/open.h"
 #include "host/repository/work.h"
 #include "host/text/wide.h"

@@ -1,13 +1,13 @@
+#include "host/changes/staging.h"
+#include "host/checkout/working_tree.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/commits/commit_names.h"
 #include "host/failure.h"
-#include "host/repository/commit_names.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
-#include "host/repository/staging.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/repository/working_tree.h"
 #include "host/text/wide.h"
 
 #include <string>

@@ -1,4 +1,4 @@
-#include "host/repository/status.h"
+#include "host/changes/status.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"

@@ -140,9 +140,9 @@ void addRestore(CLI::App& app)
     command->callback([options] { restoreFiles(*options); });
 }
 
-std::shared_ptr<MoveOptions> addMoveOptions(CLI::App& command, char const* name, char const* description)
+std::shared_ptr<CheckoutOptions> addMoveOptions(CLI::App& command, char const* name, char const* description)
 {
-    auto const options = std::make_shared<MoveOptions>();
+    auto const options = std::make_shared<CheckoutOptions>();
     command.add_option(name, options->target, description)->required();
     command.add_flag("--force", options->force, "Overwrite files with changes that are in no commit");
     return options;

@@ -1,7 +1,7 @@
 #include "host/repository/unfinished.h"
 
+#include "host/changes/staging.h"
 #include "host/failure.h"
-#include "host/repository/staging.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
 
@@ -69,7 +69,7 @@ Object documentOf(CommitUnderWay const& work)
     return document;
 }
 
-Object documentOf(MoveUnderWay const& work)
+Object documentOf(CheckoutUnderWay const& work)
 {
     Object document;
     document[L"target"] = jsonText(work.target);
@@ -97,9 +97,9 @@ CommitUnderWay commitOf(Object const& document)
     return work;
 }
 
-MoveUnderWay moveOf(Object const& document)
+CheckoutUnderWay moveOf(Object const& document)
 {
-    MoveUnderWay work{
+    CheckoutUnderWay work{
         textOf(document, L"target"), textOf(document, L"branch"), common::getBoolValue(document, L"written", L"")};
     if (common::hasKey(document, L"begun")) {
         for (Value const& element : common::getArrayValue(document, L"begun", L"")) {
@@ -155,7 +155,7 @@ void note(Unfinished const& work, LocalDatabase& database)
     Object document;
     if (auto const* const commit = std::get_if<CommitUnderWay>(&work)) {
         document = documentOf(*commit);
-    } else if (auto const* const move = std::get_if<MoveUnderWay>(&work)) {
+    } else if (auto const* const move = std::get_if<CheckoutUnderWay>(&work)) {
         document = documentOf(*move);
     } else {
         database.setUnfinished(OdString::kEmpty);

@@ -32,7 +32,7 @@ struct CommitUnderWay {
 };
 
 /// A working folder that is being made to hold another commit.
-struct MoveUnderWay {
+struct CheckoutUnderWay {
     OdString target;                  ///< hash of the commit
     OdString branch;                  ///< where HEAD points to afterwards
     bool isWritten;                   ///< whether all files are there already
@@ -40,7 +40,7 @@ struct MoveUnderWay {
     SettledFiles files = {};          ///< what it has written and removed, once that is done
 };
 
-using Unfinished = std::variant<std::monostate, CommitUnderWay, MoveUnderWay>;
+using Unfinished = std::variant<std::monostate, CommitUnderWay, CheckoutUnderWay>;
 
 /// Throws `Failure` when the note cannot be read.
 Unfinished unfinishedOf(LocalDatabase const& database);

@@ -1,16 +1,16 @@
 #include "host/repository/work.h"
 
+#include "host/changes/index_record.h"
+#include "host/checkout/checkout.h"
+#include "host/commits/commit.h"
 #include "host/failure.h"
-#include "host/repository/commit.h"
-#include "host/repository/index_record.h"
-#include "host/repository/moving.h"
 #include "host/repository/unfinished.h"
 
 namespace tav {
 
 namespace {
 
-std::string nameOf(MoveUnderWay const& move, LocalDatabase const& database)
+std::string nameOf(CheckoutUnderWay const& move, LocalDatabase const& database)
 {
     auto const branch = database.commits().reference(move.branch);
     bool const isBranch = branch && branch->commitHash == move.target;
@@ -19,7 +19,7 @@ std::string nameOf(MoveUnderWay const& move, LocalDatabase const& database)
                     : "tav checkout " + (commit ? std::to_string(commit->number) : move.target.ansi_str());
 }
 
-std::string interrupted(MoveUnderWay const& move, LocalDatabase const& database)
+std::string interrupted(CheckoutUnderWay const& move, LocalDatabase const& database)
 {
     return "'" + nameOf(move, database) + "' was interrupted: the working folder holds files of two commits.";
 }
@@ -47,16 +47,16 @@ void Work::finish()
     if (auto const* const commit = std::get_if<CommitUnderWay>(&unfinished)) {
         finished_ = finishCommit(root_, database_, *commit);
     }
-    auto const* const move = std::get_if<MoveUnderWay>(&unfinished);
+    auto const* const move = std::get_if<CheckoutUnderWay>(&unfinished);
     if (move && move->isWritten) {
-        finishMove(root_, database_, *move);
+        finishCheckout(root_, database_, *move);
     }
 }
 
 void Work::failIfBetweenCommits() const
 {
     tav::Unfinished const unfinished = unfinishedOf(database_);
-    if (auto const* const move = std::get_if<MoveUnderWay>(&unfinished)) {
+    if (auto const* const move = std::get_if<CheckoutUnderWay>(&unfinished)) {
         throw Failure(interrupted(*move, database_), "Run it again to complete it.");
     }
 }
@@ -67,7 +67,7 @@ std::string noteOnUnfinished(LocalDatabase const& database)
     if (std::holds_alternative<CommitUnderWay>(unfinished)) {
         return "A commit was interrupted. The next command that changes something completes it.";
     }
-    auto const* const move = std::get_if<MoveUnderWay>(&unfinished);
+    auto const* const move = std::get_if<CheckoutUnderWay>(&unfinished);
     return move && !move->isWritten ? interrupted(*move, database) + " Run it again to complete it." : std::string();
 }
 

@@ -1,5 +1,5 @@
+#include "host/changes/changes.h"
 #include "host/failure.h"
-#include "host/repository/changes.h"
 
 #include "tests/support/temp_repository.h"
 

@@ -1,8 +1,8 @@
 /// Going to another commit or branch.
 #pragma once
 
+#include "host/checkout/working_tree.h"
 #include "host/repository/unfinished.h"
-#include "host/repository/working_tree.h"
 
 #include <cstdint>
 
@@ -14,7 +14,7 @@ struct Destination {
 };
 
 /// What a move has done.
-struct Moved {
+struct CheckedOut {
     std::size_t written = 0;
     std::size_t removed = 0;
 };
@@ -23,11 +23,11 @@ struct Moved {
 /// Throws `Failure`; before the first file is written nothing has changed then, later the same move completes it, and
 /// one to any other commit, also back to where it began, leaves nothing of it behind.
 /// The caller holds the lock of the repository since `start`.
-Moved moveTo(
+CheckedOut checkOutCommit(
     common::RootPath const& root, LocalDatabase& database, Destination const& destination, Unsaved unsaved,
     std::uint64_t start);
 
 /// Ends a move whose files are written, unless that has been done.
-void finishMove(common::RootPath const& root, LocalDatabase& database, MoveUnderWay const& move);
+void finishCheckout(common::RootPath const& root, LocalDatabase& database, CheckoutUnderWay const& move);
 
 } // namespace tav

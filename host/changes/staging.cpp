@@ -1,4 +1,4 @@
-#include "host/repository/staging.h"
+#include "host/changes/staging.h"
 
 #include "host/failure.h"
 

@@ -1,4 +1,4 @@
-#include "host/repository/digest.h"
+#include "host/changes/digest.h"
 
 #include "common/mu_common_versions.h"
 

@@ -1,9 +1,9 @@
-#include "host/repository/export.h"
+#include "host/checkout/export.h"
 
+#include "host/checkout/working_tree.h"
 #include "host/failure.h"
 #include "host/paths/recorded_path.h"
 #include "host/progress.h"
-#include "host/repository/working_tree.h"
 #include "host/storage/local_storage.h"
 
 #include "platform/os/os_batch.h"

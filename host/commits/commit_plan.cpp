@@ -1,4 +1,4 @@
-#include "host/repository/commit_plan.h"
+#include "host/commits/commit_plan.h"
 
 #include "host/failure.h"
 

@@ -1,4 +1,4 @@
-#include "host/repository/last_commit.h"
+#include "host/changes/last_commit.h"
 
 #include "host/repository/local_database.h"
 

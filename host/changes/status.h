@@ -1,7 +1,7 @@
 /// The state of a repository, as commands show it.
 #pragma once
 
-#include "host/repository/renames.h"
+#include "host/changes/renames.h"
 
 #include "common/mu_common_diff.h"
 #include "common/mu_common_state.h"

@@ -1,7 +1,7 @@
-#include "host/repository/working_changes.h"
+#include "host/changes/working_changes.h"
 
-#include "host/repository/changes.h"
-#include "host/repository/renames.h"
+#include "host/changes/changes.h"
+#include "host/changes/renames.h"
 #include "host/repository/working_state.h"
 
 #include <map>

@@ -1,7 +1,7 @@
-#include "host/repository/removed_files.h"
+#include "host/checkout/removed_files.h"
 
+#include "host/changes/digest.h"
 #include "host/failure.h"
-#include "host/repository/digest.h"
 #include "host/storage/cleaning.h"
 #include "host/storage/storage_error.h"
 #include "host/text/wide.h"

@@ -1,10 +1,10 @@
-#include "host/repository/changes.h"
+#include "host/changes/changes.h"
 
+#include "host/changes/digest.h"
+#include "host/changes/index_record.h"
+#include "host/changes/scan_order.h"
 #include "host/failure.h"
-#include "host/repository/digest.h"
 #include "host/repository/ignore_file.h"
-#include "host/repository/index_record.h"
-#include "host/repository/scan_order.h"
 #include "host/storage/local_storage.h"
 #include "host/text/wide.h"
 

@@ -1,9 +1,9 @@
-#include "host/repository/status.h"
+#include "host/changes/status.h"
 
-#include "host/repository/changes.h"
+#include "host/changes/changes.h"
+#include "host/changes/scan_order.h"
+#include "host/changes/staging.h"
 #include "host/repository/local_database.h"
-#include "host/repository/scan_order.h"
-#include "host/repository/staging.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
 

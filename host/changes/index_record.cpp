@@ -1,4 +1,4 @@
-#include "host/repository/index_record.h"
+#include "host/changes/index_record.h"
 
 namespace tav {
 

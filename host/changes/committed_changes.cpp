@@ -1,4 +1,4 @@
-#include "host/repository/committed_changes.h"
+#include "host/changes/committed_changes.h"
 
 #include <set>
 

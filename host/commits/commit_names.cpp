@@ -1,4 +1,4 @@
-#include "host/repository/commit_names.h"
+#include "host/commits/commit_names.h"
 
 #include "host/failure.h"
 #include "host/text/wide.h"

@@ -1,6 +1,6 @@
-#include "host/repository/moving.h"
+#include "host/checkout/checkout.h"
 
-#include "host/repository/index_record.h"
+#include "host/changes/index_record.h"
 #include "host/repository/working_state.h"
 
 #include <algorithm>
@@ -10,10 +10,10 @@ namespace tav {
 namespace {
 
 /// The targets of moves whose files may be in the working folder beside those of the last commit.
-std::vector<OdString> begunMoves(LocalDatabase const& database)
+std::vector<OdString> begunCheckouts(LocalDatabase const& database)
 {
     Unfinished const unfinished = unfinishedOf(database);
-    auto const* const move = std::get_if<MoveUnderWay>(&unfinished);
+    auto const* const move = std::get_if<CheckoutUnderWay>(&unfinished);
     if (!move) {
         return {};
     }
@@ -57,18 +57,18 @@ settledBy(TreeUpdate const& whole, TreeUpdate const& update, WrittenTimes const&
 
 } // namespace
 
-Moved moveTo(
+CheckedOut checkOutCommit(
     common::RootPath const& root, LocalDatabase& database, Destination const& destination, Unsaved unsaved,
     std::uint64_t start)
 {
-    std::vector<OdString> const begun = begunMoves(database);
+    std::vector<OdString> const begun = begunCheckouts(database);
     TreeUpdate const whole = updateBetween(
         database.commits().files(database.base()), filesOf(begun, database),
         database.commits().files(destination.commit));
     TreeUpdate update = whole;
     checkUpdate(root, database, unsaved, update);
     LocalStorage storage;
-    MoveUnderWay move{destination.commit, destination.branch, false, begun};
+    CheckoutUnderWay move{destination.commit, destination.branch, false, begun};
     WrittenTimes const times = carryOut(root, storage, update, start, [&] { note(move, database); });
     Change change(database.database());
     database.setBase(destination.commit);
@@ -76,11 +76,11 @@ Moved moveTo(
     move.files = settledBy(whole, update, times, start);
     note(move, database);
     change.commit();
-    finishMove(root, database, move);
+    finishCheckout(root, database, move);
     return {update.writes.size(), update.removals.size()};
 }
 
-void finishMove(common::RootPath const& root, LocalDatabase& database, MoveUnderWay const& move)
+void finishCheckout(common::RootPath const& root, LocalDatabase& database, CheckoutUnderWay const& move)
 {
     changeState(root, [&](common::Cache& cache) {
         cache.write().head = move.branch;

@@ -1,4 +1,4 @@
-#include "host/repository/line_diff.h"
+#include "host/changes/line_diff.h"
 
 #include "host/text/characters.h"
 #include "host/text/wide.h"

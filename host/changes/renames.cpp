@@ -1,8 +1,8 @@
-#include "host/repository/renames.h"
+#include "host/changes/renames.h"
 
+#include "host/changes/digest.h"
+#include "host/changes/staging.h"
 #include "host/paths/recorded_path.h"
-#include "host/repository/digest.h"
-#include "host/repository/staging.h"
 #include "host/storage/local_storage.h"
 
 #include <algorithm>

@@ -1,7 +1,7 @@
 /// From the working folder to a new commit.
 #pragma once
 
-#include "host/repository/commit_plan.h"
+#include "host/commits/commit_plan.h"
 #include "host/repository/unfinished.h"
 
 #include <cstdint>

@@ -1,4 +1,4 @@
-#include "host/repository/file_moves.h"
+#include "host/checkout/file_moves.h"
 
 #include "host/failure.h"
 

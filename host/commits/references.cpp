@@ -1,4 +1,4 @@
-#include "host/repository/references.h"
+#include "host/commits/references.h"
 
 #include "host/failure.h"
 #include "host/repository/server_of.h"

@@ -1,10 +1,10 @@
-#include "host/repository/working_tree.h"
+#include "host/checkout/working_tree.h"
 
+#include "host/changes/digest.h"
+#include "host/changes/index_record.h"
 #include "host/failure.h"
 #include "host/paths/recorded_path.h"
 #include "host/progress.h"
-#include "host/repository/digest.h"
-#include "host/repository/index_record.h"
 #include "host/text/wide.h"
 
 #include "platform/os/os_batch.h"

@@ -1,7 +1,7 @@
 /// What the next commit does to each path.
 #pragma once
 
-#include "host/repository/renames.h"
+#include "host/changes/renames.h"
 
 #include "common/mu_common_state.h"
 
