@@ -373,6 +373,28 @@ TEST(LogString, FailsWhereNothingMayBeWritten)
     EXPECT_EQ(repository.read(kLog), "old\n");
 }
 
+TEST(LogString, TakesNoNoticeOfADiskThatIsFull)
+{
+    TempRepository const repository;
+    repository.makeLink(kLog, "/dev/full");
+    EXPECT_TRUE(logString(OdString(std::wstring(100'000, L'x').c_str()), repository.root()));
+}
+
+TEST(LogString, FailsWhereTheProcessMayOpenNoMoreFiles)
+{
+    TempRepository const repository;
+    repository.write(kLog, "old\n");
+    ASSERT_EQ(chmod(repository.path().c_str(), 0777), 0);
+    ASSERT_EQ(chmod(repository.pathTo(kLog).c_str(), 0666), 0);
+    std::string const answer = support::asOrdinaryUser([&] {
+        rlimit const none{0, 0};
+        setrlimit(RLIMIT_NOFILE, &none);
+        return logString(L"opened", repository.root()) ? "logged" : "refused";
+    });
+    EXPECT_EQ(answer, "refused");
+    EXPECT_EQ(repository.read(kLog), "old\n");
+}
+
 constexpr char const* kOfNoBytes = "e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca495991b7852b855";
 constexpr char const* kOfAbc = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad";
 constexpr char const* kOfThreeNuls = "709e80c88487a2411e1ee4dfb9f22a861492d20c4765150c0c794abd70f8147c";
