@@ -6,6 +6,7 @@
 
 #include "platform/ut/FileName.h"
 
+#include <filesystem>
 #include <map>
 #include <utility>
 
@@ -15,6 +16,14 @@ namespace {
 
 using Plan = std::map<OdString, PlannedFile>;
 
+/// Whether a pipe, a link that leads nowhere or the like has the place of a file. A folder there has removed the file.
+bool isSomethingElse(OdString const& path, common::RootPath const& root)
+{
+    std::error_code error;
+    auto const type = std::filesystem::symlink_status(root.pathTo(path).ansi_str(), error).type();
+    return type != std::filesystem::file_type::not_found && type != std::filesystem::file_type::directory;
+}
+
 void planStaged(common::State const& state, Tree const& base, common::RootPath const& root, Plan& plan)
 {
     for (common::StagedFile const& file : state.stagedFiles) {
@@ -22,6 +31,11 @@ void planStaged(common::State const& state, Tree const& base, common::RootPath c
         bool const isRenamed = rename != state.renames.end() && base.count(rename->second) > 0;
         bool const isGone =
             file.change != common::FileChange::removed && !ut::FileName::fileExists(root.pathTo(file.path));
+        if (isGone && isSomethingElse(file.path, root)) {
+            throw Failure(
+                "'" + file.path.ansi_str() + "' is staged, but it is no ordinary file any more.",
+                "Move what is there away, or run 'tav unstage' for it.");
+        }
         if (isGone && base.count(file.path) == 0) {
             throw Failure(
                 "'" + file.path.ansi_str() + "' is staged, but it is not there any more.",

@@ -148,6 +148,21 @@ TEST_F(OddRepository, WithAPipeAmongItsFilesIsNotHeldUp)
         failed("tav: 'a.dwg' is no ordinary file. Nothing has been written; move it away first.\n"));
 }
 
+TEST_F(OddRepository, CommitsNoRemovalWhereSomethingElseHasThePlaceOfAFile)
+{
+    std::string const complaint =
+        "tav: 'a.dwg' is staged, but it is no ordinary file any more. Move what is there away, "
+        "or run 'tav unstage' for it.\n";
+    putPipe("a.dwg");
+    EXPECT_EQ(tav({"add", "a.dwg"}).code, 0);
+    EXPECT_EQ(tav({"commit", "-m", "x"}), failed(complaint));
+    ASSERT_EQ(unlink(repo.pathTo("a.dwg").c_str()), 0);
+    repo.makeLink("a.dwg", "nowhere");
+    EXPECT_EQ(tav({"commit", "-m", "x"}), failed(complaint));
+    ASSERT_EQ(unlink(repo.pathTo("a.dwg").c_str()), 0);
+    EXPECT_EQ(tav({"commit", "-m", "x"}).code, 0);
+}
+
 TEST_F(OddRepository, WhoseRulesMayNotBeReadOffersNothingForACommit)
 {
     chmod(repo.path().c_str(), 0777);
