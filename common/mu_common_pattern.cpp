@@ -16,8 +16,7 @@ namespace {
 // An expression of this many states compiles and matches within some 520 KiB of stack (measured with libstdc++ 12) and
 // takes some milliseconds for a file name at worst. Lists of names are far smaller.
 constexpr std::size_t kMaxStates = 4000;
-constexpr std::size_t kMaxDigitsOfBackReference =
-    4; // The standard library reads longer numbers past the end of their type.
+constexpr std::size_t kMaxDigitsOfBackReference = 4; // The standard library lets large numbers overflow.
 // A look-ahead starts a match of its own at every character, one inside another multiplies that once more.
 constexpr std::size_t kMaxStatesWithLookAhead = 400;
 // One level of nesting takes some 850 bytes of stack to compile.

@@ -140,7 +140,7 @@ void addRestore(CLI::App& app)
     command->callback([options] { restoreFiles(*options); });
 }
 
-std::shared_ptr<CheckoutOptions> addMoveOptions(CLI::App& command, char const* name, char const* description)
+std::shared_ptr<CheckoutOptions> addCheckoutOptions(CLI::App& command, char const* name, char const* description)
 {
     auto const options = std::make_shared<CheckoutOptions>();
     command.add_option(name, options->target, description)->required();
@@ -151,14 +151,14 @@ std::shared_ptr<CheckoutOptions> addMoveOptions(CLI::App& command, char const* n
 void addCheckout(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("checkout", "Make the working folder what it was at a commit");
-    auto const options = addMoveOptions(*command, "COMMIT", "Number, hash, branch or tag");
+    auto const options = addCheckoutOptions(*command, "COMMIT", "Number, hash, branch or tag");
     command->callback([options] { checkOut(*options); });
 }
 
 void addSwitch(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("switch", "Go on with the work on another branch");
-    auto const options = addMoveOptions(*command, "BRANCH", "Name of the branch");
+    auto const options = addCheckoutOptions(*command, "BRANCH", "Name of the branch");
     command->callback([options] { switchBranch(*options); });
 }
 
