@@ -19,11 +19,12 @@ namespace {
 
 constexpr int kEverybody = 0777; // less the umask
 
-OdString const s_projects_map = L"projects_map";
-OdString const s_info = L"info";
-OdString const s_path = L"path";
-OdString const s_name = L"name";
-OdString const s_uid = L"uid";
+// Never destroyed: documents are also written at the very end of the process.
+OdString const& s_projects_map = *new OdString(L"projects_map");
+OdString const& s_info = *new OdString(L"info");
+OdString const& s_path = *new OdString(L"path");
+OdString const& s_name = *new OdString(L"name");
+OdString const& s_uid = *new OdString(L"uid");
 
 std::wstring wide(OdString const& text)
 {

@@ -20,17 +20,18 @@ using kutils::json::Value_type;
 
 namespace {
 
-OdString const s_author = L"author";
-OdString const s_date = L"date";
-OdString const s_message = L"message";
-OdString const s_files = L"files";
-OdString const s_commitNo = L"commitNo";
-OdString const s_commits = L"commits";
-OdString const s_refType = L"refType";
-OdString const s_name = L"name";
-OdString const s_id = L"id";
-OdString const s_repository = L"repository";
-OdString const s_commandVersion = L"commandVersion";
+// Never destroyed, as those that documents share.
+OdString const& s_author = *new OdString(L"author");
+OdString const& s_date = *new OdString(L"date");
+OdString const& s_message = *new OdString(L"message");
+OdString const& s_files = *new OdString(L"files");
+OdString const& s_commitNo = *new OdString(L"commitNo");
+OdString const& s_commits = *new OdString(L"commits");
+OdString const& s_refType = *new OdString(L"refType");
+OdString const& s_name = *new OdString(L"name");
+OdString const& s_id = *new OdString(L"id");
+OdString const& s_repository = *new OdString(L"repository");
+OdString const& s_commandVersion = *new OdString(L"commandVersion");
 
 std::wstring wide(OdString const& text)
 {

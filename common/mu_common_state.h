@@ -21,8 +21,8 @@
 
 namespace common {
 
-/// The branch of a new repository.
-inline OdString const s_defaultMaster = L"master";
+/// The branch of a new repository. Never destroyed, as the names in `mu_common_json_keys.h`.
+inline OdString const& s_defaultMaster = *new OdString(L"master");
 
 /// What is known of one file of the working folder.
 struct IndexData {

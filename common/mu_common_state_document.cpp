@@ -21,12 +21,13 @@ using kutils::json::Value_type;
 
 namespace {
 
-OdString const s_staged_file_change = L"file_change";
-OdString const s_index_map = L"index";
-OdString const s_index_map_path = L"path";
-OdString const s_index_map_data = L"data";
-OdString const s_index_map_last_checked = L"last_checked";
-OdString const s_index_map_modified = L"modified";
+// Never destroyed: documents are also written at the very end of the process.
+OdString const& s_staged_file_change = *new OdString(L"file_change");
+OdString const& s_index_map = *new OdString(L"index");
+OdString const& s_index_map_path = *new OdString(L"path");
+OdString const& s_index_map_data = *new OdString(L"data");
+OdString const& s_index_map_last_checked = *new OdString(L"last_checked");
+OdString const& s_index_map_modified = *new OdString(L"modified");
 
 std::wstring wide(OdString const& text)
 {

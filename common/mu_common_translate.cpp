@@ -38,9 +38,9 @@ bool fits(std::wstring_view translation, std::wstring_view english)
 OdString translate(wchar_t const* english)
 {
     wxTranslations const* const translations = wxTranslations::Get();
-    wxString const* translated = translations ? translations->GetTranslatedString(english) : nullptr;
+    wxString const* const translated = translations ? translations->GetTranslatedString(english) : nullptr;
     if (!translated || !fits(translated->ToStdWstring(), english)) {
-        translated = &wxTranslations::GetUntranslatedString(english);
+        return english; // `GetUntranslatedString` gives the same, from a table that is gone at the end of the process.
     }
     return OdString(translated->wc_str(), translated->length());
 }

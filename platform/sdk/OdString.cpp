@@ -246,7 +246,7 @@ private:
 
 } // namespace
 
-OdString const OdString::kEmpty;
+OdString const& OdString::kEmpty = *new OdString;
 
 OdString::OdString(wchar_t const* text) : text_(text == nullptr ? L"" : text) {}
 

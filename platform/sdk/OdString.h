@@ -22,7 +22,7 @@ enum OdCodePageId {
 /// the byte again. Both directions are the same under every locale.
 class MU_PLATFORM_EXPORT OdString {
 public:
-    static OdString const kEmpty; ///< the empty text
+    static OdString const& kEmpty; ///< the empty text, never destroyed
 
     OdString() noexcept = default;
     /// Copies `text` up to its NUL; null gives the empty text.
