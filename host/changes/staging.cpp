@@ -86,6 +86,15 @@ std::set<OdString> stagedPaths(common::State const& state)
     return paths;
 }
 
+std::set<OdString> claimedPaths(common::State const& state)
+{
+    Paths paths = stagedPaths(state);
+    for (auto const& [path, previous] : state.renames) {
+        paths.insert(previous);
+    }
+    return paths;
+}
+
 std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state)
 {
     Paths paths;

@@ -16,6 +16,9 @@ std::size_t stage(std::vector<common::StagedFile> const& files, common::State& s
 /// The paths of all staged files.
 std::set<OdString> stagedPaths(common::State const& state);
 
+/// The paths for which something is staged, those that staged renames leave included.
+std::set<OdString> claimedPaths(common::State const& state);
+
 /// Takes `files` out of the staged ones, with what was noted of their renames. Returns how many were staged.
 std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state);
 

@@ -63,16 +63,6 @@ stagedEntries(common::State const& state, FolderMatch const& match, common::Root
     return entries;
 }
 
-/// Committed files that are accounted for when they are missing: staged as removed, or renamed.
-Paths pathsLeft(common::State const& state)
-{
-    Paths paths = stagedPaths(state);
-    for (auto const& [path, previous] : state.renames) {
-        paths.insert(previous);
-    }
-    return paths;
-}
-
 std::vector<common::ConflictInfo> conflictsOf(common::RootPath const& root)
 {
     std::vector<common::ConflictInfo> conflicts;
@@ -172,7 +162,7 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     status.staged = stagedEntries(state, match, root);
     dropUntouched(match, state);
     common::RepoChanges changes = compare(root, std::move(match), state);
-    Paths left = pathsLeft(state);
+    Paths left = claimedPaths(state); // They are accounted for when they are missing.
     enterRenames(findRenames(changes, state, database, root), left, status);
     Paths named = stagedPaths(state);
     for (auto const& [path, previous] : status.renamed) {

@@ -1,6 +1,7 @@
 #include "host/checkout/checkout.h"
 
 #include "host/changes/index_record.h"
+#include "host/changes/staging.h"
 #include "host/repository/working_state.h"
 
 #include <algorithm>
@@ -58,7 +59,7 @@ settledBy(TreeUpdate const& whole, TreeUpdate const& update, WrittenTimes const&
 } // namespace
 
 CheckedOut checkOutCommit(
-    common::RootPath const& root, LocalDatabase& database, Destination const& destination, Unsaved unsaved,
+    common::RootPath const& root, LocalDatabase& database, Destination const& destination, Discard discard,
     std::uint64_t start)
 {
     std::vector<OdString> const begun = begunCheckouts(database);
@@ -66,7 +67,7 @@ CheckedOut checkOutCommit(
         database.commits().files(database.base()), filesOf(begun, database),
         database.commits().files(destination.commit));
     TreeUpdate update = whole;
-    checkUpdate(root, database, unsaved, update);
+    checkUpdate(root, database, claimedPaths(readState(root)->read()), discard, update);
     LocalStorage storage;
     CheckoutUnderWay move{destination.commit, destination.branch, false, begun};
     WrittenTimes const times = carryOut(root, storage, update, start, [&] { note(move, database); });

@@ -10,6 +10,7 @@
 #include "platform/os/os_batch.h"
 #include "platform/os/os_files.h"
 
+#include <algorithm>
 #include <filesystem>
 #include <string>
 
@@ -58,10 +59,13 @@ enum class Finding { isFree, isAsWanted, holdsUnsaved };
 
 class Check {
 public:
-    Check(common::RootPath const& root, LocalDatabase const& database, Unsaved unsaved, TreeUpdate& update)
+    Check(
+        common::RootPath const& root, LocalDatabase const& database, std::set<OdString> const& staged, Discard discard,
+        TreeUpdate& update)
         : root_(root)
         , database_(database)
-        , unsaved_(unsaved)
+        , staged_(staged)
+        , discard_(discard)
         , whole_(update)
         , update_(update)
         , batch_(root.path().ansi_str())
@@ -86,7 +90,8 @@ private:
             Finding const finding = look(path, areWritten ? &url : nullptr);
             bool const isUnsaved = finding == Finding::holdsUnsaved;
             bool const isLeftover = update_.leftovers.count(path) > 0;
-            if (isUnsaved && !isLeftover && unsaved_ == Unsaved::isKept) {
+            bool const isStaged = finding != Finding::isAsWanted && staged_.count(path) > 0;
+            if (isStaged || (isUnsaved && !isLeftover)) {
                 inTheWay_.push_back(path.ansi_str());
             }
             bool const stays = finding == Finding::isAsWanted || (isUnsaved && isLeftover);
@@ -117,7 +122,7 @@ private:
                 "'" + path.ansi_str() + "' is no ordinary file.", "Nothing has been written; move it away first.");
         }
         auto const digest = fileDigest(root_.pathTo(path));
-        if (!digest && unsaved_ == Unsaved::isKept) {
+        if (!digest && discard_ != Discard::everything) {
             throw Failure(
                 "'" + path.ansi_str() + "' cannot be read, and may hold changes that are in no commit.",
                 "Nothing has been written; check the disk and your rights to the file.");
@@ -125,7 +130,15 @@ private:
         if (digest && wanted && digest == digestOf(*wanted)) {
             return Finding::isAsWanted;
         }
-        return digest && database_.keeps(*digest) ? Finding::isFree : Finding::holdsUnsaved;
+        return digest && mayBeReplaced(path, *digest) ? Finding::isFree : Finding::holdsUnsaved;
+    }
+
+    bool mayBeReplaced(OdString const& path, OdString const& digest) const
+    {
+        auto const [begin, end] = update_.expected.equal_range(path);
+        bool const isExpected =
+            std::any_of(begin, end, [&](auto const& file) { return digestOf(file.second) == digest; });
+        return isExpected || (discard_ == Discard::copies && database_.keeps(digest));
     }
 
     /// Whether a file can take the place of the folder `path` once the files that go are gone. They have been sifted:
@@ -152,19 +165,20 @@ private:
 
     void failIfAnyIsInTheWay()
     {
-        if (inTheWay_.empty()) {
+        if (inTheWay_.empty() || discard_ == Discard::everything) {
             return;
         }
         Failure failure(
-            "These files hold changes that are in no commit, which would be lost.",
-            "Commit them first, or let them go with --force:");
+            "These files have uncommitted changes, which would be lost.",
+            "Commit them first, or discard them with --force:");
         failure.details = std::move(inTheWay_);
         throw failure;
     }
 
     common::RootPath const& root_;
     LocalDatabase const& database_;
-    Unsaved unsaved_;
+    std::set<OdString> const& staged_;
+    Discard discard_;
     TreeUpdate const whole_; ///< as it was at first
     TreeUpdate& update_;
     os::Batch batch_;
@@ -282,6 +296,19 @@ void addLeftovers(Tree const& begun, Tree const& to, TreeUpdate& update)
     }
 }
 
+/// What the files of `commit` have at the paths of `update`.
+void addExpected(Tree const& commit, TreeUpdate& update)
+{
+    for (Tree const* const files : {&update.writes, &update.removals}) {
+        for (auto const& [path, url] : *files) {
+            auto const file = commit.find(path);
+            if (file != commit.end()) {
+                update.expected.insert(*file);
+            }
+        }
+    }
+}
+
 } // namespace
 
 void extract(
@@ -313,12 +340,18 @@ TreeUpdate updateBetween(Tree const& from, std::vector<Tree> const& begun, Tree 
     for (Tree const& files : begun) {
         addLeftovers(files, to, update);
     }
+    addExpected(from, update);
+    for (Tree const& files : begun) {
+        addExpected(files, update);
+    }
     return update;
 }
 
-void checkUpdate(common::RootPath const& root, LocalDatabase const& database, Unsaved unsaved, TreeUpdate& update)
+void checkUpdate(
+    common::RootPath const& root, LocalDatabase const& database, std::set<OdString> const& staged, Discard discard,
+    TreeUpdate& update)
 {
-    Check(root, database, unsaved, update).run();
+    Check(root, database, staged, discard, update).run();
 }
 
 WrittenTimes carryOut(

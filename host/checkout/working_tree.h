@@ -20,6 +20,8 @@ struct TreeUpdate {
     Tree removals; ///< files that are in no later commit, with the content that they have been committed with
     /// Those of them that only interrupted moves may have touched: what is unsaved there stays.
     std::set<OdString> leftovers;
+    /// URLs of the contents that files have there unless somebody has changed them.
+    std::multimap<OdString, OdString> expected;
     /// What stood at each of the paths when it was checked.
     std::map<OdString, os::FileMark> marks;
 };
@@ -28,14 +30,18 @@ struct TreeUpdate {
 /// to elsewhere, may be there by now: they go too.
 TreeUpdate updateBetween(Tree const& from, std::vector<Tree> const& begun, Tree const& to);
 
-/// Whether content that is in no commit may be lost.
-enum class Unsaved { isKept, mayGo };
+/// Which uncommitted work an update may discard: none, contents that some commit has, wherever, or all of it.
+enum class Discard { nothing, copies, everything };
 
 /// Checks that an update can be carried out, before a byte is written: no path leads out of the working folder or
-/// through a link, no file takes the place of a folder in which others lie, and, unless `unsaved` lets them go, no file
-/// holds a content that is in no commit. The files are read: what an index says of them is no reason to overwrite them.
-/// Files that are as they shall be are taken out of the update. Throws `Failure`, which lists the files in the way.
-void checkUpdate(common::RootPath const& root, LocalDatabase const& database, Unsaved unsaved, TreeUpdate& update);
+/// through a link, no file takes the place of a folder that has other files, and no work is lost unless `discard` says
+/// so. Work is a file with another content than an expected one, and whatever is at the paths `staged`: being in some
+/// commit does not make a content that somebody has chosen unimportant. The files are read: what an index says of them
+/// is no reason to overwrite them. Files that are as wanted are taken out of the update. Throws `Failure`, which lists
+/// the files in the way.
+void checkUpdate(
+    common::RootPath const& root, LocalDatabase const& database, std::set<OdString> const& staged, Discard discard,
+    TreeUpdate& update);
 
 /// Modification times of the files that were written, by path. As far as the file system tells them apart, no two are
 /// equal: a file that is moved over another of them shows.

@@ -14,14 +14,18 @@ namespace tav {
 
 namespace {
 
-Unsaved unsavedOf(CheckoutOptions const& options)
+Discard discardOf(CheckoutOptions const& options)
 {
-    return options.force ? Unsaved::mayGo : Unsaved::isKept;
+    return options.force ? Discard::everything : Discard::nothing;
 }
 
-std::string described(CheckedOut const& result)
+/// `root` is where the move has ended.
+std::string described(CheckedOut const& result, common::RootPath const& root)
 {
-    return counted(result.written, "file") + " written, " + std::to_string(result.removed) + " removed.\n";
+    std::string const text =
+        counted(result.written, "file") + " written, " + std::to_string(result.removed) + " removed.\n";
+    std::size_t const staged = readState(root)->read().stagedFiles.size();
+    return staged == 0 ? text : text + counted(staged, "staged file") + " carried along.\n";
 }
 
 } // namespace
@@ -32,8 +36,9 @@ void checkOut(CheckoutOptions const& options)
     CommitRecord const commit = findCommit(work.database(), options.target);
     OdString const branch = readState(work.root())->read().head;
     CheckedOut const result =
-        checkOutCommit(work.root(), work.database(), {commit.hash, branch}, unsavedOf(options), work.start());
-    print("The working folder is at commit " + std::to_string(commit.number) + " now: " + described(result));
+        checkOutCommit(work.root(), work.database(), {commit.hash, branch}, discardOf(options), work.start());
+    print(
+        "The working folder is at commit " + std::to_string(commit.number) + " now: " + described(result, work.root()));
 }
 
 void switchBranch(CheckoutOptions const& options)
@@ -49,8 +54,8 @@ void switchBranch(CheckoutOptions const& options)
             "Run 'tav branch' to see those that there are, or 'tav branch NAME' to make one.");
     }
     CheckedOut const result = checkOutCommit(
-        work.root(), work.database(), {branch->commitHash, branch->name}, unsavedOf(options), work.start());
-    print("On branch " + shown(branch->name) + " now: " + described(result));
+        work.root(), work.database(), {branch->commitHash, branch->name}, discardOf(options), work.start());
+    print("On branch " + shown(branch->name) + " now: " + described(result, work.root()));
 }
 
 } // namespace tav

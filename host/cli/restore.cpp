@@ -10,6 +10,10 @@
 #include "host/repository/working_state.h"
 #include "host/text/wide.h"
 
+#include "platform/ut/FileName.h"
+
+#include <iterator>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -40,9 +44,24 @@ Tree chosenFiles(
     return chosen;
 }
 
-/// Who brings a file back does not want to remove it any more.
+/// The files whose present content is staged.
+std::set<OdString> stagedContents(common::State const& state, common::RootPath const& root)
+{
+    std::set<OdString> paths;
+    for (common::StagedFile const& file : state.stagedFiles) {
+        if (file.change != common::FileChange::removed && ut::FileName::fileExists(root.pathTo(file.path))) {
+            paths.insert(file.path);
+        }
+    }
+    return paths;
+}
+
+/// Who brings a file back does not want to remove or rename it any more.
 void unstageRemovals(Tree const& files, common::State& state)
 {
+    for (auto rename = state.renames.begin(); rename != state.renames.end();) {
+        rename = files.count(rename->second) > 0 ? state.renames.erase(rename) : std::next(rename);
+    }
     std::vector<common::StagedFile> removals;
     for (common::StagedFile const& file : state.stagedFiles) {
         if (file.change == common::FileChange::removed && files.count(file.path) > 0) {
@@ -83,7 +102,9 @@ void restoreFiles(RestoreOptions const& options)
     Tree const base = work.database().commits().files(work.database().base());
     TreeUpdate update;
     update.writes = files;
-    checkUpdate(root, work.database(), options.force ? Unsaved::mayGo : Unsaved::isKept, update);
+    checkUpdate(
+        root, work.database(), stagedContents(readState(root)->read(), root),
+        options.force ? Discard::everything : Discard::copies, update);
     LocalStorage storage;
     WrittenTimes const times = carryOut(root, storage, update, work.start());
     changeState(root, [&](common::Cache& cache) { enterFiles(files, base, times, cache.write()); });

@@ -136,7 +136,7 @@ void addRestore(CLI::App& app)
     command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path")->required();
     command->add_option("--from", options->commit, "Number, hash, branch or tag; by default where you are")
         ->type_name("COMMIT");
-    command->add_flag("--force", options->force, "Overwrite changes that are in no commit");
+    command->add_flag("--force", options->force, "Overwrite uncommitted changes");
     command->callback([options] { restoreFiles(*options); });
 }
 
@@ -144,7 +144,7 @@ std::shared_ptr<CheckoutOptions> addCheckoutOptions(CLI::App& command, char cons
 {
     auto const options = std::make_shared<CheckoutOptions>();
     command.add_option(name, options->target, description)->required();
-    command.add_flag("--force", options->force, "Overwrite files with changes that are in no commit");
+    command.add_flag("--force", options->force, "Overwrite files with uncommitted changes");
     return options;
 }
 

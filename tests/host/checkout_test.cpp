@@ -126,8 +126,8 @@ protected:
 
     static std::string wouldBeLost(std::string const& names)
     {
-        return "tav: These files hold changes that are in no commit, which would be lost. Commit them first, or let "
-               "them go with --force:\n" +
+        return "tav: These files have uncommitted changes, which would be lost. Commit them first, or discard them "
+               "with --force:\n" +
                names;
     }
 };
@@ -194,6 +194,70 @@ TEST_F(Moving, CheckoutLeavesWorkAtOtherPathsAndItsStaging)
                   "        new:      d.dwg\n\n");
 }
 
+TEST_F(Moving, CheckoutKeepsAStagedVersionOfAnotherCommit)
+{
+    repo.write("a.dwg", "three");
+    commitAll("the third");
+    tav({"restore", "a.dwg", "--from", "1"});
+    tav({"add", "a.dwg"});
+    std::string const before = status();
+    EXPECT_EQ(tav({"checkout", "2"}), failed(wouldBeLost("  a.dwg\n")));
+    EXPECT_EQ(repo.read("a.dwg"), "one");
+    EXPECT_EQ(status(), before);
+    EXPECT_EQ(tav({"checkout", "1"}).code, 0); // That is the version that was chosen.
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, CheckoutKeepsARestoredVersionOfAnotherCommit)
+{
+    repo.write("a.dwg", "three");
+    commitAll("the third");
+    tav({"restore", "a.dwg", "--from", "1"});
+    EXPECT_EQ(tav({"checkout", "2"}), failed(wouldBeLost("  a.dwg\n")));
+    EXPECT_EQ(repo.read("a.dwg"), "one");
+    EXPECT_EQ(tav({"checkout", "2", "--force"}).code, 0);
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, CheckoutKeepsANewFileThatIsTheCopyOfACommittedOne)
+{
+    repo.write("sub/b.txt", "two");
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  sub/b.txt\n")));
+    EXPECT_EQ(repo.read("sub/b.txt"), "two");
+}
+
+TEST_F(Moving, CheckoutKeepsStagedRemovalsAndRenames)
+{
+    tav({"rm", "a.dwg"});
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  a.dwg\n")));
+    EXPECT_THAT(status(), HasSubstr("removed:  a.dwg"));
+    tav({"restore", "a.dwg"});
+    tav({"mv", "a.dwg", "d.dwg"});
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  a.dwg\n")));
+    EXPECT_THAT(status(), HasSubstr("renamed:  a.dwg -> d.dwg"));
+    EXPECT_FALSE(repo.has("a.dwg"));
+}
+
+TEST_F(Moving, CheckoutBringsBackAFileThatIsGone)
+{
+    unlink(repo.pathTo("a.dwg").c_str());
+    EXPECT_EQ(tav({"checkout", "1"}).code, 0);
+    EXPECT_EQ(repo.read("a.dwg"), "one");
+}
+
+TEST_F(Moving, SwitchCarriesStagedFilesAlongAndSaysSo)
+{
+    tav({"branch", "sketch"});
+    tav({"restore", "a.dwg", "--from", "1"});
+    tav({"add", "a.dwg"});
+    EXPECT_EQ(
+        tav({"switch", "sketch"}),
+        done("On branch sketch now: 0 files written, 0 removed.\n1 staged file carried along.\n"));
+    EXPECT_EQ(repo.read("a.dwg"), "one");
+    EXPECT_EQ(tav({"switch", "master"}).code, 0);
+    EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
+}
+
 TEST_F(Moving, CheckoutTakesAFileThatHoldsTheNewContentAsItIs)
 {
     repo.write("a.dwg", "one");
@@ -246,7 +310,9 @@ TEST_F(Moving, CommitWantsTheEndOfTheBranch)
         failed("tav: You are at an earlier commit, not at the end of the branch 'master'. Run 'tav branch NAME' and "
                "'tav switch NAME' to go on from here, or 'tav switch master' to go back to its end.\n"));
     EXPECT_EQ(tav({"branch", "sketch"}), done("Made the branch 'sketch' at commit 1.\n"));
-    EXPECT_EQ(tav({"switch", "sketch"}), done("On branch sketch now: 0 files written, 0 removed.\n"));
+    EXPECT_EQ(
+        tav({"switch", "sketch"}),
+        done("On branch sketch now: 0 files written, 0 removed.\n1 staged file carried along.\n"));
     EXPECT_EQ(tav({"commit", "-m", "another way"}).code, 0);
     EXPECT_EQ(tav({"branch"}), done("  master  (commit 2)\n* sketch  (commit 3)\n"));
     EXPECT_EQ(tav({"switch", "master"}).code, 0);
@@ -484,6 +550,33 @@ TEST_F(Moving, RestoreLeavesNoRemovalStaged)
     tav({"restore", "a.dwg", "--from", "1"});
     EXPECT_EQ(state().find("staged_files"), std::string::npos) << state();
     EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
+}
+
+TEST_F(Moving, RestoreKeepsAStagedVersionOfAnotherCommitUnlessForced)
+{
+    tav({"restore", "a.dwg", "--from", "1"});
+    tav({"add", "a.dwg"});
+    EXPECT_EQ(tav({"restore", "a.dwg"}), failed(wouldBeLost("  a.dwg\n")));
+    EXPECT_EQ(repo.read("a.dwg"), "one");
+    EXPECT_EQ(tav({"restore", "a.dwg", "--force"}).code, 0);
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, RestoreBringsBackAStagedFileThatIsGone)
+{
+    repo.write("a.dwg", "three");
+    tav({"add", "a.dwg"});
+    unlink(repo.pathTo("a.dwg").c_str());
+    EXPECT_EQ(tav({"restore", "a.dwg"}).code, 0);
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, RestoreOfARenamedFileLeavesItsCopyNew)
+{
+    tav({"mv", "a.dwg", "d.dwg"});
+    EXPECT_EQ(tav({"restore", "a.dwg"}).code, 0);
+    EXPECT_THAT(status(), HasSubstr("new:      d.dwg"));
+    EXPECT_THAT(status(), Not(HasSubstr("renamed")));
 }
 
 TEST_F(Moving, RestoreSaysWhatACommitDoesNotHave)
