@@ -4,6 +4,7 @@
 #include <cctype>
 #include <charconv>
 #include <ios>
+#include <new>
 #include <streambuf>
 #include <utility>
 
@@ -66,8 +67,8 @@ char const* writeInteger(Value const& value, NumberText& text)
 /// Tells how long the text of a value will be, so that it is put where it stays. Escapes and reals count at their
 /// shortest, and what is nested deeper than any real document does not count at all, so that recursion is safe.
 /// Of long arrays, the bulk of every large document, only a sample counts: to measure a million records takes 0.15 s,
-/// to write them 0.4 s. A text that becomes longer than it seemed is moved once more; what is not written to takes no
-/// memory.
+/// to write them 0.4 s. Each value is visited once at most. A text that becomes longer than it seemed is moved once
+/// more; what is not written to takes no memory.
 class LengthEstimate {
 public:
     explicit LengthEstimate(bool pretty) : pretty_(pretty) {}
@@ -103,20 +104,31 @@ private:
         return length;
     }
 
+    // Visits no element twice: in nested arrays that would double the work at every level.
     std::size_t ofArray(Array const& array, std::size_t depth) const
     {
-        if (array.size() < 2 * kSample || depth == kDeepest) {
+        std::size_t const stride = array.size() / kSample;
+        if (stride < 2 || depth == kDeepest) {
             return ofContainer(array, depth);
         }
-        std::size_t length = 0;
-        for (std::size_t i = 0; i < kSample; ++i) {
-            std::size_t const item = ofItem(array[i * array.size() / kSample], depth + 1);
-            if (item > kLongItem) {
-                return ofContainer(array, depth);
-            }
-            length += item;
+        std::size_t sample = 0;
+        std::size_t longest = 0;
+        for (std::size_t i = 0; i < array.size(); i += stride) {
+            std::size_t const item = ofItem(array[i], depth + 1);
+            sample += item;
+            longest = std::max(longest, item);
         }
-        return length / kSample * array.size();
+        std::size_t const sampled = (array.size() + stride - 1) / stride;
+        return longest > kLongItem ? sample + ofTheOthers(array, depth, stride) : sample / sampled * array.size();
+    }
+
+    std::size_t ofTheOthers(Array const& array, std::size_t depth, std::size_t stride) const
+    {
+        std::size_t length = 0;
+        for (std::size_t i = 0; i < array.size(); ++i) {
+            length += i % stride != 0 ? ofItem(array[i], depth + 1) : 0;
+        }
+        return length;
     }
 
     template <class Item>
@@ -162,8 +174,7 @@ class TextStream : public std::wostringstream {
 public:
     explicit TextStream(std::size_t expectedLength)
     {
-        buffer_.text.reserve(expectedLength + expectedLength / 8);
-        adviseLargePages(buffer_.text);
+        reserve(expectedLength + expectedLength / 8);
         std::wios::rdbuf(&buffer_);
         exceptions(std::ios_base::badbit); // Lets what the allocation throws pass.
     }
@@ -171,6 +182,17 @@ public:
     std::wstring take() { return std::move(buffer_.text); }
 
 private:
+    // The expected length is a guess. Where that much memory is not to be had, the text may still fit as it grows.
+    void reserve(std::size_t length)
+    {
+        try {
+            buffer_.text.reserve(std::min(length, buffer_.text.max_size()));
+            adviseLargePages(buffer_.text);
+        } catch (std::bad_alloc const&) {
+            return;
+        }
+    }
+
     class Buffer : public std::wstreambuf {
     public:
         std::wstring text;

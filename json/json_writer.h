@@ -16,7 +16,8 @@
 
 namespace kutils::json {
 
-/// The text of `value`, without a line feed at its end. Throws only what allocation throws.
+/// The text of `value`, without a line feed at its end, in time proportional to its length. Throws `std::bad_alloc`
+/// when there is no memory for it, and `std::length_error` when it would be longer than a string can be.
 ///
 /// Members stand in ascending order of their keys. Reals are written in fixed notation with 16 decimals, so only those
 /// that have no more read back as they were; infinity and NaN become `inf` and `nan`, which do not read back at all.

@@ -167,6 +167,14 @@ TEST(JsonPieces, MakeACompactText)
                          LR"({"number":18446744073709551615,"true":true},"line\nend"],"last":null})");
 }
 
+TEST(JsonPieces, MakeATextHoweverLongItWasExpectedToBe)
+{
+    for (std::size_t const expected : {std::size_t{1} << 45, std::size_t{1} << 62, ~std::size_t{0}}) {
+        EXPECT_EQ(kutils::json::detail::write_pieces(expected, false, [](Generator& out) { out.value(true); }), L"true")
+            << expected;
+    }
+}
+
 TEST(JsonPieces, MakeAPrettyText)
 {
     EXPECT_EQ(inPieces(true), LR"({

@@ -7,13 +7,24 @@
 namespace {
 
 thread_local long remaining = -1; // Negative while there is no limit.
+thread_local std::size_t largest = static_cast<std::size_t>(-1);
 thread_local long used = 0;
+
+bool works(std::function<void()> const& operation)
+{
+    try {
+        operation();
+    } catch (std::bad_alloc const&) {
+        return false;
+    }
+    return true;
+}
 
 } // namespace
 
 void* operator new(std::size_t size)
 {
-    void* const block = remaining == 0 ? nullptr : std::malloc(size > 0 ? size : 1);
+    void* const block = remaining == 0 || size > largest ? nullptr : std::malloc(size > 0 ? size : 1);
     if (!block) {
         throw std::bad_alloc();
     }
@@ -43,14 +54,17 @@ long usedBlocks()
 bool worksWithin(long limit, std::function<void()> const& operation)
 {
     remaining = limit;
-    try {
-        operation();
-    } catch (std::bad_alloc const&) {
-        remaining = -1;
-        return false;
-    }
+    bool const isEnough = works(operation);
     remaining = -1;
-    return true;
+    return isEnough;
+}
+
+bool worksWithBlocksOf(std::size_t size, std::function<void()> const& operation)
+{
+    largest = size;
+    bool const isEnough = works(operation);
+    largest = static_cast<std::size_t>(-1);
+    return isEnough;
 }
 
 } // namespace scarce_memory

@@ -1,5 +1,6 @@
 // What values are written as, character by character. Tests start in the "C" locale.
 #include "tests/json/documents.h"
+#include "tests/json/scarce_memory.h"
 
 #include <cfloat>
 #include <climits>
@@ -11,6 +12,7 @@
 #include <limits>
 #include <sstream>
 #include <stdexcept>
+#include <utility>
 
 namespace {
 
@@ -19,6 +21,7 @@ using kutils::json::write_string;
 using kutils::json::detail::add_esc_char;
 using kutils::json::detail::add_esc_chars;
 using kutils::json::detail::non_printable_to_string;
+using scarce_memory::worksWithBlocksOf;
 using Generator = kutils::json::detail::Generator<Value, std::wostringstream>;
 
 std::wstring golden(char const* name)
@@ -254,6 +257,33 @@ TEST(JsonWriterOf, LongArraysAreWholeWhereverTheirLongElementsStand)
         }
         EXPECT_EQ(write_string(array, false), expected + L"]") << isLongInTheSample;
     }
+}
+
+// Once took time that doubled with each level.
+TEST(JsonWriterOf, NestedLongArraysTakeTimeLikeTheirText)
+{
+    constexpr std::size_t kDepth = 60;
+    std::wstring const rest = repeat(L",0", 2047) + L"]";
+    Value value = 0;
+    for (std::size_t level = 0; level < kDepth; ++level) {
+        Array array(2048, Value(0));
+        array[0] = std::move(value);
+        value = std::move(array);
+    }
+    EXPECT_EQ(write_string(value, false), repeat(L"[", kDepth) + L"0" + repeat(rest, kDepth));
+}
+
+// Every 64th element counts for the estimate: it expects a gigabyte where 18 MB come.
+TEST(JsonWriterOf, ATextThatFitsIsWrittenWhenMuchMoreIsExpected)
+{
+    Array array(65'536, Value(0));
+    for (std::size_t i = 0; i < array.size(); i += 64) {
+        array[i] = std::wstring(4'000, L'x');
+    }
+    std::wstring text;
+    EXPECT_TRUE(worksWithBlocksOf(std::size_t{64} << 20, [&] { text = write_string(array, false); }));
+    std::wstring const item = L",\"" + std::wstring(4'000, L'x') + L"\"" + repeat(L",0", 63);
+    EXPECT_EQ(text, L"[" + repeat(item, 1024).substr(1) + L"]");
 }
 
 Value stateDocument()
