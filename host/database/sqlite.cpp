@@ -44,7 +44,11 @@ Statement& Statement::with(std::int64_t value)
 
 Statement& Statement::with(OdString const& text)
 {
-    std::string const bytes = text.ansi_str();
+    return with(std::string_view(text.ansi_str()));
+}
+
+Statement& Statement::with(std::string_view bytes)
+{
     int const code =
         sqlite3_bind_text64(handle_.get(), ++parameters_, bytes.data(), bytes.size(), SQLITE_TRANSIENT, SQLITE_UTF8);
     if (code != SQLITE_OK) {

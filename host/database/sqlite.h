@@ -25,6 +25,7 @@ public:
     /// Sets the next parameter, in the order of the statement.
     Statement& with(std::int64_t value);
     Statement& with(OdString const& text);
+    Statement& with(std::string_view bytes); ///< of a text
 
     /// Goes to the next row; false behind the last. The statement can then be given new parameters and run again.
     bool next();

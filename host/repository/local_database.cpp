@@ -6,30 +6,32 @@
 #include "platform/ut/Dir.h"
 #include "platform/ut/FileName.h"
 
+#include <array>
+#include <cstddef>
 #include <filesystem>
 
 namespace tav {
 
 namespace {
 
-constexpr std::int64_t kVersion = 1;
-
-constexpr char const* kTables = R"(
+constexpr char const* kFirstTables = R"(
 CREATE TABLE settings (key TEXT PRIMARY KEY, value TEXT NOT NULL) WITHOUT ROWID;
 CREATE TABLE contents (url TEXT PRIMARY KEY, digest TEXT NOT NULL, size INTEGER NOT NULL) WITHOUT ROWID;
 CREATE INDEX contents_by_digest ON contents (digest);
 )";
 
-void makeTables(Database& database)
+void makeFirstTables(Database& database)
 {
-    Change change(database);
-    if (database.version() == 0) { // Another process may have been faster.
-        CommitTables::create(database);
-        database.run(kTables);
-        database.setVersion(kVersion);
-    }
-    change.commit();
+    CommitTables::create(database);
+    database.run(kFirstTables);
 }
+
+/// Each makes the next version out of the one before; a new file is version 0. Steps are added and never changed: files
+/// that earlier versions of tav made have to pass them all.
+constexpr std::array kSteps = {makeFirstTables, VerifiedFiles::create};
+
+constexpr std::int64_t kVersion = kSteps.size();
+constexpr std::int64_t kFirstWithVerifiedFiles = 2;
 
 /// A database that is missing beside stored contents has been lost: a new one would hide the history.
 void failIfLost(common::RootPath const& root)
@@ -45,29 +47,63 @@ void failIfLost(common::RootPath const& root)
     }
 }
 
+std::string pathToOpen(common::RootPath const& root)
+{
+    failIfLost(root);
+    bool const isThere = ut::FileName::fileExists(root.dbPath());
+    return isThere ? root.dbPath().ansi_str() : ":memory:";
+}
+
 } // namespace
 
 LocalDatabase LocalDatabase::make(common::RootPath const& root)
 {
     failIfLost(root);
-    return LocalDatabase(root.dbPath().ansi_str());
+    return {root.dbPath().ansi_str(), Use::changing};
+}
+
+LocalDatabase LocalDatabase::openForChanges(common::RootPath const& root)
+{
+    return {pathToOpen(root), Use::changing};
 }
 
 LocalDatabase LocalDatabase::open(common::RootPath const& root)
 {
-    failIfLost(root);
-    bool const isThere = ut::FileName::fileExists(root.dbPath());
-    return LocalDatabase(isThere ? root.dbPath().ansi_str() : ":memory:");
+    return {pathToOpen(root), Use::reading};
 }
 
-LocalDatabase::LocalDatabase(std::string const& path) : database_(path), commits_(database_, 1)
+LocalDatabase::LocalDatabase(std::string const& path, Use use)
+    : database_(path)
+    , commits_(database_, 1)
+    , verifiedFiles_(database_)
 {
     std::int64_t const version = database_.version();
-    if (version == 0) {
-        makeTables(database_);
-    } else if (version > kVersion) {
+    if (version > kVersion) {
         throw Failure("The database '" + path + "' was written by a newer tav.", "Use that one.");
     }
+    if (version == 0 || (version < kVersion && use == Use::changing)) {
+        migrate();
+    }
+}
+
+void LocalDatabase::migrate()
+{
+    Change change(database_);
+    for (std::int64_t version = database_.version(); version < kVersion; ++version) { // Another process may have been
+        kSteps[static_cast<std::size_t>(version)](database_);                         // faster.
+        database_.setVersion(version + 1);
+    }
+    change.commit();
+}
+
+VerifiedFileList LocalDatabase::verifiedFiles() const
+{
+    return database_.version() < kFirstWithVerifiedFiles ? VerifiedFileList() : verifiedFiles_.all();
+}
+
+void LocalDatabase::addVerified(VerifiedFileList const& files)
+{
+    verifiedFiles_.put(files);
 }
 
 void LocalDatabase::setServer(OdString const& folder, OdString const& repositoryId)

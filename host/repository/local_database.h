@@ -2,6 +2,7 @@
 #pragma once
 
 #include "host/database/commit_tables.h"
+#include "host/repository/verified_files.h"
 
 #include "common/mu_common_repo_prop.h"
 
@@ -14,10 +15,12 @@ namespace tav {
 /// beside stored contents.
 class LocalDatabase {
 public:
-    /// Opens the database, and makes it when it is missing.
+    /// Opens the database, and makes it when it is missing. One that an earlier tav made is brought to the form of this
+    /// one. The caller holds the lock of the repository.
     static LocalDatabase make(common::RootPath const& root);
-    /// Opens the database. Where it is missing an empty one stands in for it, which is gone afterwards. Whoever changes
-    /// it holds the lock of the repository.
+    /// The same, but where it is missing an empty one is used instead, which is gone afterwards.
+    static LocalDatabase openForChanges(common::RootPath const& root);
+    /// For commands that only read: one that an earlier tav made stays as it is.
     static LocalDatabase open(common::RootPath const& root);
 
     LocalDatabase(LocalDatabase const&) = delete;
@@ -28,6 +31,10 @@ public:
     Database& database() { return database_; }
     CommitTables& commits() { return commits_; }
     CommitTables const& commits() const { return commits_; }
+
+    /// What is known of working files without reading them.
+    VerifiedFileList verifiedFiles() const;
+    void addVerified(VerifiedFileList const& files); ///< part of a `Change` of the caller
 
     /// Where the history is kept, and under which identifier; empty before `tav init` has found out.
     OdString serverFolder() const { return value("server"); }
@@ -51,13 +58,17 @@ public:
     void addContent(OdString const& url, OdString const& digest, std::uint64_t size);
 
 private:
-    explicit LocalDatabase(std::string const& path);
+    enum class Use { reading, changing };
 
+    LocalDatabase(std::string const& path, Use use);
+
+    void migrate();
     OdString value(char const* key) const;
     void setValue(char const* key, OdString const& value);
 
     Database database_;
     CommitTables commits_;
+    VerifiedFiles verifiedFiles_;
 };
 
 } // namespace tav

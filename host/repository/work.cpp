@@ -30,7 +30,7 @@ Work::Work(common::RootPath const& root, std::string const& name, Unfinished unf
     : root_(root)
     , lock_(lockRepository(root, name))
     , start_(commandStart(root))
-    , database_(LocalDatabase::open(root))
+    , database_(LocalDatabase::openForChanges(root))
 {
     try {
         finish();

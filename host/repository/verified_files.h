@@ -1,0 +1,41 @@
+/// Working files that were read, as a table of the local database: what each held, and its stamp at that time.
+///
+/// A record says something about a file and nothing about a commit. So it is true whichever commit the folder stands
+/// on, and may be written at any time after the file was read.
+#pragma once
+
+#include "host/changes/file_stamp.h"
+#include "host/database/sqlite.h"
+
+#include <string>
+#include <vector>
+
+namespace tav {
+
+struct VerifiedFile {
+    OdString path;
+    std::string digest; ///< in lower-case hexadecimal digits, as bytes: few of them are ever shown
+    FileStamp stamp;
+};
+
+/// In ascending order of paths, each path once.
+using VerifiedFileList = std::vector<VerifiedFile>;
+
+/// One thread. Every operation throws `Failure` when the database cannot be used.
+class VerifiedFiles {
+public:
+    /// The table in `database`, which lives longer.
+    explicit VerifiedFiles(Database& database) : database_(&database) {}
+
+    /// Makes the table in a database without it.
+    static void create(Database& database);
+
+    VerifiedFileList all() const;
+    /// Adds `files`, in place of what was recorded of the same paths. Part of a `Change` of the caller.
+    void put(VerifiedFileList const& files);
+
+private:
+    Database* database_;
+};
+
+} // namespace tav

@@ -1,0 +1,108 @@
+#include "host/repository/local_database.h"
+
+#include "host/failure.h"
+
+#include "tests/support/temp_repository.h"
+
+#include <gmock/gmock.h>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace tav {
+
+void PrintTo(VerifiedFile const& file, std::ostream* stream)
+{
+    *stream << file.path.ansi_str() << ' ' << file.digest << ' ' << file.stamp.size << ' ' << file.stamp.inode << ' '
+            << file.stamp.changed << ' ' << file.stamp.modified;
+}
+
+bool operator==(VerifiedFile const& a, VerifiedFile const& b)
+{
+    return a.path == b.path && a.digest == b.digest && a.stamp == b.stamp;
+}
+
+} // namespace tav
+
+namespace {
+
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+class LocalDatabase : public testing::Test {
+protected:
+    LocalDatabase() { tav::LocalDatabase::make(repo.root()); }
+
+    /// Makes the file what the first version of its tables was.
+    void makeFirstVersion() const
+    {
+        tav::Database file(path);
+        file.run("DROP TABLE verified_files");
+        file.setVersion(1);
+    }
+
+    std::int64_t version() const { return tav::Database(path).version(); }
+
+    static tav::VerifiedFile verified(OdString const& path)
+    {
+        return {path, "d1ge5t", {5'000'000'000, ~std::uint64_t{0}, 1'700'000'000'000'000'001, -1}};
+    }
+
+    support::TempRepository const repo;
+    std::string const path = repo.pathTo(".tav/tav.db");
+};
+
+TEST_F(LocalDatabase, StaysAsAnEarlierVersionMadeItForWhoOnlyReads)
+{
+    makeFirstVersion();
+    tav::LocalDatabase const database = tav::LocalDatabase::open(repo.root());
+    EXPECT_THAT(database.verifiedFiles(), IsEmpty());
+    EXPECT_EQ(version(), 1);
+}
+
+TEST_F(LocalDatabase, IsBroughtToThisVersionForWhoChangesIt)
+{
+    makeFirstVersion();
+    tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
+    EXPECT_EQ(version(), 2);
+    database.addVerified({verified(L"a.dwg")});
+    EXPECT_THAT(tav::LocalDatabase::open(repo.root()).verifiedFiles(), ElementsAre(verified(L"a.dwg")));
+}
+
+TEST_F(LocalDatabase, IsRefusedWhenANewerVersionMadeIt)
+{
+    tav::Database(path).setVersion(3);
+    try {
+        tav::LocalDatabase::open(repo.root());
+        FAIL() << "no failure";
+    } catch (tav::Failure const& failure) {
+        EXPECT_EQ(failure.what, "The database '" + path + "' was written by a newer tav.");
+        EXPECT_EQ(failure.next, "Use that one.");
+    }
+}
+
+TEST_F(LocalDatabase, KeepsTheLastRecordOfAVerifiedFile)
+{
+    tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
+    tav::VerifiedFile later = verified(L"b.dwg");
+    later.digest = "0ther";
+    later.stamp.changed = 7;
+    database.addVerified({verified(L"a.dwg"), verified(L"b.dwg")});
+    database.addVerified({later});
+    EXPECT_THAT(database.verifiedFiles(), ElementsAre(verified(L"a.dwg"), later));
+}
+
+TEST_F(LocalDatabase, ListsVerifiedFilesInTheOrderOfPathsWhateverTheirBytes)
+{
+    OdString const noText("\xFF", CP_UTF_8);
+    OdString const rare(L"\U0001F3E0");
+    tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
+    database.addVerified({verified(rare), verified(noText), verified(L"a.dwg")});
+    tav::VerifiedFileList const files = database.verifiedFiles();
+    ASSERT_EQ(files.size(), 3U);
+    EXPECT_LT(files[0].path, files[1].path);
+    EXPECT_LT(files[1].path, files[2].path);
+}
+
+} // namespace
