@@ -134,15 +134,20 @@ bool ListenerOrder::operator()(
     return std::less<ConfigListener*>()(&a.get(), &b.get());
 }
 
-WriteConfigData::WriteConfigData(ConfigData& data, ConfigListeners& listeners) : data_(data), listeners_(listeners) {}
+WriteConfigData::WriteConfigData(ConfigData& data, ConfigListeners& listeners, std::shared_ptr<void const> owner)
+    : data_(data)
+    , listeners_(listeners)
+    , owner_(std::move(owner))
+{
+}
 
 WriteConfigData::~WriteConfigData()
 {
-    ConfigListeners const told = listeners_; // A listener may change the set.
-    for (std::reference_wrapper<ConfigListener> const& listener : told) {
-        if (listeners_.count(listener) > 0) {
-            listener.get().configChanged();
-        }
+    // A listener may change the set, and for a copy of it there may be no memory: the next one is looked up by address.
+    for (auto next = listeners_.begin(); next != listeners_.end();) {
+        std::reference_wrapper<ConfigListener> const listener = *next;
+        listener.get().configChanged();
+        next = listeners_.upper_bound(listener);
     }
 }
 
@@ -194,7 +199,7 @@ Config::Factory& Config::factory()
 WriteConfigData Config::write()
 {
     modified_ = true;
-    return WriteConfigData(data_, listeners_);
+    return WriteConfigData(data_, listeners_, weak_from_this().lock());
 }
 
 void Config::addListener(ConfigListener& listener)

@@ -25,8 +25,9 @@ public:
     explicit ConfigPath(OdString const& path);
 
     /// Checks `path` and makes the folder when it is missing, with its parents. The configuration file is not made.
-    /// Errors: `path` is empty; none of its parents exists; the nearest one that exists may not be written; the folder
-    /// cannot be made.
+    /// Errors: `path` is empty; neither the folder nor one above it exists that `path` names (the root of the file
+    /// system and the current folder do not count); the nearest one that exists may not be written; the folder cannot
+    /// be made.
     static Expected<ConfigPath> get(OdString const& path);
 
     /// Path of the configuration file in `folder`.
@@ -85,12 +86,14 @@ struct MU_COMMON_EXPORT ListenerOrder {
 /// The listeners of a configuration, which it does not own.
 using ConfigListeners = std::set<std::reference_wrapper<ConfigListener>, ListenerOrder>;
 
-/// Access for writing, for as long as it lives. Then it tells all listeners, in ascending order of addresses, whether
-/// or not anything was changed. A listener may add and remove listeners meanwhile: removed ones are not told any more.
+/// Access for writing, for as long as it lives. Then it calls all listeners, in ascending order of addresses, whether
+/// or not anything was changed. It needs no memory for that. A listener may add and remove listeners meanwhile, and
+/// destroy removed ones: a removed one is not called any more, and an added one is called if it comes later in the
+/// order. A listener may also release the last owner of the configuration, which then goes when all have been called.
 class MU_COMMON_EXPORT WriteConfigData {
 public:
-    /// Keeps both by reference.
-    WriteConfigData(ConfigData& data, ConfigListeners& listeners);
+    /// Keeps data and listeners by reference, and `owner`, which may be null, alive as long as itself.
+    WriteConfigData(ConfigData& data, ConfigListeners& listeners, std::shared_ptr<void const> owner = nullptr);
     WriteConfigData(WriteConfigData const&) = delete;
     WriteConfigData& operator=(WriteConfigData const&) = delete;
     ~WriteConfigData();
@@ -104,10 +107,11 @@ public:
 private:
     ConfigData& data_;
     ConfigListeners& listeners_;
+    std::shared_ptr<void const> owner_;
 };
 
 /// The configuration of one folder. Held by `std::shared_ptr`; it reaches the disk only when the last owner lets go.
-class MU_COMMON_EXPORT Config {
+class MU_COMMON_EXPORT Config : public std::enable_shared_from_this<Config> {
 public:
     class Factory;
 
@@ -115,23 +119,32 @@ public:
     Config(ConfigPath const& path, ConfigData data, IoInterface const& io);
     /// Starts without projects.
     Config(ConfigPath const& path, IoInterface const& io);
+    /// A temporary host would be gone when the outcome is reported.
+    ///@{
+    Config(ConfigPath const& path, ConfigData data, IoInterface const&& io) = delete;
+    Config(ConfigPath const& path, IoInterface const&& io) = delete;
+    ///@}
     Config(Config const&) = delete;
     Config& operator=(Config const&) = delete;
     /// If `write` was ever called, replaces the configuration file as a whole and reports the outcome to the host,
-    /// once. Errors reported: the document cannot be built; the file cannot be written, which leaves the old one.
+    /// once. Errors reported: the document cannot be built; the file cannot be written. Both leave the old file, except
+    /// when only its folder cannot be flushed: then the new one is there, but after a crash perhaps the old one.
     ~Config();
 
     /// The configuration of `folder`, which is made when it is missing. While one lives that was read from a file,
     /// every caller gets that same one, as it is in memory; without a file every caller gets one of its own, without
-    /// projects. Errors: those of `ConfigPath::get`; the file is not JSON or not of the expected shape.
+    /// projects. Errors: those of `ConfigPath::get`; the file cannot be read, is not JSON or not of the expected shape.
     static Expected<std::shared_ptr<Config>> load(OdString const& folder, IoInterface const& io);
+    /// A temporary host would be gone when the outcome is reported.
+    static Expected<std::shared_ptr<Config>> load(OdString const& folder, IoInterface const&& io) = delete;
 
     /// The process's table of living configurations.
     static Factory& factory();
 
     /// The content, for reading, valid as long as the configuration.
     ConfigData const& read() const { return data_; }
-    /// The content, for writing; the configuration is saved at its end from here on. It must outlive the result.
+    /// The content, for writing; the configuration is saved at its end from here on. The result counts as an owner of a
+    /// configuration that is held by `std::shared_ptr`; any other configuration must outlive it.
     WriteConfigData write();
 
     /// Registers `listener`, once.
@@ -158,6 +171,8 @@ class MU_COMMON_EXPORT Config::Factory {
 public:
     /// The living configuration of `path`, as it is; `data` and `io` are dropped then. Else a new one of `data`.
     std::shared_ptr<Config> get(ConfigPath const& path, ConfigData data, IoInterface const& io);
+    /// A temporary host would be gone when the outcome is reported.
+    std::shared_ptr<Config> get(ConfigPath const& path, ConfigData data, IoInterface const&& io) = delete;
     /// Forgets the configuration of `path`, which lives on with its owners.
     void erase(ConfigPath const& path);
 

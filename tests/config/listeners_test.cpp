@@ -1,11 +1,13 @@
 #include "tests/config/configurations.h"
 
+#include "tests/server/allocations.h"
 #include "tests/support/recording_io.h"
 
 #include <array>
 #include <csignal>
 #include <functional>
 #include <gmock/gmock.h>
+#include <memory>
 #include <stdexcept>
 
 namespace {
@@ -162,12 +164,36 @@ TEST_F(Listeners, AreNotToldWhenAnotherOneHasRemovedThem)
     EXPECT_THAT(toldOnWriting(), ElementsAre(1, 3));
 }
 
-TEST_F(Listeners, AreToldFromTheNextTimeOnWhenAddedWhileOthersAreTold)
+TEST_F(Listeners, AreToldWhenAddedWhileEarlierOnesAreTold)
 {
     add({1});
     listeners[1].then = [&] { add({0, 2}); };
-    EXPECT_THAT(toldOnWriting(), ElementsAre(1));
+    EXPECT_THAT(toldOnWriting(), ElementsAre(1, 2));
     EXPECT_THAT(toldOnWriting(), ElementsAre(0, 1, 2));
+}
+
+TEST_F(Listeners, AreToldWhenThereIsNoMemory)
+{
+    add({0, 1, 2});
+    told.reserve(listeners.size());
+    {
+        server::RefusedAllocations const refused(0);
+        config.write();
+    }
+    EXPECT_THAT(told, ElementsAre(0, 1, 2));
+}
+
+TEST_F(Listeners, AreAllToldBeforeAConfigurationGoesWhoseLastOwnerOneOfThemReleases)
+{
+    auto shared = std::make_shared<Config>(ConfigPath(folder.widePath()), io);
+    listeners[0].then = [&] { shared.reset(); };
+    listeners[1].then = [&] { EXPECT_THAT(io.calls(), IsEmpty()); };
+    shared->addListener(listeners[0]);
+    shared->addListener(listeners[1]);
+    shared->write()->add(L"/a", L"A", L"1");
+    EXPECT_THAT(told, ElementsAre(0, 1));
+    EXPECT_THAT(io.calls(), ElementsAre("report success"));
+    EXPECT_EQ(loaded(folder.widePath(), io), "/a = A (1)");
 }
 
 TEST_F(Listeners, EndTheProcessByThrowing)
