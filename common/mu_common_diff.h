@@ -16,7 +16,10 @@
 
 namespace common {
 
-/// How the working folder differs from the last commit. The host fills it in.
+/// How the working folder differs from the last commit. The host fills it in, by path: it compares `collectRepoFiles`
+/// with the files of the last commit. Each path belongs to one list: one that both have to `unchanged` or `modified`
+/// (for a content-hash URL `isDifferent` decides; a revision URL holds no digest, so the host compares with the stored
+/// content), any other to `untracked` or `removed`.
 struct RepoChanges {
     std::vector<File> files;                             ///< carried along; the explorer does not use them
     std::vector<VersionedFile> unchanged;                ///< as committed

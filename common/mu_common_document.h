@@ -18,8 +18,8 @@ kutils::json::Value readDocument(OdString const& path);
 /// The same; arrays that `sink` wants go there, element by element.
 kutils::json::Value readDocument(OdString const& path, kutils::json::detail::Element_sink& sink);
 
-/// Replaces the content of the file `path` by `document`, in the pretty layout. Error: the file cannot be written; it
-/// holds then what it held before.
+/// Replaces the content of the file `path` by `document`, in the pretty layout. Error: the file cannot be written. It
+/// then holds what it held before, or, when only its folder cannot be flushed, the new content.
 WriteOutcome writeDocument(OdString const& path, kutils::json::Value const& document);
 
 /// The same for the text of a document.

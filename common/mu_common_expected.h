@@ -78,12 +78,24 @@ public:
         assert(hasValue());
         return *std::get_if<1>(&content_);
     }
+    /// Takes it out of a result that goes, so that it may be walked at once: `for (auto& file : collect().value())`.
+    T value() &&
+    {
+        assert(hasValue());
+        return std::move(*std::get_if<1>(&content_));
+    }
 
     /// The message of a result that has no value; lives as long as the result.
     ErrorMessage const& error() const&
     {
         assert(!hasValue());
         return *std::get_if<0>(&content_);
+    }
+    /// Takes it out of a result that goes.
+    ErrorMessage error() &&
+    {
+        assert(!hasValue());
+        return std::move(*std::get_if<0>(&content_));
     }
 
 private:

@@ -28,7 +28,9 @@ struct MU_COMMON_EXPORT CollectOptions {
     bool collectDirs;              ///< folders are listed too
     std::int32_t enumerationFlags; ///< 4 when hidden entries are listed, else 0
     /// An entry whose bare name, in its narrow form, is covered as a whole by one of these is skipped, a folder with
-    /// all that is in it.
+    /// all that is in it. They run as the standard library runs them: some, such as `(a*)*b`, take exponential time on
+    /// a long name. An expression from outside the host belongs into the ignore file, or goes through `RepoIgnore`,
+    /// whose expressions end in bounded time.
     std::vector<std::regex> excludes;
 };
 

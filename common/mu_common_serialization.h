@@ -88,9 +88,11 @@ struct CommitInfo {
     std::vector<RepoFile> files;       ///< of the whole commit
     std::vector<Reference> references; ///< to create or move with the commit
     std::vector<OdString> parents;     ///< hashes
-    OdString hash;                     ///< its own
-    OdString author;                   ///< as the server shall show it
-    OdString message;                  ///< why it was made
+    /// Its own. The host makes it, and the library sends it as it is: 64 lower-case hexadecimal digits that no other
+    /// commit has, such as the SHA-256 digest of everything else in the commit.
+    OdString hash;
+    OdString author;  ///< as the server shall show it
+    OdString message; ///< why it was made
 };
 
 /// What a fetch brings.

@@ -51,27 +51,37 @@ public:
     Cache(RootPath const& root, State state, IoInterface const& io);
     /// Starts with a fresh state, which counts as changed.
     Cache(RootPath const& root, IoInterface const& io);
+    /// A temporary host would be gone when the outcome is reported.
+    ///@{
+    Cache(RootPath const& root, State state, IoInterface const&& io) = delete;
+    Cache(RootPath const& root, IoInterface const&& io) = delete;
+    ///@}
     Cache(Cache const&) = delete;
     Cache& operator=(Cache const&) = delete;
     /// Saves a changed state and reports the outcome to the host, once; does neither for an unchanged one. Errors
     /// reported: a staged change that has no text form; the document cannot be built; the file cannot be written. The
-    /// file then holds what it held before, and it is whole after a crash at any moment.
+    /// file then holds what it held before, except when only its folder cannot be flushed: then it holds the new state,
+    /// but after a crash perhaps the old one. It is whole after a crash at any moment.
     ~Cache();
 
-    /// Loads the state of `root` anew and returns a cache of its own to every caller.
-    /// Errors: no state file; not JSON; HEAD missing or no branch; a member of another shape than expected; a staged
-    /// change that is none. The disk is untouched in each case.
+    /// Loads the state of `root` anew and returns a cache of its own to every caller. The repository must exist: see
+    /// `RootPath::get` for its folder and `create` for its state file.
+    /// Errors: no state file; one that cannot be read; not JSON; HEAD missing or no branch; a member of another shape
+    /// than expected; a staged change that is none. The disk is untouched in each case.
     static Expected<std::shared_ptr<Cache>> get(RootPath const& root, IoInterface const& io);
+    /// A temporary host would be gone when the outcome is reported.
+    static Expected<std::shared_ptr<Cache>> get(RootPath const& root, IoInterface const&& io) = delete;
 
-    /// Writes the state file of a new repository and reports the outcome to `io`. Does nothing when there is one.
+    /// Writes the state file of a new repository, the folder of which exists, and reports the outcome to `io`. Does
+    /// nothing when there is one.
     static void create(RootPath const& root, IoInterface const& io);
 
     /// The state, for reading, valid as long as the cache.
     State const& read() const { return state_; }
     /// The state, for changing, valid as long as the cache, which counts as changed from here on.
     State& write();
-    /// Guards what happens to the state next.
-    Transaction getTransaction();
+    /// Guards what happens to the state for as long as the result lives.
+    [[nodiscard]] Transaction getTransaction();
 
 private:
     friend class Transaction;

@@ -268,6 +268,31 @@ TEST(ExpectedInPlace, BuildsTheVersionsOfAReceivedFileWithoutTheirOwners)
     EXPECT_THAT(log, testing::ElementsAre("owned object gone"));
 }
 
+TEST(ExpectedThatGoes, GivesAValueThatMayBeWalkedAtOnce)
+{
+    auto const collect = [] { return Expected<std::vector<std::string>>({"a long name of a drawing.dwg", "b.dwg"}); };
+    std::string walked;
+    for (std::string& name : collect().value()) {
+        walked += name;
+    }
+    EXPECT_EQ(walked, "a long name of a drawing.dwgb.dwg");
+    EXPECT_TRUE((std::is_same_v<decltype(collect().value()), std::vector<std::string>>));
+}
+
+TEST(ExpectedThatGoes, GivesAValueThatCanOnlyBeMoved)
+{
+    Expected<std::unique_ptr<int>> result(std::make_unique<int>(5));
+    EXPECT_EQ(*std::move(result).value(), 5);
+}
+
+TEST(ExpectedThatGoes, GivesAMessageThatMayBeKept)
+{
+    auto const fail = [] { return Expected<int>(ErrorMessage(L"the disk is full")); };
+    ErrorMessage const& kept = fail().error();
+    EXPECT_EQ(kept.message, OdString(L"the disk is full"));
+    EXPECT_TRUE((std::is_same_v<decltype(fail().error()), ErrorMessage>));
+}
+
 TEST(GetRValueOrThrow, GivesTheVeryValue)
 {
     Expected<OdString> result(OdString(L"plan.dwg"));
