@@ -39,7 +39,7 @@ std::FILE* openForAppending(std::string const& path)
     return isWhole ? std::fopen(path.c_str(), "ab") : nullptr;
 }
 
-/// The digest of all bytes that the file had when it was opened.
+/// The digest of all bytes that the file had when it was opened; from the first that cannot be read, of zeros.
 OdString digestOf(OdString const& path)
 {
     constexpr std::size_t kPiece = 1 << 18;
@@ -47,9 +47,11 @@ OdString digestOf(OdString const& path)
     file.open(path, ut::File::kRead);
     ContentDigest digest;
     std::vector<char> buffer(kPiece);
+    bool isReadable = true;
     for (std::uint64_t left = file.length(); left > 0;) {
         std::size_t const wanted = static_cast<std::size_t>(std::min<std::uint64_t>(left, kPiece));
-        std::size_t const got = file.read(buffer.data(), wanted);
+        std::size_t const got = isReadable ? file.read(buffer.data(), wanted) : 0;
+        isReadable = got == wanted;
         std::fill(buffer.begin() + static_cast<std::ptrdiff_t>(got), buffer.end(), '\0');
         digest.update(buffer.data(), wanted);
         left -= wanted;

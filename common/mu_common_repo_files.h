@@ -141,8 +141,8 @@ MU_COMMON_EXPORT bool logString(OdString const& text, RootPath const& root);
 
 /// Whether the working file `relativePath` of `root` differs from the recorded `hash`: a prefix of three characters
 /// followed by the SHA-256 digest in lower-case hexadecimal digits. A hash that begins with "tf" names a revision store
-/// and counts as different without a look at the file. A file that cannot be opened counts as empty; bytes that cannot
-/// be read count as zeros.
+/// and counts as different without a look at the file. A file that cannot be opened counts as empty; from the first
+/// byte that cannot be read, all count as zeros.
 /// Reads the whole file, in pieces: memory does not grow with it. Any thread may call it.
 MU_COMMON_EXPORT bool isDifferent(OdString const& relativePath, OdString const& hash, RootPath const& root);
 

@@ -1,6 +1,7 @@
 #include "common/mu_common_repo_files.h"
 #include "common/mu_common_versions.h"
 
+#include "platform/os/os_calls.h"
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
 #include "tests/support/foreign_locale.h"
@@ -17,6 +18,9 @@
 #include <sys/stat.h>
 #include <type_traits>
 #include <unistd.h>
+#include <utility>
+
+#include <QTextCodec>
 
 namespace {
 
@@ -346,6 +350,23 @@ TEST(LogString, WritesTheSameUnderEveryLocale)
     }
 }
 
+/// While it lives, Qt takes narrow texts for Latin-1 unless it is told otherwise.
+class Latin1InQt {
+public:
+    Latin1InQt() { QTextCodec::setCodecForLocale(QTextCodec::codecForName("ISO-8859-1")); }
+    Latin1InQt(Latin1InQt const&) = delete;
+    Latin1InQt& operator=(Latin1InQt const&) = delete;
+    ~Latin1InQt() { QTextCodec::setCodecForLocale(nullptr); }
+};
+
+TEST(LogString, WritesUtf8WhateverTheHostHasSetForQt)
+{
+    TempRepository const repository;
+    Latin1InQt const latin1;
+    EXPECT_TRUE(logString(L"\u00E4 \u56FE", repository.root()));
+    EXPECT_EQ(loggedBehindTheTime(repository), " - \u00E4 \u56FE\n");
+}
+
 TEST(LogString, FailsWithoutARepository)
 {
     support::TempFolder const folder;
@@ -358,7 +379,14 @@ TEST(LogString, FailsWhereTheLogCannotBeOpened)
     TempRepository const repository;
     repository.makeFolder(kLog);
     EXPECT_FALSE(logString(L"opened", repository.root()));
-    EXPECT_FALSE(logString(L"opened", common::RootPath(repository.widePath() + L'\0' + L"more")));
+}
+
+TEST(LogString, DoesNotWriteIntoTheFileThatAPathNamesUpToANul)
+{
+    TempRepository const repository;
+    repository.write("plan.dwg", "a drawing");
+    EXPECT_FALSE(logString(L"opened", common::RootPath(repository.widePathTo("plan.dwg") + L'\0' + L"more")));
+    EXPECT_EQ(repository.read("plan.dwg"), "a drawing");
 }
 
 TEST(LogString, FailsWhereNothingMayBeWritten)
@@ -437,6 +465,7 @@ INSTANTIATE_TEST_SUITE_P(
         Recorded{"FourCharactersBefore", "abc", std::string("sha:") + kOfAbc, true},
         Recorded{"NothingBefore", "abc", kOfAbc, true}, Recorded{"StorageMarker", "abc", "tf:plan#1", true},
         Recorded{"StorageMarkerBeforeTheDigest", "abc", std::string("tf:") + kOfAbc, true},
+        Recorded{"StorageMarkerWithoutColonBeforeTheDigest", "abc", std::string("tf#") + kOfAbc, true},
         Recorded{"StorageMarkerAlone", "abc", "tf", true},
         Recorded{"StorageMarkerInOtherCase", "abc", std::string("TF:") + kOfAbc, false},
         Recorded{"HalfAStorageMarker", "abc", std::string("t::") + kOfAbc, false},
@@ -504,6 +533,58 @@ TEST(IsDifferentFrom, ZerosInPlaceOfBytesThatCannotBeRead)
     support::FailingCall const failing(1, EIO);
     EXPECT_FALSE(isDifferent(L"plan.dwg", recorded("sh:", kOfThreeNuls), repository.root()));
     EXPECT_EQ(failing.name(), "1: read");
+}
+
+/// The hash of `content` as a commit records it.
+OdString hashOf(std::string const& content)
+{
+    return recorded("sh:", generateSha(content.data(), static_cast<int>(content.size())).ansi_str());
+}
+
+TEST(IsDifferentFrom, ZerosFromThePieceOnThatCannotBeRead)
+{
+    TempRepository const repository;
+    repository.write("plan.dwg", kPiece + std::string(kPiece.size(), 'q') + "rest");
+    std::string const zeros(kPiece.size() + 4, '\0');
+    support::FailingCall const failing(2, EIO);
+    EXPECT_FALSE(isDifferent(L"plan.dwg", hashOf(kPiece + zeros), repository.root()));
+    EXPECT_EQ(failing.name(), "2: read");
+}
+
+/// While it lives, the file `path` is cut off behind `length` bytes before its second piece is read.
+class CutOffWhileRead {
+public:
+    CutOffWhileRead(std::string path, std::size_t length)
+    {
+        s_path = std::move(path);
+        s_length = static_cast<off_t>(length);
+        s_reads = 0;
+        os::calls().read = cutAndRead;
+    }
+    CutOffWhileRead(CutOffWhileRead const&) = delete;
+    CutOffWhileRead& operator=(CutOffWhileRead const&) = delete;
+    ~CutOffWhileRead() { os::calls().read = ::read; }
+
+private:
+    static ssize_t cutAndRead(int file, void* buffer, std::size_t count)
+    {
+        if (++s_reads == 2) {
+            EXPECT_EQ(truncate(s_path.c_str(), s_length), 0);
+        }
+        return ::read(file, buffer, count);
+    }
+
+    static inline std::string s_path;
+    static inline off_t s_length = 0;
+    static inline int s_reads = 0;
+};
+
+TEST(IsDifferentFrom, ZerosInPlaceOfWhatTheFileLosesWhileItIsRead)
+{
+    TempRepository const repository;
+    repository.write("plan.dwg", kPiece + std::string(1000, 'q'));
+    CutOffWhileRead const cutOff(repository.pathTo("plan.dwg"), kPiece.size() + 5);
+    EXPECT_FALSE(isDifferent(L"plan.dwg", hashOf(kPiece + "qqqqq" + std::string(995, '\0')), repository.root()));
 }
 
 TEST(IsDifferentFrom, AFileWhoseNameIsNotUtf8)
