@@ -1,5 +1,10 @@
-// Any state file: loaded, changed and saved, it loads again as it was saved; refused, it stays as it is.
+// Any state file: it is read as the plain algorithm reads it. Loaded, changed and saved, it loads again as it was
+// saved; refused, it stays as it is.
+#include "fuzz/plain_state.h"
+
 #include "common/mu_common_state.h"
+
+#include "platform/ut/text.h"
 
 #include <algorithm>
 #include <cstddef>
@@ -130,6 +135,16 @@ void changeAndSave(Repository const& repository, std::shared_ptr<common::Cache> 
     require(!comesBackWhole(saved) || isSame(loaded.value()->read(), saved));
 }
 
+void compareWithPlainReading(OdString const& path, Expected<std::shared_ptr<common::Cache>> const& loaded)
+{
+    try {
+        common::State const state = plain::readState(ut::readEntireFile(path));
+        require(loaded.hasValue() && isSame(loaded.value()->read(), state));
+    } catch (OdError const& error) {
+        require(!loaded.hasValue() && loaded.error().message == error.description());
+    }
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size)
@@ -140,6 +155,7 @@ extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size
     repository.write(document);
     auto cache = common::Cache::get(repository.root(), host);
     require(repository.read() == document);
+    compareWithPlainReading(repository.root().statePath(), cache);
     if (cache.hasValue()) {
         changeAndSave(repository, std::move(cache).visit(GetRValueOrThrow<std::shared_ptr<common::Cache>>{}), host);
     }

@@ -319,6 +319,21 @@ TEST(JsonKey, IsFoundExactly)
     }
 }
 
+TEST(JsonKey, IsFoundAmongAnyNumberOfMembers)
+{
+    Object object;
+    for (int count = 0; count < 20; ++count) {
+        SCOPED_TRACE(std::to_string(count) + " members");
+        EXPECT_FALSE(common::hasKey(object, L"missing"));
+        for (int i = 0; i < count; ++i) {
+            OdString const key(std::to_wstring(i).c_str());
+            EXPECT_TRUE(common::hasKey(object, key));
+            EXPECT_EQ(common::getIntValue(object, key, L""), i);
+        }
+        object[std::to_wstring(count)] = count;
+    }
+}
+
 TEST(JsonMismatch, KeepsItsSpelling)
 {
     ErrorMessage const error = common::composeMessage(Value(5), Value_type::object, L"parsing %ls.");

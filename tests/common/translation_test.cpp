@@ -54,13 +54,13 @@ std::string catalogueOf(std::vector<Message> const& messages)
 /// Installs a German catalogue for the process, as a host does, and takes it away again.
 class Translation {
 public:
-    Translation(std::initializer_list<Message> messages)
+    Translation(std::initializer_list<Message> messages, std::string const& domain = "mu_common") : domain_(domain)
     {
         compile(messages);
         wxFileTranslationsLoader::AddCatalogLookupPathPrefix(wxString::FromUTF8(folder_.path().c_str()));
         wxTranslations::Set(new wxTranslations);
         wxTranslations::Get()->SetLanguage("de");
-        EXPECT_TRUE(wxTranslations::Get()->AddCatalog("mu_common"));
+        EXPECT_TRUE(wxTranslations::Get()->AddCatalog(domain_));
     }
     Translation(Translation const&) = delete;
     Translation& operator=(Translation const&) = delete;
@@ -69,14 +69,15 @@ public:
 private:
     void compile(std::vector<Message> const& messages) const
     {
-        folder_.write("mu_common.po", catalogueOf(messages));
+        folder_.write(domain_ + ".po", catalogueOf(messages));
         folder_.makeFolder("de/LC_MESSAGES");
-        std::string const command = MU_MSGFMT " --output-file='" + folder_.pathTo("de/LC_MESSAGES/mu_common.mo") +
-                                    "' '" + folder_.pathTo("mu_common.po") + "'";
+        std::string const command = MU_MSGFMT " --output-file='" + folder_.pathTo("de/LC_MESSAGES/" + domain_ + ".mo") +
+                                    "' '" + folder_.pathTo(domain_ + ".po") + "'";
         EXPECT_EQ(std::system(command.c_str()), 0) << command;
     }
 
     wxInitializer const wx_;
+    std::string const domain_;
     TempFolder const folder_;
 };
 
@@ -185,6 +186,12 @@ INSTANTIATE_TEST_SUITE_P(
             readUnknownChange,
             {"Unsupported file change enum: ge\u00E4ndert %n", "Unbekannte \u00C4nderung ge\u00E4ndert %n!"}}),
     [](auto const& row) { return row.param.name; });
+
+TEST(TranslatedText, IsTakenFromEveryCatalogueOfTheHost)
+{
+    Translation const translation({{"unsupported file change", "unbekannte \u00C4nderung"}}, "the_host");
+    EXPECT_EQ(nameUnknownChange(), "unbekannte \u00C4nderung");
+}
 
 struct Slip {
     char const* name;

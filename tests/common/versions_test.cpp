@@ -130,6 +130,15 @@ TEST(StatusRef, EqualsWhateverItCarries)
     EXPECT_TRUE(status == StatusRef(L"plan.dwg", FileChange::modified));
 }
 
+TEST(StatusRef, DoesNotEqualOneThatWasMovedFrom)
+{
+    StatusRef const status(L"plan.dwg", FileChange::modified);
+    StatusRef moved = status;
+    StatusRef const target = std::move(moved);
+    EXPECT_FALSE(status == moved);
+    EXPECT_TRUE(status == target);
+}
+
 TEST(StatusRef, SharesWhatItCarriesAmongItsCopies)
 {
     StatusRef status(L"plan.dwg", FileChange::modified);

@@ -5,7 +5,9 @@
 #include "tests/support/failing_call.h"
 
 #include <cerrno>
+#include <functional>
 #include <gmock/gmock.h>
+#include <sched.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -89,6 +91,19 @@ TEST(ConfigFolder, IsMadeForEverybodyLessTheUmask)
     EXPECT_EQ(status.st_mode & 07777U, 0750U);
 }
 
+TEST(ConfigFolder, IsMadeForEverybodyWithItsParentsWhereTheUmaskLeavesThat)
+{
+    TempFolder const folder;
+    mode_t const before = umask(0);
+    EXPECT_EQ(checked(folder.pathTo("a/b")), "path " + folder.pathTo("a/b"));
+    umask(before);
+    for (char const* const name : {"a", "a/b"}) {
+        struct stat status {};
+        ASSERT_EQ(stat(folder.pathTo(name).c_str(), &status), 0);
+        EXPECT_EQ(status.st_mode & 07777U, 0777U) << name;
+    }
+}
+
 TEST(ConfigFolder, IsTakenUnseenWhenTheFileIsAFolder)
 {
     TempFolder const folder;
@@ -102,6 +117,25 @@ TEST(ConfigFolder, IsTakenUnseenWhenTheFileIsAFolder)
 TEST(ConfigFolder, MustHaveAName)
 {
     EXPECT_EQ(checked(""), "error: VC config path is empty.");
+}
+
+/// What `body` returns in a process of its own whose root folder is `folder`.
+std::string below(std::string const& folder, std::function<std::string()> const& body)
+{
+    return support::inOwnProcess([&]() -> std::string {
+        bool const mayChange = geteuid() == 0 || unshare(CLONE_NEWUSER) == 0;
+        bool const isBelow = mayChange && chroot(folder.c_str()) == 0 && chdir("/") == 0;
+        return isBelow ? body() : "cannot change the root folder";
+    });
+}
+
+// The file of the folder without a name lies in the root folder.
+TEST(ConfigFolder, IsLookedForBeforeItsNameIs)
+{
+    TempFolder const root;
+    EXPECT_EQ(below(root.path(), [] { return checked(""); }), "error: VC config path is empty.");
+    root.makeFolder("directories.state");
+    EXPECT_EQ(below(root.path(), [] { return checked(""); }), "path ");
 }
 
 struct PathRow {

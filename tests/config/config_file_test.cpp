@@ -1,10 +1,12 @@
 #include "tests/config/configurations.h"
+#include "tests/server/allocations.h"
 #include "tests/server/translations.h"
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/recording_io.h"
 
 #include <gmock/gmock.h>
+#include <new>
 #include <sys/stat.h>
 
 namespace {
@@ -201,6 +203,27 @@ TEST_F(ConfigFile, IsRefusedInTheLanguageOfTheUser)
     EXPECT_EQ(loadedFrom(map("{}")), missing("info"));
     EXPECT_EQ(loadedFrom(map("5")), "error: Encounterd 'object', found 'int. While parsing json map.'");
     EXPECT_EQ(loadedFrom("[]"), mismatch("object", "array", ""));
+}
+
+TEST(ConfigFileThatCannotBeRead, IsNamedAsItIs)
+{
+    TempFolder const folder;
+    RecordingIo const io;
+    folder.makeFolder("100%ls%n/directories.state");
+    EXPECT_EQ(
+        loaded(folder.widePathTo("100%ls%n"), io),
+        "error: Could not read file '" + folder.pathTo("100%ls%n/directories.state") + "': Is a directory");
+}
+
+// What is no `OdError` passes through.
+TEST(ConfigFileTooLargeForTheMemory, IsNotTakenForAWrongOne)
+{
+    TempFolder const folder;
+    RecordingIo const io;
+    folder.write(kFile, "{\"other\": \"" + std::string(1'000'000, 'p') + "\"}");
+    auto const loadIt = [&] { static_cast<void>(common::Config::load(folder.widePath(), io)); };
+    server::RefusedAllocations const refused(2'000'000);
+    EXPECT_THROW(loadIt(), std::bad_alloc);
 }
 
 } // namespace

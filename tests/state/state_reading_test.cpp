@@ -207,6 +207,15 @@ INSTANTIATE_TEST_SUITE_P(
             "HEAD master\nindex b 2\nindex c 3\n"},
         Row{"CommasMayFollow", indexed(R"({"data": {"last_checked": 1, "modified": false,}, "path": "a",},)"),
             "HEAD master\nindex a 1\n"},
+        Row{"CommaMayFollowThePath", indexed(R"({"data": {"last_checked": 1, "modified": false}, "path": "a",})"),
+            "HEAD master\nindex a 1\n"},
+        Row{"MemberBehindThePathIsIgnored",
+            indexed(R"({"data": {"last_checked": 1, "modified": false}, "path": "a", "size": 5})"),
+            "HEAD master\nindex a 1\n"},
+        Row{"RecordMustEndWithItsOwnBracket",
+            indexed(R"({"data": {"last_checked": 1, "modified": false}, "path": "a"])"), kNoJson},
+        Row{"DataMustEndWithItsOwnBracket", indexed(R"({"data": {"last_checked": 1, "modified": false], "path": "a"})"),
+            kNoJson},
         Row{"NamesMayBeEscaped", indexed(R"({"d\u0061ta": {"last_checked": 1, "modified": false}, "path": "\u0061"})"),
             "HEAD master\nindex a 1\n"},
         Row{"LastOfTwoIndexesCounts", withHead(R"("index": [)" + kGoodIndexEntry + R"(, 5], "index": [{"data":
@@ -217,6 +226,18 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"ArrayBehindItDoesNotReplaceIt", withHead(R"("index": [)" + kGoodIndexEntry + R"(], "more": [1, {}])"),
             "HEAD master\nindex a 1\n"},
         Row{"FirstOfTwoFaultsIsTold", indexed(R"({"data": {}}, 5)"), missing("path")},
+        Row{"FaultBeforeAGoodRecordCounts", indexed(R"({"data": {}}, )" + kGoodIndexEntry), missing("path")},
+        Row{"PathIsNoString", indexed(R"({"data": {"last_checked": 1, "modified": false}, "path": 5})"),
+            mismatch("string", "int", "path")},
+        Row{"OtherNameForData", indexed(R"({"date": {"last_checked": 1, "modified": false}, "path": "a"})"),
+            missing("data")},
+        Row{"OtherNameForTheTime", indexed(R"({"data": {"last_changed": 1, "modified": false}, "path": "a"})"),
+            missing("last_checked")},
+        Row{"OtherNameForTheMark", indexed(R"({"data": {"last_checked": 1, "modifies": false}, "path": "a"})"),
+            missing("modified")},
+        Row{"OtherNameForThePath", indexed(R"({"data": {"last_checked": 1, "modified": false}, "name": "a"})"),
+            missing("path")},
+        Row{"OtherNamesForAll", indexed(R"({"info": {"number": 1, "flag": false}, "name": "a"})"), missing("data")},
         Row{"ElementIsNoObject", indexed(kGoodIndexEntry + ", null"), noObject("null", "map")},
         Row{"DataIsMissing", indexed(R"({"path": "a"})"), missing("data")},
         Row{"PathIsMissing", indexed(R"({"data": {"last_checked": 1, "modified": false}})"), missing("path")},
@@ -338,6 +359,16 @@ TEST_P(ListElement, IsRefusedUnlessItIsAnObject)
         Repository const repository(document.replace(document.find('$'), 1, text));
         EXPECT_EQ(repository.loaded(), noObject(type, GetParam().type));
     }
+}
+
+TEST(StateFileThatCannotBeRead, IsNamedAsItIs)
+{
+    support::TempFolder const folder;
+    support::RecordingIo const io;
+    folder.makeFolder("100%ls%n/.tav/tav.state");
+    EXPECT_EQ(
+        inWords(Cache::get(common::RootPath(folder.widePathTo("100%ls%n")), io)),
+        "error: Could not read file '" + folder.pathTo("100%ls%n/.tav/tav.state") + "': Is a directory");
 }
 
 } // namespace

@@ -45,7 +45,6 @@ std::string saying(std::function<std::string()> const& body)
 
 [[noreturn]] void runChild(std::function<std::string()> const& body, int answer)
 {
-    giveUpRights();
     std::string const text = saying(body);
     std::size_t done = 0;
     while (done < text.size()) {
@@ -70,6 +69,14 @@ std::string readAll(int file)
 } // namespace
 
 std::string asOrdinaryUser(std::function<std::string()> const& body)
+{
+    return inOwnProcess([&] {
+        giveUpRights();
+        return body();
+    });
+}
+
+std::string inOwnProcess(std::function<std::string()> const& body)
 {
     std::array<int, 2> ends{};
     require(pipe(ends.data()) == 0, "pipe");
