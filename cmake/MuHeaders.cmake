@@ -17,3 +17,6 @@ file(GLOB MU_COMMON_HEADERS CONFIGURE_DEPENDS RELATIVE "${PROJECT_SOURCE_DIR}"
     "${PROJECT_SOURCE_DIR}/json/*.h"
     "${PROJECT_SOURCE_DIR}/common/*.h")
 list(REMOVE_ITEM MU_COMMON_HEADERS ${MU_INTERNAL_HEADERS})
+
+# The library of preview pictures is a package of its own.
+set(MU_PREVIEW_HEADERS preview/mu_preview.h)

@@ -30,6 +30,17 @@ foreach(header IN LISTS headers)
     install(FILES "${PROJECT_SOURCE_DIR}/${header}" DESTINATION "${MU_INSTALL_INCLUDEDIR}/${folder}")
 endforeach()
 
+# The pictures of drawings come as a package of their own, for programs that want nothing else.
+target_include_directories(mu_preview_library INTERFACE "$<INSTALL_INTERFACE:${MU_INSTALL_INCLUDEDIR}>")
+install(TARGETS mu_preview_library EXPORT mu_previewTargets LIBRARY DESTINATION "${CMAKE_INSTALL_LIBDIR}")
+install(FILES ${MU_PREVIEW_HEADERS} DESTINATION "${MU_INSTALL_INCLUDEDIR}/preview")
+install(EXPORT mu_previewTargets NAMESPACE mu_preview:: FILE mu_previewConfig.cmake
+    DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/mu_preview")
+write_basic_package_version_file("${PROJECT_BINARY_DIR}/package/mu_previewConfigVersion.cmake"
+    COMPATIBILITY SameMinorVersion)
+install(FILES "${PROJECT_BINARY_DIR}/package/mu_previewConfigVersion.cmake"
+    DESTINATION "${CMAKE_INSTALL_LIBDIR}/cmake/mu_preview")
+
 install(EXPORT mu_commonTargets NAMESPACE mu_common:: DESTINATION "${MU_INSTALL_CMAKEDIR}")
 configure_package_config_file("${PROJECT_SOURCE_DIR}/cmake/mu_commonConfig.cmake.in"
     "${PROJECT_BINARY_DIR}/package/mu_commonConfig.cmake"
@@ -42,8 +53,10 @@ install(FILES
     DESTINATION "${MU_INSTALL_CMAKEDIR}")
 
 file(RELATIVE_PATH MU_PC_PREFIX "/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/")
-configure_file("${PROJECT_SOURCE_DIR}/cmake/mu_common.pc.in" "${PROJECT_BINARY_DIR}/package/mu_common.pc" @ONLY)
-install(FILES "${PROJECT_BINARY_DIR}/package/mu_common.pc" DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
+foreach(package IN ITEMS mu_common mu_preview)
+    configure_file("${PROJECT_SOURCE_DIR}/cmake/${package}.pc.in" "${PROJECT_BINARY_DIR}/package/${package}.pc" @ONLY)
+    install(FILES "${PROJECT_BINARY_DIR}/package/${package}.pc" DESTINATION "${CMAKE_INSTALL_LIBDIR}/pkgconfig")
+endforeach()
 
 file(GLOB catalogues CONFIGURE_DEPENDS "${PROJECT_SOURCE_DIR}/po/*.po")
 foreach(catalogue IN LISTS catalogues)
