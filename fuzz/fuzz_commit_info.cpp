@@ -3,6 +3,7 @@
 #include "host/failure.h"
 #include "host/paths/recorded_path.h"
 #include "host/server/commit_document.h"
+#include "host/server/members.h"
 
 #include <cstddef>
 #include <cstdint>

@@ -96,6 +96,7 @@ struct IgnoreOptions {
 };
 void ignore(IgnoreOptions const& options);
 
+void fetchHistory();
 void listProjects(bool json);
 void verifyAll(bool json);
 void collectGarbage();

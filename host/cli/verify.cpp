@@ -2,6 +2,8 @@
 #include "host/cli/output.h"
 #include "host/failure.h"
 #include "host/progress.h"
+#include "host/repository/contents.h"
+#include "host/repository/history.h"
 #include "host/repository/local_database.h"
 #include "host/repository/open.h"
 #include "host/storage/local_storage.h"
@@ -9,6 +11,7 @@
 
 #include "common/mu_common_file_storage.h"
 
+#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -42,7 +45,33 @@ damagesOf(common::RootPath const& root, CommitTables const& commits, std::vector
     return damages;
 }
 
-void printDocument(std::size_t count, std::vector<Damage> const& damages)
+/// How the history that is known here differs from the server's; none when it does not, or the server is away.
+std::optional<Failure> differenceFromServer(LocalDatabase const& database)
+{
+    if (database.repositoryId().isEmpty()) {
+        return std::nullopt;
+    }
+    HistoryComparison comparison;
+    try {
+        Connection connection(database);
+        comparison = compareHistory(database, connection);
+    } catch (Failure const& failure) {
+        printNote("The history could not be compared with the server's. " + failure.what);
+    }
+    if (comparison.unknownThere > 0) {
+        return Failure(
+            "The server lacks " + counted(comparison.unknownThere, "commit") + " that are known here.",
+            "Put a newer copy of it in its place.");
+    }
+    if (comparison.unknownHere > 0) {
+        return Failure(
+            "The server has " + counted(comparison.unknownHere, "commit") + " that are not known here.",
+            "Run 'tav fetch' to learn them.");
+    }
+    return std::nullopt;
+}
+
+void printDocument(Contents const& contents, std::vector<Damage> const& damages)
 {
     kutils::json::Array array;
     for (Damage const& damage : damages) {
@@ -55,9 +84,22 @@ void printDocument(std::size_t count, std::vector<Damage> const& damages)
         array.emplace_back(std::move(object));
     }
     kutils::json::Object document;
-    document[L"versions"] = static_cast<std::uint64_t>(count);
+    document[L"elsewhere"] = static_cast<std::uint64_t>(contents.elsewhere.size());
+    document[L"versions"] = static_cast<std::uint64_t>(contents.here.size());
     document[L"damaged"] = std::move(array);
     printJson(std::move(document));
+}
+
+void printSummary(Contents const& contents, std::vector<Damage> const& damages)
+{
+    if (damages.empty()) {
+        print("Read " + counted(contents.here.size(), "stored version") + "; nothing is damaged.\n");
+    }
+    if (!contents.elsewhere.empty()) {
+        print(
+            "Not here: " + counted(contents.elsewhere.size(), "version") +
+            " of commits that were made in other folders.\n");
+    }
 }
 
 } // namespace
@@ -66,21 +108,22 @@ void verifyAll(bool json)
 {
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
-    if (std::string const damage = database.damage(); !damage.empty()) {
-        throw Failure(
-            "The database '" + database.path() + "' is damaged: " + damage + ".",
-            "Put a copy of it from a backup in its place.");
-    }
-    std::vector<OdString> const urls = database.commits().urls();
-    std::vector<Damage> const damages = damagesOf(root, database.commits(), urls);
+    database.failIfDamaged();
+    Contents const contents = contentsOf(root, database);
+    std::vector<Damage> const damages = damagesOf(root, database.commits(), contents.here);
     if (json) {
-        printDocument(urls.size(), damages);
-    } else if (damages.empty()) {
-        print("Read " + counted(urls.size(), "stored version") + "; nothing is damaged.\n");
+        printDocument(contents, damages);
+    } else {
+        printSummary(contents, damages);
     }
+    std::optional<Failure> const difference = differenceFromServer(database);
     if (!damages.empty()) {
+        if (difference) {
+            printNote(difference->what + " " + difference->next);
+        }
         Failure failure(
-            std::to_string(damages.size()) + " of " + counted(urls.size(), "stored version") + " cannot be read.",
+            std::to_string(damages.size()) + " of " + counted(contents.here.size(), "stored version") +
+                " cannot be read.",
             "Put copies of these files from a backup in their place:");
         for (Damage const& damage : damages) {
             failure.details.push_back(
@@ -88,6 +131,9 @@ void verifyAll(bool json)
                 std::to_string(damage.file.commit) + ": " + damage.what.ansi_str());
         }
         throw failure;
+    }
+    if (difference) {
+        throw *difference;
     }
 }
 

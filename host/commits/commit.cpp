@@ -6,6 +6,7 @@
 #include "host/failure.h"
 #include "host/paths/recorded_path.h"
 #include "host/progress.h"
+#include "host/repository/history.h"
 #include "host/repository/server_of.h"
 #include "host/repository/working_state.h"
 #include "host/server/commit_document.h"
@@ -169,23 +170,16 @@ void failIfNotAtTheEnd(LocalDatabase const& database, OdString const& branch)
             "' to go back to its end.");
 }
 
-bool isOnServer(NewCommit const& commit, LocalDatabase const& database, Connection& connection)
-{
-    std::vector<common::Commit> const commits = unknownCommits(database, connection);
-    auto const isIt = [&](common::Commit const& other) { return other.hash == commit.commit.hash; };
-    return std::any_of(commits.begin(), commits.end(), isIt);
-}
-
 /// Sends the commit and returns its number. One that the server refuses is given up; after any other failure the server
 /// may have it from a try before, so the note stays until that is known.
-std::int64_t sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& database)
+std::int64_t
+sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& database, Connection& connection)
 {
-    Connection connection(database);
     kutils::json::Value answer;
     try {
         kutils::json::read_string(answer, connection.request("commit", document));
     } catch (Failure& failure) {
-        if (!isOnServer(commit, database, connection)) {
+        if (!isOnServer(commit.commit.hash, connection)) {
             note(std::monostate(), database);
         }
         failure.next += " With 'tav branch NAME' and 'tav switch NAME' you have a branch of your own.";
@@ -198,14 +192,31 @@ std::int64_t sentNumber(NewCommit const& commit, OdString const& document, Local
     return numbers.front().commitNo;
 }
 
+/// Others may have gone on from the commit before its end was entered here.
+void setUnlessPassed(common::Reference const& reference, LocalDatabase& database)
+{
+    auto const there = database.commits().reference(reference.name);
+    if (!there || !database.commits().isBefore(reference.commitHash, there->commitHash)) {
+        database.commits().set(reference);
+    }
+}
+
+void failUnlessNext(std::int64_t number, LocalDatabase const& database)
+{
+    if (number != database.commits().lastWithoutGap() + 1) {
+        throw Failure("The server gave the commit a number that does not follow its last one.", kAskOwner);
+    }
+}
+
 void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& database)
 {
     Change change(database.database());
     if (!database.commits().find(commit.commit.hash)) {
+        failUnlessNext(commit.commit.number, database);
         database.commits().add(commit.commit, commit.files);
     }
     for (common::Reference const& reference : commit.references) {
-        database.commits().set(reference);
+        setUnlessPassed(reference, database);
     }
     for (NewContent const& content : work.contents) {
         database.addContent(content.url, content.digest, content.size);
@@ -276,7 +287,11 @@ void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
 
 CommitRecord finish(common::RootPath const& root, LocalDatabase& database, CommitUnderWay const& work, NewCommit commit)
 {
-    commit.commit.number = sentNumber(commit, work.document, database);
+    Connection connection(database);
+    commit.commit.number = sentNumber(commit, work.document, database, connection);
+    if (commit.commit.number != database.commits().lastWithoutGap() + 1) { // Others have committed meanwhile.
+        learnHistory(root, database, connection, Compared::everything);
+    }
     enter(commit, work, database);
     changeState(root, [&](common::Cache& cache) { settle(work.files, cache.write()); });
     note(std::monostate(), database);
@@ -289,7 +304,8 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
 {
     auto const cache = readState(root);
     common::State const& state = cache->read();
-    [[maybe_unused]] Connection const server(database); // Without one there is nothing to begin.
+    Connection server(database); // Without one there is nothing to begin.
+    learnHistory(root, database, server, Compared::theEnd);
     failIfNotAtTheEnd(database, state.head);
     Draft draft{root, database, start, database.commits().files(database.base()), {}, {}};
     common::RepoChanges const changes = compareWithBase(draft, state);

@@ -102,8 +102,8 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
 }
 
 _tav() {
-    local commands='init status add unstage mv rm commit log show diff restore checkout switch branch tag files ignore
-        projects verify gc export'
+    local commands='init status add unstage mv rm commit log show diff restore checkout switch branch tag fetch files
+        ignore projects verify gc export'
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
     local command='' folder='' number=1 word i
     COMPREPLY=()

@@ -1,7 +1,7 @@
 # Completion of tav for fish: commands, options, files, branches and tags.
 
-set -l commands init status add unstage mv rm commit log show diff restore checkout switch branch tag files ignore \
-    projects verify gc export
+set -l commands init status add unstage mv rm commit log show diff restore checkout switch branch tag fetch files \
+    ignore projects verify gc export
 
 # Runs tav on the repository that the line names with -C, for what it knows.
 function __tav_ask
@@ -76,6 +76,7 @@ __tav_command checkout 'Make the working folder what it was at a commit' $comman
 __tav_command switch 'Go on with the work on another branch' $commands
 __tav_command branch 'List the branches, or make one' $commands
 __tav_command tag 'List the tags, or make one' $commands
+__tav_command fetch 'Learn the commits, branches and tags that the server has' $commands
 __tav_command files 'List the files that the repository keeps' $commands
 __tav_command ignore 'Show the rules for names to ignore, or add one' $commands
 __tav_command projects 'List the repositories that you have made' $commands

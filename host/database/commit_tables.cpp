@@ -141,6 +141,11 @@ void CommitTables::create(Database& database)
 
 void CommitTables::add(CommitRecord const& commit, std::vector<FileRecord> const& files)
 {
+    addChanges(commit, changesBetween(commit.parents.empty() ? Tree() : this->files(commit.parents.front()), files));
+}
+
+void CommitTables::addChanges(CommitRecord const& commit, std::vector<FileRecord> const& changes)
+{
     Statement addCommit = database_->prepare("INSERT INTO commits VALUES (?, ?, ?, ?, ?, ?)");
     addCommit.with(repository_).with(commit.number).with(commit.hash).with(commit.author).with(commit.message);
     addCommit.with(commit.date).run();
@@ -149,11 +154,18 @@ void CommitTables::add(CommitRecord const& commit, std::vector<FileRecord> const
     for (OdString const& parent : commit.parents) {
         addParent.with(repository_).with(commit.number).with(position++).with(numberOf(parent)).run();
     }
-    Tree parent = commit.parents.empty() ? Tree() : this->files(commit.parents.front());
     Statement addChange = database_->prepare("INSERT INTO changes VALUES (?, ?, ?, ?, ?)");
-    for (FileRecord const& change : changesBetween(std::move(parent), files)) {
+    for (FileRecord const& change : changes) {
         addChange.with(repository_).with(commit.number).with(change.path).with(change.url).with(change.previousPath);
         addChange.run();
+    }
+}
+
+void CommitTables::clear()
+{
+    for (char const* const table : {"refs", "changes", "parents", "commits"}) { // None names what has gone already.
+        Statement remove = database_->prepare(("DELETE FROM " + std::string(table) + " WHERE repository = ?").c_str());
+        remove.with(repository_).run();
     }
 }
 
@@ -221,6 +233,27 @@ std::int64_t CommitTables::lastNumber() const
 {
     Statement row = database_->prepare("SELECT max(number) FROM commits WHERE repository = ?");
     return row.with(repository_).next() ? row.integer(0) : 0;
+}
+
+std::int64_t CommitTables::lastWithoutGap() const
+{
+    Statement row = database_->prepare(R"(
+        SELECT max(number) FROM (
+            SELECT number, row_number() OVER (ORDER BY number) AS place FROM commits WHERE repository = ?)
+        WHERE number = place)");
+    return row.with(repository_).next() ? row.integer(0) : 0;
+}
+
+std::vector<CommitNumber> CommitTables::numbersFrom(std::int64_t first) const
+{
+    Statement rows =
+        database_->prepare("SELECT number, hash FROM commits WHERE repository = ? AND number >= ? ORDER BY number");
+    rows.with(repository_).with(first);
+    std::vector<CommitNumber> numbers;
+    while (rows.next()) {
+        numbers.push_back({rows.integer(0), rows.text(1)});
+    }
+    return numbers;
 }
 
 std::vector<std::int64_t> CommitTables::line(OdString const& hash) const

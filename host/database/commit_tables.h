@@ -27,6 +27,11 @@ struct CommitRecord {
     std::vector<OdString> parents;
 };
 
+struct CommitNumber {
+    std::int64_t number = 0;
+    OdString hash;
+};
+
 /// What a commit did to one path.
 struct FileRecord {
     OdString path;
@@ -61,6 +66,10 @@ public:
 
     /// Adds a commit whose whole content is `files`; its parents must be there. Part of a `Change` of the caller.
     void add(CommitRecord const& commit, std::vector<FileRecord> const& files);
+    /// The same for what it changed against its first parent.
+    void addChanges(CommitRecord const& commit, std::vector<FileRecord> const& changes);
+    /// Removes all commits and references. Part of a `Change` of the caller.
+    void clear();
 
     std::optional<CommitRecord> find(OdString const& hash) const;
     std::optional<CommitRecord> find(std::int64_t number) const;
@@ -72,6 +81,10 @@ public:
     std::vector<CommitRecord> history(OdString const& hash) const;
     bool isBefore(OdString const& ancestor, OdString const& hash) const; ///< or the same
     std::int64_t lastNumber() const;                                     ///< 0 when there is no commit
+    /// The last number up to which no commit is missing; 0 when the first one is.
+    std::int64_t lastWithoutGap() const;
+    /// All commits from the number `first` on, in ascending order.
+    std::vector<CommitNumber> numbersFrom(std::int64_t first) const;
 
     /// The files of a commit; none for an empty `hash`, which stands for what is before the first commit.
     FileList fileList(OdString const& hash) const;

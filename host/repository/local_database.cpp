@@ -106,6 +106,15 @@ void LocalDatabase::addVerified(VerifiedFileList const& files)
     verifiedFiles_.put(files);
 }
 
+void LocalDatabase::failIfDamaged() const
+{
+    if (std::string const damage = database_.damage(); !damage.empty()) {
+        throw Failure(
+            "The database '" + path() + "' is damaged: " + damage + ".",
+            "Put a copy of it from a backup in its place.");
+    }
+}
+
 void LocalDatabase::setServer(OdString const& folder, OdString const& repositoryId)
 {
     Change change(database_);

@@ -27,7 +27,7 @@ public:
     LocalDatabase& operator=(LocalDatabase const&) = delete;
 
     std::string const& path() const { return database_.path(); }
-    std::string damage() const { return database_.damage(); } ///< empty when it is whole
+    void failIfDamaged() const; ///< Throws `Failure` unless the whole file can be read.
     Database& database() { return database_; }
     CommitTables& commits() { return commits_; }
     CommitTables const& commits() const { return commits_; }

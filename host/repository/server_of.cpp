@@ -4,7 +4,6 @@
 #include "host/user_folders.h"
 
 #include "common/mu_common_serialization.h"
-#include "json/json_reader.h"
 
 namespace tav {
 
@@ -53,30 +52,6 @@ OdString Connection::request(char const* verb, OdString const& document)
 {
     auto const answer = server_->request(OdString(verb, CP_UTF_8) + L" " + repository_, document);
     return valueOrFail(answer, "Your working folder is as it was.");
-}
-
-std::vector<common::Commit> unknownCommits(LocalDatabase const& database, Connection& connection)
-{
-    std::wstring const known =
-        L"[{\"commitNo\":" + std::to_wstring(database.commits().lastNumber()) + L",\"hash\":\"\"}]";
-    kutils::json::Value answer;
-    kutils::json::read_string(answer, connection.request("fetch", OdString(known.c_str(), known.size())));
-    return valueOrFail(common::deserializeFetchData(answer.get_object()), "Ask the owner of the server.").commits;
-}
-
-void requireWholeHistory(LocalDatabase const& database)
-{
-    if (std::string const damage = database.damage(); !damage.empty()) {
-        throw Failure(
-            "The database '" + database.path() + "' is damaged: " + damage + ".",
-            "Put a copy of it from a backup in its place.");
-    }
-    Connection connection(database);
-    if (!unknownCommits(database, connection).empty()) {
-        throw Failure(
-            "The server has commits that the database '" + database.path() + "' does not know.",
-            "Put a newer copy of it in its place.");
-    }
 }
 
 } // namespace tav

@@ -4,11 +4,8 @@
 #include "host/repository/local_database.h"
 #include "host/server/embedded_server.h"
 
-#include "common/mu_common_serialization.h"
-
 #include <memory>
 #include <string>
-#include <vector>
 
 namespace tav {
 
@@ -21,10 +18,6 @@ std::unique_ptr<Server> connect(OdString const& folder, EmbeddedServer::Missing 
 
 /// Throws `Failure` when `database` names no server.
 void requireServer(LocalDatabase const& database);
-
-/// Throws `Failure` unless `database` is whole and knows every commit that the server has: only then it can be said
-/// what no commit needs.
-void requireWholeHistory(LocalDatabase const& database);
 
 /// A server, and a repository that it keeps.
 class Connection {
@@ -39,8 +32,5 @@ private:
     std::unique_ptr<Server> server_;
     OdString repository_;
 };
-
-/// The commits that the server has beyond the last one that `database` knows. Throws `Failure`.
-std::vector<common::Commit> unknownCommits(LocalDatabase const& database, Connection& connection);
 
 } // namespace tav

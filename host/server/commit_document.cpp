@@ -1,8 +1,7 @@
 #include "host/server/commit_document.h"
 
-#include "host/paths/recorded_path.h"
 #include "host/server/document.h"
-#include "host/storage/storage_url.h"
+#include "host/server/members.h"
 #include "host/text/characters.h"
 
 #include "common/mu_common_json_keys.h"
@@ -10,6 +9,7 @@
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <utility>
 
 namespace tav {
 
@@ -19,21 +19,15 @@ namespace keys = common::json;
 
 constexpr std::size_t kHashLength = 64;
 constexpr std::size_t kLongestName = 255;
-constexpr std::size_t kMostParents = 2;
 
 bool isDigit(wchar_t c)
 {
     return c >= L'0' && c <= L'9';
 }
 
-bool isLowerHex(wchar_t c)
-{
-    return isDigit(c) || (c >= L'a' && c <= L'f');
-}
-
 bool isHex(wchar_t c)
 {
-    return isLowerHex(c) || (c >= L'A' && c <= L'F');
+    return isDigit(c) || (c >= L'a' && c <= L'f') || (c >= L'A' && c <= L'F');
 }
 
 template <class Predicate>
@@ -97,33 +91,6 @@ char const* faultOfReferenceName(OdString const& name)
     return name.getLength() == kHashLength && all(name, isHex) ? "could be taken for the hash of a commit" : nullptr;
 }
 
-OdString readHash(Part const& part)
-{
-    OdString hash = part.text();
-    if (!isHash(hash)) {
-        part.refuse("must be a hash of 64 lower-case hexadecimal digits");
-    }
-    return hash;
-}
-
-OdString readPath(Part const& part)
-{
-    OdString path = part.text();
-    if (auto const fault = whyUnsafe(path)) {
-        part.refuse("cannot be recorded. " + fault->substr(0, fault->size() - 1));
-    }
-    return path;
-}
-
-OdString readUrl(Part const& part)
-{
-    OdString url = part.text();
-    if (!isContentUrl(url)) {
-        part.refuse("must name a content, such as 'po:' or 'tf:plan#' with a hash behind it");
-    }
-    return url;
-}
-
 std::int64_t readDate(Part const& part)
 {
     auto const seconds = secondsOf(part.text());
@@ -131,22 +98,6 @@ std::int64_t readDate(Part const& part)
         part.refuse("must be a time such as '2024-03-05T14:07:09Z'");
     }
     return *seconds;
-}
-
-std::vector<OdString> readParents(Part const& part)
-{
-    std::size_t const count = part.size();
-    if (count > kMostParents) {
-        part.refuse("must not hold more than 2 parents");
-    }
-    std::vector<OdString> parents;
-    for (std::size_t i = 0; i < count; ++i) {
-        parents.push_back(readHash(part[i]));
-    }
-    if (count == 2 && parents[0] == parents[1]) {
-        part.refuse("must not hold one parent twice");
-    }
-    return parents;
 }
 
 FileRecord readFile(Part const& part)
@@ -332,16 +283,26 @@ std::vector<common::Reference> readReferences(OdString const& document)
 
 std::int64_t readLastNumber(OdString const& document)
 {
+    std::int64_t last = 0;
+    for (CommitNumber const& pair : readNumbers(document)) {
+        last = std::max(last, pair.number);
+    }
+    return last;
+}
+
+std::vector<CommitNumber> readNumbers(OdString const& document)
+{
     kutils::json::Value const value = parsed(document);
     Part const whole(value);
     std::size_t const count = whole.size();
-    std::int64_t last = 0;
+    std::vector<CommitNumber> numbers;
+    numbers.reserve(count);
     for (std::size_t i = 0; i < count; ++i) {
         Part const pair = whole[i];
-        pair.member(keys::s_hash.c_str()).text();
-        last = std::max(last, pair.member(L"commitNo").integer());
+        OdString hash = pair.member(keys::s_hash.c_str()).text();
+        numbers.push_back({pair.member(L"commitNo").integer(), std::move(hash)});
     }
-    return last;
+    return numbers;
 }
 
 OdString readRepositoryName(OdString const& document)
@@ -354,16 +315,6 @@ OdString readRepositoryName(OdString const& document)
         part.refuse(fault);
     }
     return name;
-}
-
-bool isHash(OdString const& hash)
-{
-    return hash.getLength() == kHashLength && all(hash, isLowerHex);
-}
-
-bool isContentUrl(OdString const& url)
-{
-    return parseUrl(url).has_value();
 }
 
 std::optional<std::int64_t> secondsOf(OdString const& time)

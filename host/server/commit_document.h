@@ -30,14 +30,11 @@ std::vector<common::Reference> readReferences(OdString const& document);
 /// The highest number in a commit-numbers document, which is what the client knows; 0 for an empty one.
 std::int64_t readLastNumber(OdString const& document);
 
+/// The pairs of a commit-numbers document, in their order.
+std::vector<CommitNumber> readNumbers(OdString const& document);
+
 /// The name in the document that asks for a new repository.
 OdString readRepositoryName(OdString const& document);
-
-/// Whether `hash` is the name of a commit or content: 64 lower-case hexadecimal digits.
-bool isHash(OdString const& hash);
-
-/// Whether `url` names a content that a client can store and find: it has one of the two forms of `parseUrl`.
-bool isContentUrl(OdString const& url);
 
 /// The second of a time written as "2024-03-05T14:07:09Z"; none for any other text.
 std::optional<std::int64_t> secondsOf(OdString const& time);

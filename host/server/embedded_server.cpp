@@ -4,6 +4,7 @@
 #include "host/server/commit_document.h"
 #include "host/server/document.h"
 #include "host/server/fetch_document.h"
+#include "host/server/history_document.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
 #include "host/text/wide.h"
@@ -31,6 +32,7 @@ namespace keys = common::json;
 constexpr std::int64_t kTablesVersion = 1;
 constexpr wchar_t const* kCommandVersion = L"1";
 constexpr mode_t kFolderPermissions = 0777;
+constexpr std::size_t kChangesOfAPage = 10'000;
 constexpr char const* kFetchFirst = "Merge what others have done, or send it as a branch of its own.";
 
 struct Repository {
@@ -66,12 +68,17 @@ void prepareTables(Database& database)
     }
 }
 
-Value numbersDocument(CommitRecord const& commit)
+Value numbersDocument(std::vector<CommitNumber> const& commits)
 {
-    Object pair;
-    pair[L"commitNo"] = commit.number;
-    pair[keys::s_hash.c_str()] = jsonText(commit.hash);
-    return Array{Value(std::move(pair))};
+    Array pairs;
+    pairs.reserve(commits.size());
+    for (CommitNumber const& commit : commits) {
+        Object pair;
+        pair[L"commitNo"] = commit.number;
+        pair[keys::s_hash.c_str()] = jsonText(commit.hash);
+        pairs.emplace_back(std::move(pair));
+    }
+    return pairs;
 }
 
 Repository repositoryOrFail(Database const& database, OdString const& id)
@@ -202,7 +209,7 @@ OdString answerCommit(Request const& request, Force force)
         }
     }
     change.commit();
-    return compactText(numbersDocument(added.commit));
+    return compactText(numbersDocument({{added.commit.number, added.commit.hash}}));
 }
 
 OdString answerReferences(Request const& request, Force force)
@@ -224,6 +231,18 @@ OdString answerFetch(Request const& request)
     std::int64_t const known = readLastNumber(request.document);
     CommitTables const tables(request.database, request.repository.key);
     return fetchDocument(repositoryDocument(request.repository.id, request.repository.name), tables, known);
+}
+
+OdString answerNumbers(Request const& request)
+{
+    std::int64_t const first = readLastNumber(request.document);
+    return compactText(numbersDocument(CommitTables(request.database, request.repository.key).numbersFrom(first)));
+}
+
+OdString answerHistory(Request const& request)
+{
+    std::int64_t const known = readLastNumber(request.document);
+    return historyPage(CommitTables(request.database, request.repository.key), known, kChangesOfAPage);
 }
 
 template <Force force>
@@ -253,6 +272,8 @@ constexpr std::array kVerbs = {
     Verb{L"references", true, answerReferences<Force::no>},
     Verb{L"force-references", true, answerReferences<Force::yes>},
     Verb{L"fetch", true, answerFetch},
+    Verb{L"numbers", true, answerNumbers},
+    Verb{L"history", true, answerHistory},
 };
 
 /// The verb and, behind its first blank, the repository; that is empty when there is none.

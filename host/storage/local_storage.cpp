@@ -549,11 +549,15 @@ namespace {
 /// The steps of `keepOnly` on one repository.
 class Cleaning {
 public:
-    Cleaning(common::RootPath const& root, std::set<OdString> const& urls) : root_(root)
+    Cleaning(common::RootPath const& root, std::set<OdString> const& urls, std::set<OdString> const& elsewhere)
+        : root_(root)
     {
         for (OdString const& text : urls) {
             StorageUrl const url = urlOf(text);
             kept_[url.store].insert(url.digest);
+        }
+        for (OdString const& text : elsewhere) {
+            leftAlone_.insert(urlOf(text).store);
         }
     }
 
@@ -605,7 +609,7 @@ private:
         }
         for (std::string const& name : entriesOf(storeFolder(root_))) {
             std::string const store = name.substr(0, name.rfind('.'));
-            if (endsWith(name, kStoreEnd) && isStoreName(store)) {
+            if (endsWith(name, kStoreEnd) && isStoreName(store) && leftAlone_.count(store) == 0) {
                 reduce(storeFolder(root_).append("/").append(name), store);
             }
         }
@@ -627,17 +631,19 @@ private:
 
     common::RootPath root_;
     std::map<std::string, std::set<DigestBytes>> kept_;
+    std::set<std::string> leftAlone_; // names of stores
     Freed freed_;
     std::string firstError_;
 };
 
 } // namespace
 
-Expected<Freed> LocalStorage::keepOnly(common::RootPath const& root, std::set<OdString> const& urls)
+Expected<Freed> LocalStorage::keepOnly(
+    common::RootPath const& root, std::set<OdString> const& urls, std::set<OdString> const& elsewhere)
 {
     return guarded<Freed>([&] {
         flushBatch();
-        return Cleaning(root, urls).run();
+        return Cleaning(root, urls, elsewhere).run();
     });
 }
 

@@ -92,9 +92,11 @@ public:
     WriteOutcome remove(common::RootPath const& root, OdString const& url) override;
     /// Removes everything but `urls` and the revisions that they build on, and what interrupted operations have left.
     /// A store is rewritten beside the old one, flushed, read back, and takes its place. A store in which something to
-    /// be kept cannot be read stays as it is; the rest is cleaned, and then that is the error. What was stored and not
+    /// be kept cannot be read stays as it is; the rest is cleaned, and then that is the error. So does a store that
+    /// belongs to one of `elsewhere`, URLs of contents that need not be here; that is none. What was stored and not
     /// flushed is flushed first.
-    Expected<Freed> keepOnly(common::RootPath const& root, std::set<OdString> const& urls);
+    Expected<Freed>
+    keepOnly(common::RootPath const& root, std::set<OdString> const& urls, std::set<OdString> const& elsewhere = {});
 
 private:
     struct Object {

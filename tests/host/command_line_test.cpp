@@ -35,6 +35,7 @@ Subcommands:
   switch                      Go on with the work on another branch
   branch                      List the branches, or make one
   tag                         List the tags, or make one
+  fetch                       Learn the commits, branches and tags that the server has
   files                       List the files that the repository keeps
   ignore                      Show the rules for names to ignore, or add one
   projects                    List the repositories that you have made

@@ -1,0 +1,20 @@
+/// Which contents of the known history are in this folder.
+#pragma once
+
+#include "host/repository/local_database.h"
+
+#include "common/mu_common_repo_prop.h"
+
+#include <vector>
+
+namespace tav {
+
+/// The URLs of all files of all known commits, each once, in ascending order.
+struct Contents {
+    std::vector<OdString> here;      ///< kept here; whether they are whole, only reading them tells
+    std::vector<OdString> elsewhere; ///< of commits that were made in other folders, where their contents are
+};
+
+Contents contentsOf(common::RootPath const& root, LocalDatabase const& database);
+
+} // namespace tav
