@@ -3,6 +3,9 @@
 # Not for users: these headers of common/ serve its own sources only.
 set(MU_INTERNAL_HEADERS
     common/mu_common_document.h
+    common/mu_common_expression.h
+    common/mu_common_expression_cost.h
+    common/mu_common_expression_ways.h
     common/mu_common_pattern.h
     common/mu_common_state_document.h
     common/mu_common_translate.h)

@@ -166,7 +166,7 @@ std::regex filePattern(OdString const& name)
     if (!ut::FileName(name).hasExt()) {
         pattern += LR"((\.[a-zA-Z]+)+$)";
     }
-    return compilePattern(pattern);
+    return compilePattern(pattern, kLongestText);
 }
 
 } // namespace common

@@ -69,7 +69,12 @@ private:
 /// The expression by which a name that the user typed is matched against whole paths: anything may stand before the
 /// name, and when the name has no extension, any chain of alphabetic ones must follow it. The characters of the name
 /// are not escaped: a dot in it matches any character, and expressions may be typed. Throws `std::regex_error` for a
-/// name that makes no valid expression, or one that is too deep or too large (see `RepoIgnore`).
+/// name that does not make a valid expression, and for one that could exhaust the stack or take more than about a
+/// second for a path of 1,024 bytes. Besides the other bounds of `RepoIgnore`, there is room for two loops like `.*`,
+/// one of which is in front of the name, where there is a back reference.
+///
+/// So that matching ends in bounded time, an expression without back references has other flags than the default ones:
+/// those of the standard library's polynomial algorithm, and `nosubs`. It has no sub-matches.
 MU_COMMON_EXPORT std::regex filePattern(OdString const& name);
 
 } // namespace common

@@ -1,5 +1,7 @@
 #include "common/mu_common_pattern.h"
 
+#include "common/mu_common_expression.h"
+
 #include <algorithm>
 #include <array>
 #include <cstddef>
@@ -13,180 +15,12 @@ namespace common {
 
 namespace {
 
-// An expression of this many states compiles and matches within some 520 KiB of stack (measured with libstdc++ 12) and
-// takes some milliseconds for a file name at worst. Lists of names are far smaller.
-constexpr std::size_t kMaxStates = 4000;
-constexpr std::size_t kMaxDigitsOfBackReference = 4; // The standard library lets large numbers overflow.
-// A look-ahead starts a match of its own at every character, one inside another multiplies that once more.
-constexpr std::size_t kMaxStatesWithLookAhead = 400;
-// One level of nesting takes some 850 bytes of stack to compile.
-constexpr std::size_t kMaxDepth = 100;
-// Following back references costs a level of recursion for every character.
-constexpr std::size_t kMaxTextWithBackReference = 1024;
-constexpr int kMaxQuantifiersWithBackReference = 2;
-// Each alternative may double the ways, quantified or not.
-constexpr int kMaxAlternativesWithBackReference = 4;
-
 #if defined(__GLIBCXX__)
 // Breadth-first matching over the automaton: a documented extension of libstdc++.
 constexpr auto kPolynomial = std::regex::ECMAScript | std::regex::nosubs | std::regex_constants::__polynomial;
 #else
 constexpr auto kPolynomial = std::regex::ECMAScript | std::regex::nosubs;
 #endif
-
-[[noreturn]] void refuse()
-{
-    throw std::regex_error(std::regex_constants::error_complexity);
-}
-
-/// Measures an expression before the standard library sees it: its compiler is recursive too.
-/// Syntax is not checked here, only counted; what is wrong in it the compiler says.
-class Survey {
-public:
-    explicit Survey(std::string_view expression) : rest_(expression)
-    {
-        while (!rest_.empty()) {
-            step();
-            if (states_ > (lookAhead_ ? kMaxStatesWithLookAhead : kMaxStates)) {
-                refuse();
-            }
-        }
-    }
-
-    bool hasBackReference() const { return backReference_; }
-
-    /// Whether trying all ways takes polynomially many steps of a low degree.
-    bool hasFewWays() const
-    {
-        return !quantifiedGroup_ && !lookAhead_ && quantifiers_ <= kMaxQuantifiersWithBackReference &&
-               alternatives_ <= kMaxAlternativesWithBackReference;
-    }
-
-private:
-    enum class Last { other, group, quantifier };
-
-    struct Group {
-        std::size_t statesBefore;
-        bool isLookAhead;
-    };
-
-    void step()
-    {
-        switch (rest_.front()) {
-        case '\\': escape(); break;
-        case '[': bracket(); break;
-        case '(': openGroup(); break;
-        case ')': closeGroup(); break;
-        case '*':
-        case '+':
-        case '?': quantify(0, 1); break;
-        case '{': braces(); break;
-        case '|': alternative(); break;
-        default: atom(1); break;
-        }
-    }
-
-    void atom(std::size_t length)
-    {
-        rest_.remove_prefix(std::min(length, rest_.size()));
-        atomStates_ = length;
-        states_ += length;
-        last_ = Last::other;
-    }
-
-    void alternative()
-    {
-        ++alternatives_;
-        atom(1);
-    }
-
-    void escape()
-    {
-        bool const isDigit = rest_.size() > 1 && rest_[1] >= '1' && rest_[1] <= '9';
-        backReference_ = backReference_ || isDigit;
-        std::size_t const end = std::min(rest_.find_first_not_of("0123456789", 1), rest_.size());
-        if (isDigit && end - 1 > kMaxDigitsOfBackReference) {
-            refuse();
-        }
-        atom(2);
-        last_ = isDigit ? Last::group : Last::other;
-    }
-
-    void bracket()
-    {
-        std::size_t end = 1;
-        while (end < rest_.size() && rest_[end] != ']') {
-            end += rest_[end] == '\\' ? 2 : 1;
-        }
-        atom(std::min(end + 1, rest_.size()));
-    }
-
-    void openGroup()
-    {
-        bool const isLookAhead = rest_.substr(0, 3) == "(?=" || rest_.substr(0, 3) == "(?!";
-        if (groups_.size() == kMaxDepth || (isLookAhead && insideLookAhead_)) {
-            refuse();
-        }
-        lookAhead_ = lookAhead_ || isLookAhead;
-        insideLookAhead_ = insideLookAhead_ || isLookAhead;
-        groups_.push_back({states_, isLookAhead});
-        atom(rest_.substr(0, 2) == "(?" ? 3 : 1);
-    }
-
-    void closeGroup()
-    {
-        atom(1);
-        if (groups_.empty()) {
-            return;
-        }
-        atomStates_ = states_ - groups_.back().statesBefore;
-        insideLookAhead_ = insideLookAhead_ && !groups_.back().isLookAhead;
-        groups_.pop_back();
-        last_ = Last::group;
-    }
-
-    /// `{2}`, `{2,}` and `{2,5}` repeat what stands before them in the automaton as often as the larger number says.
-    void braces()
-    {
-        std::size_t const end = std::min(rest_.find('}'), rest_.size() - 1);
-        std::size_t number = 0;
-        std::size_t largest = 1;
-        for (char const c : rest_.substr(1, end)) {
-            number = c >= '0' && c <= '9'
-                         ? std::min<std::size_t>(number * 10 + static_cast<std::size_t>(c - '0'), kMaxStates)
-                         : 0;
-            largest = std::max(largest, number);
-        }
-        quantify(largest, end + 1);
-    }
-
-    /// The automaton gets as many `copies` of what is repeated, besides the original; loops need none.
-    void quantify(std::size_t copies, std::size_t length)
-    {
-        bool const isLazyMark = last_ == Last::quantifier && rest_.front() == '?' && !lazy_;
-        quantifiedGroup_ = quantifiedGroup_ || (last_ != Last::other && !isLazyMark);
-        quantifiers_ += isLazyMark ? 0 : 1;
-        lazy_ = isLazyMark;
-        std::size_t const original = atomStates_;
-        atom(length);
-        states_ += original * copies;
-        atomStates_ = original * std::max<std::size_t>(copies, 1) + length;
-        last_ = Last::quantifier;
-    }
-
-    std::string_view rest_;
-    std::vector<Group> groups_;
-    std::size_t states_ = 0;
-    std::size_t atomStates_ = 0;
-    int quantifiers_ = 0;
-    int alternatives_ = 0;
-    Last last_ = Last::other;
-    bool lazy_ = false;
-    bool insideLookAhead_ = false;
-    bool lookAhead_ = false;
-    bool backReference_ = false;
-    bool quantifiedGroup_ = false;
-};
 
 /// The standard library notes in the classic locale which characters it has been asked about, without any guard: what
 /// it has been asked about all of them at once, it only reads.
@@ -240,24 +74,25 @@ bool readLiteral(std::string_view expression, std::string& literal)
 
 } // namespace
 
-std::regex compilePattern(OdString const& expression)
+std::regex compilePattern(OdString const& expression, std::size_t longestText)
 {
     std::string const narrow = expression.ansi_str();
-    Survey const survey(narrow);
-    if (!survey.hasBackReference()) {
+    Expression const tree = readExpression(narrow);
+    checkCompiling(tree);
+    if (!contains(tree, Expression::Kind::backReference)) {
+        checkMatchingAtOnce(tree, longestText);
         return compile(narrow, kPolynomial);
     }
-    if (!survey.hasFewWays()) {
-        refuse();
-    }
-    return compile(narrow, std::regex::ECMAScript);
+    std::regex const compiled = compile(narrow, std::regex::ECMAScript);
+    checkMatchingWayByWay(tree, longestText);
+    return compiled;
 }
 
 bool matchesWhole(std::regex const& expression, std::string const& text)
 {
     bool const recurses = (expression.flags() & kPolynomial) != kPolynomial;
-    if (recurses && text.size() > kMaxTextWithBackReference) {
-        refuse();
+    if (recurses && text.size() > kLongestText) {
+        refuseExpression();
     }
     return std::regex_match(text, expression);
 }
@@ -377,7 +212,7 @@ NameFilter::NameFilter(std::vector<std::regex> const& expressions)
 NameFilter::Rule NameFilter::ruleOf(OdString const& text)
 {
     Rule rule;
-    rule.expression = compilePattern(text);
+    rule.expression = compilePattern(text, kLongestName);
     std::string const narrow = text.ansi_str();
     std::string_view rest = narrow;
     if (startsWith(rest, "^")) {

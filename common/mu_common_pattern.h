@@ -1,9 +1,12 @@
 /// Regular expressions that are safe to take from files and users. Internal to the library.
 #pragma once
 
+#include "common/mu_common_expression_cost.h"
+
 #include "platform/sdk/OdString.h"
 
 #include <array>
+#include <cstddef>
 #include <cstdint>
 #include <memory>
 #include <regex>
@@ -15,13 +18,14 @@ namespace common {
 
 /// Compiles `expression`, in the ECMAScript grammar, case-sensitive, over the bytes of its narrow form and under the
 /// classic locale whatever the process's is.
-/// The standard library's matcher recurses for every character and may try exponentially many ways, so expressions are
-/// compiled for its polynomial algorithm, which does neither. Back references, which that algorithm lacks, are allowed
-/// where few ways exist. Throws `std::regex_error` for an invalid expression and for one that is too deep or too large.
-std::regex compilePattern(OdString const& expression);
+/// The standard library's matcher recurses for every character and may try exponentially many ways. Expressions are
+/// compiled without sub-matches for its polynomial algorithm, which does neither. Back references, which that algorithm
+/// lacks, are followed one way after the other. Throws `std::regex_error` for an invalid expression, and for one that
+/// could take too much stack, memory or time with a text of `longestText` characters (see `checkCompiling` and others).
+std::regex compilePattern(OdString const& expression, std::size_t longestText);
 
 /// Whether `expression` covers the whole of `text`. Throws `std::regex_error` when a back reference would have to be
-/// followed through a text too long for it.
+/// followed through a text of more than `kLongestText` characters.
 bool matchesWhole(std::regex const& expression, std::string const& text);
 
 /// An expression that is one row of single characters, each of them `.`, a class like `[a-c_]` or itself, and each at

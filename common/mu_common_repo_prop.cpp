@@ -206,7 +206,7 @@ WriteOutcome RepoIgnore::write(RootPath const& root)
 
 std::regex RepoIgnore::compile(OdString const& rule)
 {
-    return compilePattern(rule);
+    return compilePattern(rule, kLongestName);
 }
 
 } // namespace common

@@ -71,10 +71,12 @@ MU_COMMON_EXPORT OdString repositoryExt();
 /// A snapshot: later changes of the file do not show. One thread at a time.
 class MU_COMMON_EXPORT RepoIgnore {
 public:
-    /// Loads the rules of `root`. Throws `std::regex_error` for a line that is no valid expression, and for one that
-    /// would take the matcher too much stack or time: nested deeper than 100, more than some 4,000 characters with
-    /// repetitions counted out (some 400 with a look-ahead), look-aheads inside each other, back references beside
-    /// repeated groups, more than two repetitions or more than four alternatives.
+    /// Loads the rules of `root`. Throws `std::regex_error` for a line that is not a valid expression, and for one that
+    /// could exhaust the stack or take more than about a second for one file name, however unlikely that name is.
+    /// Refused are: groups nested deeper than 100; more than about 8,000 characters in a row, 4,000 alternatives or
+    /// 16,000 characters in all, with counted repetitions written out; repeated look-aheads that repeat much
+    /// themselves; and with a back reference, loops in loops that can divide a text in several ways, as in `(a*)*`, or
+    /// more than three loops like `.*` whose end the next character does not decide.
     explicit RepoIgnore(RootPath const& root);
 
     /// Appends the rules once more. Throws as the constructor does.

@@ -343,6 +343,11 @@ Match const kMatches[] = {
     {"BytesThatAreNotUtf8", "\xFF\x80", "\xFF\x80.dwg", true},
     {"BlankCounts", "plan ", "plan.dwg", false},
     {"BackReference", "(a)\\1.dwg", "aa.dwg", true},
+    {"BackReferenceWithoutAnExtension", "(plan)\\1", "floor/planplan.old.dwg", true},
+    {"BackReferenceWithoutAnExtensionToSomethingElse", "(plan)\\1", "plan.dwg", false},
+    {"BackReferenceBehindALoop", "(a)(b)*\\1.dwg", "abbba.dwg", true},
+    {"BackReferenceBehindALoopToSomethingElse", "(a)(b)*\\1.dwg", "abbbb.dwg", false},
+    {"ManyCharacters", "a{4000}.dwg", "aaaa.dwg", false},
     {"BackReferenceToSomethingElse", "(a|b)\\1.dwg", "ab.dwg", false},
 };
 
@@ -377,9 +382,7 @@ INSTANTIATE_TEST_SUITE_P(
     Names, InvalidName,
     testing::Values(
         "(", ")", "[", "plan[", "a{2,1}", "\\", "[z-a]", std::string(10'000, '('), std::string(10'000, 'x'),
-        "x{100000}",
-        // The suffix for names without an extension repeats a group, which goes with no back reference.
-        "(a)\\1"));
+        "x{100000}", "(x*)*\\1y.dwg", "(.*)(.*)(.*)\\1.dwg"));
 
 TEST_P(InvalidName, ThrowsFromEveryQueryEvenIfThereIsNothingToLookThrough)
 {
