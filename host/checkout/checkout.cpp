@@ -67,8 +67,8 @@ CheckedOut checkOutCommit(
         database.commits().files(database.base()), filesOf(begun, database),
         database.commits().files(destination.commit));
     TreeUpdate update = whole;
-    checkUpdate(root, database, claimedPaths(readState(root)->read()), discard, update);
     LocalStorage storage;
+    checkUpdate(root, database, storage, claimedPaths(readState(root)->read()), discard, update);
     CheckoutUnderWay move{destination.commit, destination.branch, false, begun};
     WrittenTimes const times = carryOut(root, storage, update, start, [&] { note(move, database); });
     Change change(database.database());

@@ -43,14 +43,16 @@ std::vector<std::string> filesOfRemovals(common::RootPath const& root)
     return files;
 }
 
+/// Whether the content of `file` is stored: stored again where it is damaged.
 bool isStored(
     std::string const& file, common::RootPath const& root, std::vector<OdString> const& urls, LocalStorage& storage)
 {
     std::error_code error;
     bool const isFile = fs::symlink_status(file, error).type() == fs::file_type::regular;
     auto const digest = isFile ? fileDigest(wide(file)) : std::nullopt;
+    OdString const path = wide(file.substr(root.path().ansi_str().size() + 1));
     return digest && std::any_of(urls.begin(), urls.end(), [&](OdString const& url) {
-               return digestOf(url) == digest && storage.verify(root, url).hasValue();
+               return digestOf(url) == digest && storage.repair(root, url, path).hasValue();
            });
 }
 

@@ -2,6 +2,7 @@
 
 #include "host/changes/digest.h"
 #include "host/changes/index_record.h"
+#include "host/changes/stored_copies.h"
 #include "host/failure.h"
 #include "host/paths/recorded_path.h"
 #include "host/progress.h"
@@ -79,6 +80,9 @@ public:
         failIfAnyIsInTheWay();
     }
 
+    /// The files that go, with the URLs of their contents.
+    Tree const& replaced() const { return replaced_; }
+
 private:
     /// Takes out of `files` what stays as it is.
     void sift(Tree& files, bool areWritten)
@@ -108,7 +112,7 @@ private:
     }
 
     /// `wanted` is the URL of the content that the file shall have; null when it goes.
-    Finding look(OdString const& path, OdString const* wanted) const
+    Finding look(OdString const& path, OdString const* wanted)
     {
         fs::file_type const type = typeOf(path, root_);
         if (type == fs::file_type::directory) {
@@ -130,15 +134,24 @@ private:
         if (digest && wanted && digest == digestOf(*wanted)) {
             return Finding::isAsWanted;
         }
-        return digest && mayBeReplaced(path, *digest) ? Finding::isFree : Finding::holdsUnsaved;
+        OdString const url = digest ? urlOf(path, *digest) : OdString();
+        if (url.isEmpty()) {
+            return Finding::holdsUnsaved;
+        }
+        replaced_.emplace(path, url);
+        return Finding::isFree;
     }
 
-    bool mayBeReplaced(OdString const& path, OdString const& digest) const
+    /// The URL of a content that may be replaced at `path`; empty when it may not.
+    OdString urlOf(OdString const& path, OdString const& digest) const
     {
         auto const [begin, end] = update_.expected.equal_range(path);
-        bool const isExpected =
-            std::any_of(begin, end, [&](auto const& file) { return digestOf(file.second) == digest; });
-        return isExpected || (discard_ == Discard::copies && database_.keeps(digest));
+        auto const isIt = [&](auto const& file) { return digestOf(file.second) == digest; };
+        auto const file = std::find_if(begin, end, isIt);
+        if (file != end) {
+            return file->second;
+        }
+        return discard_ == Discard::nothing ? OdString() : database_.committedUrlOf(digest);
     }
 
     /// Whether a file can take the place of the folder `path` once the files that go are gone. They have been sifted:
@@ -182,6 +195,7 @@ private:
     TreeUpdate const whole_; ///< as it was at first
     TreeUpdate& update_;
     os::Batch batch_;
+    Tree replaced_;
     std::vector<std::string> inTheWay_;
 };
 
@@ -348,10 +362,16 @@ TreeUpdate updateBetween(Tree const& from, std::vector<Tree> const& begun, Tree 
 }
 
 void checkUpdate(
-    common::RootPath const& root, LocalDatabase const& database, std::set<OdString> const& staged, Discard discard,
-    TreeUpdate& update)
+    common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
+    std::set<OdString> const& staged, Discard discard, TreeUpdate& update)
 {
-    Check(root, database, staged, discard, update).run();
+    Check check(root, database, staged, discard, update);
+    check.run();
+    Progress progress("stored versions", check.replaced().size());
+    for (auto const& [path, url] : check.replaced()) {
+        requireStored(root, storage, path, url);
+        progress.advance();
+    }
 }
 
 WrittenTimes carryOut(

@@ -37,11 +37,12 @@ enum class Discard { nothing, copies, everything };
 /// through a link, no file takes the place of a folder that has other files, and no work is lost unless `discard` says
 /// so. Work is a file with another content than an expected one, and whatever is at the paths `staged`: being in some
 /// commit does not make a content that somebody has chosen unimportant. The files are read: what an index says of them
-/// is no reason to overwrite them. Files that are as wanted are taken out of the update. Throws `Failure`, which lists
-/// the files in the way.
+/// is no reason to overwrite them. Files that are as wanted are taken out of the update. Committed contents that go can
+/// be read from `storage` afterwards: they are read there, and stored again from the files where that is needed. Throws
+/// `Failure`, which lists the files in the way.
 void checkUpdate(
-    common::RootPath const& root, LocalDatabase const& database, std::set<OdString> const& staged, Discard discard,
-    TreeUpdate& update);
+    common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
+    std::set<OdString> const& staged, Discard discard, TreeUpdate& update);
 
 /// Modification times of the files that were written, by path. As far as the file system tells them apart, no two are
 /// equal: a file that is moved over another of them shows.

@@ -1,6 +1,7 @@
 #include "host/changes/changes.h"
 #include "host/changes/last_commit.h"
 #include "host/changes/staging.h"
+#include "host/changes/stored_copies.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
@@ -18,6 +19,33 @@ namespace tav {
 
 namespace {
 
+/// The committed file that `name` means, and that is as it was committed; null when there is none.
+common::VersionedFile const*
+unchangedFile(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
+{
+    OdString const path = pathInRepository(root, name);
+    auto const find = [&](OdString const& wanted) {
+        auto const isIt = [&](common::VersionedFile const& file) { return file.path == wanted; };
+        return std::find_if(changes.unchanged.begin(), changes.unchanged.end(), isIt);
+    };
+    auto file = find(path);
+    if (file == changes.unchanged.end()) {
+        file = find(findUnchanged(name, changes, root));
+    }
+    return file == changes.unchanged.end() ? nullptr : &*file;
+}
+
+/// Whether `name` is a folder in which all is as it was committed. The working folder is one even when it is empty.
+bool isUnchangedFolder(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
+{
+    OdString const folder = pathInRepository(root, name);
+    OdString const prefix = folder + L"/";
+    auto const isInside = [&](common::VersionedFile const& file) {
+        return file.path.left(prefix.getLength()) == prefix;
+    };
+    return folder.isEmpty() || std::any_of(changes.unchanged.begin(), changes.unchanged.end(), isInside);
+}
+
 [[noreturn]] void
 failForUnknown(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
 {
@@ -27,30 +55,46 @@ failForUnknown(std::string const& name, common::RepoChanges const& changes, comm
             throw Failure("'" + name + "' has been removed.", "The next commit takes that without staging.");
         }
     }
-    auto const isPath = [&](common::VersionedFile const& file) { return file.path == path; };
-    bool const isUnchanged = std::any_of(changes.unchanged.begin(), changes.unchanged.end(), isPath);
-    if (isUnchanged || !findUnchanged(name, changes, root).isEmpty()) {
-        throw Failure("'" + name + "' is as it was committed.", "There is nothing to stage of it.");
-    }
     throw Failure("No changed file matches '" + name + "'.", "Run 'tav status --ignored' to see what there is.");
 }
 
-std::vector<common::StagedFile>
-chosenFiles(AddOptions const& options, common::RepoChanges const& changes, common::RootPath const& root)
+/// What the names of a command mean.
+struct Chosen {
+    std::vector<common::StagedFile> files;
+    std::vector<common::VersionedFile> unchanged; ///< files that were named, and are as they were committed
+};
+
+Chosen chosenFiles(AddOptions const& options, common::RepoChanges const& changes, common::RootPath const& root)
 {
     NameFinder const finder(changes, root);
-    std::vector<common::StagedFile> chosen;
     if (options.all) {
-        return finder.all();
+        return {finder.all(), {}};
     }
+    Chosen chosen;
     for (std::string const& name : options.names) {
         std::vector<common::StagedFile> const found = finder.find(name);
-        if (found.empty()) {
+        chosen.files.insert(chosen.files.end(), found.begin(), found.end());
+        if (!found.empty() || isUnchangedFolder(name, changes, root)) {
+            continue;
+        }
+        common::VersionedFile const* const unchanged = unchangedFile(name, changes, root);
+        if (!unchanged) {
             failForUnknown(name, changes, root);
         }
-        chosen.insert(chosen.end(), found.begin(), found.end());
+        chosen.unchanged.push_back(*unchanged);
     }
     return chosen;
+}
+
+/// Adding a file means to keep what it has: what is as it was committed may be damaged in the storage.
+std::size_t repair(std::vector<common::VersionedFile> const& files, common::RootPath const& root)
+{
+    LocalStorage storage;
+    std::size_t count = 0;
+    for (common::VersionedFile const& file : files) {
+        count += requireStored(root, storage, file.path, file.storagePath) ? 1 : 0;
+    }
+    return count;
 }
 
 } // namespace
@@ -60,13 +104,19 @@ void addFilesToStage(AddOptions const& options)
     Work const work(openRepository(""), "add", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
     std::size_t count = 0;
+    std::size_t repaired = 0;
     changeState(root, [&](common::Cache& cache) {
         VerifiedTimes verified;
         common::RepoChanges const changes =
             compare(root, matchFolder(root, lastCommitFiles(root)), cache.read(), &verified);
         enterVerified(verified, work.start(), cache.write());
-        count = stage(chosenFiles(options, changes, root), cache.write());
+        Chosen const chosen = chosenFiles(options, changes, root);
+        repaired = repair(chosen.unchanged, root);
+        count = stage(chosen.files, cache.write());
     });
+    if (repaired > 0) {
+        print("Repaired " + counted(repaired, "stored version") + ".\n");
+    }
     print(count == 0 ? "Nothing new to stage.\n" : "Staged " + counted(count, "file") + ".\n");
 }
 

@@ -102,10 +102,10 @@ void restoreFiles(RestoreOptions const& options)
     Tree const base = work.database().commits().files(work.database().base());
     TreeUpdate update;
     update.writes = files;
-    checkUpdate(
-        root, work.database(), stagedContents(readState(root)->read(), root),
-        options.force ? Discard::everything : Discard::copies, update);
     LocalStorage storage;
+    checkUpdate(
+        root, work.database(), storage, stagedContents(readState(root)->read(), root),
+        options.force ? Discard::everything : Discard::copies, update);
     WrittenTimes const times = carryOut(root, storage, update, work.start());
     changeState(root, [&](common::Cache& cache) { enterFiles(files, base, times, cache.write()); });
     print(

@@ -1,6 +1,7 @@
 #include "host/changes/changes.h"
 #include "host/changes/last_commit.h"
 #include "host/changes/staging.h"
+#include "host/changes/stored_copies.h"
 #include "host/checkout/file_moves.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
@@ -94,6 +95,18 @@ void checkPath(OdString const& path, common::RootPath const& root)
     }
 }
 
+/// The file may be the last good copy of what it was committed with. `unchanged` is in the order of paths.
+void keepContent(
+    OdString const& path, std::vector<common::VersionedFile> const& unchanged, common::RootPath const& root)
+{
+    auto const isBefore = [](common::VersionedFile const& file, OdString const& other) { return file.path < other; };
+    auto const file = std::lower_bound(unchanged.begin(), unchanged.end(), path, isBefore);
+    if (file != unchanged.end() && file->path == path) {
+        LocalStorage storage;
+        requireStored(root, storage, path, file->storagePath);
+    }
+}
+
 /// Where a removed file waits until the new state is safe. A command that was killed may have left such files.
 std::string waitingName(common::RootPath const& root, std::size_t number)
 {
@@ -126,6 +139,7 @@ void removeFiles(std::vector<std::string> const& names)
         for (common::StagedFile const& file : staged) {
             if (ut::FileName::fileExists(root.pathTo(file.path))) {
                 checkPath(file.path, root);
+                keepContent(file.path, changes.unchanged, root);
                 waiting.push_back(waitingName(root, waiting.size()));
                 moves.move(file.path.ansi_str(), waiting.back());
             }

@@ -1,3 +1,4 @@
+#include "host/changes/stored_copies.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
@@ -5,12 +6,14 @@
 #include "host/repository/contents.h"
 #include "host/repository/history.h"
 #include "host/repository/local_database.h"
+#include "host/repository/lock.h"
 #include "host/repository/open.h"
 #include "host/storage/local_storage.h"
 #include "host/text/wide.h"
 
 #include "common/mu_common_file_storage.h"
 
+#include <map>
 #include <optional>
 #include <string>
 #include <utility>
@@ -71,8 +74,42 @@ std::optional<Failure> differenceFromServer(LocalDatabase const& database)
     return std::nullopt;
 }
 
-void printDocument(Contents const& contents, std::vector<Damage> const& damages)
+/// Working files by the URL of the damaged content that they gave back.
+using Repaired = std::map<OdString, OdString>;
+
+std::vector<OdString> urlsOf(std::vector<Damage> const& damages)
 {
+    std::vector<OdString> urls;
+    for (Damage const& damage : damages) {
+        urls.push_back(damage.url);
+    }
+    return urls;
+}
+
+/// Only what is damaged asks for the lock: whoever may only read can still verify.
+Repaired repair(common::RootPath const& root, LocalDatabase const& database, std::vector<Damage>& damages)
+{
+    try {
+        os::FileLock const lock = lockRepository(root, "verify");
+        LocalStorage storage;
+        Repaired repaired = repairFromFolder(root, database, storage, urlsOf(damages));
+        damages = damagesOf(root, database.commits(), urlsOf(damages)); // Others may have built on what was damaged.
+        return repaired;
+    } catch (Failure const& failure) {
+        printNote("Nothing could be repaired from the working folder: " + failure.what);
+        return {};
+    }
+}
+
+void printDocument(Contents const& contents, std::vector<Damage> const& damages, Repaired const& repaired)
+{
+    kutils::json::Array entries;
+    for (auto const& [url, path] : repaired) {
+        kutils::json::Object object;
+        object[L"url"] = jsonText(url);
+        object[L"path"] = jsonText(path);
+        entries.emplace_back(std::move(object));
+    }
     kutils::json::Array array;
     for (Damage const& damage : damages) {
         kutils::json::Object object;
@@ -87,7 +124,19 @@ void printDocument(Contents const& contents, std::vector<Damage> const& damages)
     document[L"elsewhere"] = static_cast<std::uint64_t>(contents.elsewhere.size());
     document[L"versions"] = static_cast<std::uint64_t>(contents.here.size());
     document[L"damaged"] = std::move(array);
+    document[L"repaired"] = std::move(entries);
     printJson(std::move(document));
+}
+
+void printRepaired(Repaired const& repaired)
+{
+    if (repaired.empty()) {
+        return;
+    }
+    print("Repaired " + counted(repaired.size(), "stored version") + " from the working folder:\n");
+    for (auto const& [url, path] : repaired) {
+        print("        " + shown(path) + "\n");
+    }
 }
 
 void printSummary(Contents const& contents, std::vector<Damage> const& damages)
@@ -102,6 +151,19 @@ void printSummary(Contents const& contents, std::vector<Damage> const& damages)
     }
 }
 
+[[noreturn]] void failForDamages(std::vector<Damage> const& damages, std::size_t count)
+{
+    Failure failure(
+        std::to_string(damages.size()) + " of " + counted(count, "stored version") + " cannot be read.",
+        "Put copies of these files from a backup in their place:");
+    for (Damage const& damage : damages) {
+        failure.details.push_back(
+            damage.store.ansi_str() + ", for '" + damage.file.path.ansi_str() + "' of commit " +
+            std::to_string(damage.file.commit) + ": " + damage.what.ansi_str());
+    }
+    throw failure;
+}
+
 } // namespace
 
 void verifyAll(bool json)
@@ -110,10 +172,12 @@ void verifyAll(bool json)
     LocalDatabase const database = LocalDatabase::open(root);
     database.failIfDamaged();
     Contents const contents = contentsOf(root, database);
-    std::vector<Damage> const damages = damagesOf(root, database.commits(), contents.here);
+    std::vector<Damage> damages = damagesOf(root, database.commits(), contents.here);
+    Repaired const repaired = damages.empty() ? Repaired() : repair(root, database, damages);
     if (json) {
-        printDocument(contents, damages);
+        printDocument(contents, damages, repaired);
     } else {
+        printRepaired(repaired);
         printSummary(contents, damages);
     }
     std::optional<Failure> const difference = differenceFromServer(database);
@@ -121,16 +185,7 @@ void verifyAll(bool json)
         if (difference) {
             printNote(difference->what + " " + difference->next);
         }
-        Failure failure(
-            std::to_string(damages.size()) + " of " + counted(contents.here.size(), "stored version") +
-                " cannot be read.",
-            "Put copies of these files from a backup in their place:");
-        for (Damage const& damage : damages) {
-            failure.details.push_back(
-                damage.store.ansi_str() + ", for '" + damage.file.path.ansi_str() + "' of commit " +
-                std::to_string(damage.file.commit) + ": " + damage.what.ansi_str());
-        }
-        throw failure;
+        failForDamages(damages, contents.here.size());
     }
     if (difference) {
         throw *difference;

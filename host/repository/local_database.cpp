@@ -129,10 +129,10 @@ OdString LocalDatabase::urlOf(OdString const& digest) const
     return row.with(digest).next() ? row.text(0) : OdString();
 }
 
-bool LocalDatabase::keeps(OdString const& digest) const
+OdString LocalDatabase::committedUrlOf(OdString const& digest) const
 {
-    Statement row = database_.prepare("SELECT 1 FROM contents WHERE digest = ?");
-    return row.with(digest).next();
+    Statement row = database_.prepare("SELECT url FROM contents WHERE digest = ?");
+    return row.with(digest).next() ? row.text(0) : OdString();
 }
 
 std::optional<std::uint64_t> LocalDatabase::sizeOf(OdString const& url) const

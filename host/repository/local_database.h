@@ -51,8 +51,8 @@ public:
 
     /// URL of a content of this digest that is kept in a revision store; empty when none is known.
     OdString urlOf(OdString const& digest) const;
-    /// Whether a commit holds a content of this digest.
-    bool keeps(OdString const& digest) const;
+    /// URL under which some commit has a content of this digest; empty when none has.
+    OdString committedUrlOf(OdString const& digest) const;
     /// Bytes of the content at `url`.
     std::optional<std::uint64_t> sizeOf(OdString const& url) const;
     void addContent(OdString const& url, OdString const& digest, std::uint64_t size);

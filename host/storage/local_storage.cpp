@@ -208,6 +208,26 @@ Expected<OdString> LocalStorage::store(common::RootPath const& root, OdString co
     });
 }
 
+Expected<bool> LocalStorage::repair(common::RootPath const& root, OdString const& text, OdString const& path)
+{
+    return guarded<bool>([&] {
+        StorageUrl const url = urlOf(text);
+        if (isReadable(root, url)) {
+            return false;
+        }
+        Content const content =
+            openContent(root.pathTo(path).ansi_str(), quoted(path), std::uint64_t{1} << segmentLog_);
+        if (digestOf(content) != url.digest) {
+            throw StorageError(quoted(path) + " has another content by now.");
+        }
+        beginBatch(root);
+        url.isObject() ? keepObject(root, url, content) : keepDrawing(root, url, path, content);
+        flushBatch();
+        read(root, text, [](std::string_view) {});
+        return true;
+    });
+}
+
 // Where it should be: what is damaged or gone there is mended for all commits that name it.
 std::optional<StorageUrl> LocalStorage::knownPlace(DigestBytes const& digest) const
 {

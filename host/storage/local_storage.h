@@ -60,6 +60,9 @@ public:
     /// what was read, under its own digest; a file seen to change meanwhile is an error ("has changed while it was
     /// being stored"), after which the caller tries again. An error leaves nothing of the file behind.
     Expected<OdString> store(common::RootPath const& root, OdString const& path) override;
+    /// Makes the content at `url` readable: where it is damaged or gone it is stored again, flushed and read back, from
+    /// the file `path`, relative to the working folder, which has that content. True when it was stored again.
+    Expected<bool> repair(common::RootPath const& root, OdString const& url, OdString const& path);
     /// Waits until everything stored since the last flush is safe on the disk, in one go. After an error nothing of it
     /// is kept, and its URLs are void.
     WriteOutcome flush(common::RootPath const& root);

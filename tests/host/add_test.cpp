@@ -97,7 +97,7 @@ TEST_F(Add, StagesEverythingFromASubFolderToo)
 TEST_F(Add, HasNothingToStageInAnEmptyFolder)
 {
     EXPECT_EQ(tav({"add", "--all"}), done("Nothing new to stage.\n"));
-    EXPECT_EQ(tav({"add", "."}), unknown("."));
+    EXPECT_EQ(tav({"add", "."}), done("Nothing new to stage.\n"));
     EXPECT_EQ(state(), kFreshState);
 }
 

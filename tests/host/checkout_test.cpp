@@ -620,13 +620,15 @@ TEST_F(Moving, VerifyFindsDamage)
     std::string bytes = repo.read(store);
     bytes[bytes.size() - 2] = static_cast<char>(bytes[bytes.size() - 2] ^ 1);
     repo.write(store, bytes);
+    repo.write("a.dwg", "own"); // Else the damage would be repaired from a working file.
+    repo.write("c.dwg", "own");
     Outcome const outcome = tav({"verify"});
     EXPECT_EQ(outcome.code, 1);
     EXPECT_THAT(
         outcome.err, testing::MatchesRegex("tav: 1 of 3 stored versions cannot be read. Put copies of these files from "
                                            "a backup in their place:\n  .*/\\.tav/tf/a-[0-9a-f]*\\.tf, for 'a.dwg' of "
                                            "commit 2: The content of 'tf:a-[^ ]*' is damaged\\.\n"));
-    EXPECT_EQ(tav({"restore", "a.dwg", "--from", "1"}).code, 0);
+    EXPECT_EQ(tav({"restore", "a.dwg", "--from", "1", "--force"}).code, 0);
 }
 
 TEST_F(Moving, MissingDatabaseIsNotMistakenForANewRepository)

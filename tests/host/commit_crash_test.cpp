@@ -66,6 +66,7 @@ TEST_P(CommitCrash, LeavesOneCommitOfEachOrderAfterItIsRepeated)
         killWithin(whole, message);
         Outcome const verified = tav({"verify"});
         ASSERT_EQ(verified.code, 0) << testing::PrintToString(verified);
+        ASSERT_EQ(verified.out.find("Repaired"), std::string::npos) << verified.out;
         ASSERT_EQ(tav({"log", "-n", "1"}).code, 0);
         Outcome const repeated = tav({"commit", "-m", message});
         ASSERT_EQ(repeated.code, 0) << testing::PrintToString(repeated);

@@ -61,17 +61,19 @@ TEST_F(RemovedFiles, StayWhenNoCommitHasTheirContent)
     EXPECT_EQ(repo.read(".tav/removed-0"), "drawing of nobody else");
 }
 
-TEST_F(RemovedFiles, StayWhenTheirContentIsDamagedInTheStorage)
+TEST_F(RemovedFiles, RepairTheStorageBeforeTheyGo)
 {
-    repo.write(".tav/removed-0", "drawing");
+    ASSERT_EQ(rename(repo.pathTo("a.dwg").c_str(), repo.pathTo(".tav/removed-0").c_str()), 0);
     for (std::string const& name : repo.list()) {
         if (name.find(".tf") != std::string::npos) {
             repo.write(name, repo.read(name).replace(110, 1, "x"));
         }
     }
     EXPECT_EQ(tav({"verify"}).code, 1);
-    tav({"gc"});
-    EXPECT_EQ(repo.read(".tav/removed-0"), "drawing");
+    EXPECT_EQ(tav({"gc"}).code, 0);
+    EXPECT_FALSE(hasLeftovers());
+    EXPECT_EQ(tav({"restore", "a.dwg"}).code, 0);
+    EXPECT_EQ(repo.read("a.dwg"), "drawing");
 }
 
 TEST_F(RemovedFiles, AreNotMistakenForOthers)

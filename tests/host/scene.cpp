@@ -179,10 +179,14 @@ Outcome Scene::inCopy(std::function<int()> const& body) const
 
 Outcome Scene::verifyAndRepeat(Arguments const& arguments) const
 {
-    return inCopy([&] {
+    Outcome outcome = inCopy([&] {
         int const code = runHere({"verify"});
         return code == 0 ? runHere(arguments) : code;
     });
+    if (outcome.out.find("Repaired") != std::string::npos) { // Something was damaged all the same.
+        outcome.code = 1;
+    }
+    return outcome;
 }
 
 Files Scene::files() const

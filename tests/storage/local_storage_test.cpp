@@ -185,6 +185,20 @@ TEST_F(LocalStorage, ReplacesAnObjectWhicheverByteOfItIsDamaged)
     EXPECT_THAT(files(), ElementsAre(fileOf(url)));
 }
 
+TEST_F(LocalStorage, RepairsAContentFromAFileThatHasItAndFromNoOther)
+{
+    for (char const* const name : {"file", "plan.dwg"}) {
+        std::string const url = store(name, "abc");
+        tav::LocalStorage storage = newStorage();
+        EXPECT_FALSE(storage.repair(repo.root(), wide(url), wide(name)).value());
+        repo.write(fileOf(url), "damaged");
+        repo.write("other", "abd");
+        EXPECT_EQ(messageOf(storage.repair(repo.root(), wide(url), L"other")), "'other' has another content by now.");
+        EXPECT_TRUE(storage.repair(repo.root(), wide(url), wide(name)).value());
+        EXPECT_EQ(contentOf(url), "abc");
+    }
+}
+
 TEST_F(LocalStorage, KeepsADamagedObjectUntilTheNewOneIsFlushed)
 {
     std::string const url = store("file", "abc");
