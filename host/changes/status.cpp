@@ -3,11 +3,10 @@
 #include "host/changes/changes.h"
 #include "host/changes/scan_order.h"
 #include "host/changes/staging.h"
+#include "host/repository/conflicts.h"
 #include "host/repository/local_database.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
-
-#include "common/mu_common_file_utils.h"
 
 #include <algorithm>
 #include <functional>
@@ -61,15 +60,6 @@ stagedEntries(common::State const& state, FolderMatch const& match, common::Root
     auto const byPath = [](StagedEntry const& a, StagedEntry const& b) { return a.path < b.path; };
     std::stable_sort(entries.begin(), entries.end(), byPath);
     return entries;
-}
-
-std::vector<common::ConflictInfo> conflictsOf(common::RootPath const& root)
-{
-    std::vector<common::ConflictInfo> conflicts;
-    for (auto const& conflict : common::collectConflictPaths(root)) {
-        conflicts.push_back(*conflict);
-    }
-    return conflicts;
 }
 
 /// What the database knows.
@@ -158,7 +148,7 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     auto [history, match, cache] = lookAround(root, database);
     common::State const& state = cache->read();
     enterPlace(history, state, status);
-    status.conflicts = conflictsOf(root);
+    status.conflicts = openConflicts(root);
     status.staged = stagedEntries(state, match, root);
     dropUntouched(match, state);
     common::RepoChanges changes = compare(root, std::move(match), state);

@@ -2,6 +2,7 @@
 
 #include "host/changes/index_record.h"
 #include "host/changes/staging.h"
+#include "host/repository/conflicts.h"
 #include "host/repository/working_state.h"
 
 #include <algorithm>
@@ -62,6 +63,7 @@ CheckedOut checkOutCommit(
     common::RootPath const& root, LocalDatabase& database, Destination const& destination, Discard discard,
     std::uint64_t start)
 {
+    requireNoConflicts(root);
     std::vector<OdString> const begun = begunCheckouts(database);
     TreeUpdate const whole = updateBetween(
         database.commits().files(database.base()), filesOf(begun, database),

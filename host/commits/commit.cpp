@@ -6,6 +6,7 @@
 #include "host/failure.h"
 #include "host/paths/recorded_path.h"
 #include "host/progress.h"
+#include "host/repository/conflicts.h"
 #include "host/repository/history.h"
 #include "host/repository/server_of.h"
 #include "host/repository/working_state.h"
@@ -302,6 +303,7 @@ CommitRecord finish(common::RootPath const& root, LocalDatabase& database, Commi
 
 Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start)
 {
+    requireNoConflicts(root);
     auto const cache = readState(root);
     common::State const& state = cache->read();
     Connection server(database); // Without one there is nothing to begin.

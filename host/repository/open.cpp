@@ -73,7 +73,8 @@ common::RootPath openRepository(std::string const& folder)
 void requireOwnFiles(common::RootPath const& root)
 {
     for (wchar_t const* const name :
-         {L".tav", L".tav/objects", L".tav/objects/incoming", L".tav/properties", L".tav/restoring", L".tav/tf"}) {
+         {L".tav", L".tav/conflict", L".tav/objects", L".tav/objects/incoming", L".tav/properties", L".tav/restoring",
+          L".tav/tf"}) {
         failIfLink(root.pathTo(name).ansi_str(), "folder");
     }
     failIfLink(root.statePath().ansi_str(), "file");

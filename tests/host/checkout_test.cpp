@@ -631,6 +631,36 @@ TEST_F(Moving, VerifyFindsDamage)
     EXPECT_EQ(tav({"restore", "a.dwg", "--from", "1", "--force"}).code, 0);
 }
 
+TEST_F(Moving, EndsAtAnOpenConflict)
+{
+    repo.write(".tav/conflict/plans/roof.theirs.dwg", "theirs");
+    repo.write("a.dwg", "three");
+    tav({"add", "a.dwg"});
+    tav({"branch", "sketch"});
+    for (Arguments const& command :
+         {Arguments{"commit", "-m", "x"}, {"switch", "sketch"}, {"checkout", "1"}, {"checkout", "1", "--force"}}) {
+        EXPECT_EQ(
+            tav(command), failed("tav: These drawings are in conflict. Put the version that is to stay in its place, "
+                                 "remove the others from '.tav/conflict', and run the command again:\n"
+                                 "  plans/roof.dwg\n"))
+            << command.front();
+    }
+    EXPECT_EQ(repo.read("a.dwg"), "three");
+    ASSERT_EQ(unlink(repo.pathTo(".tav/conflict/plans/roof.theirs.dwg").c_str()), 0);
+    EXPECT_EQ(tav({"commit", "-m", "x"}).code, 0);
+}
+
+TEST_F(Moving, EndsAtAConflictFolderThatCannotBeRead)
+{
+    repo.write(".tav/conflict", "a file");
+    for (Arguments const& command : {Arguments{"status"}, {"commit", "-m", "x"}, {"checkout", "1"}}) {
+        EXPECT_EQ(
+            tav(command), failed(
+                              "tav: The conflict folder '" + repo.pathTo(".tav/conflict") +
+                              "' cannot be read: Not a directory. Check your rights to it.\n"));
+    }
+}
+
 TEST_F(Moving, MissingDatabaseIsNotMistakenForANewRepository)
 {
     ASSERT_EQ(unlink(repo.pathTo(".tav/tav.db").c_str()), 0);

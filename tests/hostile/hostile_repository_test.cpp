@@ -241,7 +241,7 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         LinkRow{"Own", ".tav"}, LinkRow{"Objects", ".tav/objects"}, LinkRow{"Stores", ".tav/tf"},
         LinkRow{"Incoming", ".tav/objects/incoming"}, LinkRow{"Restoring", ".tav/restoring"},
-        LinkRow{"Properties", ".tav/properties"}),
+        LinkRow{"Properties", ".tav/properties"}, LinkRow{"Conflicts", ".tav/conflict"}),
     rowName<LinkRow>);
 
 /// A file of the repository is a link to a file of somebody else.
