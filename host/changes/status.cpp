@@ -68,7 +68,6 @@ struct History {
     std::int64_t number = 0;
     FileList files; ///< of that commit
     std::vector<common::Reference> references;
-    std::string unfinishedWork;
 };
 
 History readHistory(LocalDatabase& database)
@@ -77,8 +76,7 @@ History readHistory(LocalDatabase& database)
     CommitTables const& commits = database.commits();
     OdString const base = database.base();
     auto const commit = commits.find(base);
-    return {
-        base, commit ? commit->number : 0, commits.fileList(base), commits.references(), noteOnUnfinished(database)};
+    return {base, commit ? commit->number : 0, commits.fileList(base), commits.references()};
 }
 
 struct Findings {
@@ -121,7 +119,6 @@ void enterPlace(History const& history, common::State const& state, Status& stat
     status.branch = state.head;
     status.commit = history.number;
     status.isAtEnd = end == history.references.end() || end->commitHash == history.base;
-    status.unfinishedWork = history.unfinishedWork;
 }
 
 /// A staged file that turns out to be renamed is shown so; other renamed files are a group of their own.
@@ -148,6 +145,7 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     auto [history, match, cache] = lookAround(root, database);
     common::State const& state = cache->read();
     enterPlace(history, state, status);
+    status.unfinishedWork = noteOnUnfinished(root, database);
     status.conflicts = openConflicts(root);
     status.staged = stagedEntries(state, match, root);
     dropUntouched(match, state);

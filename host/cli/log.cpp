@@ -67,8 +67,9 @@ void printDocument(std::vector<CommitRecord> const& commits)
 
 void showLog(LogOptions const& options)
 {
-    LocalDatabase const database = LocalDatabase::open(openRepository(""));
-    if (std::string const unfinished = noteOnUnfinished(database); !unfinished.empty()) {
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    if (std::string const unfinished = noteOnUnfinished(root, database); !unfinished.empty()) {
         printNote(unfinished);
     }
     std::vector<CommitRecord> commits =

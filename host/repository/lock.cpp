@@ -19,6 +19,11 @@ std::string hostName()
     return gethostname(name.data(), name.size() - 1) == 0 ? name.data() : "this machine";
 }
 
+std::string lockPath(common::RootPath const& root)
+{
+    return (root.tavPath() + L"/tav.lock").ansi_str();
+}
+
 /// Whether something else has the name of the lock.
 bool isNoLock(std::error_code const& error)
 {
@@ -30,7 +35,7 @@ bool isNoLock(std::error_code const& error)
 
 os::FileLock lockRepository(common::RootPath const& root, std::string const& name)
 {
-    std::string const path = (root.tavPath() + L"/tav.lock").ansi_str();
+    std::string const path = lockPath(root);
     std::string const note = "'tav " + name + "', process " + std::to_string(getpid()) + " on " + hostName();
     os::FileLock lock;
     std::error_code const error = lock.acquire(path, note, kPatience);
@@ -49,6 +54,12 @@ os::FileLock lockRepository(common::RootPath const& root, std::string const& nam
             "Check your rights to '" + root.tavPath().ansi_str() + "'.");
     }
     return lock;
+}
+
+std::string lockHolder(common::RootPath const& root)
+{
+    std::string const path = lockPath(root);
+    return os::FileLock::isHeld(path) ? os::FileLock::holder(path) : std::string();
 }
 
 } // namespace tav

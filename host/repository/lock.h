@@ -12,4 +12,7 @@ namespace tav {
 /// the result lives. Throws `Failure` that says who holds it.
 os::FileLock lockRepository(common::RootPath const& root, std::string const& name);
 
+/// Who holds the lock of the repository, as the subject of a sentence; empty when nobody does.
+std::string lockHolder(common::RootPath const& root);
+
 } // namespace tav

@@ -61,8 +61,18 @@ void Work::failIfBetweenCommits() const
     }
 }
 
-std::string noteOnUnfinished(LocalDatabase const& database)
+std::string noteOnUnfinished(common::RootPath const& root, LocalDatabase const& database)
 {
+    OdString const noted = database.unfinished();
+    if (noted.isEmpty()) {
+        return {};
+    }
+    if (std::string const holder = lockHolder(root); !holder.empty()) {
+        return holder + ", is changing the repository.";
+    }
+    if (database.unfinished() != noted) { // It has ended meanwhile.
+        return {};
+    }
     Unfinished const unfinished = unfinishedOf(database);
     if (std::holds_alternative<CommitUnderWay>(unfinished)) {
         return "A commit was interrupted. The next command that changes something completes it.";

@@ -40,7 +40,8 @@ private:
     std::optional<CommitRecord> finished_;
 };
 
-/// What a reader of the repository should know of work that has not been finished; empty when there is none.
-std::string noteOnUnfinished(LocalDatabase const& database);
+/// What a reader of the repository should know of work that has not been finished, by an interrupted command or by one
+/// that is still running; empty when there is none.
+std::string noteOnUnfinished(common::RootPath const& root, LocalDatabase const& database);
 
 } // namespace tav

@@ -78,6 +78,13 @@ std::error_code FileLock::acquire(std::string const& path, std::string const& no
     return {};
 }
 
+bool FileLock::isHeld(std::string const& path)
+{
+    FileLock probe;
+    probe.file_ = calls().openat(AT_FDCWD, path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC, 0);
+    return probe.file_ != -1 && calls().flock(probe.file_, LOCK_SH | LOCK_NB) == -1 && errno == EWOULDBLOCK;
+}
+
 std::string FileLock::holder(std::string const& path)
 {
     std::string content;

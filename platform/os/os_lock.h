@@ -24,6 +24,9 @@ public:
     [[nodiscard]] std::error_code
     acquire(std::string const& path, std::string const& note, std::chrono::milliseconds patience);
 
+    /// Whether a process holds the lock on `path`. Makes no file; a lock that cannot be looked at counts as free.
+    static bool isHeld(std::string const& path);
+
     /// The note of the process that holds the lock on `path`, or held it last; empty when there is none.
     static std::string holder(std::string const& path);
 

@@ -1,5 +1,7 @@
 #include "tests/host/tav_test.h"
 
+#include "host/repository/unfinished.h"
+
 #include "platform/os/os_lock.h"
 
 #include <array>
@@ -121,6 +123,23 @@ TEST_F(Lock, IsNotTakenThroughALink)
                                    "tav: The repository cannot be locked: Too many levels of symbolic links. Move '" +
                                    repo.pathTo(".tav/tav.lock") + "' away; the next command makes a new one.\n"));
     EXPECT_EQ(elsewhere.read("precious"), "content");
+}
+
+TEST_F(Lock, OfARunningCommandKeepsItsWorkFromBeingCalledInterrupted)
+{
+    tav::LocalDatabase database = tav::LocalDatabase::make(repo.root());
+    tav::note(tav::CommitUnderWay{L"{}", {}, {}}, database);
+    {
+        os::FileLock const lock = hold("'tav commit', process 7 on studio");
+        for (char const* const command : {"status", "log"}) {
+            EXPECT_EQ(tav({command}).err, "tav: 'tav commit', process 7 on studio, is changing the repository.\n");
+        }
+    }
+    for (char const* const command : {"status", "log"}) {
+        EXPECT_EQ(
+            tav({command}).err,
+            "tav: A commit was interrupted. The next command that changes something completes it.\n");
+    }
 }
 
 } // namespace
