@@ -8,6 +8,8 @@
 
 #include "common/mu_common_history.h"
 
+#include "platform/ut/text.h"
+
 #include <map>
 #include <string>
 
@@ -15,13 +17,20 @@ namespace tav {
 
 namespace {
 
-common::HistoryItem itemOf(CommitRecord const& commit)
+OdString titleOf(CommitRecord const& commit)
+{
+    std::string const message = commit.message.ansi_str();
+    return wide(message.substr(0, message.find('\n')));
+}
+
+/// What the library shows of an entry, put together here: its texts are of Qt, which keeps no bytes that are not UTF-8.
+std::string infoOf(CommitRecord const& commit)
 {
     OdTimeStamp date;
     date.setPackedValue(commit.date);
-    std::string const message = commit.message.ansi_str();
-    OdString const title = wide(message.substr(0, message.find('\n')));
-    return {date, commit.author, title, commit.hash, static_cast<int>(commit.number)};
+    std::string const age = common::HistoryItem(date, {}, {}, {}, 0).getInfo().toStdString();
+    OdArray<OdString> const author = ut::splitByChar(commit.author, L'@', false);
+    return author.isEmpty() ? age : shown(author.first()) + " \u2981 " + age;
 }
 
 using Names = std::multimap<OdString, std::string>;
@@ -45,13 +54,11 @@ std::string namesAt(OdString const& hash, Names const& names)
     return list.empty() ? list : list + ")";
 }
 
-std::string linesOf(common::HistoryItem const& item, Names const& names)
+std::string linesOf(CommitRecord const& commit, Names const& names)
 {
-    std::string const number = std::to_string(item.number);
+    std::string const number = std::to_string(commit.number);
     std::string const indent(number.size() + 2, ' ');
-    std::string const info = item.getInfo().toStdString();
-    return number + "  " + shown(wide(item.getName().toStdString())) + namesAt(item.detail, names) + "\n" + indent +
-           shown(wide(info)) + "\n";
+    return number + "  " + shown(titleOf(commit)) + namesAt(commit.hash, names) + "\n" + indent + infoOf(commit) + "\n";
 }
 
 void printDocument(std::vector<CommitRecord> const& commits)
@@ -83,7 +90,7 @@ void showLog(LogOptions const& options)
     }
     Names const names = namesByHash(database);
     for (CommitRecord const& commit : commits) {
-        print(linesOf(itemOf(commit), names));
+        print(linesOf(commit, names));
     }
     if (commits.empty()) {
         print("There is no commit yet.\n");
