@@ -1,6 +1,8 @@
 #include "host/changes/staging.h"
 
 #include "host/failure.h"
+#include "host/paths/recorded_path.h"
+#include "host/text/characters.h"
 
 #include <algorithm>
 #include <cwctype>
@@ -23,12 +25,25 @@ bool isStorable(OdString const& path)
     return true;
 }
 
-void checkStorable(OdString const& path)
+std::optional<std::string> whyNotStorable(OdString const& path)
 {
-    if (!isStorable(path)) {
-        throw Failure(
-            "The name '" + path.ansi_str() + "' holds a character that cannot be recorded.",
-            "Rename the file and try again.");
+    return isStorable(path) ? std::nullopt
+                            : std::optional("The path " + quoted(path) + " holds a character that cannot be recorded.");
+}
+
+void requireKept(std::vector<common::StagedFile> const& files)
+{
+    Failure failure(
+        "No commit can keep these names.",
+        "Nothing has been staged; rename the files, or leave them out with 'tav ignore':");
+    for (common::StagedFile const& file : files) {
+        auto fault = file.change == common::FileChange::removed ? whyNotStorable(file.path) : whyNotKept(file.path);
+        if (fault) {
+            failure.details.push_back(std::move(*fault));
+        }
+    }
+    if (!failure.details.empty()) {
+        throw failure;
     }
 }
 
@@ -57,15 +72,23 @@ OdString takeFirstPath(OdString const& path, common::State& state)
 
 } // namespace
 
+std::optional<std::string> whyNotKept(OdString const& path)
+{
+    if (auto fault = whyUnsafe(path)) {
+        return fault;
+    }
+    return whyNotStorable(path);
+}
+
 std::size_t stage(std::vector<common::StagedFile> const& files, common::State& state)
 {
+    requireKept(files);
     std::map<OdString, std::size_t> positions;
     for (std::size_t i = 0; i < state.stagedFiles.size(); ++i) {
         positions.emplace(state.stagedFiles[i].path, i);
     }
     std::size_t count = 0;
     for (common::StagedFile const& file : files) {
-        checkStorable(file.path);
         auto const [position, isNew] = positions.emplace(file.path, state.stagedFiles.size());
         if (isNew) {
             state.stagedFiles.push_back(file);

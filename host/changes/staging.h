@@ -4,13 +4,19 @@
 #include "common/mu_common_state.h"
 
 #include <cstddef>
+#include <optional>
 #include <set>
+#include <string>
 #include <vector>
 
 namespace tav {
 
+/// What keeps a file of this name out of every commit, in a sentence; none for a name that a commit can keep.
+std::optional<std::string> whyNotKept(OdString const& path);
+
 /// Stages `files` behind what is staged already; what is staged under the same path gets the new change in its place.
-/// Returns how many were not staged before. Throws `Failure` for a path that the state file cannot hold.
+/// Returns how many were not staged before. Throws `Failure`, with a list of them, for names that no commit can keep;
+/// nothing is staged then.
 std::size_t stage(std::vector<common::StagedFile> const& files, common::State& state);
 
 /// The paths of all staged files.

@@ -4,7 +4,6 @@
 #include "host/changes/index_record.h"
 #include "host/changes/staging.h"
 #include "host/failure.h"
-#include "host/paths/recorded_path.h"
 #include "host/progress.h"
 #include "host/repository/conflicts.h"
 #include "host/repository/history.h"
@@ -248,13 +247,20 @@ std::optional<CommitRecord> lastCommitIfOf(CommitOrder const& order, LocalDataba
     return isSame ? last : std::nullopt;
 }
 
+/// The state file may come from anywhere.
 void checkNames(std::vector<PlannedFile> const& plan)
 {
+    Failure failure(
+        "No commit can keep these names.",
+        "Nothing has been committed; rename the files, or take them out with 'tav unstage NAME':");
     for (PlannedFile const& file : plan) {
-        auto const fault = whyUnsafe(file.path);
-        if (fault && file.change != common::FileChange::removed) {
-            throw Failure(*fault, "Nothing has been committed; rename the file, or run 'tav unstage' for it.");
+        auto fault = file.change == common::FileChange::removed ? std::nullopt : whyNotKept(file.path);
+        if (fault) {
+            failure.details.push_back(std::move(*fault));
         }
+    }
+    if (!failure.details.empty()) {
+        throw failure;
     }
 }
 

@@ -381,11 +381,14 @@ TEST_F(Commit, RefusesAServerInTheWorkingFolder)
 TEST_F(Commit, RefusesNamesThatNoSystemShallMeet)
 {
     repo.write("a\x1b[31m.dwg", "one");
-    tav({"add", "--all"});
+    repo.write("b\n.dwg", "two");
+    repo.write(".tav/tav.state", stateWithAdded({"a\\u001B[31m.dwg", "b\\n.dwg"}));
     EXPECT_EQ(
-        tav({"commit", "-m", "drawn"}), failed("tav: The path 'a\\u001B[31m.dwg' holds a control character or a line "
-                                               "end. Nothing has been committed; rename the file, "
-                                               "or run 'tav unstage' for it.\n"));
+        tav({"commit", "-m", "drawn"}),
+        failed("tav: No commit can keep these names. Nothing has been committed; rename the files, or take them out "
+               "with 'tav unstage NAME':\n"
+               "  The path 'a\\u001B[31m.dwg' holds a control character or a line end.\n"
+               "  The path 'b\\u000A.dwg' holds a control character or a line end.\n"));
 }
 
 TEST_F(Commit, IsShownWithItsControlCharactersEscapedOnATerminal)

@@ -334,12 +334,21 @@ TEST_F(Mv, FailsForFoldersThatAreNot)
     expectRefusal({"plans", "plans/deeper"}, cannotMove("plans", "plans/deeper", "Invalid argument"));
 }
 
-TEST_F(Mv, MovesTheFileBackWhenTheStateCannotHoldItsName)
+TEST_F(Mv, FailsForANameThatTheStateCannotHold)
 {
     repo.add({"a.dwg"});
     expectRefusal(
         {"a.dwg", "\xf0\x9f\xbf\xbe.dwg"},
-        "The name '\xf0\x9f\xbf\xbe.dwg' holds a character that cannot be recorded. Rename the file and try again.");
+        "The path '\xf0\x9f\xbf\xbe.dwg' holds a character that cannot be recorded. Choose another name.");
+}
+
+TEST_F(Mv, MovesAFolderBackThatHasAFileWhichNoCommitCanKeep)
+{
+    repo.add({"old/a.dwg", "old/b\n.dwg"});
+    expectRefusal(
+        {"old", "new"}, "No commit can keep these names. Nothing has been staged; rename the files, or leave them out "
+                        "with 'tav ignore':\n"
+                        "  The path 'new/b\\u000A.dwg' holds a control character or a line end.");
 }
 
 TEST_F(Mv, FailsForNamesThatAreTooLong)

@@ -63,8 +63,9 @@ TEST_F(Staging, RefusesAPathThatTheStateFileCannotHold)
         tav::stage({{L"\U0001FFFE.dwg", FileChange::added}}, state);
         FAIL() << "no failure";
     } catch (tav::Failure const& failure) {
-        EXPECT_EQ(failure.what, "The name '\xf0\x9f\xbf\xbe.dwg' holds a character that cannot be recorded.");
-        EXPECT_EQ(failure.next, "Rename the file and try again.");
+        EXPECT_EQ(failure.what, "No commit can keep these names.");
+        EXPECT_THAT(
+            failure.details, ElementsAre("The path '\xf0\x9f\xbf\xbe.dwg' holds a character that cannot be recorded."));
     }
 }
 
@@ -75,7 +76,7 @@ TEST_F(Staging, TakesPathsOfEveryScriptAndOfNone)
             {{L"План", FileChange::added},
              {L"\U0001F3E0", FileChange::added},
              {OdString("\xff", 1, CP_UTF_8), FileChange::added},
-             {L"\xFFFE\n", FileChange::added}},
+             {L"\xFFFE", FileChange::added}},
             state),
         4u);
 }
