@@ -8,6 +8,7 @@
 
 #include <filesystem>
 #include <map>
+#include <string>
 #include <utility>
 
 namespace tav {
@@ -24,8 +25,21 @@ bool isSomethingElse(OdString const& path, common::RootPath const& root)
     return type != std::filesystem::file_type::not_found && type != std::filesystem::file_type::directory;
 }
 
+/// A new file that is gone leaves nothing to commit. To go on without it would drop what somebody has chosen.
+void failForGone(std::vector<std::string> gone)
+{
+    if (!gone.empty()) {
+        Failure failure(
+            "These new files are staged, but they are gone.",
+            "Bring them back, or take them out of the commit with 'tav unstage NAME':");
+        failure.details = std::move(gone);
+        throw failure;
+    }
+}
+
 void planStaged(common::State const& state, Tree const& base, common::RootPath const& root, Plan& plan)
 {
+    std::vector<std::string> gone;
     for (common::StagedFile const& file : state.stagedFiles) {
         auto const rename = state.renames.find(file.path);
         bool const isRenamed = rename != state.renames.end() && base.count(rename->second) > 0;
@@ -37,13 +51,12 @@ void planStaged(common::State const& state, Tree const& base, common::RootPath c
                 "Move what is there away, or run 'tav unstage' for it.");
         }
         if (isGone && base.count(file.path) == 0) {
-            throw Failure(
-                "'" + file.path.ansi_str() + "' is staged, but it is not there any more.",
-                "Bring it back, or run 'tav unstage' for it.");
+            gone.push_back(file.path.ansi_str());
         }
         common::FileChange const change = isGone ? common::FileChange::removed : file.change;
         plan.insert_or_assign(file.path, PlannedFile{file.path, change, isRenamed ? rename->second : OdString::kEmpty});
     }
+    failForGone(std::move(gone));
 }
 
 void planRenames(Renames const& renames, Plan& plan)

@@ -172,14 +172,21 @@ TEST_F(Commit, RefusesStagedFilesThatAreAsTheyWereCommitted)
     EXPECT_THAT(values({"log"}, "number"), ElementsAre("1"));
 }
 
-TEST_F(Commit, RefusesANewFileThatIsGone)
+TEST_F(Commit, NamesAllStagedNewFilesThatAreGone)
 {
     repo.write("a.dwg", "one");
-    tav({"add", "a.dwg"});
+    repo.write("b.dwg", "two");
+    repo.write("c.dwg", "three");
+    tav({"add", "a.dwg", "b.dwg", "c.dwg"});
     remove("a.dwg");
+    remove("b.dwg");
     EXPECT_EQ(
         tav({"commit", "-m", "drawn"}),
-        failed("tav: 'a.dwg' is staged, but it is not there any more. Bring it back, or run 'tav unstage' for it.\n"));
+        failed("tav: These new files are staged, but they are gone. Bring them back, or take them out of the commit "
+               "with 'tav unstage NAME':\n  a.dwg\n  b.dwg\n"));
+    tav({"unstage", "a.dwg", "b.dwg"});
+    EXPECT_EQ(tav({"commit", "-m", "drawn"}).code, 0);
+    EXPECT_THAT(values({"show"}, "path"), ElementsAre("c.dwg"));
 }
 
 TEST_F(Commit, KeepsBytesThatAreNotUtf8InTheLog)
@@ -190,6 +197,17 @@ TEST_F(Commit, KeepsBytesThatAreNotUtf8InTheLog)
     EXPECT_EQ(
         tav({"log"}), done("1  caf\xE9  (master)\n"
                            "   Andr\xE9 \xE2\xA6\x81 less than a minute ago\n"));
+}
+
+TEST_F(Commit, TakesAStagedFileThatIsGoneForRemovedIfItWasCommitted)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    repo.write("a.dwg", "two");
+    tav({"add", "a.dwg"});
+    remove("a.dwg");
+    EXPECT_EQ(tav({"commit", "-m", "removed"}).code, 0);
+    EXPECT_THAT(values({"show"}, "change"), ElementsAre("removed"));
 }
 
 TEST_F(Commit, RefusesAnEmptyMessage)
