@@ -109,12 +109,19 @@ std::set<OdString> stagedPaths(common::State const& state)
     return paths;
 }
 
-std::set<OdString> claimedPaths(common::State const& state)
+std::set<OdString> formerPaths(common::State const& state)
 {
-    Paths paths = stagedPaths(state);
+    Paths paths;
     for (auto const& [path, previous] : state.renames) {
         paths.insert(previous);
     }
+    return paths;
+}
+
+std::set<OdString> claimedPaths(common::State const& state)
+{
+    Paths paths = stagedPaths(state);
+    paths.merge(formerPaths(state));
     return paths;
 }
 

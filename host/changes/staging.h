@@ -22,7 +22,10 @@ std::size_t stage(std::vector<common::StagedFile> const& files, common::State& s
 /// The paths of all staged files.
 std::set<OdString> stagedPaths(common::State const& state);
 
-/// The paths for which something is staged, those that staged renames leave included.
+/// The paths that staged renames leave.
+std::set<OdString> formerPaths(common::State const& state);
+
+/// Both: all paths for which something is staged.
 std::set<OdString> claimedPaths(common::State const& state);
 
 /// Takes `files` out of the staged ones, with what was noted of their renames. Returns how many were staged.

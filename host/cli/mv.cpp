@@ -5,7 +5,6 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/failure.h"
-#include "host/paths/recorded_path.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/work.h"
@@ -17,6 +16,7 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <set>
 #include <string>
 #include <utility>
 #include <vector>
@@ -74,7 +74,7 @@ void failIfAnyPart(OdString const& to, Predicate const& isLeftOut)
 void checkTarget(OdString const& to, common::RootPath const& root)
 {
     failIfAnyPart(to, [](std::filesystem::path const& part) { return part.string().front() == '.'; });
-    if (auto const fault = whyUnsafe(to)) {
+    if (auto const fault = whyNotKept(to)) {
         throw Failure(*fault, "Choose another name.");
     }
     common::RepoIgnore const rules(root);
@@ -96,20 +96,54 @@ std::vector<Move> movesOf(OdString const& from, OdString const& to, std::vector<
     return moves;
 }
 
+/// The committed file `path`; null when there is none.
+ListedFile const* find(FileList const& committed, OdString const& path)
+{
+    auto const isBefore = [](ListedFile const& file, OdString const& other) { return file.path < other; };
+    auto const file = std::lower_bound(committed.begin(), committed.end(), path, isBefore);
+    return file != committed.end() && file->path == path ? &*file : nullptr;
+}
+
+/// A file that comes to a committed path and is no committed file itself has been renamed away from there by hand, or
+/// is to take its place. Either way it is that file again, and not a renamed one; so is noted where it began.
+void noteReturns(std::vector<Move> const& moves, FileList const& committed, common::State& state)
+{
+    for (Move const& move : moves) {
+        auto const rename = state.renames.find(move.from);
+        OdString const& first = rename == state.renames.end() ? move.from : rename->second;
+        if (!find(committed, first) && find(committed, move.to)) {
+            state.renames[move.from] = move.to;
+        }
+    }
+}
+
+/// A file that is back, or has been replaced, is no longer the former name of one that is gone.
+void dropRenamesTo(std::vector<Move> const& moves, common::RootPath const& root, common::State& state)
+{
+    std::set<OdString> back;
+    for (Move const& move : moves) {
+        back.insert(move.to);
+    }
+    std::vector<common::StagedFile> stale;
+    for (auto const& [path, previous] : state.renames) {
+        if (back.count(previous) > 0 && !ut::FileName::fileExists(root.pathTo(path))) {
+            stale.emplace_back(path, common::FileChange::added);
+        }
+    }
+    unstage(stale, state);
+}
+
 /// The files that are back where the last commit has them, with another content than it has. Where they come from the
 /// next commit would have taken that content; so it does here.
-std::vector<common::StagedFile>
-changedAndBack(std::vector<Move> const& moves, common::State const& state, common::RootPath const& root)
+std::vector<common::StagedFile> changedAndBack(
+    std::vector<Move> const& moves, FileList const& committed, common::State const& state, common::RootPath const& root)
 {
     std::vector<common::StagedFile> changed;
-    FileList const committed = lastCommitFiles(root);
-    auto const isBefore = [](ListedFile const& file, OdString const& path) { return file.path < path; };
     for (Move const& move : moves) {
         auto const rename = state.renames.find(move.from);
         bool const isBack = rename != state.renames.end() && rename->second == move.to;
-        auto const file = std::lower_bound(committed.begin(), committed.end(), move.to, isBefore);
-        bool const isCommitted = file != committed.end() && file->path == move.to;
-        if (isBack && isCommitted && hasOtherContent(move.to, wide(file->url), root)) {
+        ListedFile const* const file = find(committed, move.to);
+        if (isBack && file && hasOtherContent(move.to, wide(file->url), root)) {
             changed.emplace_back(move.to, common::FileChange::modified);
         }
     }
@@ -136,9 +170,13 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     FileMoves onDisk(root.path().ansi_str());
     onDisk.move(from.ansi_str(), to.ansi_str());
     changeState(root, [&](common::Cache& cache) {
-        std::vector<common::StagedFile> const changed = changedAndBack(moves, cache.read(), root);
-        stageMoves(moves, cache.write());
-        stage(changed, cache.write());
+        common::State& state = cache.write();
+        FileList const committed = lastCommitFiles(root);
+        noteReturns(moves, committed, state);
+        std::vector<common::StagedFile> const changed = changedAndBack(moves, committed, state, root);
+        stageMoves(moves, state);
+        dropRenamesTo(moves, root, state);
+        stage(changed, state);
     });
     onDisk.keep();
     print("Renamed '" + shown(from) + "' to '" + shown(to) + "'.\n");

@@ -18,6 +18,7 @@
 #include <algorithm>
 #include <filesystem>
 #include <optional>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -68,6 +69,26 @@ std::vector<common::StagedFile> removableFiles(
         throw Failure("No committed file matches '" + name + "'.", "Run 'tav status' to see what there is.");
     }
     return found;
+}
+
+/// A file that has been renamed is gone already, and the commit says so.
+void failIfRenamed(std::string const& name, common::State const& state, common::RootPath const& root)
+{
+    OdString const typed = pathInRepository(root, name);
+    auto const isIt = [&](auto const& rename) { return rename.second == typed; };
+    auto const rename = std::find_if(state.renames.begin(), state.renames.end(), isIt);
+    if (rename != state.renames.end() && !ut::FileName::fileExists(root.pathTo(typed))) {
+        throw Failure(
+            "'" + name + "' has been renamed to '" + rename->first.ansi_str() + "'.", "The next commit takes that.");
+    }
+}
+
+/// The removal of a renamed file is staged with its rename.
+std::vector<common::StagedFile> without(std::set<OdString> const& renamed, std::vector<common::StagedFile> files)
+{
+    auto const isRenamed = [&](common::StagedFile const& file) { return renamed.count(file.path) > 0; };
+    files.erase(std::remove_if(files.begin(), files.end(), isRenamed), files.end());
+    return files;
 }
 
 NameFinder finderOfCommitted(common::RepoChanges const& changes, common::RootPath const& root)
@@ -130,9 +151,11 @@ void removeFiles(std::vector<std::string> const& names)
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
         common::RepoChanges const changes = compare(root, matchFolder(root, lastCommitFiles(root)), cache.read());
+        std::set<OdString> const renamed = formerPaths(cache.read());
         NameFinder const committed = finderOfCommitted(changes, root);
         std::vector<common::StagedFile> staged;
         for (std::string const& name : names) {
+            failIfRenamed(name, cache.read(), root);
             std::vector<common::StagedFile> const found = removableFiles(name, changes, committed, root);
             staged.insert(staged.end(), found.begin(), found.end());
         }
@@ -142,9 +165,10 @@ void removeFiles(std::vector<std::string> const& names)
                 keepContent(file.path, changes.unchanged, root);
                 waiting.push_back(waitingName(root, waiting.size()));
                 moves.move(file.path.ansi_str(), waiting.back());
+                count += renamed.count(file.path); // Those are not staged below.
             }
         }
-        count = stage(staged, cache.write());
+        count += stage(without(renamed, staged), cache.write());
     });
     moves.keep();
     for (std::string const& name : waiting) {

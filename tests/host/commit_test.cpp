@@ -189,16 +189,6 @@ TEST_F(Commit, NamesAllStagedNewFilesThatAreGone)
     EXPECT_THAT(values({"show"}, "path"), ElementsAre("c.dwg"));
 }
 
-TEST_F(Commit, KeepsBytesThatAreNotUtf8InTheLog)
-{
-    repo.write("a.dwg", "one");
-    tav({"add", "a.dwg"});
-    ASSERT_EQ(tav({"commit", "-m", "caf\xE9", "--author", "Andr\xE9@studio"}).code, 0);
-    EXPECT_EQ(
-        tav({"log"}), done("1  caf\xE9  (master)\n"
-                           "   Andr\xE9 \xE2\xA6\x81 less than a minute ago\n"));
-}
-
 TEST_F(Commit, TakesAStagedFileThatIsGoneForRemovedIfItWasCommitted)
 {
     repo.write("a.dwg", "one");
@@ -208,6 +198,60 @@ TEST_F(Commit, TakesAStagedFileThatIsGoneForRemovedIfItWasCommitted)
     remove("a.dwg");
     EXPECT_EQ(tav({"commit", "-m", "removed"}).code, 0);
     EXPECT_THAT(values({"show"}, "change"), ElementsAre("removed"));
+}
+
+TEST_F(Commit, FindsNothingChangedWhenMvTakesARenameByHandBack)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    move("a.dwg", "b.dwg");
+    EXPECT_EQ(tav({"mv", "b.dwg", "a.dwg"}).code, 0);
+    EXPECT_EQ(status(), kClean);
+    tav({"mv", "a.dwg", "b.dwg"});
+    move("b.dwg", "c.dwg");
+    EXPECT_EQ(tav({"mv", "c.dwg", "a.dwg"}).code, 0);
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Commit, TakesAFileThatMvPutsInThePlaceOfACommittedOneForModified)
+{
+    repo.write("a.dwg", "one");
+    commitAll("the first");
+    move("a.dwg", "b.dwg");
+    repo.write("b.dwg", "two");
+    tav({"mv", "b.dwg", "a.dwg"});
+    EXPECT_EQ(
+        status(), "Staged for the next commit:\n"
+                  "  (use 'tav unstage NAME' to take a file out)\n"
+                  "        modified: a.dwg\n\n");
+    EXPECT_EQ(tav({"commit", "-m", "changed"}).code, 0);
+    EXPECT_THAT(values({"show"}, "change"), ElementsAre("modified"));
+}
+
+TEST_F(Commit, ShowsARenamedFileOnceWhenItsOldNameIsRemovedToo)
+{
+    std::string const renamed = "Staged for the next commit:\n"
+                                "  (use 'tav unstage NAME' to take a file out)\n"
+                                "        renamed:  plan.dwg -> q.dwg\n\n";
+    repo.write("plan.dwg", "one");
+    commitAll("the first");
+    tav({"mv", "plan.dwg", "q.dwg"});
+    EXPECT_EQ(
+        tav({"rm", "plan.dwg"}), failed("tav: 'plan.dwg' has been renamed to 'q.dwg'. The next commit takes that.\n"));
+    EXPECT_EQ(status(), renamed);
+    repo.write("plan.dwg", "one");
+    EXPECT_EQ(tav({"rm", "plan.dwg"}), done("Removed 1 file; the next commit takes that.\n"));
+    EXPECT_EQ(status(), renamed);
+}
+
+TEST_F(Commit, KeepsBytesThatAreNotUtf8InTheLog)
+{
+    repo.write("a.dwg", "one");
+    tav({"add", "a.dwg"});
+    ASSERT_EQ(tav({"commit", "-m", "caf\xE9", "--author", "Andr\xE9@studio"}).code, 0);
+    EXPECT_EQ(
+        tav({"log"}), done("1  caf\xE9  (master)\n"
+                           "   Andr\xE9 \xE2\xA6\x81 less than a minute ago\n"));
 }
 
 TEST_F(Commit, RefusesAnEmptyMessage)
