@@ -2,6 +2,7 @@
 #include "common/mu_common_json.h"
 #include "common/mu_common_repo_files.h"
 #include "common/mu_common_repo_prop.h"
+#include "common/mu_common_serialization.h"
 
 #include "tests/support/temp_folder.h"
 
@@ -218,7 +219,13 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         Slip{"NarrowString", "Unbekannt: %s", nullptr}, Slip{"Number", "Unbekannt: %d", nullptr},
         Slip{"Counter", "Unbekannt: %n", nullptr}, Slip{"TwoForOne", "Unbekannt: %ls, %ls", nullptr},
-        Slip{"AnotherKindBehindIt", "Unbekannt: %ls, %d", nullptr}, Slip{"Position", "Unbekannt: %1$ls", nullptr},
+        Slip{"AnotherKindBehindIt", "Unbekannt: %ls, %d", nullptr},
+        Slip{"PositionBeyondTheLast", "Unbekannt: %2$ls", nullptr}, Slip{"PositionZero", "Unbekannt: %0$ls", nullptr},
+        Slip{"PositionOfTwoDigits", "Unbekannt: %11$ls", nullptr},
+        Slip{"PositionOfAnotherKind", "Unbekannt: %1$s", nullptr}, Slip{"PositionWithAWidth", "%1$5ls?", nullptr},
+        Slip{"PositionBesideNone", "Unbekannt: %1$ls, %ls", nullptr}, Slip{"HalfAPosition", "Unbekannt: %1$", nullptr},
+        Slip{"Position", "Unbekannt: %1$ls", "Unbekannt: moved"},
+        Slip{"PositionTwice", "%1$ls? 100%% unbekannt: %1$ls", "moved? 100% unbekannt: moved"},
         Slip{"Width", "Unbekannt: %5ls", nullptr}, Slip{"WidthFromAnArgument", "Unbekannt: %*ls", nullptr},
         Slip{"OneCharacter", "Unbekannt: %lc", nullptr}, Slip{"UpperCase", "Unbekannt: %LS", nullptr},
         Slip{"LonePercentSign", "100% unbekannt: %ls", nullptr},
@@ -229,10 +236,31 @@ INSTANTIATE_TEST_SUITE_P(
         Slip{"EscapedPlaceholder", "%%ls unbekannt: %ls", "%ls unbekannt: moved"}, Slip{"Empty", "", nullptr}),
     [](auto const& row) { return row.param.name; });
 
-TEST(CatalogueSlipInATextWithoutPlaceholder, IsNotShown)
+// Such a text is never formatted.
+TEST(TranslationOfATextWithoutPlaceholder, MayHoldPercentSigns)
 {
-    Translation const translation{{"unsupported file change", "unbekannte \u00C4nderung: %ls"}};
-    EXPECT_EQ(nameUnknownChange(), "unsupported file change");
+    for (char const* german : {"zu 100 % unbekannt", "%", "%s%n", "100%%", "%ls"}) {
+        Translation const translation{{"unsupported file change", german}};
+        EXPECT_EQ(nameUnknownChange(), german);
+    }
+}
+
+TEST(TranslationOfTwoPlaceholders, MayChangeTheirOrder)
+{
+    struct {
+        char const* german;
+        char const* result;
+    } const rows[] = {
+        {R"("%2$ls" fehlt in %1$ls)", R"("name" fehlt in repo data)"},
+        {R"(%1$ls ohne "%2$ls" (%1$ls))", R"(repo data ohne "name" (repo data))"},
+        {"%1$ls ist unvollst\u00E4ndig", "repo data ist unvollst\u00E4ndig"},
+        {R"("%2$ls" fehlt)", R"(Could not parse repo data, missing "name")"}, // The kind of the first would be a guess.
+        {"%3$ls %2$ls %1$ls", R"(Could not parse repo data, missing "name")"},
+        {"%2$ls %ls", R"(Could not parse repo data, missing "name")"}};
+    for (auto const& row : rows) {
+        Translation const translation{{R"(Could not parse %ls, missing "%ls")", row.german}};
+        EXPECT_EQ(errorOf(common::deserializeRepoData(Object())), row.result) << row.german;
+    }
 }
 
 TEST(CatalogueSlipInATextThatStaysUnfilled, IsNotShown)
