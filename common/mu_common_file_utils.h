@@ -51,7 +51,7 @@ MU_COMMON_EXPORT DirContents collectDirContents(OdString const& folder, CollectO
 /// The files under version control, relative to the working folder: what lies in it, hidden entries and what the ignore
 /// rules match excepted, then the files of the properties folder, which travel with the repository.
 /// Error: the properties folder is not below the working folder. Throws `std::regex_error` for an invalid ignore rule
-/// (see `RepoIgnore`).
+/// and `OdError` for an ignore file that cannot be read (see `RepoIgnore`).
 MU_COMMON_EXPORT Expected<std::vector<File>> collectRepoFiles(RootPath const& root);
 
 /// The drawings of which other versions lie in the conflict folder, in ascending order of their paths.

@@ -3,6 +3,7 @@
 #include "common/mu_common_pattern.h"
 #include "common/mu_common_translate.h"
 
+#include "platform/sdk/OdError.h"
 #include "platform/ut/Dir.h"
 #include "platform/ut/FileName.h"
 #include "platform/ut/TextFile.h"
@@ -153,7 +154,10 @@ void RepoIgnore::load()
         }
         return;
     }
-    file.open();
+    if (!file.open()) { // Without its rules a scan would offer what is meant to stay out.
+        OdString message;
+        throw OdError(message.format(L"Could not read Ignore file '%ls'.", ignorePath_.c_str()));
+    }
     for (OdString line = file.getFirstLine(); !line.isEmpty(); line = file.getNextLine()) {
         append(line);
     }

@@ -77,6 +77,7 @@ public:
     /// 16,000 characters in all, with counted repetitions written out; repeated look-aheads that repeat much
     /// themselves; and with a back reference, loops in loops that can divide a text in several ways, as in `(a*)*`, or
     /// more than three loops like `.*` whose end the next character does not decide.
+    /// Throws `OdError`, naming the file, when the ignore file is there but cannot be read.
     explicit RepoIgnore(RootPath const& root);
 
     /// Appends the rules once more. Throws as the constructor does.

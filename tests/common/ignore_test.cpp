@@ -7,6 +7,7 @@
 #include "tests/support/temp_repository.h"
 
 #include <algorithm>
+#include <functional>
 #include <gmock/gmock.h>
 #include <random>
 #include <regex>
@@ -157,16 +158,30 @@ TEST(RepoIgnore, GivesACopyOfItsExpressions)
     EXPECT_EQ(ignore.expressions().size(), 3U);
 }
 
-// A file that is there but cannot be read gives no line, and the first line that is not there ends the list.
-TEST(RepoIgnore, HasNoRulesWhenItsFileCannotBeRead)
+std::string thrownAsOrdinaryUser(std::function<void()> const& body)
+{
+    return support::asOrdinaryUser([&]() -> std::string {
+        try {
+            body();
+        } catch (OdError const& error) {
+            return error.description().ansi_str();
+        }
+        return "nothing was thrown";
+    });
+}
+
+// It would count as empty, and a scan would offer what is meant to stay out.
+TEST(RepoIgnore, ThrowsWhenItsFileCannotBeRead)
 {
     TempRepository const repository;
     repository.ignore("^a$");
+    repository.add({"a"});
+    std::string const file = repository.pathTo(".tav/properties/ignore");
     ASSERT_EQ(chmod(repository.path().c_str(), 0755), 0);
-    ASSERT_EQ(chmod(repository.pathTo(".tav/properties/ignore").c_str(), 0), 0);
-    EXPECT_EQ(
-        support::asOrdinaryUser([&] { return std::to_string(RepoIgnore(repository.root()).expressions().size()); }),
-        "0");
+    ASSERT_EQ(chmod(file.c_str(), 0), 0);
+    std::string const message = "Could not read Ignore file '" + file + "'.";
+    EXPECT_EQ(thrownAsOrdinaryUser([&] { RepoIgnore const rules(repository.root()); }), message);
+    EXPECT_EQ(thrownAsOrdinaryUser([&] { static_cast<void>(common::collectRepoFiles(repository.root())); }), message);
 }
 
 TEST(RepoIgnoreWrite, CreatesTheFileWithTheDefaults)
