@@ -12,10 +12,13 @@
 
 #include <algorithm>
 #include <array>
-#include <cstdio>
 #include <string>
 #include <utility>
 #include <vector>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
 namespace common {
 
@@ -32,11 +35,21 @@ constexpr std::array<ChangeName, 3> kChangeNames = {{
     {FileChange::removed, L"removed"},
 }};
 
-/// Qt would encode the path by the process's locale, in which names of other scripts may have no form.
-std::FILE* openForAppending(std::string const& path)
+/// Opens the regular file `path`, or makes it; -1 when that fails. Qt would encode the path by the process's locale, in
+/// which names of other scripts may have no form, and would wait at a pipe until somebody reads from it.
+int openForAppending(std::string const& path)
 {
-    bool const isWhole = path.find('\0') == path.npos;
-    return isWhole ? std::fopen(path.c_str(), "ab") : nullptr;
+    constexpr mode_t kEverybody = 0666; // less the umask
+    if (path.find('\0') != path.npos) {
+        return -1;
+    }
+    int const file = open(path.c_str(), O_WRONLY | O_APPEND | O_CREAT | O_CLOEXEC | O_NONBLOCK | O_NOCTTY, kEverybody);
+    struct stat status {};
+    if (file >= 0 && (fstat(file, &status) != 0 || !S_ISREG(status.st_mode))) {
+        close(file);
+        return -1;
+    }
+    return file;
 }
 
 /// The digest of all bytes that the file had when it was opened; from the first that cannot be read, of zeros.
@@ -143,8 +156,8 @@ Versions<VersionedFile, std::shared_ptr<File>>::Versions(
 bool logString(OdString const& text, RootPath const& root)
 {
     QFile file(qut::toQt(root.logPath()));
-    std::FILE* const handle = openForAppending(root.logPath().ansi_str());
-    if (!handle || !file.open(handle, QIODevice::WriteOnly | QIODevice::Append, QFileDevice::AutoCloseHandle)) {
+    int const handle = openForAppending(root.logPath().ansi_str());
+    if (handle < 0 || !file.open(handle, QIODevice::WriteOnly | QIODevice::Append, QFileDevice::AutoCloseHandle)) {
         return false;
     }
     OdString time;

@@ -8,8 +8,10 @@
 #include "tests/support/temp_repository.h"
 
 #include <cerrno>
+#include <csignal>
 #include <cstdlib>
 #include <ctime>
+#include <fcntl.h>
 #include <fstream>
 #include <gmock/gmock.h>
 #include <limits>
@@ -404,8 +406,44 @@ TEST(LogString, FailsWhereNothingMayBeWritten)
 TEST(LogString, TakesNoNoticeOfADiskThatIsFull)
 {
     TempRepository const repository;
-    repository.makeLink(kLog, "/dev/full");
-    EXPECT_TRUE(logString(OdString(std::wstring(100'000, L'x').c_str()), repository.root()));
+    std::string const answer = support::inOwnProcess([&] {
+        rlimit const none{0, 0};
+        setrlimit(RLIMIT_FSIZE, &none);
+        signal(SIGXFSZ, SIG_IGN);
+        return logString(OdString(std::wstring(100'000, L'x').c_str()), repository.root()) ? "logged" : "refused";
+    });
+    EXPECT_EQ(answer, "logged");
+    EXPECT_EQ(repository.read(kLog), "");
+}
+
+// Opening a pipe waits until somebody reads from it.
+TEST(LogString, FailsAtOnceWhereAPipeHasThePlaceOfTheLog)
+{
+    TempRepository const repository;
+    ASSERT_EQ(mkfifo(repository.pathTo(kLog).c_str(), 0600), 0);
+    EXPECT_FALSE(logString(L"opened", repository.root()));
+    int const reader = open(repository.pathTo(kLog).c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC);
+    ASSERT_GE(reader, 0);
+    EXPECT_FALSE(logString(L"opened", repository.root()));
+    char byte = 0;
+    EXPECT_EQ(read(reader, &byte, 1), 0);
+    close(reader);
+}
+
+TEST(LogString, FailsWhereALinkLeadsToADevice)
+{
+    TempRepository const repository;
+    repository.makeLink(kLog, "/dev/null");
+    EXPECT_FALSE(logString(L"opened", repository.root()));
+}
+
+TEST(LogString, FollowsALinkToAFile)
+{
+    TempRepository const repository;
+    repository.write("elsewhere.log", "old\n");
+    repository.makeLink(kLog, repository.pathTo("elsewhere.log"));
+    EXPECT_TRUE(logString(L"opened", repository.root()));
+    EXPECT_THAT(repository.read("elsewhere.log"), testing::EndsWith(" - opened\n"));
 }
 
 TEST(LogString, FailsWhereTheProcessMayOpenNoMoreFiles)
