@@ -46,7 +46,6 @@ WriteOutcome writeDocument(OdString const& path, kutils::json::Value const& docu
 WriteOutcome writeText(OdString const& path, std::wstring const& text)
 {
     ut::TextFile file(path);
-    file.create();
     file.addLine(OdString(text.c_str(), text.size()));
     if (!file.write()) {
         return ErrorMessage(translate(L"Error writing to file '%ls'"), path.c_str());
