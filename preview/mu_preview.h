@@ -33,7 +33,7 @@ enum class Status : std::uint8_t {
 
 /// The form of a picture.
 enum class Kind : std::uint8_t {
-    none,
+    none,    ///< no picture was found
     bitmap,  ///< a device-independent bitmap without the file header that a .bmp file begins with
     png,     ///< a PNG file
     metafile ///< a Windows metafile; only its place is checked, and its size in pixels is not known
@@ -51,28 +51,28 @@ struct Limits {
 /// A file header makes a .bmp file of the bitmap. Its 14 bytes are, little-endian: "BM", 32 bits with the length of the
 /// bitmap plus 14, 32 zero bits, and 32 bits with `pixels` plus 14.
 struct BitmapLayout {
-    std::uint32_t bitsPerPixel = 0; ///< 1, 4, 8, 16, 24 or 32
-    std::uint32_t compression = 0;  ///< as in the header: 0 none, 1 and 2 run lengths, 3 and 6 none but with masks
-    std::uint32_t masks = 0;        ///< of red, green and blue, 32 bits each; 0 when there are none
-    std::uint32_t palette = 0;      ///< blue, green, red and, in entries of four bytes, an unused byte
-    std::uint32_t colors = 0;       ///< number of entries in the palette
-    std::uint32_t bytesPerColor = 0;
-    std::uint32_t pixels = 0;
-    std::uint32_t bytesPerRow = 0; ///< padding included; 0 for run lengths
-    bool isTopDown = false;        ///< the first row is the upper one; usually it is the lowest
+    std::uint32_t bitsPerPixel = 0;  ///< 1, 4, 8, 16, 24 or 32
+    std::uint32_t compression = 0;   ///< as in the header: 0 none, 1 and 2 run lengths, 3 and 6 none but with masks
+    std::uint32_t masks = 0;         ///< of red, green and blue, 32 bits each; 0 when there are none
+    std::uint32_t palette = 0;       ///< blue, green, red and, in entries of four bytes, an unused byte
+    std::uint32_t colors = 0;        ///< number of entries in the palette
+    std::uint32_t bytesPerColor = 0; ///< 3 after a header of 12 bytes, otherwise 4
+    std::uint32_t pixels = 0;        ///< the first row
+    std::uint32_t bytesPerRow = 0;   ///< padding included; 0 for run lengths
+    bool isTopDown = false;          ///< the first row is the upper one; usually it is the lowest
 };
 
 /// The picture of a drawing, or why there is none.
 struct Preview {
-    Status status = Status::none;
-    char const* reason = "";  ///< why there is no picture: an English sentence, never freed; "" when there is one
-    Kind kind = Kind::none;   ///< this and all that follows is set when the status is `found`
-    std::uint64_t offset = 0; ///< of the picture in the drawing
-    std::uint32_t length = 0; ///< of the picture in bytes
-    std::uint32_t width = 0;  ///< in pixels, at least 1; 0 for a metafile
-    std::uint32_t height = 0; ///< the same
-    BitmapLayout bitmap;      ///< of a bitmap
-    std::string_view bytes;   ///< the picture, inside the bytes given to `find`; empty when a `Source` was read
+    Status status = Status::none; ///< `found` when there is a picture
+    char const* reason = "";      ///< why there is no picture: an English sentence, never freed; "" when there is one
+    Kind kind = Kind::none;       ///< this and all that follows is set when the status is `found`
+    std::uint64_t offset = 0;     ///< of the picture in the drawing
+    std::uint32_t length = 0;     ///< of the picture in bytes
+    std::uint32_t width = 0;      ///< in pixels, at least 1; 0 for a metafile
+    std::uint32_t height = 0;     ///< the same
+    BitmapLayout bitmap;          ///< of a bitmap
+    std::string_view bytes;       ///< the picture, inside the bytes given to `find`; empty when a `Source` was read
 };
 
 /// A drawing that is read piece by piece, for files too long to be loaded whole. `find` reads at most five
