@@ -51,7 +51,9 @@ damagesOf(common::RootPath const& root, CommitTables const& commits, std::vector
 /// How the history that is known here differs from the server's; none when it does not, or the server is away.
 std::optional<Failure> differenceFromServer(LocalDatabase const& database)
 {
-    if (database.repositoryId().isEmpty()) {
+    bool const isUnfinished =
+        !database.unfinished().isEmpty(); // The server may have a commit already that is noted here.
+    if (database.repositoryId().isEmpty() || isUnfinished) {
         return std::nullopt;
     }
     HistoryComparison comparison;
