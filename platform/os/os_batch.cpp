@@ -1,5 +1,6 @@
 #include "platform/os/os_batch.h"
 
+#include "platform/os/os_detail.h"
 #include "platform/os/os_files.h"
 
 #include <algorithm>
@@ -13,14 +14,13 @@
 namespace os {
 namespace {
 
-using detail::Handle;
 using detail::kFolderFlags;
 using detail::lastError;
 using detail::openAt;
 using detail::outcome;
-using detail::Place;
-using detail::placeOf;
 using detail::retried;
+using detail::split;
+using detail::SplitPath;
 
 constexpr mode_t kFolderPermissions = 0777; // less the process's umask
 constexpr std::uint64_t kNanosecondsPerSecond = 1'000'000'000;
@@ -65,7 +65,7 @@ std::int64_t nanoseconds(timespec const& time)
 /// Removes a folder that holds nothing but folders. Links are entries like any others.
 std::error_code removeEmptyTree(int folder, std::string const& name)
 {
-    Handle opened = openAt(folder, name, kFolderFlags);
+    Handle opened = openAt(folder, name, kFolderFlags | O_NOFOLLOW);
     FolderReader const reader(opened.isOpen() ? fdopendir(opened.get()) : nullptr, closedir);
     if (!reader) {
         return lastError();
@@ -89,16 +89,11 @@ std::error_code copyBytes(Handle const& from, Handle const& to)
 {
     std::array<char, 65536> buffer;
     for (std::size_t count = buffer.size(); count == buffer.size();) {
-        if (std::error_code const error = readBytes(from.get(), buffer.data(), buffer.size(), count)) {
+        if (std::error_code const error = readBytes(from, buffer.data(), buffer.size(), count)) {
             return error;
         }
-        for (std::size_t done = 0; done < count;) {
-            ssize_t const written =
-                retried([&] { return calls().write(to.get(), buffer.data() + done, count - done); });
-            if (written == -1) {
-                return lastError();
-            }
-            done += static_cast<std::size_t>(written);
+        if (std::error_code const error = detail::writeAll(to, {buffer.data(), count})) {
+            return error;
         }
     }
     return {};
@@ -119,7 +114,7 @@ std::error_code copyFile(Handle const& from, Handle const& to)
     if (calls().futimens(to.get(), times.data()) == -1) {
         return lastError();
     }
-    return outcome(retried([&] { return calls().fsync(to.get()); }));
+    return detail::flush(to);
 }
 
 } // namespace
@@ -131,12 +126,12 @@ bool isSame(FileMark const& a, FileMark const& b)
            a.modified == b.modified && isSameChange;
 }
 
-Batch::Batch(std::string const& folder) : top_(openAt(AT_FDCWD, folder, O_RDONLY | O_DIRECTORY)) {}
+Batch::Batch(std::string const& folder) : top_(openAt(AT_FDCWD, folder, kFolderFlags)) {}
 
 std::error_code Batch::mark(std::string const& path, FileMark& mark)
 {
     mark = {};
-    auto const [folder, name] = placeOf(path);
+    auto const [folder, name] = split(path);
     std::error_code error = enter(folder, Missing::fails);
     struct stat status;
     if (!error) {
@@ -161,7 +156,7 @@ std::error_code Batch::mark(std::string const& path, FileMark& mark)
 
 std::error_code Batch::place(std::string const& from, std::string const& path)
 {
-    auto const [folder, name] = placeOf(path);
+    auto const [folder, name] = split(path);
     if (std::error_code const error = enter(folder, Missing::isMade)) {
         return error;
     }
@@ -207,7 +202,7 @@ std::error_code Batch::copy(std::string const& from, std::string const& name)
 
 std::error_code Batch::remove(std::string const& path)
 {
-    auto const [folder, name] = placeOf(path);
+    auto const [folder, name] = split(path);
     std::error_code error = enter(folder, Missing::fails);
     if (!error) {
         error = outcome(calls().unlinkat(current_.get(), name.c_str(), 0));
@@ -217,9 +212,9 @@ std::error_code Batch::remove(std::string const& path)
 
 void Batch::removeEmptyFoldersOf(std::string const& path)
 {
-    for (Place place = placeOf(placeOf(path).folder); !place.name.empty(); place = placeOf(place.folder)) {
-        if (enter(place.folder, Missing::fails) ||
-            calls().unlinkat(current_.get(), place.name.c_str(), AT_REMOVEDIR) == -1) {
+    for (SplitPath parts = split(split(path).folder); !parts.name.empty(); parts = split(parts.folder)) {
+        if (enter(parts.folder, Missing::fails) ||
+            calls().unlinkat(current_.get(), parts.name.c_str(), AT_REMOVEDIR) == -1) {
             return;
         }
     }
@@ -257,14 +252,14 @@ std::error_code Batch::enter(std::string const& folder, Missing missing)
     if (current_.isOpen() && currentPath_ == folder) {
         return {};
     }
-    Handle place = detail::walk(top_.get(), folder, missing == Missing::isMade ? openOrMake : openFolderIn);
-    if (!place.isOpen()) {
+    Handle opened = detail::walk(top_.get(), folder, missing == Missing::isMade ? openOrMake : openFolderIn);
+    if (!opened.isOpen()) {
         return lastError();
     }
-    if (std::error_code const error = noteFileSystem(place)) {
+    if (std::error_code const error = noteFileSystem(opened)) {
         return error;
     }
-    current_ = std::move(place);
+    current_ = std::move(opened);
     currentPath_ = folder;
     return {};
 }

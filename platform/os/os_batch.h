@@ -51,14 +51,14 @@ public:
 private:
     enum class Missing { fails, isMade };
     std::error_code enter(std::string const& folder, Missing missing);
-    std::error_code noteFileSystem(detail::Handle const& folder);
+    std::error_code noteFileSystem(Handle const& folder);
     std::error_code rename(std::string const& from, std::string const& name);
     std::error_code copy(std::string const& from, std::string const& name);
 
-    detail::Handle top_;
-    detail::Handle current_;
+    Handle top_;
+    Handle current_;
     std::string currentPath_;                             ///< of `current_`; empty for the top
-    std::map<std::uint64_t, detail::Handle> fileSystems_; ///< a folder of each that was entered, by device
+    std::map<std::uint64_t, Handle> fileSystems_; ///< a folder of each that was entered, by device
 };
 
 /// Sets the modification time of the file `path` (links followed) to nanoseconds since 1970-01-01T00:00:00Z.

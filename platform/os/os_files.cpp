@@ -1,7 +1,7 @@
 #include "platform/os/os_files.h"
 
 #include "platform/os/os_calls.h"
-#include "platform/os/os_handle.h"
+#include "platform/os/os_detail.h"
 
 #include <algorithm>
 #include <array>
@@ -25,43 +25,21 @@
 namespace os {
 namespace {
 
-using detail::Handle;
+using detail::Entry;
+using detail::flush;
+using detail::flushEntries;
+using detail::isPath;
+using detail::kFolderFlags;
 using detail::lastError;
 using detail::openAt;
 using detail::outcome;
 using detail::retried;
+using detail::systemError;
+using detail::writeAll;
 
-constexpr int kFolderFlags = O_RDONLY | O_DIRECTORY | O_CLOEXEC;
 constexpr int kMostLinks = 40;   // as many as the system follows in one path
 constexpr int kMostAttempts = 5; // at a temporary file that others take away
 constexpr char const* kAcl = "system.posix_acl_access";
-
-std::error_code systemError(int number)
-{
-    return {number, std::generic_category()};
-}
-
-bool isPath(std::string_view path)
-{
-    return path.find('\0') == std::string_view::npos;
-}
-
-std::error_code flush(Handle const& file)
-{
-    return outcome(retried([&] { return calls().fsync(file.get()); }));
-}
-
-std::error_code writeAll(Handle const& file, std::string_view content)
-{
-    while (!content.empty()) {
-        ssize_t const written = retried([&] { return calls().write(file.get(), content.data(), content.size()); });
-        if (written == -1) {
-            return lastError();
-        }
-        content.remove_prefix(static_cast<std::size_t>(written));
-    }
-    return {};
-}
 
 std::string folderOf(std::string const& path)
 {
@@ -81,13 +59,7 @@ std::string parentOf(std::string const& path)
     return end == std::string::npos ? "/" : folderOf(path.substr(0, end + 1));
 }
 
-// A name and the folder it stands in, open for looking names up.
-struct Place {
-    Handle folder;
-    std::string name;
-};
-
-std::error_code findPlace(int from, std::string const& path, Place& place)
+std::error_code findEntry(int from, std::string const& path, Entry& entry)
 {
     if (path.empty() || !isPath(path)) {
         return systemError(path.empty() ? ENOENT : EILSEQ);
@@ -96,24 +68,24 @@ std::error_code findPlace(int from, std::string const& path, Place& place)
     if (!folder.isOpen()) {
         return lastError();
     }
-    place = {std::move(folder), nameOf(path)};
-    return systemError(place.name.empty() ? EISDIR : 0);
+    entry = {std::move(folder), nameOf(path)};
+    return systemError(entry.name.empty() ? EISDIR : 0);
 }
 
-// Follows the links at the end of the path by hand: renaming over a link would replace the link.
-std::error_code findTarget(std::string const& path, Place& place)
+// Follows the links at the end of the path by hand: renaming over a link would reentry the link.
+std::error_code findTarget(std::string const& path, Entry& entry)
 {
-    std::error_code error = findPlace(AT_FDCWD, path, place);
+    std::error_code error = findEntry(AT_FDCWD, path, entry);
     std::array<char, PATH_MAX> link;
     for (int links = 0; !error; ++links) {
-        ssize_t const length = readlinkat(place.folder.get(), place.name.c_str(), link.data(), link.size());
+        ssize_t const length = readlinkat(entry.folder.get(), entry.name.c_str(), link.data(), link.size());
         if (length == -1) {
             return errno == EINVAL || errno == ENOENT ? std::error_code() : lastError();
         }
         if (links == kMostLinks) {
             return systemError(ELOOP);
         }
-        error = findPlace(place.folder.get(), std::string(link.data(), static_cast<std::size_t>(length)), place);
+        error = findEntry(entry.folder.get(), std::string(link.data(), static_cast<std::size_t>(length)), entry);
     }
     return error;
 }
@@ -121,17 +93,17 @@ std::error_code findTarget(std::string const& path, Place& place)
 // The status of the file that is to be replaced; none when there is no such file yet.
 using OldStatus = std::optional<struct stat>;
 
-std::error_code examineTarget(Place const& place, OldStatus& old)
+std::error_code examineTarget(Entry const& target, OldStatus& old)
 {
     struct stat status;
-    if (fstatat(place.folder.get(), place.name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == -1) {
+    if (fstatat(target.folder.get(), target.name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == -1) {
         return errno == ENOENT ? std::error_code() : lastError();
     }
     if (!S_ISREG(status.st_mode)) {
         return systemError(S_ISDIR(status.st_mode) ? EISDIR : EINVAL);
     }
     old = status;
-    return outcome(faccessat(place.folder.get(), place.name.c_str(), W_OK, AT_EACCESS));
+    return outcome(faccessat(target.folder.get(), target.name.c_str(), W_OK, AT_EACCESS));
 }
 
 // What the names of all temporary files for `name` begin with. Long names are cut so that the rest finds room, and not
@@ -186,7 +158,7 @@ FolderReader readerOf(Handle folder)
     return reader;
 }
 
-void removeAbandoned(Place const& target)
+void removeAbandoned(Entry const& target)
 {
     FolderReader const reader = readerOf(openAt(target.folder.get(), ".", kFolderFlags));
     std::string const prefix = tempPrefix(target.name);
@@ -219,7 +191,7 @@ std::error_code takeOwner(struct stat const& old, Handle const& file)
 }
 
 // The list of users and groups with rights of their own. The temporary file may have got one from its folder.
-std::error_code takeAccessList(Place const& target, Handle const& file)
+std::error_code takeAccessList(Entry const& target, Handle const& file)
 {
     std::string const path = "/proc/self/fd/" + std::to_string(target.folder.get()) + "/" + target.name;
     std::vector<char> list(XATTR_SIZE_MAX);
@@ -245,7 +217,7 @@ std::error_code takeMode(struct stat const& old, Handle const& file)
 }
 
 // In this order: a change of the owner takes away mode bits, the list of users changes them.
-std::error_code takePermissions(Place const& target, OldStatus const& old, Handle const& file)
+std::error_code takePermissions(Entry const& target, OldStatus const& old, Handle const& file)
 {
     if (!old) {
         return {};
@@ -269,7 +241,7 @@ std::error_code findFolder(std::string const& path)
 }
 
 // Reads on until the end shows: the file may grow meanwhile.
-std::error_code readAll(Handle const& file, std::string& content)
+std::error_code readToEnd(Handle const& file, std::string& content)
 {
     struct stat status;
     if (fstat(file.get(), &status) == -1) {
@@ -280,7 +252,7 @@ std::error_code readAll(Handle const& file, std::string& content)
     for (std::size_t wanted = static_cast<std::size_t>(status.st_size) + 1; total == bytes.size(); wanted *= 2) {
         bytes.resize(wanted);
         std::size_t done = 0;
-        if (auto const error = readBytes(file.get(), &bytes[total], wanted - total, done)) {
+        if (auto const error = readBytes(file, &bytes[total], wanted - total, done)) {
             return error;
         }
         total += done;
@@ -299,7 +271,7 @@ std::error_code tryAgain()
 // The new content beside the target until it takes the target's place. Removes itself unless it did.
 class TempFile {
 public:
-    explicit TempFile(Place const& target) : target_(target) {}
+    explicit TempFile(Entry const& target) : target_(target) {}
     TempFile(TempFile const&) = delete;
     TempFile& operator=(TempFile const&) = delete;
     ~TempFile()
@@ -384,12 +356,12 @@ private:
         return error == ENOENT || error == EACCES || error == EPERM || error == EXDEV || error == EOPNOTSUPP;
     }
 
-    Place const& target_;
+    Entry const& target_;
     Handle file_;
     std::string name_;
 };
 
-std::error_code replaceOnce(Place const& target, OldStatus const& old, std::string_view content, bool named)
+std::error_code replaceOnce(Entry const& target, OldStatus const& old, std::string_view content, bool named)
 {
     TempFile temp(target);
     mode_t const mode = old ? old->st_mode & 0600U : 0666U; // Nobody reads it before its permissions are right.
@@ -415,7 +387,7 @@ std::error_code replaceOnce(Place const& target, OldStatus const& old, std::stri
 
 std::error_code replaceFile(std::string const& path, std::string_view content)
 {
-    Place target;
+    Entry target;
     if (auto const error = findTarget(path, target)) {
         return error;
     }
@@ -437,7 +409,7 @@ std::error_code replaceFile(std::string const& path, std::string_view content)
 
 std::error_code replaceFileBy(std::string const& path, std::string const& source)
 {
-    Place target;
+    Entry target;
     if (auto const error = findTarget(path, target)) {
         return error;
     }
@@ -502,15 +474,15 @@ std::error_code makeFolders(std::string const& path, mode_t permissions)
 
 std::error_code removeFile(std::string const& path)
 {
-    Place place;
-    if (auto const error = findPlace(AT_FDCWD, path, place)) {
+    Entry entry;
+    if (auto const error = findEntry(AT_FDCWD, path, entry)) {
         return error;
     }
-    Handle const folder = openAt(place.folder.get(), ".", kFolderFlags);
+    Handle const folder = openAt(entry.folder.get(), ".", kFolderFlags);
     if (!folder.isOpen()) {
         return lastError();
     }
-    if (retried([&] { return calls().unlinkat(folder.get(), place.name.c_str(), 0); }) == -1) {
+    if (retried([&] { return calls().unlinkat(folder.get(), entry.name.c_str(), 0); }) == -1) {
         return lastError();
     }
     return flushEntries(folder);
@@ -547,48 +519,26 @@ FolderReader openFolder(std::string const& path)
     return readerOf(openAt(AT_FDCWD, path, kFolderFlags));
 }
 
-std::error_code openForReading(std::string const& path, int& file)
+std::error_code openForReading(std::string const& path, Handle& file)
 {
-    if (!isPath(path)) {
-        return systemError(EILSEQ);
-    }
-    Handle opened = openAt(AT_FDCWD, path, O_RDONLY | O_NONBLOCK | O_NOCTTY);
-    struct stat status;
-    if (!opened.isOpen() || fstat(opened.get(), &status) == -1) {
-        return lastError();
-    }
-    if (!S_ISREG(status.st_mode)) {
-        return systemError(S_ISDIR(status.st_mode) ? EISDIR : EINVAL);
-    }
-    file = opened.release();
-    return {};
+    return detail::openRegular(path, O_RDONLY, file);
 }
 
-std::error_code readBytes(int file, void* buffer, std::size_t count, std::size_t& done)
+std::error_code readBytes(Handle const& file, void* buffer, std::size_t count, std::size_t& done)
 {
-    for (done = 0; done < count;) {
-        void* const rest = static_cast<char*>(buffer) + done;
-        ssize_t const result = retried([&] { return calls().read(file, rest, count - done); });
-        if (result == -1) {
-            return lastError();
-        }
-        if (result == 0) {
-            break;
-        }
-        done += static_cast<std::size_t>(result);
-    }
-    return {};
+    return detail::readAll(buffer, count, done, [&](void* rest, std::size_t wanted, std::size_t) {
+        return calls().read(file.get(), rest, wanted);
+    });
 }
 
 std::error_code readFile(std::string const& path, std::string& content)
 {
-    int file = -1;
+    Handle file;
     if (auto const error = openForReading(path, file)) {
         return error;
     }
-    Handle const handle(file);
     try {
-        return readAll(handle, content);
+        return readToEnd(file, content);
     } catch (std::bad_alloc const&) {
         return systemError(ENOMEM);
     } catch (std::length_error const&) {

@@ -4,6 +4,7 @@
 #pragma once
 
 #include "platform/mu_platform_export.h"
+#include "platform/os/os_handle.h"
 
 #include <cstddef>
 #include <dirent.h>
@@ -60,13 +61,13 @@ using FolderReader = std::unique_ptr<DIR, int (*)(DIR*)>;
 /// Opens the folder `path`; null, with `errno` set, when it cannot be opened.
 MU_PLATFORM_EXPORT FolderReader openFolder(std::string const& path);
 
-/// Opens the regular file `path` (links followed) for reading. The caller closes `file`. Anything else than a regular
-/// file is refused without waiting for it.
-[[nodiscard]] MU_PLATFORM_EXPORT std::error_code openForReading(std::string const& path, int& file);
+/// Opens the regular file `path` (links followed) for reading. Anything else than a regular file is refused without
+/// waiting for it. `file` changes only on success.
+[[nodiscard]] MU_PLATFORM_EXPORT std::error_code openForReading(std::string const& path, Handle& file);
 
 /// Reads until `count` bytes are in `buffer` or the file ends. `done` is the number of bytes read, after an error too.
 [[nodiscard]] MU_PLATFORM_EXPORT std::error_code
-readBytes(int file, void* buffer, std::size_t count, std::size_t& done);
+readBytes(Handle const& file, void* buffer, std::size_t count, std::size_t& done);
 
 /// The whole content of the regular file `path`.
 [[nodiscard]] MU_PLATFORM_EXPORT std::error_code readFile(std::string const& path, std::string& content);

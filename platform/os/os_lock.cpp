@@ -1,8 +1,8 @@
 #include "platform/os/os_lock.h"
 
 #include "platform/os/os_calls.h"
+#include "platform/os/os_detail.h"
 #include "platform/os/os_files.h"
-#include "platform/os/os_handle.h"
 
 #include <cerrno>
 #include <fcntl.h>
@@ -45,35 +45,20 @@ std::error_code requireOwn(int file)
 
 } // namespace
 
-FileLock::FileLock(FileLock&& other) noexcept : file_(std::exchange(other.file_, -1)) {}
-
-FileLock& FileLock::operator=(FileLock&& other) noexcept
-{
-    std::swap(file_, other.file_);
-    return *this;
-}
-
-FileLock::~FileLock()
-{
-    if (file_ != -1) {
-        calls().close(file_);
-    }
-}
-
 std::error_code FileLock::acquire(std::string const& path, std::string const& note, std::chrono::milliseconds patience)
 {
     FileLock lock;
-    lock.file_ = calls().openat(AT_FDCWD, path.c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC, 0666);
-    if (lock.file_ == -1 || !lockWithin(lock.file_, patience)) {
+    lock.file_ = detail::openAt(AT_FDCWD, path, O_RDWR | O_CREAT | O_NOFOLLOW | O_NONBLOCK, 0666);
+    if (!lock.file_.isOpen() || !lockWithin(lock.file_.get(), patience)) {
         return lastError();
     }
-    if (std::error_code const error = requireOwn(lock.file_)) {
+    if (std::error_code const error = requireOwn(lock.file_.get())) {
         return error;
     }
     // Only the first line counts, so a longer note of before need not be cut off. A disk too full for the note is no
     // reason to refuse the lock.
     std::string const line = note + "\n";
-    [[maybe_unused]] auto const written = calls().write(lock.file_, line.data(), line.size());
+    [[maybe_unused]] auto const written = calls().write(lock.file_.get(), line.data(), line.size());
     *this = std::move(lock);
     return {};
 }

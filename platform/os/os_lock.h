@@ -2,6 +2,7 @@
 #pragma once
 
 #include "platform/mu_platform_export.h"
+#include "platform/os/os_handle.h"
 
 #include <chrono>
 #include <string>
@@ -10,14 +11,9 @@
 namespace os {
 
 /// A lock on a file that serves for nothing else. The system lets go of it when the process ends, however it ends.
+/// The file stays when the lock goes: removing it would let two processes lock two files of one name.
 class MU_PLATFORM_EXPORT FileLock {
 public:
-    FileLock() = default;
-    FileLock(FileLock&& other) noexcept;
-    FileLock& operator=(FileLock&& other) noexcept;
-    /// Lets go of the lock. The file stays: removing it would let two processes lock two files of one name.
-    ~FileLock();
-
     /// Makes the file `path` if need be, waits up to `patience` for its lock, and writes `note` into it, one line that
     /// tells others who holds it. `std::errc::operation_would_block` when another process held it all the time,
     /// `too_many_links` when the file has other names, `not_supported` when it is no file.
@@ -31,7 +27,7 @@ public:
     static std::string holder(std::string const& path);
 
 private:
-    int file_ = -1;
+    Handle file_;
 };
 
 } // namespace os

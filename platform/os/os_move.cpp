@@ -1,7 +1,7 @@
 #include "platform/os/os_move.h"
 
 #include "platform/os/os_calls.h"
-#include "platform/os/os_handle.h"
+#include "platform/os/os_detail.h"
 
 #include <cerrno>
 #include <cstdio>
@@ -12,28 +12,22 @@
 namespace os {
 namespace {
 
+using detail::Entry;
 using detail::flushEntries;
-using detail::Handle;
 using detail::lastError;
 using detail::openAt;
 using detail::outcome;
 
-/// An entry of a folder that is held open.
-struct Entry {
-    Handle folder;
-    std::string name;
-};
-
 std::error_code findEntry(std::string const& top, std::string const& path, Entry& entry)
 {
     auto const pass = [](int folder, std::string const& name) { return openAt(folder, name, detail::kPassingFlags); };
-    detail::Place place = detail::placeOf(path);
+    detail::SplitPath parts = detail::split(path);
     Handle const start = openAt(AT_FDCWD, top, O_PATH | O_DIRECTORY);
-    Handle const folder = start.isOpen() ? detail::walk(start.get(), place.folder, pass) : Handle();
+    Handle const folder = start.isOpen() ? detail::walk(start.get(), parts.folder, pass) : Handle();
     if (!folder.isOpen()) {
         return lastError();
     }
-    entry = {openAt(folder.get(), ".", detail::kFolderFlags), std::move(place.name)};
+    entry = {openAt(folder.get(), ".", detail::kFolderFlags), std::move(parts.name)};
     return entry.folder.isOpen() ? std::error_code() : lastError();
 }
 
@@ -60,7 +54,7 @@ std::error_code move(Entry const& from, Entry const& to)
 std::error_code moveEntry(std::string const& top, std::string const& from, std::string const& to, bool& hasMoved)
 {
     hasMoved = false;
-    if ((top + from + to).find('\0') != std::string::npos) {
+    if (!detail::isPath(top + from + to)) {
         return std::make_error_code(std::errc::invalid_argument);
     }
     Entry source;
@@ -71,7 +65,7 @@ std::error_code moveEntry(std::string const& top, std::string const& from, std::
     if (std::error_code const error = findEntry(top, to, target)) {
         return error;
     }
-    bool const isOneFolder = detail::placeOf(from).folder == detail::placeOf(to).folder;
+    bool const isOneFolder = detail::split(from).folder == detail::split(to).folder;
     if (std::error_code const error = move(source, target)) {
         return error;
     }

@@ -1,7 +1,8 @@
 #include "platform/os/os_open_file.h"
 
 #include "platform/os/os_calls.h"
-#include "platform/os/os_handle.h"
+#include "platform/os/os_detail.h"
+#include "platform/os/os_files.h"
 
 #include <atomic>
 #include <cerrno>
@@ -15,19 +16,11 @@
 namespace os {
 namespace {
 
+using detail::isPath;
 using detail::lastError;
 using detail::outcome;
 using detail::retried;
-
-std::error_code systemError(int number)
-{
-    return {number, std::generic_category()};
-}
-
-bool isPath(std::string const& path)
-{
-    return path.find('\0') == std::string::npos;
-}
+using detail::systemError;
 
 bool isOffset(std::uint64_t offset)
 {
@@ -42,73 +35,38 @@ std::string newUnnamedName(std::string const& folder)
 
 } // namespace
 
-OpenFile::OpenFile(OpenFile&& other) noexcept : file_(std::exchange(other.file_, -1)) {}
-
-OpenFile& OpenFile::operator=(OpenFile&& other) noexcept
-{
-    std::swap(file_, other.file_);
-    return *this;
-}
-
-// Interrupted or not, the system closes the file: a second call could hit another one.
-OpenFile::~OpenFile()
-{
-    if (file_ != -1) {
-        calls().close(file_);
-    }
-}
-
 std::error_code OpenFile::openAs(std::string const& path, int flags, mode_t permissions)
 {
     if (!isPath(path)) {
         return systemError(EILSEQ);
     }
-    OpenFile opened;
-    opened.file_ =
-        retried([&] { return calls().openat(AT_FDCWD, path.c_str(), flags | O_CLOEXEC | O_NOCTTY, permissions); });
+    Handle opened = detail::openAt(AT_FDCWD, path, flags | O_NOCTTY, permissions);
     if (!opened.isOpen()) {
         return lastError();
     }
-    std::swap(file_, opened.file_);
-    return {};
-}
-
-std::error_code OpenFile::openRegular(std::string const& path, int flags)
-{
-    OpenFile opened;
-    if (auto const error = opened.openAs(path, flags | O_NONBLOCK, 0)) {
-        return error;
-    }
-    struct stat status;
-    if (fstat(opened.file_, &status) == -1) {
-        return lastError();
-    }
-    if (!S_ISREG(status.st_mode)) {
-        return systemError(S_ISDIR(status.st_mode) ? EISDIR : EINVAL);
-    }
-    std::swap(file_, opened.file_);
+    file_ = std::move(opened);
     return {};
 }
 
 std::error_code OpenFile::openForReading(std::string const& path)
 {
-    return openRegular(path, O_RDONLY);
+    return os::openForReading(path, file_);
 }
 
 std::error_code OpenFile::openForChanging(std::string const& path)
 {
-    OpenFile opened;
-    if (auto const error = opened.openRegular(path, O_RDWR | O_NOFOLLOW)) {
+    Handle opened;
+    if (auto const error = detail::openRegular(path, O_RDWR | O_NOFOLLOW, opened)) {
         return error;
     }
     struct stat status;
-    if (fstat(opened.file_, &status) == -1) {
+    if (fstat(opened.get(), &status) == -1) {
         return lastError();
     }
     if (status.st_nlink > 1) {
         return systemError(EMLINK);
     }
-    std::swap(file_, opened.file_);
+    file_ = std::move(opened);
     return {};
 }
 
@@ -135,14 +93,14 @@ std::error_code OpenFile::createUnnamed(std::string const& folder)
     if (auto const error = removeUnflushed(name)) {
         return error;
     }
-    std::swap(file_, named.file_);
+    file_ = std::move(named.file_);
     return {};
 }
 
 std::error_code OpenFile::length(std::uint64_t& length) const
 {
     struct stat status;
-    if (fstat(file_, &status) == -1) {
+    if (fstat(file_.get(), &status) == -1) {
         return lastError();
     }
     length = static_cast<std::uint64_t>(status.st_size);
@@ -151,36 +109,21 @@ std::error_code OpenFile::length(std::uint64_t& length) const
 
 std::error_code OpenFile::readAt(std::uint64_t offset, void* buffer, std::size_t count, std::size_t& done) const
 {
-    for (done = 0; done < count && isOffset(offset + done);) {
-        void* const rest = static_cast<char*>(buffer) + done;
-        auto const place = static_cast<off_t>(offset + done);
-        ssize_t const result = retried([&] { return calls().pread(file_, rest, count - done, place); });
-        if (result == -1) {
-            return lastError();
-        }
-        if (result == 0) {
-            break;
-        }
-        done += static_cast<std::size_t>(result);
-    }
-    return {};
+    return detail::readAll(buffer, count, done, [&](void* rest, std::size_t wanted, std::size_t before) -> ssize_t {
+        bool const isThere = isOffset(offset + before);
+        return isThere ? calls().pread(file_.get(), rest, wanted, static_cast<off_t>(offset + before)) : 0;
+    });
 }
 
 std::error_code OpenFile::writeAt(std::uint64_t offset, std::string_view bytes) const
 {
-    while (!bytes.empty()) {
-        if (!isOffset(offset)) {
-            return systemError(EFBIG);
+    return detail::writeAll(bytes, [&](std::string_view rest, std::size_t before) -> ssize_t {
+        if (!isOffset(offset + before)) {
+            errno = EFBIG;
+            return -1;
         }
-        auto const place = static_cast<off_t>(offset);
-        ssize_t const written = retried([&] { return calls().pwrite(file_, bytes.data(), bytes.size(), place); });
-        if (written == -1) {
-            return lastError();
-        }
-        bytes.remove_prefix(static_cast<std::size_t>(written));
-        offset += static_cast<std::size_t>(written);
-    }
-    return {};
+        return calls().pwrite(file_.get(), rest.data(), rest.size(), static_cast<off_t>(offset + before));
+    });
 }
 
 std::error_code OpenFile::truncate(std::uint64_t length) const
@@ -188,17 +131,17 @@ std::error_code OpenFile::truncate(std::uint64_t length) const
     if (!isOffset(length)) {
         return systemError(EFBIG);
     }
-    return outcome(retried([&] { return calls().ftruncate(file_, static_cast<off_t>(length)); }));
+    return outcome(retried([&] { return calls().ftruncate(file_.get(), static_cast<off_t>(length)); }));
 }
 
 std::error_code OpenFile::flush() const
 {
-    return outcome(retried([&] { return calls().fsync(file_); }));
+    return detail::flush(file_);
 }
 
 std::error_code OpenFile::flushFileSystem() const
 {
-    std::error_code const error = outcome(retried([&] { return calls().syncfs(file_); }));
+    std::error_code const error = outcome(retried([&] { return calls().syncfs(file_.get()); }));
     bool const isUnknown = error == systemError(EINVAL) || error == systemError(EOPNOTSUPP);
     return isUnknown ? systemError(ENOSYS) : error;
 }

@@ -4,6 +4,7 @@
 #pragma once
 
 #include "platform/mu_platform_export.h"
+#include "platform/os/os_handle.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -18,11 +19,6 @@ namespace os {
 /// to open leaves that open.
 class MU_PLATFORM_EXPORT OpenFile {
 public:
-    OpenFile() = default;
-    OpenFile(OpenFile&& other) noexcept;
-    OpenFile& operator=(OpenFile&& other) noexcept;
-    ~OpenFile();
-
     /// The regular file `path`, links followed. Anything else is refused without waiting for it.
     [[nodiscard]] std::error_code openForReading(std::string const& path);
     /// The regular file `path`, to be read and written. A link is refused (`too_many_symbolic_link_levels`), and so is
@@ -38,7 +34,7 @@ public:
     [[nodiscard]] std::error_code createUnnamed(std::string const& folder);
 
     /// Whether something is open.
-    bool isOpen() const { return file_ != -1; }
+    bool isOpen() const { return file_.isOpen(); }
     /// Length in bytes.
     [[nodiscard]] std::error_code length(std::uint64_t& length) const;
     /// Reads until `count` bytes are in `buffer` or the file ends. `done` is the number of bytes read, after an error
@@ -58,9 +54,8 @@ public:
 
 private:
     std::error_code openAs(std::string const& path, int flags, mode_t permissions);
-    std::error_code openRegular(std::string const& path, int flags);
 
-    int file_ = -1;
+    Handle file_;
 };
 
 /// Gives the file `from` the name `to`, in place of a file of that name, without waiting for the disk.

@@ -1,44 +1,48 @@
 #include "platform/ut/File.h"
 
-#include "platform/os/os_calls.h"
 #include "platform/os/os_files.h"
 
 #include <sys/stat.h>
 
 namespace ut {
 
-File::~File()
-{
-    close();
-}
+struct File::Open {
+    os::Handle handle;
+};
+
+File::File() noexcept = default;
+
+File::~File() = default;
 
 bool File::open(OdString const& path, OpenMode /*mode*/)
 {
     close();
-    return !os::openForReading(path.ansi_str(), handle_);
+    auto opened = std::make_unique<Open>();
+    if (os::openForReading(path.ansi_str(), opened->handle)) {
+        return false;
+    }
+    open_ = std::move(opened);
+    return true;
 }
 
 std::uint64_t File::length() const
 {
     struct stat status;
-    return handle_ != -1 && fstat(handle_, &status) == 0 ? static_cast<std::uint64_t>(status.st_size) : 0;
+    return open_ && fstat(open_->handle.get(), &status) == 0 ? static_cast<std::uint64_t>(status.st_size) : 0;
 }
 
 std::size_t File::read(void* buffer, std::size_t count)
 {
     std::size_t done = 0;
-    if (handle_ != -1) {
-        static_cast<void>(os::readBytes(handle_, buffer, count, done)); // What was read counts, whatever ended it.
+    if (open_) {
+        static_cast<void>(os::readBytes(open_->handle, buffer, count, done)); // What was read counts, whatever ended it.
     }
     return done;
 }
 
 void File::close()
 {
-    if (handle_ != -1) {
-        os::calls().close(handle_);
-        handle_ = -1;
-    }
+    open_.reset();
 }
 
 } // namespace ut

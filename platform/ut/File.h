@@ -6,6 +6,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 
 namespace ut {
 
@@ -18,7 +19,7 @@ public:
         kRead = 0,
     };
 
-    File() noexcept = default;
+    File() noexcept;
     File(File const&) = delete;
     File& operator=(File const&) = delete;
     ~File();
@@ -34,7 +35,8 @@ public:
     void close();
 
 private:
-    int handle_ = -1;
+    struct Open;
+    std::unique_ptr<Open> open_;
 };
 
 } // namespace ut

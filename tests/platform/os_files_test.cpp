@@ -240,7 +240,7 @@ TEST(ReadBytes, CountsWhatWasReadBeforeAnError)
 {
     TempFolder const folder;
     folder.write("plan.dwg", "a whole content");
-    int file = -1;
+    os::Handle file;
     ASSERT_EQ(os::openForReading(folder.pathTo("plan.dwg"), file), std::error_code());
     KeptCalls const kept;
     static int calls;
@@ -253,7 +253,6 @@ TEST(ReadBytes, CountsWhatWasReadBeforeAnError)
     std::size_t done = 0;
     EXPECT_EQ(os::readBytes(file, buffer.data(), buffer.size(), done), fails(EIO));
     EXPECT_EQ(buffer.substr(0, done), "a wh");
-    os::calls().close(file);
 }
 
 TEST(OpenForReading, SaysWhyItFailed)
@@ -261,12 +260,12 @@ TEST(OpenForReading, SaysWhyItFailed)
     TempFolder const folder;
     folder.makeFolder("sub");
     ASSERT_EQ(mkfifo(folder.pathTo("pipe").c_str(), 0600), 0);
-    int file = -7;
+    os::Handle file;
     EXPECT_EQ(os::openForReading(folder.pathTo("missing"), file), fails(ENOENT));
     EXPECT_EQ(os::openForReading(folder.pathTo("sub"), file), fails(EISDIR));
     EXPECT_EQ(os::openForReading(folder.pathTo("pipe"), file), fails(EINVAL));
     EXPECT_EQ(os::openForReading(folder.path() + '\0', file), fails(EILSEQ));
-    EXPECT_EQ(file, -7);
+    EXPECT_FALSE(file.isOpen());
 }
 
 } // namespace
