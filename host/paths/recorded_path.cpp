@@ -2,16 +2,11 @@
 
 #include "host/text/characters.h"
 #include "host/text/wide.h"
-
-#include <fcntl.h>
-#include <sys/stat.h>
-#include <unistd.h>
+#include "platform/os/os_way.h"
 
 #include <algorithm>
 #include <array>
-#include <cerrno>
 #include <cstddef>
-#include <system_error>
 #include <vector>
 
 namespace tav {
@@ -231,58 +226,6 @@ char const* faultOf(OdString const& path)
     return nullptr;
 }
 
-constexpr int kFolderFlags = O_PATH | O_DIRECTORY | O_CLOEXEC;
-
-class Folder {
-public:
-    explicit Folder(int handle) : handle_(handle) {}
-    Folder(Folder const&) = delete;
-    Folder& operator=(Folder const&) = delete;
-    ~Folder() { take(-1); }
-
-    int handle() const { return handle_; }
-    bool isOpen() const { return handle_ >= 0; }
-    void take(int handle)
-    {
-        if (handle_ >= 0) {
-            close(handle_);
-        }
-        handle_ = handle;
-    }
-
-private:
-    int handle_;
-};
-
-std::string cannotBeExamined(OdString const& way)
-{
-    return quoted(way) + " cannot be examined: " + std::generic_category().message(errno) + ".";
-}
-
-/// Examines the entry `part` of `folder`, which is the last part of `way`, and goes into it unless it is the last of
-/// the path.
-std::optional<std::string> step(Folder& folder, OdString const& part, OdString const& way, bool isLast)
-{
-    std::string const name = part.ansi_str();
-    struct stat entry {};
-    if (fstatat(folder.handle(), name.c_str(), &entry, AT_SYMLINK_NOFOLLOW) != 0) {
-        bool const isFree = errno == ENOENT;
-        folder.take(-1);
-        return isFree ? std::nullopt : std::optional(cannotBeExamined(way));
-    }
-    if (S_ISLNK(entry.st_mode)) {
-        return quoted(way) + " is a symbolic link, which may lead out of the working folder.";
-    }
-    if (isLast) {
-        return std::nullopt;
-    }
-    if (!S_ISDIR(entry.st_mode)) {
-        return quoted(way) + " is no folder.";
-    }
-    folder.take(openat(folder.handle(), name.c_str(), kFolderFlags | O_NOFOLLOW));
-    return folder.isOpen() ? std::nullopt : std::optional(cannotBeExamined(way));
-}
-
 } // namespace
 
 std::optional<std::string> whyUnsafe(OdString const& path)
@@ -296,19 +239,17 @@ std::optional<std::string> whyUnsafe(OdString const& path)
 
 std::optional<std::string> linkOnTheWay(std::string const& root, OdString const& path)
 {
-    Folder folder(open(root.c_str(), kFolderFlags));
-    if (!folder.isOpen()) {
-        return cannotBeExamined(wide(root));
+    std::string const bytes = path.ansi_str();
+    os::Obstacle const obstacle = os::findObstacle(root, bytes);
+    OdString const way = wide(obstacle.length == 0 ? root : bytes.substr(0, obstacle.length));
+    switch (obstacle.kind) {
+    case os::Obstacle::Kind::none: return std::nullopt;
+    case os::Obstacle::Kind::link:
+        return quoted(way) + " is a symbolic link, which may lead out of the working folder.";
+    case os::Obstacle::Kind::notFolder: return quoted(way) + " is no folder.";
+    case os::Obstacle::Kind::unknown: break;
     }
-    std::vector<OdString> const parts = partsOf(path);
-    OdString way;
-    for (std::size_t i = 0; i < parts.size() && folder.isOpen(); ++i) {
-        way += (i == 0 ? OdString() : OdString(L"/")) + parts[i];
-        if (auto obstacle = step(folder, parts[i], way, i + 1 == parts.size())) {
-            return obstacle;
-        }
-    }
-    return std::nullopt;
+    return quoted(way) + " cannot be examined: " + obstacle.error.message() + ".";
 }
 
 } // namespace tav
