@@ -1,9 +1,9 @@
 #include "host/storage/content.h"
 
 #include "host/storage/storage_error.h"
+#include "platform/os/os_memory.h"
 
 #include <new>
-#include <sys/mman.h>
 
 namespace tav {
 
@@ -28,7 +28,7 @@ char* Buffer::reserve(std::size_t size)
         throw std::bad_alloc();
     }
     if (isLarge) {
-        madvise(bytes_.get(), room, MADV_HUGEPAGE); // Where it is refused, pages stay small.
+        os::adviseLargePages(bytes_.get(), room);
     }
     size_ = size;
     return bytes_.get();

@@ -1,5 +1,7 @@
 #include "platform/sdk/OdString.h"
 
+#include "platform/os/os_memory.h"
+
 #include <algorithm>
 #include <array>
 #include <clocale>
@@ -11,9 +13,6 @@
 #include <cwchar>
 #include <new>
 #include <utility>
-
-#include <sys/mman.h>
-#include <unistd.h>
 
 namespace {
 
@@ -100,18 +99,14 @@ std::size_t decodeBlock(unsigned char const*& at, unsigned char const* end, std:
     return count;
 }
 
-// An empty text with room for `length` characters. The first touch of a page costs more than writing the text into it,
-// so the memory of a very large one is asked for in large pages. Blocks of this size are mapped for themselves alone.
+// An empty text with room for `length` characters.
 std::wstring withRoom(std::size_t length)
 {
-    constexpr std::size_t kAlwaysMapped = std::size_t{32} << 20;
     std::wstring text;
     text.reserve(length);
     std::size_t const size = length * sizeof(wchar_t);
-    if (size > kAlwaysMapped) {
-        auto const page = static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
-        std::size_t const toPage = page - reinterpret_cast<std::uintptr_t>(text.data()) % page;
-        madvise(reinterpret_cast<char*>(text.data()) + toPage, size - toPage, MADV_HUGEPAGE);
+    if (size > os::kAlwaysMapped) {
+        os::adviseLargePages(text.data(), size);
     }
     return text;
 }
