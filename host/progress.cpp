@@ -16,11 +16,12 @@ constexpr std::uint64_t kWidth = 30;
 
 } // namespace
 
-Progress::Progress(std::string what, std::uint64_t total)
+Progress::Progress(std::string what, std::uint64_t total, Clock::time_point (*now)())
     : what_(std::move(what))
     , total_(std::max<std::uint64_t>(total, 1))
     , enabled_(isatty(STDERR_FILENO) == 1)
-    , next_(Clock::now() + kPatience)
+    , now_(now)
+    , next_(now() + kPatience)
 {
 }
 
@@ -34,10 +35,10 @@ Progress::~Progress()
 void Progress::advance(std::uint64_t count)
 {
     done_ += count;
-    if (!enabled_ || Clock::now() < next_) {
+    if (!enabled_ || now_() < next_) {
         return;
     }
-    next_ = Clock::now() + kInterval;
+    next_ = now_() + kInterval;
     drawn_ = true;
     draw();
 }

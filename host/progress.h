@@ -11,8 +11,10 @@ namespace tav {
 /// is no terminal. The line is wiped when the work is over.
 class Progress {
 public:
-    /// `total` is counted in the unit of `advance`; `what` names it ("files").
-    Progress(std::string what, std::uint64_t total);
+    using Clock = std::chrono::steady_clock;
+
+    /// `total` is counted in the unit of `advance`; `what` names it ("files"). `now` tells the time.
+    Progress(std::string what, std::uint64_t total, Clock::time_point (*now)() = Clock::now);
     Progress(Progress const&) = delete;
     Progress& operator=(Progress const&) = delete;
     ~Progress();
@@ -20,8 +22,6 @@ public:
     void advance(std::uint64_t count = 1);
 
 private:
-    using Clock = std::chrono::steady_clock;
-
     void draw() const;
 
     std::string what_;
@@ -29,6 +29,7 @@ private:
     std::uint64_t done_ = 0;
     bool enabled_;
     bool drawn_ = false;
+    Clock::time_point (*now_)();
     Clock::time_point next_;
 };
 

@@ -1,18 +1,70 @@
+#include "tests/host/run_here.h"
 #include "tests/host/tav_test.h"
 
 #include "host/repository/unfinished.h"
 
+#include "platform/os/os_calls.h"
 #include "platform/os/os_lock.h"
 
 #include <array>
+#include <cerrno>
 #include <chrono>
 #include <csignal>
+#include <fcntl.h>
 #include <memory>
-#include <thread>
+#include <sys/file.h>
 #include <unistd.h>
+#include <utility>
 
 namespace host_tests {
 namespace {
+
+std::vector<Arguments> const kChanges = {
+    {"init"}, {"add", "a.dwg"}, {"unstage", "b.dwg"}, {"mv", "a.dwg", "c.dwg"}, {"rm", "a.dwg"}, {"ignore", "--add", "x"},
+};
+
+/// A child tells its parent through a pipe that it has met a lock that somebody else holds.
+class MeetingOfALock {
+public:
+    MeetingOfALock() { EXPECT_EQ(pipe2(ends_.data(), O_CLOEXEC), 0); }
+    MeetingOfALock(MeetingOfALock const&) = delete;
+    MeetingOfALock& operator=(MeetingOfALock const&) = delete;
+    ~MeetingOfALock()
+    {
+        close(ends_[0]);
+        closeWriter();
+    }
+
+    /// In the child: from now on a lock that is taken is told.
+    void tell() const
+    {
+        writer = ends_[1];
+        os::calls().flock = [](int file, int operation) {
+            int const result = ::flock(file, operation);
+            int const error = errno;
+            if (result == -1 && error == EWOULDBLOCK) {
+                [[maybe_unused]] auto const told = ::write(writer, "", 1);
+            }
+            errno = error;
+            return result;
+        };
+    }
+
+    /// In the parent: whether the child has met the lock, and not ended before.
+    bool wait()
+    {
+        closeWriter();
+        char byte = 0;
+        return read(ends_[0], &byte, 1) == 1;
+    }
+
+private:
+    inline static int writer = -1;
+
+    void closeWriter() { close(std::exchange(ends_[1], -1)); }
+
+    std::array<int, 2> ends_{};
+};
 
 class Lock : public TavTest {
 protected:
@@ -30,37 +82,26 @@ protected:
     }
 };
 
-struct ChangingRow {
-    char const* name;
-    Arguments arguments;
-};
-
-class LockAgainstChanges
-    : public Lock
-    , public testing::WithParamInterface<ChangingRow> {};
-
-TEST_P(LockAgainstChanges, IsWaitedForShortlyAndItsHolderNamed)
+TEST_F(Lock, IsWaitedForBrieflyByEveryChangeAndItsHolderNamed)
 {
     std::vector<std::string> const before = repo.list();
     std::string const stateBefore = state();
     os::FileLock const lock = hold("'tav add', process 7 on \x1b[31melsewhere");
     auto const start = std::chrono::steady_clock::now();
-    EXPECT_EQ(
-        tav(GetParam().arguments), failed("tav: 'tav add', process 7 on \\x1B[31melsewhere, is changing the "
-                                          "repository. Run the command again when that "
-                                          "is done.\n"));
-    EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
+    std::vector<std::unique_ptr<Process>> processes; // They wait at the same time.
+    for (Arguments const& arguments : kChanges) {
+        processes.push_back(std::make_unique<Process>(setting(), arguments));
+    }
+    for (std::size_t i = 0; i < kChanges.size(); ++i) {
+        EXPECT_EQ(
+            processes[i]->wait(), failed("tav: 'tav add', process 7 on \\x1B[31melsewhere, is changing the repository. "
+                                         "Run the command again when that is done.\n"))
+            << kChanges[i].front();
+        EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::seconds(2)) << kChanges[i].front();
+    }
     EXPECT_EQ(repo.list(), before);
     EXPECT_EQ(state(), stateBefore);
 }
-
-INSTANTIATE_TEST_SUITE_P(
-    Commands, LockAgainstChanges,
-    testing::Values(
-        ChangingRow{"Init", {"init"}}, ChangingRow{"Add", {"add", "a.dwg"}},
-        ChangingRow{"Unstage", {"unstage", "b.dwg"}}, ChangingRow{"Mv", {"mv", "a.dwg", "c.dwg"}},
-        ChangingRow{"Rm", {"rm", "a.dwg"}}, ChangingRow{"IgnoreAdd", {"ignore", "--add", "x"}}),
-    rowName<ChangingRow>);
 
 TEST_F(Lock, DoesNotConcernCommandsThatOnlyRead)
 {
@@ -83,8 +124,13 @@ New, not staged:
 TEST_F(Lock, IsTakenOnceItsHolderIsDone)
 {
     auto lock = std::make_unique<os::FileLock>(hold("someone"));
-    Process process(setting(), {"add", "a.dwg"});
-    std::this_thread::sleep_for(std::chrono::milliseconds(500));
+    MeetingOfALock meeting;
+    Process process(setting(), [&] {
+        lock.reset(); // The copy that came with the process; the lock is still held here.
+        meeting.tell();
+        return runHere({"add", "a.dwg"});
+    });
+    EXPECT_TRUE(meeting.wait());
     EXPECT_TRUE(process.isRunning());
     lock.reset();
     EXPECT_EQ(process.wait(), done("Staged 1 file.\n"));

@@ -6,25 +6,33 @@
 
 #include <array>
 #include <chrono>
-#include <thread>
 
 namespace host_tests {
 namespace {
 
-void pause(int milliseconds)
+using Clock = tav::Progress::Clock;
+
+Clock::time_point time{};
+
+Clock::time_point now()
 {
-    std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
+    return time;
+}
+
+Setting settingOn(bool isOnTerminal)
+{
+    Setting setting;
+    setting.isOnTerminal = isOnTerminal;
+    return setting;
 }
 
 /// What a work of four files prints that takes this long for each.
 Outcome printedBy(bool isOnTerminal, std::array<int, 4> const& milliseconds)
 {
-    Setting setting;
-    setting.isOnTerminal = isOnTerminal;
-    Process process(setting, [&] {
-        tav::Progress progress("files", milliseconds.size());
+    Process process(settingOn(isOnTerminal), [&] {
+        tav::Progress progress("files", milliseconds.size(), now);
         for (int const duration : milliseconds) {
-            pause(duration);
+            time += std::chrono::milliseconds(duration);
             progress.advance();
         }
         return 0;
@@ -35,15 +43,23 @@ Outcome printedBy(bool isOnTerminal, std::array<int, 4> const& milliseconds)
 TEST(Progress, IsShownOnATerminalOnceTheWorkHasTakenLongAndWipedAtTheEnd)
 {
     EXPECT_EQ(
-        printedBy(true, {0, 600, 150, 150}).err, "\r[###############...............] 2 of 4 files"
+        printedBy(true, {499, 1, 100, 100}).err, "\r[###############...............] 2 of 4 files"
                                                  "\r[######################........] 3 of 4 files"
                                                  "\r[##############################] 4 of 4 files"
                                                  "\r\x1b[K");
 }
 
+TEST(Progress, IsDrawnTenTimesASecondAtMost)
+{
+    EXPECT_EQ(
+        printedBy(true, {600, 99, 1, 99}).err, "\r[#######.......................] 1 of 4 files"
+                                              "\r[######################........] 3 of 4 files"
+                                              "\r\x1b[K");
+}
+
 TEST(Progress, IsNotShownForShortWork)
 {
-    EXPECT_EQ(printedBy(true, {0, 0, 0, 0}), done(""));
+    EXPECT_EQ(printedBy(true, {0, 0, 0, 499}), done(""));
 }
 
 TEST(Progress, IsNotShownElsewhere)
@@ -53,11 +69,9 @@ TEST(Progress, IsNotShownElsewhere)
 
 TEST(Progress, OfNothingIsWhole)
 {
-    Setting setting;
-    setting.isOnTerminal = true;
-    Process process(setting, [] {
-        tav::Progress progress("files", 0);
-        pause(600);
+    Process process(settingOn(true), [] {
+        tav::Progress progress("files", 0, now);
+        time += std::chrono::milliseconds(600);
         progress.advance(0);
         return 0;
     });

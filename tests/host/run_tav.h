@@ -71,8 +71,4 @@ private:
 /// Runs tav to its end.
 Outcome run(Setting const& setting, Arguments const& arguments);
 
-/// Runs the commands of tav to their end in a copy of this process, where calls of the system can be made to fail and
-/// rights can be given up. `before` comes first.
-Outcome runCopy(Setting const& setting, Arguments const& arguments, std::function<void()> const& before);
-
 } // namespace host_tests
