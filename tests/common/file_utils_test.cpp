@@ -1,6 +1,7 @@
 #include "common/mu_common_file_utils.h"
 
 #include "tests/support/as_ordinary_user.h"
+#include "tests/support/rows.h"
 #include "tests/support/temp_repository.h"
 
 #include <ctime>
@@ -411,7 +412,7 @@ INSTANTIATE_TEST_SUITE_P(
             {"plan.base.dwg.dwg|plan.base.dwg.theirs.dwg|", "plan.theirs.dwg.dwg||plan.theirs.dwg.base.dwg"}},
         Conflict{"IgnoreRulesDoNotCount", {"plan.bak.base.dwg"}, {"plan.bak.dwg||plan.bak.base.dwg"}},
         Conflict{"OutsideAscii", {"\u56FE\xFF.base.dwg"}, {"\u56FE\xFF.dwg||\u56FE\xFF.base.dwg"}}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(CollectConflictPathsOf, ARepositoryWithoutConflictFolderAreNone)
 {

@@ -3,8 +3,10 @@
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/foreign_locale.h"
+#include "tests/support/rows.h"
 #include "tests/support/small_stack.h"
 #include "tests/support/temp_repository.h"
+#include "tests/support/utf8.h"
 
 #include <algorithm>
 #include <functional>
@@ -22,11 +24,6 @@ using common::RepoIgnore;
 using support::TempRepository;
 using testing::ElementsAre;
 using testing::IsEmpty;
-
-OdString toWide(std::string const& bytes)
-{
-    return {bytes.data(), bytes.size(), CP_UTF_8};
-}
 
 std::vector<std::string> rulesOf(RepoIgnore const& ignore)
 {
@@ -117,7 +114,7 @@ INSTANTIATE_TEST_SUITE_P(
         Content{"ByteOrderMark", "\xEF\xBB\xBF^a$", {"^a$"}},
         Content{"BlanksBelongToTheRule", " a \n\t", {" a ", "\t"}}, Content{"NumberSignIsNoComment", "#a", {"#a"}},
         Content{"OutsideAscii", "^\u56FE$", {"^\u56FE$"}}, Content{"NotUtf8", "^\xFF\x80$", {"^\xFF\x80$"}}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(RepoIgnore, AppendsTheRulesWhenItLoadsAgain)
 {
@@ -303,7 +300,7 @@ INSTANTIATE_TEST_SUITE_P(
         Rule{"OutsideAscii", "^\u56FE.*$", "\u56FE.dwg", ignored}, Rule{"NotUtf8", "^\xFF.*$", "\xFF.dwg", ignored},
         Rule{"EscapedDollar", "^a\\$", "a$", ignored}, Rule{"EscapedStar", "^a\\.*$", "a...", ignored},
         Rule{"EscapedBackslash", "^a\\\\$", "a\\", ignored}, Rule{"Placeholders", "^%s%n$", "%s%n", ignored}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(IgnoreRulesOfARepository, TellWhatAScanSkips)
 {
@@ -312,9 +309,9 @@ TEST(IgnoreRulesOfARepository, TellWhatAScanSkips)
     RepoIgnore const rules(repository.root());
     EXPECT_TRUE(rules.matches(L"plan.bak"));
     EXPECT_FALSE(rules.matches(L"plan.bak.dwg"));
-    EXPECT_FALSE(rules.matches(toWide(std::string(255, 'a'))));
-    EXPECT_TRUE(rules.matches(toWide(std::string(254, 'a') + "c")));
-    EXPECT_THROW(static_cast<void>(rules.matches(toWide(std::string(2'000, 'a')))), std::regex_error);
+    EXPECT_FALSE(rules.matches(support::fromUtf8(std::string(255, 'a'))));
+    EXPECT_TRUE(rules.matches(support::fromUtf8(std::string(254, 'a') + "c")));
+    EXPECT_THROW(static_cast<void>(rules.matches(support::fromUtf8(std::string(2'000, 'a')))), std::regex_error);
 }
 
 char const* const kInvalid[] = {"(",      ")",    "a)",    "[",     "[a",       "*a",   "+",       "?",   "a{2",
@@ -324,7 +321,7 @@ char const* const kInvalid[] = {"(",      ")",    "a)",    "[",     "[a",       
 TEST(InvalidRule, IsThrownOut)
 {
     for (char const* rule : kInvalid) {
-        EXPECT_THROW(RepoIgnore::compile(toWide(rule)), std::regex_error) << rule;
+        EXPECT_THROW(RepoIgnore::compile(support::fromUtf8(rule)), std::regex_error) << rule;
     }
 }
 
@@ -349,7 +346,7 @@ std::string fate(std::string const& rule, std::string const& name)
     std::string result;
     support::onSmallStack([&] {
         try {
-            result = std::regex_match(name, RepoIgnore::compile(toWide(rule))) ? "match" : "no match";
+            result = std::regex_match(name, RepoIgnore::compile(support::fromUtf8(rule))) ? "match" : "no match";
         } catch (std::regex_error const& error) {
             result = error.code() == std::regex_constants::error_complexity ? "refused" : error.what();
         }
@@ -393,7 +390,7 @@ INSTANTIATE_TEST_SUITE_P(
         Hostile{"LazyLoops", "(a*?)*?b", kLong, "no match"},
         Hostile{"NestedHundredDeep", repeated("(", 100) + "a" + repeated(")*", 100), kLong, "match"},
         Hostile{"SeveralLookAheads", "(" + kLookAheads + ".)*", kLong, "no match"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 std::string alternativesOf(std::size_t count)
 {
@@ -422,7 +419,7 @@ INSTANTIATE_TEST_SUITE_P(
         Hostile{"OneCharacterAndAnother", R"(^(.)\1+$)", kLong + "b", "no match"},
         Hostile{"TwoPartsTwice", R"(^(.*)_(.*)_\1_\2$)", "a_b_a_b", "match"},
         Hostile{"AlternativesTwice", R"(^(plan|site)-([0-9]+|[a-z]+)_\1$)", "site-12_site", "match"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     LongTexts, HostileRule,
@@ -431,7 +428,7 @@ INSTANTIATE_TEST_SUITE_P(
         Hostile{"Alternatives", "(a|b)*", kVeryLong, "match"}, Hostile{"LazyLoop", ".*?b", kVeryLong, "no match"},
         Hostile{"StarOfStar", "(a*)*b", kVeryLong, "no match"},
         Hostile{"Ending", "^.*\\.bak$", kVeryLong + ".bak", "match"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     TooDeep, HostileRule,
@@ -452,7 +449,7 @@ INSTANTIATE_TEST_SUITE_P(
         Hostile{"LookAheadsOneBehindTheOther", "(?=a)(?!b)a", "a", "match"},
         Hostile{"EscapedParenthesesAreText", repeated("\\(", 300), std::string(300, '('), "match"},
         Hostile{"ParenthesesInAClassAreText", "[" + std::string(300, '(') + "]", "(", "match"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     TooLarge, HostileRule,
@@ -476,7 +473,7 @@ INSTANTIATE_TEST_SUITE_P(
         Hostile{"LineThatFits", kLong, kLong, "match"},
         Hostile{"LookAheadInALargeRule", "(?=a)" + std::string(500, 'a'), kLong, "no match"},
         Hostile{"LargeLookAheadInALoop", "((?!" + repeated("a*", 300) + "b).)*", kLong, "refused"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     BackReferences, HostileRule,
@@ -510,7 +507,7 @@ INSTANTIATE_TEST_SUITE_P(
         Hostile{"BesideALookAheadOfManyWays", "(a)\\1(?=(b*)*c).*", "aa" + std::string(250, 'b'), "refused"},
         Hostile{"BesideALookAheadBehindALoop", "(a)\\1.*.*.*(?=.*x)y", "aa" + std::string(250, 'b'), "refused"},
         Hostile{"EscapedBackslashIsNone", "(a*)*\\\\1", "a\\1", "match"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 // These need more than a small stack, but no more than a thread has by itself.
 TEST(LargeRule, IsAnsweredUpToItsLimit)
@@ -521,7 +518,7 @@ TEST(LargeRule, IsAnsweredUpToItsLimit)
           std::string("a{16000}"), std::string("(a?){2000}"), repeated("(?=", 99) + "a" + repeated(")", 99),
           std::string("((a))*()\\3")}) {
         EXPECT_NO_THROW({
-            std::regex const compiled = RepoIgnore::compile(toWide(rule));
+            std::regex const compiled = RepoIgnore::compile(support::fromUtf8(rule));
             EXPECT_FALSE(std::regex_match("b", compiled)) << rule.substr(0, 20);
         }) << rule.substr(0, 20);
     }
@@ -588,7 +585,7 @@ TEST_P(RuleUnderLocale, IsCompiledAndMatchedTheSame)
 {
     support::ForeignLocale const locale(GetParam());
     for (SameEverywhere const& row : kSameEverywhere) {
-        EXPECT_EQ(std::regex_match(row.text, RepoIgnore::compile(toWide(row.rule))), row.matches)
+        EXPECT_EQ(std::regex_match(row.text, RepoIgnore::compile(support::fromUtf8(row.rule))), row.matches)
             << row.rule << " on " << row.text;
     }
 }
@@ -685,7 +682,7 @@ TEST(RandomRule, MatchesWhatTheStandardLibrarySays)
     Names names;
     for (int i = 0; i < 3000; ++i) {
         std::string const expression = expressions.next();
-        std::regex const ours = RepoIgnore::compile(toWide(expression));
+        std::regex const ours = RepoIgnore::compile(support::fromUtf8(expression));
         std::regex const standard(expression);
         for (int j = 0; j < 20; ++j) {
             std::string const name = names.next();

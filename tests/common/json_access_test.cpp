@@ -1,6 +1,7 @@
 #include "common/mu_common_json.h"
 #include "common/mu_common_json_keys.h"
 
+#include "tests/support/rows.h"
 #include "json/json_reader.h"
 
 #include <functional>
@@ -253,7 +254,7 @@ INSTANTIATE_TEST_SUITE_P(
         Integer{"Smallest", L"-9223372036854775808", 0, kMin64, 9223372036854775808U},
         Integer{"Bit63TurnsNegative", L"9223372036854775808", 0, kMin64, 9223372036854775808U},
         Integer{"Largest", L"18446744073709551615", -1, -1, kMax64}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(JsonDouble, IsReadFromANumberWithFractionOrExponent)
 {

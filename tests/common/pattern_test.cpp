@@ -1,5 +1,6 @@
 #include "common/mu_common_expression_ways.h"
 #include "common/mu_common_pattern.h"
+#include "tests/support/utf8.h"
 
 #include <cstddef>
 #include <gtest/gtest.h>
@@ -13,11 +14,6 @@ namespace {
 
 using common::CharacterRow;
 using common::NameFilter;
-
-OdString toWide(std::string const& bytes)
-{
-    return {bytes.data(), bytes.size(), CP_UTF_8};
-}
 
 class Dice {
 public:
@@ -66,7 +62,7 @@ std::string name(Dice& dice)
 bool isValid(std::string const& expression)
 {
     try {
-        static_cast<void>(common::compilePattern(toWide(expression), common::kLongestName));
+        static_cast<void>(common::compilePattern(support::fromUtf8(expression), common::kLongestName));
     } catch (std::regex_error const&) {
         return false;
     }
@@ -85,8 +81,8 @@ TEST(NameFilter, DecidesAsTheExpressionDoes)
         }
         ++valid;
         rows += CharacterRow::of(expression) ? 1 : 0;
-        NameFilter const filter(std::vector<OdString>{toWide(expression)});
-        std::regex const compiled = common::compilePattern(toWide(expression), common::kLongestName);
+        NameFilter const filter(std::vector<OdString>{support::fromUtf8(expression)});
+        std::regex const compiled = common::compilePattern(support::fromUtf8(expression), common::kLongestName);
         for (int i = 0; i < 500; ++i) {
             std::string const text = name(dice);
             ASSERT_EQ(filter.matches(text), std::regex_match(text, compiled)) << expression << " on " << text;
@@ -103,7 +99,7 @@ TEST(NameFilter, DecidesOnLongRowsAsTheExpressionDoes)
         for (std::size_t i = 0; i < length; ++i) {
             expression += "[0-9]";
         }
-        NameFilter const filter(std::vector<OdString>{toWide(expression)});
+        NameFilter const filter(std::vector<OdString>{support::fromUtf8(expression)});
         EXPECT_TRUE(filter.matches(digits)) << length;
         EXPECT_FALSE(filter.matches(digits + "7")) << length;
         EXPECT_FALSE(filter.matches(digits.substr(1))) << length;
@@ -220,7 +216,7 @@ TEST(StepsWayByWay, AreNeverMoreThanForeseen)
             continue;
         }
         ++accepted;
-        std::regex const compiled = common::compilePattern(toWide(expression), kLength);
+        std::regex const compiled = common::compilePattern(support::fromUtf8(expression), kLength);
         double const foreseen = common::stepsWayByWay(common::readExpression(expression), kLength);
         for (std::string const& text : texts) {
             ASSERT_LE(looksOfMatching(text, compiled), foreseen * kLength) << expression << " on " << text;

@@ -5,6 +5,7 @@
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
 #include "tests/support/foreign_locale.h"
+#include "tests/support/rows.h"
 #include "tests/support/temp_repository.h"
 
 #include <cerrno>
@@ -175,7 +176,7 @@ INSTANTIATE_TEST_SUITE_P(
         Candidate{"PathKnownStorageAndPrevious", PossibleRepoFile(kPlan, kKnownUrl, kOld), kUrl, kOld},
         Candidate{"PathUnknownStorageAndPrevious", PossibleRepoFile(kPlan, kUnknown, kOld), kUnknown, kOld},
         Candidate{"EmptyTextsAreSet", PossibleRepoFile(kPlan, OdString(), OdString()), OdString(), OdString()}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(Versions, OfTheWorkingFolderAreAggregatesInTheirOrder)
 {
@@ -530,7 +531,7 @@ INSTANTIATE_TEST_SUITE_P(
         Recorded{
             "LastByteOfSeveralPieces", kPiece + kPiece + kPiece + "q",
             "sh:5347148dcbbacc35d33d1da1ad47e99565be3a9804ed22011a1779ed759737c9", true}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(IsDifferentFrom, AStorageReferenceWithoutALookAtTheDisk)
 {

@@ -2,8 +2,10 @@
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
+#include "tests/support/rows.h"
 #include "tests/support/temp_folder.h"
 #include "tests/support/temp_repository.h"
+#include "tests/support/utf8.h"
 
 #include <cerrno>
 #include <gmock/gmock.h>
@@ -23,11 +25,6 @@ std::string got(OdString const& path, bool create)
 {
     Expected<RootPath> const result = RootPath::get(path, create);
     return result.hasValue() ? "root " + result.value().path().ansi_str() : result.error().message.ansi_str();
-}
-
-OdString toWide(std::string const& bytes)
-{
-    return {bytes.data(), bytes.size(), CP_UTF_8};
 }
 
 mode_t modeOf(std::string const& path)
@@ -64,7 +61,7 @@ INSTANTIATE_TEST_SUITE_P(
         Root{"NothingIsResolved", L"./a/../proj/.", L"./a/../proj/."}, Root{"Blanks", L" /w/proj/ ", L" /w/proj/ "},
         Root{"BackslashBelongsToTheName", L"/w/proj\\", L"/w/proj\\"},
         Root{"OutsideAscii", L"/w/Pl\u00E4ne \xDCFF/", L"/w/Pl\u00E4ne \xDCFF"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(RootPath, ComposesEveryPathOfTheRepository)
 {
@@ -140,7 +137,7 @@ INSTANTIATE_TEST_SUITE_P(
         Copies{
             "OutsideAscii", L"Pl\u00E4ne/\u56FE \xDCFF.dwg", L".tav/conflict/\u56FE \xDCFF.theirs.dwg",
             L".tav/conflict/\u56FE \xDCFF.base.dwg"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 struct Below {
     char const* name;
@@ -181,7 +178,7 @@ INSTANTIATE_TEST_SUITE_P(
         Below{"DoubledSeparatorInTheRoot", L"/w//proj/a.dwg", nullptr},
         Below{"Placeholders", L"/w/proj/%s%n.dwg", "%s%n.dwg"}, Below{"PlaceholdersElsewhere", L"/%s%n", nullptr},
         Below{"OutsideAscii", L"/w/proj/\u56FE \xDCFF.dwg", "\u56FE \xFF.dwg"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(RelativePathOfARootOutsideAscii, IsComparedCharacterByCharacter)
 {
@@ -342,7 +339,7 @@ TEST(RootPathGet, FailsForAPathThatTheSystemDoesNotTake)
 {
     TempFolder const folder;
     std::string const tooLong = folder.pathTo(std::string(300, 'n'));
-    EXPECT_EQ(got(toWide(tooLong), true), "Not able to create the version control folder: " + tooLong);
+    EXPECT_EQ(got(support::fromUtf8(tooLong), true), "Not able to create the version control folder: " + tooLong);
     EXPECT_EQ(got(L"", true), "Not able to create the version control folder: ");
     EXPECT_FALSE(RootPath::get(folder.widePathTo("proj") + L'\0' + L"more", true).hasValue());
     EXPECT_THAT(folder.list(), IsEmpty());

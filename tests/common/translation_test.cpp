@@ -4,6 +4,7 @@
 #include "common/mu_common_repo_prop.h"
 #include "common/mu_common_serialization.h"
 
+#include "tests/support/rows.h"
 #include "tests/support/temp_folder.h"
 
 #include <cstdlib>
@@ -186,7 +187,7 @@ INSTANTIATE_TEST_SUITE_P(
             {"Unsupported file change enum: %ls", "Unbekannte \u00C4nderung %ls!"},
             readUnknownChange,
             {"Unsupported file change enum: ge\u00E4ndert %n", "Unbekannte \u00C4nderung ge\u00E4ndert %n!"}}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(TranslatedText, IsTakenFromEveryCatalogueOfTheHost)
 {
@@ -234,7 +235,7 @@ INSTANTIATE_TEST_SUITE_P(
         Slip{"NoPlaceholder", "Unbekannt", "Unbekannt"},
         Slip{"EscapedPercentSign", "100%% unbekannt: %ls", "100% unbekannt: moved"},
         Slip{"EscapedPlaceholder", "%%ls unbekannt: %ls", "%ls unbekannt: moved"}, Slip{"Empty", "", nullptr}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 // Such a text is never formatted.
 TEST(TranslationOfATextWithoutPlaceholder, MayHoldPercentSigns)

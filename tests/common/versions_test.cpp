@@ -1,4 +1,5 @@
 #include "common/mu_common_versions.h"
+#include "tests/support/rows.h"
 
 #include <gmock/gmock.h>
 #include <string>
@@ -37,7 +38,7 @@ Digest const kDigests[] = {
 
 class Sha : public testing::TestWithParam<Digest> {};
 
-INSTANTIATE_TEST_SUITE_P(Standard, Sha, testing::ValuesIn(kDigests), [](auto const& row) { return row.param.name; });
+INSTANTIATE_TEST_SUITE_P(Standard, Sha, testing::ValuesIn(kDigests), support::rowName);
 
 TEST_P(Sha, OfBytesIsTheStandardDigest)
 {

@@ -3,6 +3,8 @@
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
+#include "tests/support/rows.h"
+#include "tests/support/utf8.h"
 
 #include <cerrno>
 #include <functional>
@@ -29,13 +31,13 @@ std::string checked(OdString const& path)
 
 std::string checked(std::string const& path)
 {
-    return checked(wide(path));
+    return checked(support::fromUtf8(path));
 }
 
 TEST(ConfigPath, KeepsWhatItIsGivenUnchecked)
 {
     for (char const* const path : {"", "a", "a/", "/a//b/../", "A"}) {
-        EXPECT_EQ(ConfigPath(wide(path)).path(), wide(path));
+        EXPECT_EQ(ConfigPath(support::fromUtf8(path)).path(), support::fromUtf8(path));
     }
 }
 
@@ -151,7 +153,7 @@ INSTANTIATE_TEST_SUITE_P(
         PathRow{"OneName", "mu_missing"}, PathRow{"TwoNames", "mu_missing/a"},
         PathRow{"SeparatorBehind", "mu_missing/"}, PathRow{"RootFolder", "/"}, PathRow{"SeveralSeparators", "//"},
         PathRow{"BelowTheRootFolder", "/mu_missing"}, PathRow{"TwoBelowTheRootFolder", "/mu_missing/a"}),
-    rowName);
+    support::rowName);
 
 TEST_P(ConfigFolderOutOfNothing, IsNotValid)
 {

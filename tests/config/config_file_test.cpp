@@ -1,9 +1,10 @@
 #include "tests/config/configurations.h"
-#include "tests/server/allocations.h"
+#include "tests/support/allocations.h"
 #include "tests/server/translations.h"
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/recording_io.h"
+#include "tests/support/rows.h"
 
 #include <gmock/gmock.h>
 #include <new>
@@ -91,7 +92,7 @@ INSTANTIATE_TEST_SUITE_P(
         FileRow{"ByteOrderMark", "\xEF\xBB\xBF" + map(kHouse), "/house = House (1)"},
         FileRow{"CarriageReturns", "{\r\n\"projects_map\"\r\n: []\r\n}\r\n", "no projects"},
         FileRow{"TextBehind", "{} and more", "no projects"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NoJson, ConfigFile,
@@ -99,7 +100,7 @@ INSTANTIATE_TEST_SUITE_P(
         FileRow{"Empty", "", kNoJson}, FileRow{"Blanks", " \n", kNoJson}, FileRow{"Words", "projects", kNoJson},
         FileRow{"CutOff", "{\"projects_map\": [", kNoJson}, FileRow{"LoneComma", "{,}", kNoJson},
         FileRow{"NulFirst", std::string("\0{}", 3), kNoJson}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OtherShapes, ConfigFile,
@@ -122,7 +123,7 @@ INSTANTIATE_TEST_SUITE_P(
             "BoolAsName", map(R"({"info": {"name": true, "uid": 1}, "path": ""})"), mismatch("string", "bool", "name")},
         FileRow{
             "NullAsUid", map(R"({"info": {"name": "", "uid": null}, "path": ""})"), mismatch("string", "null", "uid")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     MissingMembers, ConfigFile,
@@ -134,7 +135,7 @@ INSTANTIATE_TEST_SUITE_P(
         FileRow{"Uid", map(R"({"info": {"name": ""}, "path": ""})"), missing("uid")},
         FileRow{"UidUnderTheNameOfTheField", map(R"({"info": {"name": "", "cloud": ""}, "path": ""})"), missing("uid")},
         FileRow{"InTheSecondProject", map(kHouse + ", {}"), missing("info")}),
-    rowName);
+    support::rowName);
 
 TEST_P(ConfigFile, IsReadAsItIsAndLeftAsItWas)
 {
@@ -222,7 +223,7 @@ TEST(ConfigFileTooLargeForTheMemory, IsNotTakenForAWrongOne)
     RecordingIo const io;
     folder.write(kFile, "{\"other\": \"" + std::string(1'000'000, 'p') + "\"}");
     auto const loadIt = [&] { static_cast<void>(common::Config::load(folder.widePath(), io)); };
-    server::RefusedAllocations const refused(2'000'000);
+    support::RefusedAllocations const refused(2'000'000);
     EXPECT_THROW(loadIt(), std::bad_alloc);
 }
 

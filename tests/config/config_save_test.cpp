@@ -1,11 +1,12 @@
 #include "tests/config/configurations.h"
-#include "tests/server/allocations.h"
 #include "tests/server/examples.h"
 #include "tests/server/translations.h"
+#include "tests/support/allocations.h"
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
 #include "tests/support/recording_io.h"
+#include "tests/support/utf8.h"
 
 #include <array>
 #include <cerrno>
@@ -209,8 +210,8 @@ TEST_F(SavedConfig, IsNotMadeInAFolderThatHasBeenLockedSinceItWasLoaded)
     ASSERT_EQ(chmod(folder.path().c_str(), 0777), 0);
     std::string const path = folder.pathTo("own");
     std::string const reported = asOrdinaryUser([&] {
-        load(wide(path), io)->write(); // Its folder and its file are the child's own.
-        ConfigRef config = load(wide(path), io);
+        load(support::fromUtf8(path), io)->write(); // Its folder and its file are the child's own.
+        ConfigRef config = load(support::fromUtf8(path), io);
         config->write();
         chmod(path.c_str(), 0555);
         config.reset();
@@ -230,7 +231,7 @@ protected:
         folder.write(kFile, "{}");
         ConfigRef config = load(folder.widePath(), io);
         config->write()->add(L"/a", OdString(std::wstring(kLarge, L'x').c_str(), kLarge), L"1");
-        server::RefusedAllocations const refused(kLarge);
+        support::RefusedAllocations const refused(kLarge);
         config.reset();
         return io.calls();
     }

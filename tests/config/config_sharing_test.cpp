@@ -1,6 +1,7 @@
 #include "tests/config/configurations.h"
 
 #include "tests/support/recording_io.h"
+#include "tests/support/utf8.h"
 
 #include <gmock/gmock.h>
 #include <type_traits>
@@ -89,9 +90,9 @@ TEST_F(SharedConfig, IsAnotherOneForAnotherSpellingOfTheFolder)
     std::vector<ConfigRef> configs;
     for (std::string const& path :
          {folder.path(), folder.path() + "/", folder.path() + "//", folder.path() + "/.", folder.pathTo("link")}) {
-        configs.push_back(load(wide(path), io));
-        EXPECT_EQ(configs.back(), load(wide(path), io));
-        EXPECT_EQ(configs.back()->path().path(), wide(path));
+        configs.push_back(load(support::fromUtf8(path), io));
+        EXPECT_EQ(configs.back(), load(support::fromUtf8(path), io));
+        EXPECT_EQ(configs.back()->path().path(), support::fromUtf8(path));
     }
     EXPECT_EQ(std::set<ConfigRef>(configs.begin(), configs.end()).size(), configs.size());
 }

@@ -16,11 +16,6 @@ using ConfigRef = std::shared_ptr<common::Config>;
 
 inline char const* const kFile = "directories.state";
 
-inline OdString wide(std::string_view text)
-{
-    return {text.data(), text.size(), CP_UTF_8};
-}
-
 /// The projects in their order, "path = name (cloud)" each.
 inline std::string inWords(common::ConfigData const& data)
 {
@@ -51,8 +46,5 @@ inline ConfigRef load(OdString const& folder, common::IoInterface const& io)
     EXPECT_TRUE(config.hasValue()) << inWords(config.error());
     return config.hasValue() ? config.value() : nullptr;
 }
-
-/// Names a row of a table by its member `name`.
-inline constexpr auto rowName = [](auto const& row) { return std::string(row.param.name); };
 
 } // namespace configurations

@@ -1,6 +1,6 @@
 #include "tests/config/configurations.h"
 
-#include "tests/server/allocations.h"
+#include "tests/support/allocations.h"
 #include "tests/support/recording_io.h"
 
 #include <array>
@@ -177,7 +177,7 @@ TEST_F(Listeners, AreToldWhenThereIsNoMemory)
     add({0, 1, 2});
     told.reserve(listeners.size());
     {
-        server::RefusedAllocations const refused(0);
+        support::RefusedAllocations const refused(0);
         config.write();
     }
     EXPECT_THAT(told, ElementsAre(0, 1, 2));

@@ -1,4 +1,5 @@
 #include "tests/host/tav_test.h"
+#include "tests/support/rows.h"
 
 #include <gmock/gmock.h>
 
@@ -155,7 +156,7 @@ INSTANTIATE_TEST_SUITE_P(
         PathRow{"FolderAbove", "plans/north", {".."}, {"plans/a.dwg", "plans/b.dwg", "plans/north/a.dwg"}},
         PathRow{"Several", "plans", {"north", "../a.dwg"}, {"a.dwg", "plans/north/a.dwg"}},
         PathRow{"PartOfAPathElsewhere", "plans/north", {"plans/b"}, {"plans/b.dwg"}}),
-    rowName<PathRow>);
+    support::rowName);
 
 TEST_F(Add, TakesAbsolutePaths)
 {

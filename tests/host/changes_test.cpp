@@ -2,6 +2,7 @@
 #include "host/failure.h"
 
 #include "tests/support/temp_repository.h"
+#include "tests/support/utf8.h"
 
 #include <gmock/gmock.h>
 
@@ -20,12 +21,12 @@ protected:
     {
         std::string const content = "committed " + name;
         repo.write(name, content);
-        committed_[wide(name)] = L"po:" + generateSha(content.data(), static_cast<int>(content.size()));
+        committed_[support::fromUtf8(name)] = L"po:" + generateSha(content.data(), static_cast<int>(content.size()));
     }
 
     void index(std::string const& name, bool modified)
     {
-        state_.index[wide(name)] = {common::modifyTime(wide(name), repo.root()), modified};
+        state_.index[support::fromUtf8(name)] = {common::modifyTime(support::fromUtf8(name), repo.root()), modified};
     }
 
     common::RepoChanges compare() const
@@ -41,8 +42,6 @@ protected:
         }
         return files;
     }
-
-    static OdString wide(std::string const& name) { return OdString(name.data(), name.size(), CP_UTF_8); }
 
     static std::vector<std::string> unchanged(common::RepoChanges const& changes)
     {
@@ -115,7 +114,7 @@ TEST_F(Compare, ListsFilesInTheOrderOfPaths)
     for (char const* const name : {"b/z.dwg", "y.dwg", "a/x.dwg"}) {
         commit(name);
         repo.write(name, "other");
-        committed_[wide("gone/" + std::string(name))] = L"po:";
+        committed_[support::fromUtf8("gone/" + std::string(name))] = L"po:";
     }
     repo.add({"b/new.dwg", "new.dwg"});
     common::RepoChanges const changes = compare();
@@ -151,7 +150,7 @@ TEST_F(Compare, AsksForTheTimesOfAllOfManyFiles)
     for (int i = 1'000; i < 2'200; ++i) {
         names.push_back(std::to_string(i) + ".dwg");
         repo.write(names.back(), "not as committed");
-        committed_[wide(names.back())] = L"po:";
+        committed_[support::fromUtf8(names.back())] = L"po:";
         index(names.back(), i == 1'500 || i == 2'199);
     }
     common::RepoChanges const changes = compare();

@@ -1,4 +1,5 @@
 #include "tests/host/tav_test.h"
+#include "tests/support/rows.h"
 
 namespace host_tests {
 namespace {
@@ -159,7 +160,7 @@ INSTANTIATE_TEST_SUITE_P(
         HelpRow{"Add", {"add", "--help"}, kAddHelp}, HelpRow{"Unstage", {"unstage", "--help"}, kUnstageHelp},
         HelpRow{"Mv", {"mv", "--help"}, kMvHelp}, HelpRow{"Rm", {"rm", "--help"}, kRmHelp},
         HelpRow{"Files", {"files", "--help"}, kFilesHelp}, HelpRow{"Ignore", {"ignore", "--help"}, kIgnoreHelp}),
-    rowName<HelpRow>);
+    support::rowName);
 
 struct MisuseRow {
     char const* name;
@@ -249,7 +250,7 @@ INSTANTIATE_TEST_SUITE_P(
             "IgnoreAddAsDocument",
             {"ignore", "--add", "x", "--json"},
             "tav: --add excludes --json. Run 'tav ignore --help' to see how it is used.\n"}),
-    rowName<MisuseRow>);
+    support::rowName);
 
 TEST_F(CommandLine, WorksInTheFolderOfTheOptionC)
 {
@@ -372,7 +373,7 @@ INSTANTIATE_TEST_SUITE_P(
         FullDiskRow{"Files", {"files"}}, FullDiskRow{"FilesWithDigests", {"files", "--hash"}},
         FullDiskRow{"FilesAsDocument", {"files", "--json"}}, FullDiskRow{"Ignore", {"ignore"}},
         FullDiskRow{"IgnoreAdd", {"ignore", "--add", "x"}}),
-    rowName<FullDiskRow>);
+    support::rowName);
 
 } // namespace
 } // namespace host_tests

@@ -3,6 +3,7 @@
 #include "tests/host/tav_test.h"
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
+#include "tests/support/rows.h"
 
 #include <cerrno>
 #include <csignal>
@@ -123,7 +124,7 @@ INSTANTIATE_TEST_SUITE_P(
         CommandRow{"Add", {"add", "a.dwg"}, "a.dwg", stateWithAdded({"z.dwg", "a.dwg"})},
         CommandRow{"Unstage", {"unstage", "z.dwg"}, "a.dwg", kFreshState},
         CommandRow{"Mv", {"mv", "a.dwg", "b.dwg"}, "b.dwg", kRenamed}),
-    rowName<CommandRow>);
+    support::rowName);
 
 /// A repository of somebody else.
 class WithoutRights : public TavTest {

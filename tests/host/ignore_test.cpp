@@ -1,4 +1,5 @@
 #include "tests/host/tav_test.h"
+#include "tests/support/rows.h"
 
 namespace host_tests {
 namespace {
@@ -82,7 +83,7 @@ INSTANTIATE_TEST_SUITE_P(
         AddRow{"OtherScripts", "", "^План.*$", "^План.*$"}, AddRow{"NotUtf8", "", "^\xff$", "^\xff$"},
         AddRow{"Brackets", "", "[ab]", "[ab]"}, AddRow{"BracketsWithCommas", "", "[a,b]", "[a,b]"},
         AddRow{"LikeAnOption", "", "--all", "--all"}),
-    rowName<AddRow>);
+    support::rowName);
 
 TEST_F(Ignore, AddsARuleOnlyOnce)
 {
@@ -122,7 +123,7 @@ INSTANTIATE_TEST_SUITE_P(
         RefusalRow{
             "TooDeep", std::string(30000, '(') + std::string(30000, ')'),
             "tav: '" + std::string(30000, '(') + std::string(30000, ')') + "'" + kNoExpression}),
-    rowName<RefusalRow>);
+    support::rowName);
 
 TEST_F(Ignore, FailsForAFileThatCannotBeUsed)
 {

@@ -1,4 +1,5 @@
 #include "tests/host/tav_test.h"
+#include "tests/support/rows.h"
 
 #include <algorithm>
 #include <filesystem>
@@ -185,7 +186,7 @@ INSTANTIATE_TEST_SUITE_P(
         TargetRow{"IntoTheCurrentFolder", "plans", "../a.dwg", ".", "plans/a.dwg"},
         TargetRow{"IntoTheFolderAbove", "plans/north", "../../a.dwg", "..", "plans/a.dwg"},
         TargetRow{"WithDots", "plans", "north/../../a.dwg", "./north/../c.dwg", "plans/c.dwg"}),
-    rowName<TargetRow>);
+    support::rowName);
 
 TEST_F(Mv, MovesAFileToTheWorkingFolder)
 {

@@ -1,6 +1,7 @@
 #include "host/failure.h"
 #include "host/repository/names.h"
 
+#include "tests/support/rows.h"
 #include "tests/support/temp_repository.h"
 
 #include <gmock/gmock.h>
@@ -67,7 +68,7 @@ INSTANTIATE_TEST_SUITE_P(
         PathRow{"Beside", "/usr", "../usrX", nullptr}, PathRow{"LongerName", "/usr/sha", "share/a", nullptr},
         PathRow{"OtherCase", "/usr", "/USR/a", nullptr},
         PathRow{"AboveTheRootOfTheSystem", "/usr", "../../../../etc", nullptr}, PathRow{"Empty", "/usr", "", nullptr}),
-    [](testing::TestParamInfo<PathRow> const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(PathInRepositoryFailure, NamesWhatWasTypedAndTheWorkingFolder)
 {

@@ -1,6 +1,7 @@
 // Stored versions that are damaged, and working files that still have them.
 #include "tests/host/history_test.h"
 #include "tests/host/run_here.h"
+#include "tests/support/rows.h"
 
 #include "platform/os/os_calls.h"
 
@@ -187,7 +188,7 @@ INSTANTIATE_TEST_SUITE_P(
         CommandRow{"Checkout", {"checkout", "1"}}, CommandRow{"ForcedCheckout", {"checkout", "1", "--force"}},
         CommandRow{"Restore", {"restore", "a.dwg", "n.txt", "--from", "1"}},
         CommandRow{"Removal", {"rm", "a.dwg", "n.txt"}}),
-    rowName<CommandRow>);
+    support::rowName);
 
 TEST_F(Repair, IsMadeByAddOfAFileThatIsAsItWasCommitted)
 {

@@ -1,6 +1,7 @@
 #include "tests/host/history_test.h"
 #include "tests/host/run_here.h"
 #include "tests/host/tav_test.h"
+#include "tests/support/rows.h"
 
 #include "platform/os/os_calls.h"
 
@@ -379,7 +380,7 @@ INSTANTIATE_TEST_SUITE_P(
         BrokenRow{"Empty", "", kNoJson}, BrokenRow{"CutOff", "{ \"head\" : { \"reference\"", kNoJson},
         BrokenRow{"NotText", "\xff\xfe\x01", kNoJson}, BrokenRow{"NoHead", "{}", "State does not contain HEAD."},
         BrokenRow{"NoBranch", "{ \"head\" : {} }", "HEAD does not point to a branch."}),
-    rowName<BrokenRow>);
+    support::rowName);
 
 TEST_F(Status, FailsWithoutAState)
 {

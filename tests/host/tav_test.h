@@ -66,13 +66,6 @@ private:
     }
 };
 
-/// Names the rows of a table by their member `name`.
-template <class Row>
-std::string rowName(testing::TestParamInfo<Row> const& row)
-{
-    return row.param.name;
-}
-
 /// A state with `files` staged as added, in the order given.
 inline std::string stateWithAdded(std::initializer_list<std::string_view> files)
 {

@@ -1,5 +1,6 @@
 #include "host/paths/recorded_path.h"
 
+#include "tests/support/rows.h"
 #include "tests/support/temp_folder.h"
 
 #include <gtest/gtest.h>
@@ -19,11 +20,6 @@ struct Row {
     OdString path;
     std::string verdict;
 };
-
-std::string rowName(testing::TestParamInfo<Row> const& row)
-{
-    return row.param.name;
-}
 
 class RecordedPath : public testing::TestWithParam<Row> {};
 
@@ -93,7 +89,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"WideLettersWithoutADot", L"\uFF54\uFF41\uFF56", "safe"}, Row{"WideSlash", L"a\uFF0Fb", "safe"},
         Row{"Ellipsis", L"\u2026", "safe"}, Row{"Composed", L"\u00E9.dwg", "safe"},
         Row{"Decomposed", L"e\u0301.dwg", "safe"}, Row{"DeviceOfAnotherSystem", L"nul.dwg", "safe"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OutOfTheFolder, RecordedPath,
@@ -114,7 +110,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"OnlyABackslash", L"\\", because("\\", kBackslash)}, Row{"ThreeDots", L"a/...", because("a/...", kDots)},
         Row{"Blank", L"a/ /b", because("a/ /b", kDots)}, Row{"EmptyInside", L"a//b", because("a//b", kEmptyPart)},
         Row{"SlashAtTheEnd", L"a/", because("a/", kEmptyPart)}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Characters, RecordedPath,
@@ -133,7 +129,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"SurrogateBelowTheStrayBytes", L"a\xDC7F", because("a\\uDC7F", kUnsound)},
         Row{"StrayBytesThatAreNone", held("\xC3\xA9"), because("\\uDCC3\\uDCA9", kUnsound)},
         Row{"BeyondUnicode", OdString(L"a\x7FFFFFFF"), because("a\xEF\xBF\xBD", kUnsound)}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Lengths, RecordedPath,
@@ -152,7 +148,7 @@ INSTANTIATE_TEST_SUITE_P(
                     "...",
                 kLongPart)},
         Row{"LongPath", longPath(4097), because(std::string(100, 'a') + "...", kLong)}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OwnFolder, RecordedPath,
@@ -198,7 +194,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"OutOfProperties", L".tav/properties/../a", because(".tav/properties/../a", kDots)},
         Row{"SlashBehindProperties", L".tav/properties/", because(".tav/properties/", kEmptyPart)},
         Row{"InProperties", L".tav/properties/.tav/a", because(".tav/properties/.tav/a", kOwn)}),
-    rowName);
+    support::rowName);
 
 struct Range {
     char const* name;
@@ -228,7 +224,7 @@ INSTANTIATE_TEST_SUITE_P(
         Range{"JoinersAndMarks", 0x200B, 0x200F}, Range{"Directions", 0x202A, 0x202E},
         Range{"InvisibleOperators", 0x2060, 0x206F}, Range{"VariationSelectors", 0xFE00, 0xFE0F},
         Range{"ByteOrderMark", 0xFEFF, 0xFEFF}, Range{"Tags", 0xE0000, 0xE007F}),
-    [](testing::TestParamInfo<Range> const& range) { return std::string(range.param.name); });
+    support::rowName);
 
 TEST(ControlCharacters, StandInNoPath)
 {

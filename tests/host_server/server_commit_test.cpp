@@ -1,4 +1,5 @@
 #include "tests/host_server/server_test.h"
+#include "tests/support/rows.h"
 
 #include <gtest/gtest.h>
 
@@ -157,11 +158,6 @@ TEST_P(ServerCommitRefusal, NamesTheMemberAndChangesNothing)
     EXPECT_EQ(send(good), R"([{"commitNo":1,"hash":"<a>"}])");
 }
 
-std::string rowName(testing::TestParamInfo<Row> const& row)
-{
-    return row.param.name;
-}
-
 std::string type(std::string const& place, std::string const& wanted, std::string const& found)
 {
     return "'" + place + "' must be of type " + wanted + ", not " + found + ".";
@@ -212,7 +208,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"ReferenceOfWrongType", "\"references\":[", "\"references\":[0,", type("references[0]", "object", "int")},
         Row{"NameOfWrongType", "\"main\"", "1", type("references[0].name", "string", "int")},
         Row{"RefTypeOfWrongType", "\"branch\"", "1", type("references[0].refType", "string", "int")}),
-    rowName);
+    support::rowName);
 
 std::string const kHash = " must be a hash of 64 lower-case hexadecimal digits.";
 std::string const kDate = "'commits[0].annotation.date' must be a time such as '2024-03-05T14:07:09Z'.";
@@ -263,7 +259,7 @@ INSTANTIATE_TEST_SUITE_P(
             "'references[0].commitHash'" + kHash},
         Row{"OneNameTwice", "\"references\":[", R"("references":[{"commitHash":"<a>","name":"main","refType":"tag"},)",
             "'references' must not hold the name 'main' twice."}),
-    rowName);
+    support::rowName);
 
 std::string named(std::string const& fault)
 {
@@ -287,7 +283,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NumberAsName", "\"main\"", "\"12\"", named("could be taken for the number of a commit")},
         Row{"HashAsName", "main", "<a>", named("could be taken for the hash of a commit")},
         Row{"HashInCapitalsAsName", "main", "<A>", named("could be taken for the hash of a commit")}),
-    rowName);
+    support::rowName);
 
 class ServerCommitDate : public ServerCommit {
 protected:

@@ -1,6 +1,8 @@
 #include "tests/host_server/server_test.h"
 #include "tests/server/examples.h"
 #include "tests/server/outcome.h"
+#include "tests/support/rows.h"
+#include "tests/support/utf8.h"
 
 #include <gtest/gtest.h>
 
@@ -32,13 +34,14 @@ TEST_F(ServerDocuments, AreReadByTheLibrary)
         "2 <b> of [<a>]: ann said 'moves the stairs' at 1709647629 [new in po:<1>]]; "
         "references [branch main -> <b>, tag v1 -> <a>]");
     EXPECT_EQ(
-        words(
-            server::outcomeOf([&] { return deserializeReferences(server::wide(answerTo("references <id>", "[]"))); })),
+        words(server::outcomeOf(
+            [&] { return deserializeReferences(support::fromUtf8(answerTo("references <id>", "[]"))); })),
         "[branch main -> <b>, tag v1 -> <a>]");
     EXPECT_EQ(
-        server::outcomeOf([&] { return deserializeRepoDatas(server::wide(answerTo("repositories", ""))); }),
+        server::outcomeOf([&] { return deserializeRepoDatas(support::fromUtf8(answerTo("repositories", ""))); }),
         "[bridge is <id> '']");
-    EXPECT_EQ(server::outcomeOf([&] { return deserializeServerVersion(server::wide(answerTo("version", ""))); }), "1");
+    EXPECT_EQ(
+        server::outcomeOf([&] { return deserializeServerVersion(support::fromUtf8(answerTo("version", ""))); }), "1");
     EXPECT_EQ(
         words(server::outcomeOf([&] {
             std::string const again = commit('b', "a", {"new 1 plan"}, {});
@@ -102,7 +105,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"InitWithEmptyName", "init", R"({"name":""})", "'name' is empty."},
         Row{"InitWithLineEnd", "init", R"({"name":"a\nb"})", "'name' holds a control character."},
         Row{"InitWithBlank", "init", R"({"name":"a "})", "'name' begins or ends with a blank."}),
-    [](testing::TestParamInfo<Row> const& row) { return row.param.name; });
+    support::rowName);
 
 class ServerRequestOfHostileText : public server::ServerTest {};
 

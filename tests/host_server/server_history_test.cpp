@@ -1,4 +1,5 @@
 #include "tests/host_server/server_test.h"
+#include "tests/support/rows.h"
 
 #include "host/failure.h"
 #include "host/server/history_document.h"
@@ -108,6 +109,6 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NumberThatDoesNotAscend", R"("commitNo":2)", R"("commitNo":1)",
             "'commits[1]' must have a higher number than the one before it."},
         Row{"NoCommits", "commits", "others", "The document lacks the member 'commits'."}),
-    [](auto const& row) { return std::string(row.param.name); });
+    support::rowName);
 
 } // namespace

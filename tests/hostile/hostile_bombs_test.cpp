@@ -6,6 +6,7 @@
 
 #include "tests/host/history_test.h"
 #include "tests/host/run_here.h"
+#include "tests/support/rows.h"
 #include "tests/support/sanitized.h"
 
 #include <gmock/gmock.h>
@@ -135,7 +136,7 @@ TEST_P(BombInAFile, IsRefusedAsADocumentForTheServer)
     EXPECT_THAT(process.wait().code, AnyOf(1, 2));
 }
 
-INSTANTIATE_TEST_SUITE_P(Kinds, BombInAFile, testing::ValuesIn(kBombs), rowName<Bomb>);
+INSTANTIATE_TEST_SUITE_P(Kinds, BombInAFile, testing::ValuesIn(kBombs), support::rowName);
 
 TEST_P(BombInAFile, IsToldWhereACommandNotedWhatItHasBegun)
 {

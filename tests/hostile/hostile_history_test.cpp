@@ -5,6 +5,7 @@
 #include "host/text/wide.h"
 
 #include "tests/host/history_test.h"
+#include "tests/support/rows.h"
 
 #include <gmock/gmock.h>
 
@@ -114,7 +115,7 @@ INSTANTIATE_TEST_SUITE_P(
         PathRow{"ShortName", L"TAV~1/tav.state"}, PathRow{"Stream", L".tav::$INDEX_ALLOCATION/tav.state"},
         PathRow{"OutOfProperties", L".tav/properties/../tav.state"}, PathRow{"LineFeed", L"victim\n.dwg"},
         PathRow{"Escape", L"\x1B[2Jvictim.dwg"}),
-    rowName<PathRow>);
+    support::rowName);
 
 TEST_F(ForeignHistory, RemovesNothingOutsideOfTheRepository)
 {
@@ -203,7 +204,7 @@ INSTANTIATE_TEST_SUITE_P(
         UrlRow{"OfAStoreInAFolder", "tf:a/b#" + std::string(64, 'a')},
         UrlRow{"OfAnObjectThatIsNotThere", "po:" + std::string(64, 'a')},
         UrlRow{"OfAStoreThatIsNotThere", "tf:a#" + std::string(64, 'a')}),
-    rowName<UrlRow>);
+    support::rowName);
 
 /// Files in the place of what the tables hold.
 TEST_F(ForeignHistory, InAnotherShapeIsToldAndChangesNothing)

@@ -1,6 +1,7 @@
 // Names of files that a command line, a terminal or another file system may take for something else.
 #include "tests/host/history_test.h"
 #include "tests/host/run_here.h"
+#include "tests/support/rows.h"
 
 #include "platform/os/os_calls.h"
 
@@ -88,7 +89,7 @@ INSTANTIATE_TEST_SUITE_P(
     Forms, NameWithADash,
     testing::Values(
         Form{"BehindTwoDashes", {"--"}, "-rf.dwg", "-v.dwg"}, Form{"WithItsFolder", {}, "./-rf.dwg", "./-v.dwg"}),
-    rowName<Form>);
+    support::rowName);
 
 TEST_F(Names, ThatAreNoTextComeBackByteForByte)
 {
@@ -425,7 +426,7 @@ INSTANTIATE_TEST_SUITE_P(
         SwapRow{"CheckoutByForce", {"checkout", "1", "--force"}, Meanwhile::whenRenamed},
         SwapRow{"RestoreWhenItFlushes", {"restore", "sub", "--from", "1"}, Meanwhile::whenFlushed},
         SwapRow{"RestoreWhenItRenames", {"restore", "sub", "--from", "1"}, Meanwhile::whenRenamed}),
-    rowName<SwapRow>);
+    support::rowName);
 
 class MovedFromSwappedFolder
     : public HistoryTest

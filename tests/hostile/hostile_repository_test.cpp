@@ -2,6 +2,7 @@
 #include "tests/host/history_test.h"
 #include "tests/host/run_here.h"
 #include "tests/support/as_ordinary_user.h"
+#include "tests/support/rows.h"
 
 #include "common/mu_common_versions.h"
 
@@ -120,7 +121,7 @@ INSTANTIATE_TEST_SUITE_P(
         OddRow{"Database", ".tav/tav.db", kAll, ".*tav\\.db.*"},
         OddRow{"Lock", ".tav/tav.lock", kChanging, ".*locked.*"},
         OddRow{"Rules", ".tav/properties/ignore", kScanning, ".*ignore.*"}),
-    rowName<OddRow>);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Own, PipeInItsPlace,
@@ -133,7 +134,7 @@ INSTANTIATE_TEST_SUITE_P(
         OddRow{"Stores", ".tav/tf", {{"restore", "a.dwg", "--force"}, {"verify"}}, ".*"},
         OddRow{"Restoring", ".tav/restoring", {{"restore", "a.dwg", "--force"}, {"checkout", "1", "--force"}}, ".*"},
         OddRow{"Folder", ".tav", kAll, ".*is not a tav directory.*"}),
-    rowName<OddRow>);
+    support::rowName);
 
 TEST_F(OddRepository, WithAPipeAmongItsFilesIsNotHeldUp)
 {
@@ -242,7 +243,7 @@ INSTANTIATE_TEST_SUITE_P(
         LinkRow{"Own", ".tav"}, LinkRow{"Objects", ".tav/objects"}, LinkRow{"Stores", ".tav/tf"},
         LinkRow{"Incoming", ".tav/objects/incoming"}, LinkRow{"Restoring", ".tav/restoring"},
         LinkRow{"Properties", ".tav/properties"}, LinkRow{"Conflicts", ".tav/conflict"}),
-    rowName<LinkRow>);
+    support::rowName);
 
 /// A file of the repository is a link to a file of somebody else.
 class LinkInAFilesPlace

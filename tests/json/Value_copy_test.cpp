@@ -1,6 +1,6 @@
 // Copying, moving and destroying values: what becomes of the two sides, and of memory that runs out half-way.
 #include "tests/json/documents.h"
-#include "tests/json/scarce_memory.h"
+#include "tests/support/allocations.h"
 
 #include <gtest/gtest.h>
 #include <memory>
@@ -9,8 +9,8 @@
 namespace {
 
 using namespace documents;
-using scarce_memory::usedBlocks;
-using scarce_memory::worksWithin;
+using support::WatchedMemory;
+using support::worksWithin;
 
 /// Every kind of value, nested in each other, with texts too long to need no memory.
 Value richValue()
@@ -45,9 +45,9 @@ TEST(JsonValueCopy, LeavesNothingBehindWhicheverAllocationFails)
     Value const original = richValue();
     long limit = 0;
     for (bool copied = false; !copied; ++limit) {
-        long const before = usedBlocks();
+        WatchedMemory const memory;
         copied = worksWithin(limit, [&] { Value const copy = original; });
-        ASSERT_EQ(usedBlocks(), before) << "with " << limit << " blocks";
+        ASSERT_EQ(memory.blocks(), 0) << "with " << limit << " requests";
     }
     EXPECT_GT(limit, 20) << "the value is too simple for this test";
 }
@@ -61,7 +61,7 @@ TEST(JsonValueCopy, AssignmentChangesNothingWhicheverAllocationFails)
             EXPECT_EQ(target, original);
             return;
         }
-        ASSERT_EQ(target, Value(Array{L"a text that was there before"})) << "with " << limit << " blocks";
+        ASSERT_EQ(target, Value(Array{L"a text that was there before"})) << "with " << limit << " requests";
     }
 }
 
@@ -71,14 +71,14 @@ TEST(JsonValueCopy, ReadingChangesNothingWhicheverAllocationFails)
     for (long limit = 0;; ++limit) {
         Value target = L"before";
         bool read = false;
-        long const before = usedBlocks();
+        WatchedMemory const memory;
         if (worksWithin(limit, [&] { read = read_string(target, text); })) {
             EXPECT_TRUE(read);
             EXPECT_EQ(target, richValue());
             return;
         }
-        ASSERT_EQ(target, Value(L"before")) << "with " << limit << " blocks";
-        ASSERT_EQ(usedBlocks(), before) << "with " << limit << " blocks";
+        ASSERT_EQ(target, Value(L"before")) << "with " << limit << " requests";
+        ASSERT_EQ(memory.blocks(), 0) << "with " << limit << " requests";
     }
 }
 
@@ -87,13 +87,13 @@ TEST(JsonValueCopy, WritingPassesOnThatMemoryRanOut)
     Value const value = Array{std::wstring(100'000, L'\x0001'), richValue()};
     std::wstring const whole = kutils::json::write_string(value, true);
     for (long limit = 0;; ++limit) {
-        long const before = usedBlocks();
+        WatchedMemory const memory;
         std::wstring text;
         if (worksWithin(limit, [&] { text = kutils::json::write_string(value, true); })) {
             EXPECT_EQ(text, whole);
             return;
         }
-        ASSERT_EQ(usedBlocks(), before) << "with " << limit << " blocks";
+        ASSERT_EQ(memory.blocks(), 0) << "with " << limit << " requests";
     }
 }
 

@@ -1,4 +1,5 @@
 #include "tests/json/documents.h"
+#include "tests/support/rows.h"
 
 #include <cmath>
 #include <cstdint>
@@ -59,7 +60,7 @@ INSTANTIATE_TEST_SUITE_P(
         TypeRow{"Int", 7, Value_type::integer, false}, TypeRow{"Int64", std::int64_t{7}, Value_type::integer, false},
         TypeRow{"Uint64", std::uint64_t{7}, Value_type::integer, true}, TypeRow{"Double", 7.0, Value_type::real, false},
         TypeRow{"Float", 7.0F, Value_type::real, false}),
-    rowName);
+    support::rowName);
 
 TEST_P(JsonValueOf, HasItsType)
 {
@@ -246,7 +247,7 @@ INSTANTIATE_TEST_SUITE_P(
         EqualityRow{"ObjectThatGoesOn", Object{{L"a", 1}, {L"b", 1}}, Object{{L"a", 1}}, false},
         EqualityRow{"NestedDifference", Array{Object{{L"a", Array{1}}}}, Array{Object{{L"a", Array{2}}}}, false},
         EqualityRow{"DifferenceBehindAnotherContainer", Array{Array{}, 1}, Array{Array{}, 2}, false}),
-    rowName);
+    support::rowName);
 
 TEST_P(JsonValueEquality, HoldsBothWays)
 {

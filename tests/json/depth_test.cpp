@@ -1,6 +1,6 @@
 // Documents nested a million deep, on a small call stack.
 #include "tests/json/documents.h"
-#include "tests/support/sanitized.h"
+#include "tests/support/rows.h"
 #include "tests/support/small_stack.h"
 
 #include <gtest/gtest.h>
@@ -43,7 +43,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"ObjectsThatAreLast", L"{\"a\":2,\"b\":", L"1", L"}"},
         Row{"ArraysBetweenContainers", L"[[],{},", L"1", L",[],{}]"},
         Row{"ObjectsBetweenContainers", L"{\"a\":[],\"b\":", L"1", L",\"c\":{}}"}),
-    rowName);
+    support::rowName);
 
 TEST_P(JsonDepth, IsReadAndDestroyed)
 {

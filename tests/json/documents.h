@@ -56,7 +56,4 @@ inline std::wstring repeat(std::wstring const& text, std::size_t count)
     return all;
 }
 
-/// Names a row of a table by its member `name`.
-inline constexpr auto rowName = [](auto const& row) { return std::string(row.param.name); };
-
 } // namespace documents

@@ -1,5 +1,6 @@
 // What the locale of the process decides, and what not.
 #include "tests/json/documents.h"
+#include "tests/support/rows.h"
 
 #include <algorithm>
 #include <clocale>
@@ -118,7 +119,7 @@ INSTANTIATE_TEST_SUITE_P(
         PrintableRow{"HeldByte", L'\xDC80', L"\\uDC80", L"\\uDC80"},
         PrintableRow{"Emoji", L'\x1F600', L"\\uF600", L"\x1F600"},
         PrintableRow{"LastCharacter", L'\x10FFFF', L"\\uFFFF", L"\\uFFFF"}),
-    rowName);
+    support::rowName);
 
 TEST_P(JsonPrintable, IsDecidedByTheLocale)
 {

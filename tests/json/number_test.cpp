@@ -1,5 +1,6 @@
 // Which numbers the texts of numbers become: those of the C library.
 #include "tests/json/documents.h"
+#include "tests/support/rows.h"
 
 #include <cmath>
 #include <cstdint>
@@ -55,7 +56,7 @@ INSTANTIATE_TEST_SUITE_P(
         IntegerRow{"NextToTheSmallestSigned", L"-9223372036854775807", (std::uint64_t{1} << 63) + 1, false},
         IntegerRow{"BelowTheSmallestSigned", L"-9223372036854775809", std::uint64_t{1} << 63, false},
         IntegerRow{"FarBelowTheSmallestSigned", L"-99999999999999999999999", std::uint64_t{1} << 63, false}),
-    rowName);
+    support::rowName);
 
 TEST_P(JsonInteger, IsTheNearestOfItsKind)
 {
@@ -103,7 +104,7 @@ INSTANTIATE_TEST_SUITE_P(
         RealRow{"JustAboveHalfway", L"9007199254740993." + zeroes(1000) + L"1"},
         RealRow{"JustAboveHalfwayInDigitsThatAreCutOff", L"9007199254740993" + zeroes(1000) + L"1e-1001"},
         RealRow{"FiftyDigits", L"6631236871469758276785396630275967242439909094328385.0"}),
-    rowName);
+    support::rowName);
 
 TEST_P(JsonReal, IsTheNearestDouble)
 {

@@ -1,5 +1,6 @@
 // What documents become, and which are refused.
 #include "tests/json/documents.h"
+#include "tests/support/rows.h"
 
 #include <cstdint>
 #include <gtest/gtest.h>
@@ -64,7 +65,7 @@ INSTANTIATE_TEST_SUITE_P(
             "ContainersBehindContainers", L"{\"a\":[{}],\"b\":{\"c\":[]}}",
             Object{{L"a", Array{Object()}}, {L"b", Object{{L"c", Array()}}}}},
         AcceptedRow{"ControlCharacterInString", L"\"\x01\"", L"\x01"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     TextBehindTheValue, JsonReaderAccepts,
@@ -73,7 +74,7 @@ INSTANTIATE_TEST_SUITE_P(
         AcceptedRow{"ClosingBracket", L"[]]", Array()}, AcceptedRow{"Comma", L"1,", 1_u},
         AcceptedRow{"UnfinishedString", L"true\"", true}, AcceptedRow{"Letters", L"truex", true},
         AcceptedRow{"DigitBehindZero", L"07", 0_u}, AcceptedRow{"Nul", withNul(L"[]", L"["), Array()}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NulsBehindNumbers, JsonReaderAccepts,
@@ -86,7 +87,7 @@ INSTANTIATE_TEST_SUITE_P(
         AcceptedRow{"BehindAFraction", withNul(L"[1.", L",2]"), Array{1.0, 2}},
         AcceptedRow{"BehindAnExponent", withNul(L"[1e2", L",2]"), Array{100.0, 2}},
         AcceptedRow{"InAnObject", withNul(L"{\"a\":1", L",\"b\":2}"), Object{{L"a", 1}, {L"b", 2}}}),
-    rowName);
+    support::rowName);
 
 struct RefusedRow {
     char const* name;
@@ -142,7 +143,7 @@ INSTANTIATE_TEST_SUITE_P(
         RefusedRow{
             "NoBreakSpace", L"[1,\x00A0"
                             "2]"}),
-    rowName);
+    support::rowName);
 
 TEST(JsonReader, IntegersAreUnsignedUnlessTheyHaveAMinusSign)
 {

@@ -1,5 +1,6 @@
 // How text is cut into tokens.
 #include "tests/json/documents.h"
+#include "tests/support/rows.h"
 
 #include <cstdint>
 #include <cstring>
@@ -115,7 +116,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NulBehindABlank", withNul(L"[ ", L"1"), "[; end"},
         Row{"NulBehindAKeyword", withNul(L"true", L"1"), "true; end"},
         Row{"NulBehindAString", withNul(L"\"a\"", L"1"), "string <a>; end"}),
-    rowName);
+    support::rowName);
 
 TEST(JsonScanner, RefusesEveryOtherControlCharacter)
 {
@@ -162,7 +163,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NoClosingQuote", L"\"plan", "invalid"}, Row{"OnlyTheOpeningQuote", L"\"", "invalid"},
         Row{"EndBehindABackslash", L"\"plan\\", "invalid"}, Row{"EndInsideHexDigits", L"\"\\u00", "invalid"},
         Row{"OnlyAnEscapedQuoteAtTheEnd", LR"("plan\")", "invalid"}),
-    rowName);
+    support::rowName);
 
 TEST(JsonScanner, KeepsANulInsideAString)
 {
@@ -223,7 +224,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Exponent", L"-e5", "invalid"}, Row{"UpperCaseExponent", L"-E5", "invalid"}, Row{"Plus", L"-+5", "invalid"},
         Row{"Minus", L"--5", "invalid"}, Row{"Else", L"-x", "invalid"}, Row{"Blank", L"- 5", "invalid"},
         Row{"End", L"-", "invalid"}, Row{"Nul", withNul(L"-", L"5"), "invalid"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NumberBehindLeadingZero, JsonScannerOn,
@@ -238,7 +239,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"PointBehindMinusZero", L"-0.5", "real -0.5; end"}, Row{"ExponentBehindMinusZero", L"-0e1", "real -0; end"},
         Row{"PlusBehindMinusZero", L"-0+5", "unsigned 0; invalid"},
         Row{"ElseBehindMinusZero", L"-0]", "unsigned 0; ]; end"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NumberInPositiveDigits, JsonScannerOn,
@@ -251,7 +252,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Nul", withNul(L"10", L"5"), "unsigned 10; unsigned 5; end"},
         Row{"NulAndEnd", withNul(L"10", L""), "unsigned 10; end"},
         Row{"TwoNuls", withNul(L"10", L"") + withNul(L"", L"5"), "unsigned 10; end"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NumberInNegativeDigits, JsonScannerOn,
@@ -261,7 +262,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Plus", L"-10+5", "signed -10; invalid"}, Row{"Minus", L"-10-5", "signed -10; signed -5; end"},
         Row{"Else", L"-10}", "signed -10; }; end"}, Row{"End", L"-10", "signed -10; end"},
         Row{"Nul", withNul(L"-10", L"5"), "signed -10; unsigned 5; end"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NumberInFraction, JsonScannerOn,
@@ -274,7 +275,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Minus", L"1.5-2", "real 1.5; signed -2; end"}, Row{"Else", L"1.5]", "real 1.5; ]; end"},
         Row{"Letter", L"1.x", "real 1; invalid"}, Row{"Nul", withNul(L"1.5", L"2"), "real 1.5; unsigned 2; end"},
         Row{"NulBehindThePoint", withNul(L"1.", L"2"), "real 1; unsigned 2; end"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NumberBehindExponentMark, JsonScannerOn,
@@ -283,7 +284,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"UpperCaseExponent", L"7eE5", "invalid"}, Row{"Plus", L"7e+1", "real 70; end"},
         Row{"Minus", L"7e-1", "real 0.7; end"}, Row{"Else", L"7ex", "invalid"}, Row{"Bracket", L"7e]", "invalid"},
         Row{"End", L"1e", "invalid"}, Row{"Nul", withNul(L"1e", L"5"), "invalid"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NumberBehindExponentSign, JsonScannerOn,
@@ -293,7 +294,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"UpperCaseExponent", L"7e-E5", "invalid"}, Row{"Plus", L"7e++5", "invalid"},
         Row{"Minus", L"7e+-5", "invalid"}, Row{"Else", L"7e-x", "invalid"}, Row{"End", L"7e+", "invalid"},
         Row{"Nul", withNul(L"7e+", L"5"), "invalid"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     NumberInExponentDigits, JsonScannerOn,
@@ -302,7 +303,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Exponent", L"1e2e3", "real 100; invalid"}, Row{"UpperCaseExponent", L"1e2E3", "real 100; invalid"},
         Row{"Plus", L"1e2+3", "real 100; invalid"}, Row{"Minus", L"1e2-3", "real 100; signed -3; end"},
         Row{"Else", L"1e2,", "real 100; ,; end"}, Row{"Nul", withNul(L"1e2", L"3"), "real 100; unsigned 3; end"}),
-    rowName);
+    support::rowName);
 
 TEST(JsonScanner, ReadsOnFromACharacterThatItIsGiven)
 {

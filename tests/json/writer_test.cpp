@@ -1,6 +1,7 @@
 // What values are written as, character by character. Tests start in the "C" locale.
 #include "tests/json/documents.h"
-#include "tests/json/scarce_memory.h"
+#include "tests/support/allocations.h"
+#include "tests/support/rows.h"
 
 #include <cfloat>
 #include <climits>
@@ -21,7 +22,7 @@ using kutils::json::write_string;
 using kutils::json::detail::add_esc_char;
 using kutils::json::detail::add_esc_chars;
 using kutils::json::detail::non_printable_to_string;
-using scarce_memory::worksWithBlocksOf;
+using support::worksWithBlocksOf;
 using Generator = kutils::json::detail::Generator<Value, std::wostringstream>;
 
 std::wstring golden(char const* name)
@@ -79,7 +80,7 @@ INSTANTIATE_TEST_SUITE_P(
         scalar("MinusInfinity", -kInfinity, L"-inf"), scalar("Nan", std::copysign(NAN, 1.0), L"nan"),
         scalar("MinusNan", std::copysign(NAN, -1.0), L"-nan"), scalar("EmptyString", L"", L"\"\""),
         scalar("String", L"a/b", L"\"a/b\"")),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Containers, JsonWriter,
@@ -99,7 +100,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Projects", Object{{L"projects_map", Array{Object{{L"name", L"A"}}}}},
             L"{\"projects_map\":[{\"name\":\"A\"}]}",
             L"{\n    \"projects_map\" : [\n        {\n            \"name\" : \"A\"\n        }\n    ]\n}"}),
-    rowName);
+    support::rowName);
 
 TEST(JsonWriterOf, LargestRealInFull)
 {
@@ -147,7 +148,7 @@ INSTANTIATE_TEST_SUITE_P(
         EscapeRow{"NegativeCharacter", std::wstring(1, static_cast<wchar_t>(-2)), L"\\uFFFE"},
         EscapeRow{"PlainAroundEscapes", L"a\nb\x00E4\"c", L"a\\nb\\u00E4\\\"c"},
         EscapeRow{"EscapesAtBothEnds", L"\tab\t", L"\\tab\\t"}),
-    rowName);
+    support::rowName);
 
 TEST_P(JsonEscapes, AreAppliedToStrings)
 {

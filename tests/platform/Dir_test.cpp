@@ -2,6 +2,7 @@
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/temp_folder.h"
+#include "tests/support/utf8.h"
 
 #include <gmock/gmock.h>
 #include <sys/socket.h>
@@ -57,11 +58,6 @@ std::string deepPath(TempFolder const& folder, std::size_t length)
     return path + "/" + std::string(length - path.size() - 1, 'e');
 }
 
-OdString toWide(std::string const& bytes)
-{
-    return {bytes.data(), bytes.size(), CP_UTF_8};
-}
-
 TEST(DirExists, IsTrueForFoldersOnly)
 {
     TempFolder const folder;
@@ -92,7 +88,7 @@ TEST(DirExists, IsFalseForAPathWithANul)
 TEST(DirExists, IsFalseForAPathThatIsTooLong)
 {
     TempFolder const folder;
-    EXPECT_FALSE(Dir::exists(toWide(deepPath(folder, 5000))));
+    EXPECT_FALSE(Dir::exists(support::fromUtf8(deepPath(folder, 5000))));
 }
 
 TEST(DirCreate, MakesTheFolder)
@@ -344,7 +340,7 @@ TEST(Dir, OpensNothingButFolders)
     }
     EXPECT_FALSE(Dir().open(L""));
     EXPECT_FALSE(Dir().open(withNul(folder.widePath())));
-    EXPECT_FALSE(Dir().open(toWide(deepPath(folder, 5000))));
+    EXPECT_FALSE(Dir().open(support::fromUtf8(deepPath(folder, 5000))));
 }
 
 TEST(Dir, ListsNothingAfterAFailedOpening)
@@ -393,8 +389,8 @@ TEST(Dir, WalksFoldersDownToTheLongestPathThatTheSystemTakes)
     TempFolder const folder;
     std::string const path = deepPath(folder, 4095);
     folder.makeFolder(path.substr(folder.path().size() + 1));
-    EXPECT_TRUE(Dir().open(toWide(path)));
-    EXPECT_FALSE(Dir().open(toWide(path + "/")));
+    EXPECT_TRUE(Dir().open(support::fromUtf8(path)));
+    EXPECT_FALSE(Dir().open(support::fromUtf8(path + "/")));
 }
 
 } // namespace

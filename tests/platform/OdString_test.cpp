@@ -1,4 +1,6 @@
 #include "platform/sdk/OdString.h"
+#include "tests/support/rows.h"
+#include "tests/support/utf8.h"
 
 #include <QString>
 #include <array>
@@ -6,14 +8,9 @@
 
 namespace {
 
-std::wstring wide(OdString const& text)
+std::wstring charactersOf(OdString const& text)
 {
     return {text.c_str(), text.getLength()};
-}
-
-OdString fromBytes(std::string const& bytes)
-{
-    return {bytes.data(), bytes.size(), CP_UTF_8};
 }
 
 std::string bytesOf(std::wstring const& characters)
@@ -23,7 +20,7 @@ std::string bytesOf(std::wstring const& characters)
 
 bool survives(std::string const& bytes)
 {
-    return fromBytes(bytes).ansi_str() == bytes;
+    return support::fromUtf8(bytes).ansi_str() == bytes;
 }
 
 TEST(OdString, IsEmptyWhenMade)
@@ -43,15 +40,15 @@ TEST(OdString, IsEmptyWhenMadeFromNull)
 
 TEST(OdString, EndsAtTheFirstNulWithoutALength)
 {
-    EXPECT_EQ(wide(OdString(L"ab\0c")), L"ab");
-    EXPECT_EQ(wide(OdString("ab\0c", CP_UTF_8)), L"ab");
+    EXPECT_EQ(charactersOf(OdString(L"ab\0c")), L"ab");
+    EXPECT_EQ(charactersOf(OdString("ab\0c", CP_UTF_8)), L"ab");
 }
 
 TEST(OdString, HoldsNulsWithALength)
 {
     std::wstring const expected(L"ab\0c", 4);
-    EXPECT_EQ(wide(OdString(L"ab\0c", 4)), expected);
-    EXPECT_EQ(wide(OdString("ab\0c", 4, CP_UTF_8)), expected);
+    EXPECT_EQ(charactersOf(OdString(L"ab\0c", 4)), expected);
+    EXPECT_EQ(charactersOf(OdString("ab\0c", 4, CP_UTF_8)), expected);
     EXPECT_EQ(OdString(L"ab\0c", 4).ansi_str(), std::string("ab\0c", 4));
 }
 
@@ -70,28 +67,28 @@ TEST(OdString, CopiesAreIndependent)
     OdString const original = L"plan";
     OdString copy = original;
     copy += L"s";
-    EXPECT_EQ(wide(original), L"plan");
-    EXPECT_EQ(wide(copy), L"plans");
+    EXPECT_EQ(charactersOf(original), L"plan");
+    EXPECT_EQ(charactersOf(copy), L"plans");
 }
 
 TEST(OdString, PartsAreClamped)
 {
     OdString const text = L"abc";
     constexpr std::size_t kHuge = static_cast<std::size_t>(-1);
-    EXPECT_EQ(wide(text.left(0)), L"");
-    EXPECT_EQ(wide(text.left(2)), L"ab");
-    EXPECT_EQ(wide(text.left(3)), L"abc");
-    EXPECT_EQ(wide(text.left(kHuge)), L"abc");
-    EXPECT_EQ(wide(text.right(0)), L"");
-    EXPECT_EQ(wide(text.right(2)), L"bc");
-    EXPECT_EQ(wide(text.right(kHuge)), L"abc");
-    EXPECT_EQ(wide(text.mid(0)), L"abc");
-    EXPECT_EQ(wide(text.mid(2)), L"c");
-    EXPECT_EQ(wide(text.mid(3)), L"");
-    EXPECT_EQ(wide(text.mid(kHuge)), L"");
-    EXPECT_EQ(wide(text.mid(1, 1)), L"b");
-    EXPECT_EQ(wide(text.mid(1, kHuge)), L"bc");
-    EXPECT_EQ(wide(text.mid(kHuge, kHuge)), L"");
+    EXPECT_EQ(charactersOf(text.left(0)), L"");
+    EXPECT_EQ(charactersOf(text.left(2)), L"ab");
+    EXPECT_EQ(charactersOf(text.left(3)), L"abc");
+    EXPECT_EQ(charactersOf(text.left(kHuge)), L"abc");
+    EXPECT_EQ(charactersOf(text.right(0)), L"");
+    EXPECT_EQ(charactersOf(text.right(2)), L"bc");
+    EXPECT_EQ(charactersOf(text.right(kHuge)), L"abc");
+    EXPECT_EQ(charactersOf(text.mid(0)), L"abc");
+    EXPECT_EQ(charactersOf(text.mid(2)), L"c");
+    EXPECT_EQ(charactersOf(text.mid(3)), L"");
+    EXPECT_EQ(charactersOf(text.mid(kHuge)), L"");
+    EXPECT_EQ(charactersOf(text.mid(1, 1)), L"b");
+    EXPECT_EQ(charactersOf(text.mid(1, kHuge)), L"bc");
+    EXPECT_EQ(charactersOf(text.mid(kHuge, kHuge)), L"");
 }
 
 TEST(OdString, IsOrderedByCodeUnit)
@@ -127,8 +124,8 @@ TEST(OdString, IsJoinedFromTextsAndCharacters)
     text += L"c";
     text += L'd';
     text += static_cast<wchar_t const*>(nullptr);
-    EXPECT_EQ(wide(text), L"abcd");
-    EXPECT_EQ(wide(text + OdString(L"e") + L"f" + L'g'), L"abcdefg");
+    EXPECT_EQ(charactersOf(text), L"abcd");
+    EXPECT_EQ(charactersOf(text + OdString(L"e") + L"f" + L'g'), L"abcdefg");
 }
 
 TEST(OdString, CanBeJoinedToItself)
@@ -136,7 +133,7 @@ TEST(OdString, CanBeJoinedToItself)
     OdString text = L"plan";
     text += text;
     text += text.c_str();
-    EXPECT_EQ(wide(text), L"planplanplanplan");
+    EXPECT_EQ(charactersOf(text), L"planplanplanplan");
 }
 
 TEST(OdString, FormatReplacesTheText)
@@ -144,7 +141,7 @@ TEST(OdString, FormatReplacesTheText)
     OdString text = L"before";
     OdString const& result = text.format(L"%ls-%d-%c-%%", L"plan", 7, 'x');
     EXPECT_EQ(&result, &text);
-    EXPECT_EQ(wide(text), L"plan-7-x-%");
+    EXPECT_EQ(charactersOf(text), L"plan-7-x-%");
 }
 
 TEST(OdString, FormatHasNoLimitOnTheLength)
@@ -152,14 +149,14 @@ TEST(OdString, FormatHasNoLimitOnTheLength)
     std::wstring const argument(3'000'000, L'\u20AC');
     OdString text;
     text.format(L"<%ls>", argument.c_str());
-    EXPECT_EQ(wide(text), L"<" + argument + L">");
+    EXPECT_EQ(charactersOf(text), L"<" + argument + L">");
 }
 
 TEST(OdString, FormatTakesItsOwnTextAsAnArgument)
 {
     OdString text = L"plan";
     text.format(L"%ls/%ls", text.c_str(), text.c_str());
-    EXPECT_EQ(wide(text), L"plan/plan");
+    EXPECT_EQ(charactersOf(text), L"plan/plan");
 }
 
 TEST(OdString, FormatTakesEveryCharacter)
@@ -167,21 +164,21 @@ TEST(OdString, FormatTakesEveryCharacter)
     std::wstring const argument = {L'\xDC80', L'\xDCFF', L'\xD800', L'\xFFFF', L'\x10FFFF', L'\x1'};
     OdString text;
     text.format(L"%ls", argument.c_str());
-    EXPECT_EQ(wide(text), argument);
+    EXPECT_EQ(charactersOf(text), argument);
 }
 
 TEST(OdString, FormatKeepsNulsThatWereFilledIn)
 {
     OdString text;
     text.format(L"a%cb", 0);
-    EXPECT_EQ(wide(text), std::wstring(L"a\0b", 3));
+    EXPECT_EQ(charactersOf(text), std::wstring(L"a\0b", 3));
 }
 
 TEST(OdString, FormatThatIsRefusedStandsAsItIs)
 {
     OdString text = L"before";
     text.format(L"%2147483648d", 1); // wider than any text can be
-    EXPECT_EQ(wide(text), L"%2147483648d");
+    EXPECT_EQ(charactersOf(text), L"%2147483648d");
 }
 
 struct Reading {
@@ -199,18 +196,18 @@ class OdStringReading : public testing::TestWithParam<Reading> {};
 
 TEST_P(OdStringReading, GivesTheseCharacters)
 {
-    EXPECT_EQ(wide(fromBytes(GetParam().bytes)), GetParam().characters);
+    EXPECT_EQ(charactersOf(support::fromUtf8(GetParam().bytes)), GetParam().characters);
 }
 
 TEST_P(OdStringReading, GivesTheSameCharactersAmongOthers)
 {
     std::wstring const expected = L"plan \u00E4" + GetParam().characters + L" of the house";
-    EXPECT_EQ(wide(fromBytes("plan \xC3\xA4" + GetParam().bytes + " of the house")), expected);
+    EXPECT_EQ(charactersOf(support::fromUtf8("plan \xC3\xA4" + GetParam().bytes + " of the house")), expected);
 }
 
 TEST_P(OdStringReading, CanBeTurnedBack)
 {
-    EXPECT_EQ(fromBytes(GetParam().bytes).ansi_str(), GetParam().bytes);
+    EXPECT_EQ(support::fromUtf8(GetParam().bytes).ansi_str(), GetParam().bytes);
 }
 
 INSTANTIATE_TEST_SUITE_P(
@@ -225,7 +222,7 @@ INSTANTIATE_TEST_SUITE_P(
         Reading{"FirstOfFourBytes", "\xF0\x90\x80\x80", L"\x10000"},
         Reading{"LastOfFourBytes", "\xF4\x8F\xBF\xBF", L"\x10FFFF"},
         Reading{"ByteOrderMark", "\xEF\xBB\xBFx", L"\xFEFFx"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Invalid, OdStringReading,
@@ -256,7 +253,7 @@ INSTANTIATE_TEST_SUITE_P(
             "e",
             L"Stra\xDCDF"
             L"e"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(OdString, EveryCharacterSurvivesTheWayToBytesAndBack)
 {
@@ -268,7 +265,7 @@ TEST(OdString, EveryCharacterSurvivesTheWayToBytesAndBack)
         std::string const bytes = bytesOf({L'a', character});
         std::array<uint, 2> const characters{'a', value};
         ASSERT_EQ(bytes, QString::fromUcs4(characters.data(), 2).toStdString()) << std::hex << value;
-        ASSERT_EQ(wide(fromBytes(bytes)), (std::wstring{L'a', character})) << std::hex << value;
+        ASSERT_EQ(charactersOf(support::fromUtf8(bytes)), (std::wstring{L'a', character})) << std::hex << value;
     }
 }
 
@@ -306,8 +303,8 @@ TEST(OdString, ConvertsLongTextsWhateverStandsAtTheEdgesOfItsBlocks)
     std::wstring const characters = L"\x20AC\x1F600\xDCFF\xE4\xDCF0\xDC9F";
     for (std::size_t before = 0; before < 2100; ++before) {
         std::string const longBytes = std::string(before, 'a') + bytes + std::string(20, 'z');
-        OdString const text = fromBytes(longBytes);
-        ASSERT_EQ(wide(text), std::wstring(before, L'a') + characters + std::wstring(20, L'z')) << before;
+        OdString const text = support::fromUtf8(longBytes);
+        ASSERT_EQ(charactersOf(text), std::wstring(before, L'a') + characters + std::wstring(20, L'z')) << before;
         ASSERT_EQ(text.ansi_str(), longBytes) << before;
     }
 }
@@ -342,6 +339,6 @@ INSTANTIATE_TEST_SUITE_P(
         Writing{"BeyondTheLastCharacter", {static_cast<wchar_t>(0x110000)}, "\xEF\xBF\xBD"},
         Writing{"GreatestWideCharacter", {static_cast<wchar_t>(0x7FFFFFFF)}, "\xEF\xBF\xBD"},
         Writing{"NegativeWideCharacter", {static_cast<wchar_t>(-1)}, "\xEF\xBF\xBD"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 } // namespace

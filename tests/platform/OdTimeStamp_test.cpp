@@ -1,4 +1,5 @@
 #include "platform/sdk/OdTimeStamp.h"
+#include "tests/support/rows.h"
 
 #include <array>
 #include <climits>
@@ -173,7 +174,7 @@ INSTANTIATE_TEST_SUITE_P(
         Span{"JustUnderADay", 86'400 + 4, 5, 0, 86'399'000}, Span{"OneDay", 86'400 + 5, 5, 1, 0},
         Span{"LaterByOneSecond", 5, 6, -1, 86'399'000}, Span{"LaterByOneDay", 5, 86'405, -1, 0},
         Span{"WholeRange", INT64_MAX, INT64_MIN, 213'503'982'334'601, 25'215'000}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(OdTimeStamp, CanBeSubtractedFromItself)
 {
@@ -226,7 +227,7 @@ INSTANTIATE_TEST_SUITE_P(
         Format{"FiveDigitYear", 253402300800, L"%Y-%m-%d %a", "10000-01-01 Sat"},
         Format{"LastMoment", INT64_MAX, L"%Y-%m-%dT%H:%M:%S", "292277026596-12-04T15:30:07"},
         Format{"FirstMoment", INT64_MIN, L"%Y-%m-%dT%H:%M:%S", "-292277022657-01-27T08:29:52"}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(OdTimeStamp, FormatsIntoItsOwnPattern)
 {

@@ -2,6 +2,7 @@
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
+#include "tests/support/rows.h"
 #include "tests/support/temp_folder.h"
 
 #include <cerrno>
@@ -85,7 +86,7 @@ INSTANTIATE_TEST_SUITE_P(
         Content{"NotAscii", "\xC3\xA4\n\xF0\x9F\x98\x80", {"\xC3\xA4", "\xF0\x9F\x98\x80"}},
         Content{"NotUtf8", "\xFF\n\xC3\n\xA4", {"\xFF", "\xC3", "\xA4"}},
         Content{"Nuls", std::string("a\0b\n\0", 5), {std::string("a\0b", 3), std::string("\0", 1)}}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(TextFile, StartsAgainAtTheFirstLine)
 {

@@ -2,6 +2,7 @@
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/failing_call.h"
+#include "tests/support/rows.h"
 #include "tests/support/temp_folder.h"
 
 #include <cerrno>
@@ -166,7 +167,7 @@ INSTANTIATE_TEST_SUITE_P(
         Split{"SeparatorFirst", L"@ann", {"ann"}, {"", "ann"}}, Split{"SeparatorLast", L"ann@", {"ann"}, {"ann", ""}},
         Split{"OnlyASeparator", L"@", {}, {"", ""}}, Split{"TwoSeparators", L"a@@b", {"a", "b"}, {"a", "", "b"}},
         Split{"ManyPieces", L"a@b@c", {"a", "b", "c"}, {"a", "b", "c"}}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(SplitByChar, SplitsAtNulsToo)
 {

@@ -2,6 +2,7 @@
 #include "preview/mu_preview.h"
 
 #include "tests/support/drawing_bytes.h"
+#include "tests/support/rows.h"
 
 namespace {
 
@@ -86,7 +87,7 @@ INSTANTIATE_TEST_SUITE_P(
         Layout{"LongerOldHeader", fieldsOf(64, 24, 0, 0), 0, 64, 64, 16},
         Layout{"RunsOfBytes", fieldsOf(40, 8, 1, 0), 0, 40, 1064, 0},
         Layout{"RunsOfHalfBytes", fieldsOf(40, 4, 2, 0), 0, 40, 104, 0}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(BitmapHeader, SaysThatTheFirstRowIsTheUpperOne)
 {
@@ -147,7 +148,7 @@ INSTANTIATE_TEST_SUITE_P(
         Damage{"UnknownCompression", &BitmapFields::compression, 0xFFFF'FFFF, kForm},
         Damage{"TooManyColors", &BitmapFields::colors, 257, kColors},
         Damage{"GigabytesOfColors", &BitmapFields::colors, 0x4000'0000, kColors}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(BitmapHeader, IsRefusedWithMoreColorsThanTrueColorsHaveHints)
 {

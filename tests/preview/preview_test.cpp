@@ -2,6 +2,7 @@
 #include "preview/mu_preview.h"
 
 #include "tests/support/drawing_bytes.h"
+#include "tests/support/rows.h"
 
 namespace {
 
@@ -205,7 +206,7 @@ INSTANTIATE_TEST_SUITE_P(
         Damage{"PictureOnTheLastEntry", entryAt(1) + 1, entryAt(2) - 1, kOnList},
         Damage{"PictureOfSomethingElse", entryAt(1) + 1, entryAt(2), "The PNG does not begin as one."},
         Damage{"PictureOfOneByte", entryAt(1) + 5, 1, "The PNG does not begin as one."}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST(Preview, CanBeBeforeItsListToo)
 {

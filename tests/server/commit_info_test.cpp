@@ -1,6 +1,8 @@
 #include "tests/server/outcome.h"
 #include "tests/server/test_clock.h"
 #include "tests/server/translations.h"
+#include "tests/support/rows.h"
+#include "tests/support/utf8.h"
 
 #include <cstdlib>
 #include <ctime>
@@ -104,7 +106,7 @@ INSTANTIATE_TEST_SUITE_P(
         PreviousRow{"Another", L"draft.dwg", true}, PreviousRow{"TheSame", L"plan.dwg", false},
         PreviousRow{"Empty", L"", false}, PreviousRow{"InOtherCase", L"Plan.dwg", true},
         PreviousRow{"InAnotherFolder", L"./plan.dwg", true}, PreviousRow{"Longer", L"plan.dwg ", true}),
-    rowName);
+    support::rowName);
 
 TEST_P(WrittenPreviousPath, IsThereOnlyWhenItDiffers)
 {
@@ -153,13 +155,13 @@ INSTANTIATE_TEST_SUITE_P(
         MomentRow{"Midnight", 1704067200000, "2024-01-01T00:00:00Z"},
         MomentRow{"LastMomentOfAYear", 1704067199999, "2023-12-31T23:59:59Z"},
         MomentRow{"LeapDay", 1709164800000, "2024-02-29T00:00:00Z"}),
-    rowName);
+    support::rowName);
 
 TEST_P(WrittenDate, IsTheUniversalTimeOfTheMomentOfWriting)
 {
     TestClock const clock(GetParam().moment);
     Object const commit = serializeCommit({}, L"", L"", L"", {});
-    EXPECT_EQ(commit.at(L"annotation").get_object().at(L"date"), Value(wide(GetParam().text).c_str()));
+    EXPECT_EQ(commit.at(L"annotation").get_object().at(L"date"), Value(support::fromUtf8(GetParam().text).c_str()));
 }
 
 /// The local time is an unusual one as long as this lives.

@@ -1,5 +1,6 @@
 #include "tests/server/outcome.h"
 #include "tests/server/translations.h"
+#include "tests/support/rows.h"
 
 #include <cmath>
 #include <limits>
@@ -73,7 +74,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"UnknownMembers", R"({"author": "ann", "date": 1.0, "Message": 1, "email": null})", "ann said '' at 1"},
         Row{"LinesInMessage", R"({"author": "", "date": 1.0, "message": "a\nb\u0000c"})",
             std::string(" said 'a\nb\0c' at 1", 18)}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     MissingMembers, AnnotationReader,
@@ -84,7 +85,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Date", R"({"author": "ann"})", missingMember("annotation", "date")},
         Row{"DateBesideWrongAuthor", R"({"author": 1})", missingMember("annotation", "date")},
         Row{"DateAfterTheMessageIsRead", R"({"author": "ann", "message": 5})", mismatch("string", "int", "message")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     WrongMembers, AnnotationReader,
@@ -94,7 +95,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"AuthorLast", R"({"author": 1, "date": 1.0})", mismatch("string", "int", "author")},
         Row{"NullMessage", R"({"author": "ann", "date": 1.0, "message": null})",
             mismatch("string", "null", "message")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Dates, AnnotationReader,
@@ -118,7 +119,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Infinite", annotated("1e999"), "ann said '' at 9223372036854775807"},
         Row{"InfiniteNegative", annotated("-1e999"), "ann said '' at -9223372036854775808"},
         Row{"Tiny", annotated("1e-999"), "ann said '' at 0"}),
-    rowName);
+    support::rowName);
 
 TEST_P(AnnotationReader, TakesTheObjectAsItIs)
 {
@@ -152,7 +153,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Real", "[1.0]", "error: Could not parse parent hash, real type found."},
         Row{"Null", "[null]", "error: Could not parse parent hash, null type found."},
         Row{"FirstWrongOne", R"(["a", 1.5, null])", "error: Could not parse parent hash, real type found."}),
-    rowName);
+    support::rowName);
 
 TEST_P(ParentHashesReader, TakesTheArrayAsItIs)
 {
@@ -191,7 +192,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"BoolAsPreviousPath", renamedFrom("false"), mismatch("string", "bool", "")},
         Row{"ObjectAsPreviousPath", renamedFrom("{}"), mismatch("string", "object", "")},
         Row{"ArrayAsPreviousPath", renamedFrom("[]"), mismatch("string", "array", "")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     MissingAndWrongMembers, ReceivedFileReader,
@@ -203,7 +204,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"PathFirst", R"({"path": 1, "storagePath": 2, "previousPath": 3})", mismatch("string", "int", "path")},
         Row{"StoragePathNext", R"({"path": "a", "storagePath": null, "previousPath": 3})",
             mismatch("string", "null", "storagePath")}),
-    rowName);
+    support::rowName);
 
 TEST_P(ReceivedFileReader, LeavesNoTraceOfPreviousPathsAndParents)
 {
@@ -259,7 +260,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NoParents", commitOf(kAnnotation, "[]", "[]", kHash, "7"), "7 abc of []: ann said 'why' at 1 []"},
         Row{"UnknownMembers", commitOf(kAnnotation, "", R"([], "parents": 5, "Hash": null)", kHash, "7"),
             "7 abc of []: ann said 'why' at 1 []"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Numbers, CommitReader,
@@ -274,7 +275,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Real", numbered("7.0"), mismatch("int", "real", "commitNo")},
         Row{"Infinite", numbered("1e999"), mismatch("int", "real", "commitNo")},
         Row{"Text", numbered("\"7\""), mismatch("int", "string", "commitNo")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     MissingMembers, CommitReader,
@@ -289,7 +290,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Number", commitOf(kAnnotation, kParents, kFiles, kHash, ""), missingMember("commit", "commitNo")},
         Row{"NumberBesideWrongHash", commitOf(kAnnotation, kParents, kFiles, "1", ""),
             missingMember("commit", "commitNo")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     WrongMembers, CommitReader,
@@ -308,7 +309,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"HashNext", commitOf(kAnnotation, kParents, kFiles, "1", "\"1\""), mismatch("string", "int", "hash")},
         Row{"NumberLast", commitOf(kAnnotation, kParents, kFiles, kHash, "\"1\""),
             mismatch("int", "string", "commitNo")}),
-    rowName);
+    support::rowName);
 
 TEST_P(CommitReader, TakesTheObjectAsItIs)
 {
@@ -344,7 +345,7 @@ INSTANTIATE_TEST_SUITE_P(
             "error: {Could not parse commit, missing \"commitNo\"}"},
         Row{"ElementsAreNot", commitOf(kAnnotation, "", "[5]", "", ""), noObject("int")},
         Row{"MissingKeysAreNot", commitOf(kAnnotation, "", "", "", ""), missing("files")}),
-    rowName);
+    support::rowName);
 
 TEST_P(TranslatedCommitReader, SpeaksTheLanguageOfTheUser)
 {

@@ -1,5 +1,7 @@
 #include "tests/server/outcome.h"
 #include "tests/server/translations.h"
+#include "tests/support/rows.h"
+#include "tests/support/utf8.h"
 
 #include <type_traits>
 
@@ -43,7 +45,7 @@ INSTANTIATE_TEST_SUITE_P(
             "bridge is 42 ''; commits []; references []"},
         Row{"UnknownMembers", fetch(kRepository, R"("Commits": 5)", R"("reference": null)"),
             "bridge is 42 ''; commits []; references []"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     MissingMembers, FetchReader,
@@ -59,7 +61,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"InCommits", fetch(kRepository, kReferences, R"("commits": [{"annotation": {}}])"),
             missingMember("annotation", "author")},
         Row{"AnnotationInCommits", fetch(kRepository, kReferences, R"("commits": [{}])"), missing("annotation")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     WrongMembers, FetchReader,
@@ -74,7 +76,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NoObjectInReferences", fetch(kRepository, R"("references": [1])", R"("commits": 1)"), noObject("int")},
         Row{"CommitsLast", fetch(kRepository, kReferences, R"("commits": {})"), mismatch("array", "object", "commits")},
         Row{"NoObjectInCommits", fetch(kRepository, kReferences, R"("commits": [null])"), noObject("null")}),
-    rowName);
+    support::rowName);
 
 TEST_P(FetchReader, TakesTheObjectAsItIs)
 {
@@ -109,7 +111,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"WithoutHash", R"({"commitNo": "7"})", missingMember("commit number", "hash")},
         Row{"WithoutNumber", R"({"hash": 1})", missingMember("commit number", "commitNo")},
         Row{"HashFirst", R"({"hash": 1, "commitNo": ""})", mismatch("string", "int", "hash")}),
-    rowName);
+    support::rowName);
 
 TEST_P(CommitNumberReader, TakesTheObjectAsItIs)
 {
@@ -131,7 +133,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"FirstError", "[" + kNumber + R"(, {"hash": ""}, 5])", missingMember("commit number", "commitNo")},
         Row{"NoObject", "[" + kNumber + ", true]", noObject("bool")},
         Row{"ThrowingElement", R"([{"commitNo": 1, "hash": 1.5}])", mismatch("string", "real", "hash")}),
-    rowName);
+    support::rowName);
 
 TEST_P(CommitNumbersReader, TakesTheArrayAsItIs)
 {
@@ -146,7 +148,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Complete", R"({"id": "42"})", "42"}, Row{"EmptyText", R"({"id": ""})", ""},
         Row{"UnknownMembers", R"({"id": "42", "name": 5})", "42"}, Row{"Empty", "{}", missingMember("init data", "id")},
         Row{"InOtherCase", R"({"Id": "42"})", missingMember("init data", "id")}),
-    rowName);
+    support::rowName);
 
 TEST_P(InitReader, TakesTheObjectAsItIs)
 {
@@ -172,18 +174,19 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Null", R"({"commandVersion": null})", mismatch("string", "null", "commandVersion")},
         Row{"Array", "[]", mismatch("object", "array", "")}, Row{"String", "\"1.2\"", mismatch("object", "string", "")},
         Row{"Empty", "", mismatch("object", "null", "")}, Row{"NoJson", "{1.2}", mismatch("object", "null", "")}),
-    rowName);
+    support::rowName);
 
 TEST_P(ServerVersionReader, TakesTheTextAsItIs)
 {
-    EXPECT_EQ(outcomeOf([] { return deserializeServerVersion(wide(GetParam().document)); }), GetParam().outcome);
+    EXPECT_EQ(
+        outcomeOf([] { return deserializeServerVersion(support::fromUtf8(GetParam().document)); }), GetParam().outcome);
 }
 
 TEST(ServerVersionReader, TakesATextThatIsCutOffAnywhereForNull)
 {
     std::string const whole = R"({"commandVersion": "1.2"})";
     for (std::size_t length = 0; length < whole.size(); ++length) {
-        OdString const text = wide(whole.substr(0, length));
+        OdString const text = support::fromUtf8(whole.substr(0, length));
         EXPECT_EQ(outcomeOf([&] { return deserializeServerVersion(text); }), mismatch("object", "null", ""))
             << "cut at " << length;
     }

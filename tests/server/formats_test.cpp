@@ -1,6 +1,7 @@
 #include "tests/server/examples.h"
 #include "tests/server/outcome.h"
 #include "tests/server/test_clock.h"
+#include "tests/support/utf8.h"
 
 #include <memory>
 
@@ -23,19 +24,20 @@ TEST(DocumentedExample, OfAReference)
 TEST(DocumentedExample, OfReferences)
 {
     EXPECT_EQ(
-        outcomeOf([] { return deserializeReferences(wide(documented("References"))); }),
+        outcomeOf([] { return deserializeReferences(support::fromUtf8(documented("References"))); }),
         "[branch main -> 4f0a, tag as built -> 11c2]");
 }
 
 TEST(DocumentedExample, OfARepository)
 {
-    EXPECT_EQ(outcomeOf([] { return deserializeRepoData(wide(documented("Repository"))); }), "bridge is 42 ''");
+    EXPECT_EQ(
+        outcomeOf([] { return deserializeRepoData(support::fromUtf8(documented("Repository"))); }), "bridge is 42 ''");
 }
 
 TEST(DocumentedExample, OfRepositories)
 {
     EXPECT_EQ(
-        outcomeOf([] { return deserializeRepoDatas(wide(documented("Repositories"))); }),
+        outcomeOf([] { return deserializeRepoDatas(support::fromUtf8(documented("Repositories"))); }),
         "[bridge is 42 '', house is 43 '']");
 }
 
@@ -101,7 +103,8 @@ TEST(DocumentedExample, OfTheAnswerToMakingARepository)
 
 TEST(DocumentedExample, OfAServerVersion)
 {
-    EXPECT_EQ(outcomeOf([] { return deserializeServerVersion(wide(documented("Server version"))); }), "1.2");
+    EXPECT_EQ(
+        outcomeOf([] { return deserializeServerVersion(support::fromUtf8(documented("Server version"))); }), "1.2");
 }
 
 } // namespace

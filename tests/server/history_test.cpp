@@ -1,5 +1,6 @@
 #include "tests/server/test_clock.h"
 #include "tests/server/translations.h"
+#include "tests/support/rows.h"
 
 #include "common/mu_common_history.h"
 
@@ -53,8 +54,6 @@ struct AgeRow {
 
 class HistoryAge : public testing::TestWithParam<AgeRow> {};
 
-constexpr auto rowName = [](auto const& row) { return std::string(row.param.name); };
-
 INSTANTIATE_TEST_SUITE_P(
     Thresholds, HistoryAge,
     testing::Values(
@@ -73,7 +72,7 @@ INSTANTIATE_TEST_SUITE_P(
         AgeRow{"MillisecondLessThanADay", kDay - 1, kNow, "23 hours ago"}, AgeRow{"Day", kDay, kNow, "Mar 4, 2024"},
         AgeRow{"DayAndHours", kDay + 5 * kHour, kNow, "Mar 4, 2024"}, AgeRow{"Years", 1000 * kDay, kNow, "Jun 9, 2021"},
         AgeRow{"MillisecondAhead", -1, kNow, "Mar 5, 2024"}, AgeRow{"DaysAhead", -30 * kDay, kNow, "Apr 4, 2024"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     AcrossMidnight, HistoryAge,
@@ -82,7 +81,7 @@ INSTANTIATE_TEST_SUITE_P(
         AgeRow{"Minutes", 20 * kMinute, 20000 * kDay + 5 * kMinute, "20  minutes ago"},
         AgeRow{"Hours", 20 * kHour, 20000 * kDay + 5 * kHour, "20 hours ago"},
         AgeRow{"AlmostADay", kDay - 1, 20000 * kDay, "23 hours ago"}, AgeRow{"Day", kDay, 20000 * kDay, "Oct 3, 2024"}),
-    rowName);
+    support::rowName);
 
 TEST_P(HistoryAge, IsToldInItsUnit)
 {
@@ -105,7 +104,7 @@ INSTANTIATE_TEST_SUITE_P(
         DateRow{"LeapDay", 1582934400, "Feb 29, 2020"}, DateRow{"Beginning", 0, "Jan 1, 1970"},
         DateRow{"BeforeTheBeginning", -1, "Dec 31, 1969"}, DateRow{"SmallYear", -62135596800, "Jan 1, 0001"},
         DateRow{"LargeYear", 253402300800, "Jan 1, 10000"}),
-    rowName);
+    support::rowName);
 
 TEST_P(HistoryDate, IsWrittenOutFromADayOn)
 {
@@ -155,7 +154,7 @@ INSTANTIATE_TEST_SUITE_P(
         AuthorRow{"Blanks", L" ann b ", " ann b  \u2981 1 hours ago"},
         AuthorRow{"BeyondAscii", L"J\u00FCrgen@example.org", "J\u00FCrgen \u2981 1 hours ago"},
         AuthorRow{"Placeholder", L"%ls%Y", "%ls%Y \u2981 1 hours ago"}),
-    rowName);
+    support::rowName);
 
 TEST_P(HistoryAuthor, IsNamedBeforeTheTimeUpToTheFirstSign)
 {

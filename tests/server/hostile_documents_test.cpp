@@ -1,7 +1,8 @@
-#include "tests/server/allocations.h"
 #include "tests/server/outcome.h"
+#include "tests/support/allocations.h"
 
 #include "tests/support/small_stack.h"
+#include "tests/support/utf8.h"
 
 namespace {
 
@@ -44,20 +45,20 @@ TEST(LargeFetch, IsReadWithoutACopyOfAnyObjectOrArray)
 {
     std::wstring const ballast(10'000, L'x');
     Object const document = largeFetch(100, 20, ballast);
-    CountedAllocations const allocations;
+    support::WatchedMemory const memory;
     ASSERT_TRUE(deserializeFetchData(document).hasValue());
     std::size_t const ballastOfOneInTen = (100 * 22 + 22) / 10 * ballast.size() * sizeof(wchar_t);
-    EXPECT_LT(allocations.bytes(), ballastOfOneInTen);
-    EXPECT_GT(allocations.bytes(), 100 * 20 * sizeof(L"house/plan.dwg")) << "the library's are not counted";
+    EXPECT_LT(memory.asked(), ballastOfOneInTen);
+    EXPECT_GT(memory.asked(), 100 * 20 * sizeof(L"house/plan.dwg")) << "the library's are not counted";
 }
 
 TEST(LargeFetch, ReadsEachKindOfObjectWithoutACopy)
 {
     std::wstring const ballast(1'000'000, L'x');
     Object const document = largeFetch(1, 1, ballast);
-    CountedAllocations const allocations;
+    support::WatchedMemory const memory;
     ASSERT_TRUE(deserializeFetchData(document).hasValue());
-    EXPECT_LT(allocations.bytes(), ballast.size());
+    EXPECT_LT(memory.asked(), ballast.size());
 }
 
 TEST(LargeCommit, IsWrittenWithoutACopyOfItsTexts)
@@ -67,9 +68,9 @@ TEST(LargeCommit, IsWrittenWithoutACopyOfItsTexts)
     CommitInfo info;
     info.files.emplace_back(text, L"po1");
     info.message = text;
-    CountedAllocations const allocations;
+    support::WatchedMemory const memory;
     Value const document = serializeCommitInfo(info);
-    EXPECT_LT(allocations.bytes(), 3 * sizeOfText) << "two texts go into the document, and no part of it moves twice";
+    EXPECT_LT(memory.asked(), 3 * sizeOfText) << "two texts go into the document, and no part of it moves twice";
     EXPECT_EQ(document.type(), Value_type::object);
 }
 
@@ -89,7 +90,7 @@ TEST(GiganticArray, OfWrongElementsEndsAtTheFirst)
     for (int i = 0; i < 1'000'000; ++i) {
         text += ",0";
     }
-    OdString const document = wide(text + "]");
+    OdString const document = support::fromUtf8(text + "]");
     EXPECT_EQ(outcomeOf([&] { return deserializeReferences(document); }), noObject("int"));
 }
 
@@ -100,8 +101,8 @@ std::string nested(std::size_t depth, char open, char close)
 
 TEST(NestedDocument, IsRefusedOnASmallStack)
 {
-    OdString const arrays = wide(nested(200'000, '[', ']'));
-    OdString const openArrays = wide(std::string(200'000, '['));
+    OdString const arrays = support::fromUtf8(nested(200'000, '[', ']'));
+    OdString const openArrays = support::fromUtf8(std::string(200'000, '['));
     std::string outcomes;
     support::onSmallStack([&] {
         outcomes += outcomeOf([&] { return deserializeReferences(arrays); }) + "\n";

@@ -5,6 +5,7 @@
 #include "common/mu_common_serialization.h"
 
 #include "platform/sdk/OdString.h"
+#include "tests/support/utf8.h"
 #include "json/json_reader.h"
 #include "json/json_writer.h"
 
@@ -22,17 +23,11 @@ using kutils::json::Object;
 using kutils::json::Value;
 using kutils::json::Value_type;
 
-/// UTF-8 as the library takes it.
-inline OdString wide(std::string_view text)
-{
-    return {text.data(), text.size(), CP_UTF_8};
-}
-
 /// The value of a text that a test takes for a document.
 inline Value parsed(std::string_view text)
 {
     Value value;
-    if (!kutils::json::read_string(value, wide(text))) {
+    if (!kutils::json::read_string(value, support::fromUtf8(text))) {
         throw std::invalid_argument("the test's own document is not JSON: " + std::string(text));
     }
     return value;
@@ -168,9 +163,6 @@ struct Row {
     std::string outcome;
 };
 
-/// Names a row of a table by its member `name`.
-inline constexpr auto rowName = [](auto const& row) { return std::string(row.param.name); };
-
 inline void PrintTo(Row const& row, std::ostream* out)
 {
     *out << row.document;
@@ -204,7 +196,7 @@ void expectsTypes(std::string_view complete, std::vector<Member> const& members,
                 continue;
             }
             Object document = object(complete);
-            document[wide(member.key).c_str()] = parsed(sample.text);
+            document[support::fromUtf8(member.key).c_str()] = parsed(sample.text);
             EXPECT_EQ(outcomeOf([&] { return read(document); }), mismatch(member.type, sample.type, member.key));
         }
     }

@@ -1,5 +1,7 @@
 #include "tests/server/outcome.h"
 #include "tests/server/translations.h"
+#include "tests/support/rows.h"
+#include "tests/support/utf8.h"
 
 #include "common/mu_common_json_keys.h"
 
@@ -61,11 +63,11 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Blank", "tag ", "error: Unsupported type: tag "}, Row{"Nothing", "", "error: Unsupported type: "},
         Row{"Placeholder", "%ls%n", "error: Unsupported type: %ls%n"},
         Row{"BeyondAscii", "Zweig \u00FC", "error: Unsupported type: Zweig \u00FC"}),
-    rowName);
+    support::rowName);
 
 TEST_P(ReferenceType, IsToldByItsText)
 {
-    EXPECT_EQ(inWords(toType(wide(GetParam().document))), GetParam().outcome);
+    EXPECT_EQ(inWords(toType(support::fromUtf8(GetParam().document))), GetParam().outcome);
 }
 
 std::string const kReference = R"({"commitHash": "abc", "name": "main", "refType": "branch"})";
@@ -89,7 +91,7 @@ INSTANTIATE_TEST_SUITE_P(
             "tag \xED\xA0\x80 -> abc"},
         Row{"UnknownMembers", R"({"commitHash": "abc", "name": "v1", "refType": "tag", "type": 7, "Name": []})",
             "tag v1 -> abc"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     MissingMembers, ReferenceReader,
@@ -105,7 +107,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"HashInOtherCase", R"({"commithash": "abc", "name": "v1", "refType": "tag"})",
             "error: No commitHash found in reference."},
         Row{"TypeBesideWrongOnes", R"({"commitHash": 1, "name": 2})", "error: No reference type found in reference."}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     WrongMembers, ReferenceReader,
@@ -118,7 +120,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NameNext", R"({"commitHash": 1, "name": null, "refType": "tag"})", mismatch("string", "null", "name")},
         Row{"HashLast", R"({"commitHash": true, "name": "v1", "refType": "tag"})",
             mismatch("string", "bool", "commitHash")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Annotations, ReferenceReader,
@@ -141,7 +143,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"WrongAuthor", withAnnotation(R"({"author": [], "date": 1.5})"), mismatch("string", "array", "author")},
         Row{"WrongBeforeMissingMembers", R"({"annotation": {"author": "ann", "date": false}})",
             mismatch("real", "bool", "date")}),
-    rowName);
+    support::rowName);
 
 TEST_P(ReferenceReader, TakesTheDocumentAsItIs)
 {
@@ -178,7 +180,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NoObject", "[" + kReference + ", 5]", noObject("int")}, Row{"NestedArray", "[[]]", noObject("array")},
         Row{"NullElement", "[null, {}]", noObject("null")},
         Row{"ThrowingElement", R"([{"annotation": {"author": 1, "date": 1.0}}])", mismatch("string", "int", "author")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OtherTexts, ReferencesReader,
@@ -190,18 +192,19 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NoJson", "references", mismatch("array", "null", "")},
         Row{"LoneComma", "[,]", mismatch("array", "null", "")},
         Row{"Nul", std::string("\0[]", 3), mismatch("array", "null", "")}),
-    rowName);
+    support::rowName);
 
 TEST_P(ReferencesReader, TakesTheTextAsItIs)
 {
-    EXPECT_EQ(outcomeOf([] { return deserializeReferences(wide(GetParam().document)); }), GetParam().outcome);
+    EXPECT_EQ(
+        outcomeOf([] { return deserializeReferences(support::fromUtf8(GetParam().document)); }), GetParam().outcome);
 }
 
 TEST(ReferencesReader, TakesATextThatIsCutOffAnywhereForNull)
 {
     std::string const whole = "[" + kReference + ", " + withAnnotation(R"({"author": "ann", "date": 1.5})") + "]";
     for (std::size_t length = 0; length < whole.size(); ++length) {
-        OdString const text = wide(whole.substr(0, length));
+        OdString const text = support::fromUtf8(whole.substr(0, length));
         EXPECT_EQ(outcomeOf([&] { return deserializeReferences(text); }), mismatch("array", "null", ""))
             << "cut at " << length;
     }
@@ -222,7 +225,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"WithoutIdBesideWrongName", R"({"name": 1})", "error: Could not parse repo data, missing \"id\""},
         Row{"NameFirst", R"({"id": 1, "name": 1.5})", mismatch("string", "real", "name")},
         Row{"IdLast", R"({"id": 1, "name": "bridge"})", mismatch("string", "int", "id")}),
-    rowName);
+    support::rowName);
 
 TEST_P(RepositoryReader, TakesTheObjectAsItIs)
 {
@@ -231,7 +234,8 @@ TEST_P(RepositoryReader, TakesTheObjectAsItIs)
 
 TEST_P(RepositoryReader, TakesTheTextAsTheObjectInIt)
 {
-    EXPECT_EQ(outcomeOf([] { return deserializeRepoData(wide(GetParam().document)); }), GetParam().outcome);
+    EXPECT_EQ(
+        outcomeOf([] { return deserializeRepoData(support::fromUtf8(GetParam().document)); }), GetParam().outcome);
 }
 
 TEST(RepositoryReader, ThrowsOverEveryMemberOfAnotherType)
@@ -248,11 +252,12 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         Row{"Array", "[]", mismatch("object", "array", "")}, Row{"Empty", "", mismatch("object", "null", "")},
         Row{"NoJson", "{\"name\"}", mismatch("object", "null", "")}, Row{"Int", "7", mismatch("object", "int", "")}),
-    rowName);
+    support::rowName);
 
 TEST_P(RepositoryTextReader, ThrowsOverATextThatHoldsNoObject)
 {
-    EXPECT_EQ(outcomeOf([] { return deserializeRepoData(wide(GetParam().document)); }), GetParam().outcome);
+    EXPECT_EQ(
+        outcomeOf([] { return deserializeRepoData(support::fromUtf8(GetParam().document)); }), GetParam().outcome);
 }
 
 class RepositoriesReader : public testing::TestWithParam<Row> {};
@@ -267,11 +272,12 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NoObject", "[" + kRepository + R"(, "x"])", noObject("string")},
         Row{"ThrowingElement", R"([{"id": [], "name": "x"}])", mismatch("string", "array", "id")},
         Row{"Object", "{}", mismatch("array", "object", "")}, Row{"Empty", "", mismatch("array", "null", "")}),
-    rowName);
+    support::rowName);
 
 TEST_P(RepositoriesReader, TakesTheTextAsItIs)
 {
-    EXPECT_EQ(outcomeOf([] { return deserializeRepoDatas(wide(GetParam().document)); }), GetParam().outcome);
+    EXPECT_EQ(
+        outcomeOf([] { return deserializeRepoDatas(support::fromUtf8(GetParam().document)); }), GetParam().outcome);
 }
 
 class TranslatedReferenceReader : public testing::TestWithParam<Row> {};
@@ -284,7 +290,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Type", R"({"commitHash": "", "name": ""})", "error: {No reference type found in reference.}"},
         Row{"UnsupportedTypeIsNot", R"({"commitHash": "", "name": "", "refType": "x"})", "error: Unsupported type: x"},
         Row{"WrongTypeIsNot", R"({"commitHash": "", "name": "", "refType": 1})", mismatch("string", "int", "refType")}),
-    rowName);
+    support::rowName);
 
 TEST_P(TranslatedReferenceReader, SpeaksTheLanguageOfTheUser)
 {

@@ -5,7 +5,9 @@
 #include "common/mu_common_file_storage.h"
 #include "common/mu_common_repo_prop.h"
 
+#include "tests/support/rows.h"
 #include "tests/support/small_stack.h"
+#include "tests/support/utf8.h"
 
 #include <array>
 #include <random>
@@ -43,11 +45,11 @@ INSTANTIATE_TEST_SUITE_P(
         KindRow{"OneCapital", "tF:plan#1", StorageType::Object},
         KindRow{"BlankBefore", " tf:plan#1", StorageType::Object},
         KindRow{"OtherLetters", "ft:plan#1", StorageType::Object}),
-    rowName);
+    support::rowName);
 
 TEST_P(UrlKind, IsToldByTheFirstTwoCharacters)
 {
-    EXPECT_EQ(urlToType(wide(GetParam().text)), GetParam().type);
+    EXPECT_EQ(urlToType(support::fromUtf8(GetParam().text)), GetParam().type);
 }
 
 class FileKind : public testing::TestWithParam<KindRow> {};
@@ -67,11 +69,11 @@ INSTANTIATE_TEST_SUITE_P(
         KindRow{"ExtensionBeforeAnother", "plan.dwg.bak", StorageType::Object},
         KindRow{"EmptyExtension", "plan.dwg.", StorageType::Object},
         KindRow{"BlankBehind", "plan.dwg ", StorageType::Object}, KindRow{"Empty", "", StorageType::Object}),
-    rowName);
+    support::rowName);
 
 TEST_P(FileKind, IsToldByTheExtension)
 {
-    EXPECT_EQ(fileToType(wide(GetParam().text)), GetParam().type);
+    EXPECT_EQ(fileToType(support::fromUtf8(GetParam().text)), GetParam().type);
 }
 
 /// A URL, the revision and the place that it names; an empty text stands for the error.
@@ -105,7 +107,7 @@ INSTANTIATE_TEST_SUITE_P(
         UrlRow{
             "Nul", std::string("tf:a\0b#c\0d", 10), std::string("c\0d", 3),
             std::string("/bridge/.tav/tf/a\0b.tf", 22)}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     LineEnds, StorageUrl,
@@ -116,7 +118,7 @@ INSTANTIATE_TEST_SUITE_P(
         UrlRow{"CarriageReturnInRevision", "tf:a#\r1", kInvalid, kInvalid},
         UrlRow{"LineSeparator", "tf:a\u2028#1", "1", "/bridge/.tav/tf/a\u2028.tf"},
         UrlRow{"InAnObject", "po\n" + kHash, kHash, "/bridge/.tav/objects/" + kHash}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     Objects, StorageUrl,
@@ -129,7 +131,7 @@ INSTANTIATE_TEST_SUITE_P(
         UrlRow{"Shorter", "po1", "po1", "/bridge/.tav/objects/po1"},
         UrlRow{"LettersAlone", "po", "po", "/bridge/.tav/objects/po"},
         UrlRow{"Marks", "po#3#7", "po#3#7", "/bridge/.tav/objects/po#3#7"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OtherTexts, StorageUrl,
@@ -138,20 +140,20 @@ INSTANTIATE_TEST_SUITE_P(
         UrlRow{"ObjectInCapitals", "PO" + kHash, kInvalid, kInvalid}, UrlRow{"OneLetter", "p", kInvalid, kInvalid},
         UrlRow{"OtherForm", "http://plan#1", kInvalid, kInvalid}, UrlRow{"HashAlone", kHash, kInvalid, kInvalid},
         UrlRow{"Placeholder", "%ls%n", kInvalid, kInvalid}, UrlRow{"BlankBefore", " tf:plan#1", kInvalid, kInvalid}),
-    rowName);
+    support::rowName);
 
 TEST_P(StorageUrl, NamesARevision)
 {
     UrlRow const& row = GetParam();
     std::string const error = "error: Internal error, invalid url occur: " + row.url;
-    EXPECT_EQ(inWords(getRevision(wide(row.url))), row.revision == kInvalid ? error : row.revision);
+    EXPECT_EQ(inWords(getRevision(support::fromUtf8(row.url))), row.revision == kInvalid ? error : row.revision);
 }
 
 TEST_P(StorageUrl, NamesAPlace)
 {
     UrlRow const& row = GetParam();
     std::string const error = "error: invalid url: " + row.url;
-    EXPECT_EQ(inWords(getStoragePath(kRoot, wide(row.url))), row.place == kInvalid ? error : row.place);
+    EXPECT_EQ(inWords(getStoragePath(kRoot, support::fromUtf8(row.url))), row.place == kInvalid ? error : row.place);
 }
 
 TEST(StorageUrlMessages, AreTranslatedBeforeTheUrlIsFilledIn)
@@ -195,7 +197,7 @@ public:
     }
 
 private:
-    static std::string lastCharacters(std::string const& url) { return inWords(wide(url).right(64)); }
+    static std::string lastCharacters(std::string const& url) { return inWords(support::fromUtf8(url).right(64)); }
 
     std::regex const revision_{".*#(.*)"};
     std::regex const place_{"tf:(.*?)#.*"};
@@ -220,8 +222,9 @@ class StorageUrlByItsForm : public testing::Test {
 protected:
     void expectTheForms(std::string const& url) const
     {
-        EXPECT_EQ(inWords(getRevision(wide(url))), forms.revision(url)) << testing::PrintToString(url);
-        EXPECT_EQ(inWords(getStoragePath(kRoot, wide(url))), forms.place(url)) << testing::PrintToString(url);
+        EXPECT_EQ(inWords(getRevision(support::fromUtf8(url))), forms.revision(url)) << testing::PrintToString(url);
+        EXPECT_EQ(inWords(getStoragePath(kRoot, support::fromUtf8(url))), forms.place(url))
+            << testing::PrintToString(url);
     }
 
     Forms const forms;
@@ -269,9 +272,9 @@ TEST(DocumentedExample, OfStorageUrls)
     std::getline(lines, line); // The titles of the columns.
     int count = 0;
     for (std::string url, kind, revision, place; lines >> url >> kind >> revision >> place; ++count) {
-        Expected<OdString> const namedRevision = getRevision(wide(url));
-        Expected<OdString> const namedPlace = getStoragePath(kRoot, wide(url));
-        EXPECT_EQ(urlToType(wide(url)) == StorageType::Tf ? "drawing" : "object", kind) << url;
+        Expected<OdString> const namedRevision = getRevision(support::fromUtf8(url));
+        Expected<OdString> const namedPlace = getStoragePath(kRoot, support::fromUtf8(url));
+        EXPECT_EQ(urlToType(support::fromUtf8(url)) == StorageType::Tf ? "drawing" : "object", kind) << url;
         EXPECT_EQ(namedRevision.hasValue() ? inWords(namedRevision.value()) : "-", revision) << url;
         EXPECT_EQ(namedPlace.hasValue() ? inWords(namedPlace.value()) : "-", place) << url;
     }

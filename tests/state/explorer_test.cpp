@@ -1,6 +1,7 @@
 #include "common/mu_common_diff.h"
 
 #include "tests/support/temp_folder.h"
+#include "tests/support/utf8.h"
 
 #include <gmock/gmock.h>
 #include <optional>
@@ -25,11 +26,6 @@ using testing::IsEmpty;
 
 using Found = std::variant<StagedFile, std::monostate, ErrorMessage>;
 
-OdString wide(std::string_view text)
-{
-    return {text.data(), text.size(), CP_UTF_8};
-}
-
 /// Lists of paths, as they go into the changes.
 struct Paths {
     std::vector<std::string> modified;
@@ -43,16 +39,17 @@ RepoChanges changesOf(Paths const& paths)
     RepoChanges changes;
     changes.files = {{L"carried-along.dwg"}};
     for (std::string const& path : paths.modified) {
-        changes.modified.push_back({nullptr, {wide(path)}, {L"committed/" + wide(path), L"tf:x#1"}, 0});
+        changes.modified.push_back(
+            {nullptr, {support::fromUtf8(path)}, {L"committed/" + support::fromUtf8(path), L"tf:x#1"}, 0});
     }
     for (std::string const& path : paths.untracked) {
-        changes.untracked.push_back({nullptr, {wide(path)}, 0});
+        changes.untracked.push_back({nullptr, {support::fromUtf8(path)}, 0});
     }
     for (std::string const& path : paths.removed) {
-        changes.removed.push_back({nullptr, {wide(path), L"tf:x#1"}, 0});
+        changes.removed.push_back({nullptr, {support::fromUtf8(path), L"tf:x#1"}, 0});
     }
     for (std::string const& path : paths.unchanged) {
-        changes.unchanged.push_back({wide(path), L"tf:x#1"});
+        changes.unchanged.push_back({support::fromUtf8(path), L"tf:x#1"});
     }
     return changes;
 }
@@ -359,21 +356,21 @@ INSTANTIATE_TEST_SUITE_P(Rows, FilePattern, testing::ValuesIn(kMatches), [](auto
 
 TEST_P(FilePattern, Matches)
 {
-    EXPECT_EQ(std::regex_match(GetParam().path, filePattern(wide(GetParam().typed))), GetParam().matches);
+    EXPECT_EQ(std::regex_match(GetParam().path, filePattern(support::fromUtf8(GetParam().typed))), GetParam().matches);
 }
 
 TEST_P(FilePattern, FindsCandidates)
 {
     RepoFileExplorer const explorer = explorerOf({{}, {"other", GetParam().path}, {}, {}});
     std::string const expected = GetParam().matches ? "added " + GetParam().path : "nothing";
-    EXPECT_EQ(inWords(explorer.findForStaging(wide(GetParam().typed))), expected);
+    EXPECT_EQ(inWords(explorer.findForStaging(support::fromUtf8(GetParam().typed))), expected);
 }
 
 TEST_P(FilePattern, FindsUnchangedFiles)
 {
     RepoFileExplorer const explorer = explorerOf({{}, {}, {}, {"other", GetParam().path}});
     std::string const expected = GetParam().matches ? GetParam().path : "";
-    EXPECT_EQ(explorer.findUnchanged(wide(GetParam().typed)).ansi_str(), expected);
+    EXPECT_EQ(explorer.findUnchanged(support::fromUtf8(GetParam().typed)).ansi_str(), expected);
 }
 
 class InvalidName : public testing::TestWithParam<std::string> {};
@@ -386,7 +383,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_P(InvalidName, ThrowsFromEveryQueryEvenIfThereIsNothingToLookThrough)
 {
-    OdString const name = wide(GetParam());
+    OdString const name = support::fromUtf8(GetParam());
     EXPECT_THROW(filePattern(name), std::regex_error);
     for (Paths const& paths : {Paths(), Paths{{"plan.dwg"}, {"plan.dwg"}, {}, {"plan.dwg"}}}) {
         RepoFileExplorer const explorer = explorerOf(paths);

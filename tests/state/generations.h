@@ -2,6 +2,7 @@
 #pragma once
 
 #include "tests/state/states.h"
+#include "tests/support/utf8.h"
 
 #include <cstdint>
 #include <string>
@@ -20,9 +21,9 @@ inline std::string entryPath(int entry)
 inline State generation(std::uint64_t number)
 {
     State state;
-    state.head = wide("generation-" + std::to_string(number));
+    state.head = support::fromUtf8("generation-" + std::to_string(number));
     for (int entry = 0; entry < kEntries; ++entry) {
-        state.index[wide(entryPath(entry))] = {number, number % 2 == 1};
+        state.index[support::fromUtf8(entryPath(entry))] = {number, number % 2 == 1};
     }
     return state;
 }

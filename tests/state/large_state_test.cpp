@@ -1,5 +1,6 @@
 // States of large repositories. Nothing here looks at a clock: what takes quadratic time does not end in time.
 #include "tests/state/states.h"
+#include "tests/support/utf8.h"
 
 #include <gmock/gmock.h>
 #include <string>
@@ -13,7 +14,7 @@ constexpr std::size_t kFiles = 200'000;
 
 OdString pathOf(std::size_t number)
 {
-    return wide("house-" + std::to_string(number % 2'000) + "/drawing-" + std::to_string(number) + ".dwg");
+    return support::fromUtf8("house-" + std::to_string(number % 2'000) + "/drawing-" + std::to_string(number) + ".dwg");
 }
 
 TEST(LargeState, TakesIndexRecordsOfAllStagedFilesAndDropsThem)
@@ -52,7 +53,7 @@ TEST(LargeState, IsSavedAndLoadedWhole)
 TEST(LargeState, IsSavedWhenOnePathIsMuchLongerThanTheOthers)
 {
     State state;
-    OdString const longPath = wide(std::string(100'000, 'a'));
+    OdString const longPath = support::fromUtf8(std::string(100'000, 'a'));
     state.index[longPath] = {1, false};
     for (std::size_t i = 0; i < kFiles; ++i) {
         state.index[pathOf(i)] = {i, false};

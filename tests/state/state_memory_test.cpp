@@ -1,9 +1,10 @@
 // What states cost in memory, and what happens when there is none.
 #include "tests/state/golden.h"
-#include "tests/state/memory.h"
 #include "tests/state/states.h"
 
 #include "tests/server/translations.h"
+#include "tests/support/allocations.h"
+#include "tests/support/utf8.h"
 
 #include <gmock/gmock.h>
 #include <new>
@@ -12,14 +13,18 @@
 namespace {
 
 using namespace states;
+using support::FailingAllocation;
 using testing::ElementsAre;
+
+constexpr std::uint64_t kFiles = 20'000;
 
 State largeState()
 {
     State state;
-    for (std::uint64_t i = 0; i < 200'000; ++i) {
+    for (std::uint64_t i = 0; i < kFiles; ++i) {
         std::string const number = std::to_string(i);
-        state.index[wide("houses/block-" + std::to_string(i % 2'000) + "/ground-floor-" + number + ".dwg")] = {
+        state.index[support::fromUtf8(
+            "houses/block-" + std::to_string(i % 2'000) + "/ground-floor-" + number + ".dwg")] = {
             1'700'000'000'123'456'789 + i, false};
     }
     return state;
@@ -39,20 +44,20 @@ protected:
 
 TEST_F(MemoryOfLargeState, ForLoadingIsAFewTimesTheFile)
 {
-    PeakOfMemory const peak;
-    ASSERT_EQ(repository_.open()->read().index.size(), 200'000U);
-    RecordProperty("times_the_file_in_percent", std::to_string(100 * peak.bytes() / fileSize_));
-    EXPECT_LT(peak.bytes(), 7 * fileSize_);
+    support::WatchedMemory const memory;
+    ASSERT_EQ(repository_.open()->read().index.size(), kFiles);
+    RecordProperty("times_the_file_in_percent", std::to_string(100 * memory.peak() / fileSize_));
+    EXPECT_LT(memory.peak(), 7 * fileSize_);
 }
 
 TEST_F(MemoryOfLargeState, ForSavingIsAFewTimesTheFile)
 {
     std::shared_ptr<Cache> cache = repository_.open();
     cache->write();
-    PeakOfMemory const peak;
+    support::WatchedMemory const memory;
     cache.reset();
-    RecordProperty("times_the_file_in_percent", std::to_string(100 * peak.bytes() / fileSize_));
-    EXPECT_LT(peak.bytes(), 12 * fileSize_);
+    RecordProperty("times_the_file_in_percent", std::to_string(100 * memory.peak() / fileSize_));
+    EXPECT_LT(memory.peak(), 12 * fileSize_);
 }
 
 std::string const kOld = golden("escaped.json");
@@ -66,7 +71,7 @@ public:
     std::int32_t accept(OdString const& /*path*/) const override { return 0; }
     void report(WriteOutcome const& outcome) const override
     {
-        FailingDemand::stop();
+        FailingAllocation::pause();
         io_.report(outcome);
     }
 
@@ -89,10 +94,10 @@ TEST(ScarceMemory, LeavesTheOldOrTheNewStateAndOneReportWheneverItRunsOutInSavin
         auto cache = std::make_unique<Cache>(repository.root(), state, io);
         cache->write();
         {
-            FailingDemand const failing(n);
+            FailingAllocation const failing(n);
             cache.reset();
         }
-        more = FailingDemand::hasFailed();
+        more = FailingAllocation::hasFailed();
         ASSERT_EQ(repository.calls().size(), 1U);
         std::string const told = repository.calls().front();
         EXPECT_EQ(told, more ? kLibrarysOwn : "report success");
@@ -110,7 +115,7 @@ TEST(ScarceMemory, InSavingIsReportedInTheUsersLanguage)
     Repository const repository(kOld);
     ThriftyIo const io(repository.io());
     auto cache = std::make_unique<Cache>(repository.root(), io);
-    FailingDemand const failing(0);
+    FailingAllocation const failing(0);
     cache.reset();
     EXPECT_THAT(
         repository.calls(),
@@ -127,15 +132,15 @@ TEST(ScarceMemory, IsThrownByLoadingWhichChangesNothing)
     for (long n = 0; more; ++n) {
         std::string outcome;
         try {
-            FailingDemand const failing(n);
+            FailingAllocation const failing(n);
             Expected<std::shared_ptr<Cache>> const cache = repository.load();
-            FailingDemand::stop();
+            FailingAllocation::pause();
             outcome = inWords(cache);
         } catch (std::bad_alloc const&) {
             outcome = "no memory";
             ++exceptions;
         }
-        more = FailingDemand::hasFailed();
+        more = FailingAllocation::hasFailed();
         std::string const noMemory =
             "error: Could not read file '" + repository.statePath() + "': Cannot allocate memory";
         EXPECT_TRUE(outcome == (more ? "no memory" : expected) || (more && outcome == noMemory))

@@ -1,5 +1,6 @@
 #include "tests/state/golden.h"
 #include "tests/state/states.h"
+#include "tests/support/rows.h"
 
 #include <gmock/gmock.h>
 #include <string>
@@ -88,7 +89,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"UnknownMembersAreIgnored",
             R"({"head": {"reference": "a", "tag": [1], "references": {}}, "staged_references": 5, "Index": 5})",
             "HEAD a\n"}),
-    rowName);
+    support::rowName);
 
 // The number is looked up as "head", though it is written as "commit".
 INSTANTIATE_TEST_SUITE_P(
@@ -111,7 +112,7 @@ INSTANTIATE_TEST_SUITE_P(
             mismatch("int", "real", "head")},
         Row{"ErrorComesBeforeThoseOfTheLists", R"({"head": {"commit": 17, "reference": "a"}, "staged_files": 5})",
             missing("head")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OfStagedFiles, StateReading,
@@ -143,7 +144,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"AreReadBeforeRenamesAndIndex",
             R"({"head": {"reference": "master"}, "index": 5, "renames": 5, "staged_files": [5]})",
             noObject("int", "vector")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OfRenames, StateReading,
@@ -164,7 +165,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NewPathIsReadFirst", renames("{}"), missing("new")},
         Row{"AreReadBeforeTheIndex", R"({"head": {"reference": "master"}, "index": [5], "renames": [true]})",
             noObject("bool", "map")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OfTheIndex, StateReading,
@@ -246,7 +247,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"DataIsTakenBeforePath", indexed("{}"), missing("data")},
         Row{"PathIsReadBeforeTime", indexed(R"({"data": {}})"), missing("path")},
         Row{"TimeIsReadBeforeMark", indexed(R"({"data": {}, "path": "a"})"), missing("last_checked")}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OfTheWholeText, StateReading,
@@ -265,7 +266,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"CommasBeforeBracketsAreAccepted",
             R"({"head": {"reference": "a",}, "renames": [{"new": "b", "previous": "a",},],})",
             "HEAD a\nrename a -> b\n"}),
-    rowName);
+    support::rowName);
 
 INSTANTIATE_TEST_SUITE_P(
     OfWholeDocuments, StateReading,
@@ -284,7 +285,7 @@ INSTANTIATE_TEST_SUITE_P(
             "index plans/ground.dwg 1700000000\n"
             "index plans/roof-new.dwg 1700000500 modified\n"},
         Row{"OfAllPartsWithACommit", golden("full.json"), missing("head")}),
-    rowName);
+    support::rowName);
 
 /// A member of the document and the type that it must have; in `document` stands $ for its value.
 struct Member {
@@ -321,7 +322,7 @@ INSTANTIATE_TEST_SUITE_P(
             indexed(R"({"data": {"last_checked": $, "modified": 5}, "path": "a"})")},
         Member{
             "Modified", "modified", "bool", indexed(R"({"data": {"last_checked": 1, "modified": $}, "path": "a"})")}),
-    rowName);
+    support::rowName);
 
 TEST_P(StateMember, IsRefusedInAnyOtherType)
 {
@@ -348,7 +349,7 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         Member{"StagedFile", "", "vector", staged("$")}, Member{"Rename", "", "map", renames("$")},
         Member{"IndexEntry", "", "map", indexed("$")}),
-    rowName);
+    support::rowName);
 
 TEST_P(ListElement, IsRefusedUnlessItIsAnObject)
 {

@@ -3,6 +3,7 @@
 
 #include "common/mu_common_diff.h"
 #include "tests/server/translations.h"
+#include "tests/support/rows.h"
 
 #include <gmock/gmock.h>
 #include <string>
@@ -65,7 +66,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"OddTypeIsNotTranslated", "[]", mismatch("object", "array", "")},
         Row{"OddElementIsNotTranslated", R"({"head": {"reference": "a"}, "index": [5]})",
             "error: Encounterd 'object', found 'int. While parsing json map.'"}),
-    rowName);
+    support::rowName);
 
 TEST_P(StateMessage, IsAsTranslated)
 {

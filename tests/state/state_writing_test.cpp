@@ -2,6 +2,8 @@
 #include "tests/state/states.h"
 
 #include "tests/support/foreign_locale.h"
+#include "tests/support/rows.h"
+#include "tests/support/utf8.h"
 
 #include <clocale>
 #include <gmock/gmock.h>
@@ -30,7 +32,7 @@ State oddState()
     state.index = {
         {L"a \"b\" \\ c/\b\t\n\f\r\v\x01\x7F'.dwg", {0, true}},
         {L"\u5E73\u9762\u56F3.dwg", {kMostSigned, false}},
-        {wide("\xFF\x80.dwg"), {kMostSigned + 1, false}},
+        {support::fromUtf8("\xFF\x80.dwg"), {kMostSigned + 1, false}},
         {L"\U0001F600.dwg", {kMost, true}}};
     state.renames = {{L"\u00E4.dwg", OdString(L"\0.dwg", 5)}, {L"a.dwg", L""}, {L"Z.dwg", L"%ls"}};
     state.stagedFiles = {{L"\u00DF.dwg", FileChange::removed}};
@@ -143,7 +145,7 @@ std::vector<Row> rows()
 
 class StateWriting : public testing::TestWithParam<Row> {};
 
-INSTANTIATE_TEST_SUITE_P(Rows, StateWriting, testing::ValuesIn(rows()), rowName);
+INSTANTIATE_TEST_SUITE_P(Rows, StateWriting, testing::ValuesIn(rows()), support::rowName);
 
 TEST_P(StateWriting, GivesTheDocument)
 {

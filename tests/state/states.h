@@ -27,12 +27,6 @@ using common::StagedFile;
 using common::State;
 using common::Transaction;
 
-/// UTF-8 as the library takes it.
-inline OdString wide(std::string_view text)
-{
-    return {text.data(), text.size(), CP_UTF_8};
-}
-
 /// One line for HEAD and for each staged file, rename and index record:
 ///     HEAD feature 17
 ///     staged modified plans/ground.dwg
@@ -127,8 +121,5 @@ inline std::string unwritable(Repository const& repository)
 {
     return "report error: Error writing to file '" + repository.statePath() + "'";
 }
-
-/// Names a row of a table by its member `name`.
-inline constexpr auto rowName = [](auto const& row) { return std::string(row.param.name); };
 
 } // namespace states

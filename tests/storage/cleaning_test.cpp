@@ -1,4 +1,5 @@
 #include "storage_test.h"
+#include "tests/support/utf8.h"
 
 #include <set>
 
@@ -15,7 +16,7 @@ protected:
     {
         std::set<OdString> kept;
         for (std::string const& url : wanted) {
-            kept.insert(wide(url));
+            kept.insert(support::fromUtf8(url));
         }
         auto const freed = newStorage().keepOnly(repo.root(), kept);
         return freed.hasValue() ? std::to_string(freed.value().contents) + " contents, " +
@@ -23,7 +24,10 @@ protected:
                                 : messageOf(freed);
     }
 
-    std::string remove(std::string const& url) const { return messageOf(newStorage().remove(repo.root(), wide(url))); }
+    std::string remove(std::string const& url) const
+    {
+        return messageOf(newStorage().remove(repo.root(), support::fromUtf8(url)));
+    }
 
     /// Versions of "plan.dwg", a new whole one every third time.
     void commitMany()

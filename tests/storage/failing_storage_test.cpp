@@ -3,6 +3,7 @@
 
 #include "platform/os/os_calls.h"
 #include "tests/support/failing_call.h"
+#include "tests/support/utf8.h"
 
 #include <cerrno>
 
@@ -169,7 +170,8 @@ TEST_P(FailingStorage, RestoresTheOldFileOrTheNewOne)
         std::string name;
         {
             FailingCall const failing(n, GetParam());
-            succeeded = scene.newStorage().restore(scene.repo.root(), wide(scene.second), L"plan.dwg").hasValue();
+            succeeded =
+                scene.newStorage().restore(scene.repo.root(), support::fromUtf8(scene.second), L"plan.dwg").hasValue();
             more = failing.hasFailed();
             name = failing.name();
         }
@@ -189,8 +191,9 @@ TEST_P(FailingStorage, ExtractsTheWholeContentOrNothing)
         std::string name;
         {
             FailingCall const failing(n, GetParam());
-            succeeded =
-                scene.newStorage().extract(scene.repo.root(), wide(scene.second), scene.repo.pathTo("copy")).hasValue();
+            succeeded = scene.newStorage()
+                            .extract(scene.repo.root(), support::fromUtf8(scene.second), scene.repo.pathTo("copy"))
+                            .hasValue();
             more = failing.hasFailed();
             name = failing.name();
         }
@@ -208,7 +211,8 @@ TEST_P(FailingStorage, CleansWithoutLosingWhatIsKept)
         std::string name;
         {
             FailingCall const failing(n, GetParam());
-            static_cast<void>(scene.newStorage().keepOnly(scene.repo.root(), {wide(scene.second), wide(scene.object)}));
+            static_cast<void>(scene.newStorage().keepOnly(
+                scene.repo.root(), {support::fromUtf8(scene.second), support::fromUtf8(scene.object)}));
             more = failing.hasFailed();
             name = failing.name();
         }
@@ -232,9 +236,10 @@ TEST(InterruptedStorage, GoesOnWhicheverCallIsInterrupted)
         std::vector<std::string> urls;
         FailingCall const failing(n, EINTR);
         EXPECT_TRUE(storeThree(scene, urls)) << failing.name();
-        EXPECT_TRUE(scene.newStorage().restore(scene.repo.root(), wide(urls.at(0)), L"new").hasValue())
+        EXPECT_TRUE(scene.newStorage().restore(scene.repo.root(), support::fromUtf8(urls.at(0)), L"new").hasValue())
             << failing.name();
-        EXPECT_TRUE(scene.newStorage().keepOnly(scene.repo.root(), {wide(urls.at(0))}).hasValue()) << failing.name();
+        EXPECT_TRUE(scene.newStorage().keepOnly(scene.repo.root(), {support::fromUtf8(urls.at(0))}).hasValue())
+            << failing.name();
         more = failing.hasFailed();
     }
 }

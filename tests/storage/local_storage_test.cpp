@@ -1,6 +1,7 @@
 #include "storage_test.h"
 
 #include "platform/os/os_calls.h"
+#include "tests/support/utf8.h"
 
 #include <cerrno>
 #include <sys/stat.h>
@@ -21,12 +22,12 @@ class LocalStorage : public StorageTest {
 protected:
     std::string restore(std::string const& url, std::string const& target) const
     {
-        return messageOf(newStorage().restore(repo.root(), wide(url), wide(target)));
+        return messageOf(newStorage().restore(repo.root(), support::fromUtf8(url), support::fromUtf8(target)));
     }
 
     std::string extract(std::string const& url, std::string const& path) const
     {
-        return messageOf(newStorage().extract(repo.root(), wide(url), repo.pathTo(path)));
+        return messageOf(newStorage().extract(repo.root(), support::fromUtf8(url), repo.pathTo(path)));
     }
 
     mode_t modeOf(std::string const& name) const
@@ -66,7 +67,7 @@ TEST_F(LocalStorage, GivesBackContentsOfAnyLength)
             for (char const* const name : {"file", "plan.dwg", "b\xff\n.dwg", "a\xfe.txt"}) {
                 std::string const url = store(name, content);
                 EXPECT_EQ(contentOf(url), content) << url;
-                EXPECT_EQ(newStorage().size(repo.root(), wide(url)).value(), size);
+                EXPECT_EQ(newStorage().size(repo.root(), support::fromUtf8(url)).value(), size);
                 EXPECT_EQ(verify(url), "success");
             }
         }
@@ -137,7 +138,7 @@ TEST_F(LocalStorage, KeepsEqualContentOfOneBatchOnce)
     std::vector<OdString> urls;
     for (char const* const name : {"a.dwg", "b.dwg", "c"}) {
         repo.write(name, "abc");
-        urls.push_back(storage.store(repo.root(), wide(name)).value());
+        urls.push_back(storage.store(repo.root(), support::fromUtf8(name)).value());
     }
     EXPECT_EQ(messageOf(storage.flush(repo.root())), "success");
     EXPECT_EQ(urls[0], urls[1]);
@@ -190,11 +191,13 @@ TEST_F(LocalStorage, RepairsAContentFromAFileThatHasItAndFromNoOther)
     for (char const* const name : {"file", "plan.dwg"}) {
         std::string const url = store(name, "abc");
         tav::LocalStorage storage = newStorage();
-        EXPECT_FALSE(storage.repair(repo.root(), wide(url), wide(name)).value());
+        EXPECT_FALSE(storage.repair(repo.root(), support::fromUtf8(url), support::fromUtf8(name)).value());
         repo.write(fileOf(url), "damaged");
         repo.write("other", "abd");
-        EXPECT_EQ(messageOf(storage.repair(repo.root(), wide(url), L"other")), "'other' has another content by now.");
-        EXPECT_TRUE(storage.repair(repo.root(), wide(url), wide(name)).value());
+        EXPECT_EQ(
+            messageOf(storage.repair(repo.root(), support::fromUtf8(url), L"other")),
+            "'other' has another content by now.");
+        EXPECT_TRUE(storage.repair(repo.root(), support::fromUtf8(url), support::fromUtf8(name)).value());
         EXPECT_EQ(contentOf(url), "abc");
     }
 }
@@ -206,7 +209,7 @@ TEST_F(LocalStorage, KeepsADamagedObjectUntilTheNewOneIsFlushed)
     {
         tav::LocalStorage storage = newStorage();
         EXPECT_EQ(messageOf(storage.store(repo.root(), L"file")), "success");
-        EXPECT_EQ(messageOf(storage.verify(repo.root(), wide(url))), "success");
+        EXPECT_EQ(messageOf(storage.verify(repo.root(), support::fromUtf8(url))), "success");
     }
     EXPECT_THAT(files(), ElementsAre(fileOf(url)));
     EXPECT_EQ(repo.read(fileOf(url)), "damaged");
@@ -226,7 +229,7 @@ TEST_F(LocalStorage, ReadsAKnownContentOnceHoweverManyFilesHaveIt)
         return RealCallsAfterwards::real.openat(folder, name, flags, mode);
     };
     for (int i = 0; i < 3; ++i) {
-        EXPECT_EQ(storage.store(repo.root(), L"a.dwg").value(), wide(known[kAbc]));
+        EXPECT_EQ(storage.store(repo.root(), L"a.dwg").value(), support::fromUtf8(known[kAbc]));
     }
     EXPECT_EQ(opened, 1);
 }
@@ -237,8 +240,8 @@ TEST_F(LocalStorage, AppendsToTheStoreOfADrawingThatWasRenamed)
     committed["sub/north wing.dwg"] = first;
     std::string const second = store("sub/north wing.dwg", edited(drawing(1, 2000), 1));
     EXPECT_EQ(fileOf(second), fileOf(first));
-    auto const all = newStorage().revisions(repo.root(), wide(second));
-    EXPECT_THAT(all.value(), ElementsAre(wide(first), wide(second)));
+    auto const all = newStorage().revisions(repo.root(), support::fromUtf8(second));
+    EXPECT_THAT(all.value(), ElementsAre(support::fromUtf8(first), support::fromUtf8(second)));
     EXPECT_LT(repo.read(fileOf(first)).size(), 2500u);
 }
 
@@ -287,7 +290,7 @@ TEST_F(LocalStorage, RefusesAFileThatChangesWhileItIsStored)
                 return RealCallsAfterwards::real.pread(file, buffer, count, offset);
             };
             tav::LocalStorage storage = newStorage();
-            auto const url = storage.store(repo.root(), wide(name));
+            auto const url = storage.store(repo.root(), support::fromUtf8(name));
             os::calls() = RealCallsAfterwards::real;
             EXPECT_EQ(messageOf(storage.flush(repo.root())), "success");
             if (!url.hasValue()) {
@@ -386,7 +389,7 @@ TEST_F(LocalStorage, StopsReadingWhenTheSinkHasEnough)
 {
     std::string const url = store("file", drawing(1, 3 * kSegment));
     std::size_t total = 0;
-    auto const outcome = newStorage().read(repo.root(), wide(url), [&](char const*, std::size_t count) {
+    auto const outcome = newStorage().read(repo.root(), support::fromUtf8(url), [&](char const*, std::size_t count) {
         total += count;
         return false;
     });
@@ -404,17 +407,21 @@ TEST_F(LocalStorage, SaysWhatIsKept)
     EXPECT_FALSE(contains("tf:x#" + kAbc));
     EXPECT_EQ(messageOf(newStorage().contains(repo.root(), L"po:1")), "'po:1' is no URL of this storage.");
     EXPECT_EQ(verify(other), "'" + other + "' is not in the storage.");
-    EXPECT_EQ(messageOf(newStorage().size(repo.root(), wide(other))), "'" + other + "' is not in the storage.");
-    EXPECT_EQ(messageOf(newStorage().revisions(repo.root(), wide(other))), "'" + other + "' is not in the storage.");
+    EXPECT_EQ(
+        messageOf(newStorage().size(repo.root(), support::fromUtf8(other))), "'" + other + "' is not in the storage.");
+    EXPECT_EQ(
+        messageOf(newStorage().revisions(repo.root(), support::fromUtf8(other))),
+        "'" + other + "' is not in the storage.");
     std::string const object = store("file", "text");
-    EXPECT_THAT(newStorage().revisions(repo.root(), wide(object)).value(), ElementsAre(wide(object)));
+    EXPECT_THAT(
+        newStorage().revisions(repo.root(), support::fromUtf8(object)).value(), ElementsAre(support::fromUtf8(object)));
 }
 
 TEST_F(LocalStorage, MergesOnlyWhatIsEqualOrMissing)
 {
     std::string const url = store("plan.dwg", "abc");
     auto const merge = [&](char const* target, std::string const& version) {
-        return newStorage().mergeFromStorage(repo.root(), wide(target), wide(version));
+        return newStorage().mergeFromStorage(repo.root(), support::fromUtf8(target), support::fromUtf8(version));
     };
     EXPECT_TRUE(merge("plan.dwg", url).value());
     EXPECT_TRUE(merge("new.dwg", url).value());

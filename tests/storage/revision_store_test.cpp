@@ -1,5 +1,7 @@
 // What a revision store serves when its file has been cut, damaged or made up.
 #include "storage_test.h"
+#include "tests/support/rows.h"
+#include "tests/support/utf8.h"
 
 #include <functional>
 #include <zstd.h>
@@ -173,8 +175,9 @@ TEST_F(RevisionStore, StoresARevisionAgainThatAnInterruptedCommitLeftDamaged)
     committed["plan.dwg"] = urls[1];
     EXPECT_EQ(store("plan.dwg", contents[2]), urls[2]);
     EXPECT_EQ(contentOf(urls[2]), contents[2]);
-    auto const all = newStorage().revisions(repo.root(), wide(urls[2]));
-    EXPECT_THAT(all.value(), ElementsAre(wide(urls[0]), wide(urls[1]), wide(urls[2])));
+    auto const all = newStorage().revisions(repo.root(), support::fromUtf8(urls[2]));
+    EXPECT_THAT(
+        all.value(), ElementsAre(support::fromUtf8(urls[0]), support::fromUtf8(urls[1]), support::fromUtf8(urls[2])));
 }
 
 TEST_F(RevisionStore, ReadsLaterRevisionsAgainWhenTheOneTheyBuildOnIsStoredAgain)
@@ -236,7 +239,8 @@ TEST_F(RevisionStore, LosesTheDamagedRecordOfARevisionStoredAgainWithTheNextClea
     for (std::size_t const place : {std::size_t{40}, std::size_t{150}}) {
         damage(place);
         EXPECT_EQ(store("plan.dwg", contents[0]), urls[0]);
-        auto const freed = newStorage().keepOnly(repo.root(), {wide(urls[0]), wide(urls[1]), wide(urls[2])});
+        auto const freed = newStorage().keepOnly(
+            repo.root(), {support::fromUtf8(urls[0]), support::fromUtf8(urls[1]), support::fromUtf8(urls[2])});
         EXPECT_EQ(messageOf(freed), "success");
         EXPECT_EQ(repo.read(file).size(), whole.size());
         EXPECT_TRUE(recordsOf(urls[0]).isClean());
@@ -277,7 +281,7 @@ TEST_P(RevisionStoreChains, GrowToTheirBoundAndBeginAgain)
 INSTANTIATE_TEST_SUITE_P(
     Lengths, RevisionStoreChains,
     testing::Values(Chains{"OneSegment", 1u << 12U, 32}, Chains{"MoreThanOneSegment", (1u << 12U) + 1, 8}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST_F(RevisionStore, KeepsAContentWholeWhereTheBaseIsOfNoUse)
 {
@@ -324,7 +328,7 @@ INSTANTIATE_TEST_SUITE_P(
         Change{"Appendage", [](std::string bytes) { return bytes + "appended"; }},
         Change{"GrownWithZeros", [](std::string bytes) { return bytes + std::string(20 * kSegment, '\0'); }},
         Change{"CutToOneSegment", [](std::string bytes) { return bytes.substr(0, kSegment); }}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 TEST_F(RevisionStore, BuildsALargeContentOnASmallOne)
 {

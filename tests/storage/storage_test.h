@@ -6,6 +6,7 @@
 #include "host/storage/storage_error.h"
 
 #include "tests/support/temp_repository.h"
+#include "tests/support/utf8.h"
 
 #include <gmock/gmock.h>
 
@@ -15,11 +16,6 @@
 #include <vector>
 
 namespace storage_tests {
-
-inline OdString wide(std::string const& text)
-{
-    return OdString(text.data(), text.size(), CP_UTF_8);
-}
 
 /// What a result without a value says; "success" when there is nothing to say.
 template <class T>
@@ -66,7 +62,7 @@ protected:
     {
         repo.write(name, content);
         tav::LocalStorage storage = newStorage();
-        auto const url = storage.store(repo.root(), wide(name));
+        auto const url = storage.store(repo.root(), support::fromUtf8(name));
         WriteOutcome const flushed = storage.flush(repo.root());
         return url.hasValue() && flushed.hasValue() ? url.value().ansi_str() : messageOf(url) + messageOf(flushed);
     }
@@ -84,18 +80,22 @@ protected:
     {
         std::string content;
         tav::LocalStorage storage = newStorage();
-        WriteOutcome const outcome = storage.read(repo.root(), wide(url), [&](char const* bytes, std::size_t count) {
-            content.append(bytes, count);
-            return true;
-        });
+        WriteOutcome const outcome =
+            storage.read(repo.root(), support::fromUtf8(url), [&](char const* bytes, std::size_t count) {
+                content.append(bytes, count);
+                return true;
+            });
         return outcome.hasValue() ? content : messageOf(outcome);
     }
 
-    std::string verify(std::string const& url) const { return messageOf(newStorage().verify(repo.root(), wide(url))); }
+    std::string verify(std::string const& url) const
+    {
+        return messageOf(newStorage().verify(repo.root(), support::fromUtf8(url)));
+    }
 
     bool contains(std::string const& url) const
     {
-        auto const answer = newStorage().contains(repo.root(), wide(url));
+        auto const answer = newStorage().contains(repo.root(), support::fromUtf8(url));
         return answer.hasValue() && answer.value();
     }
 
@@ -130,7 +130,7 @@ private:
     static OdString lookUp(std::map<std::string, std::string> const& urls, OdString const& key)
     {
         auto const found = urls.find(key.ansi_str());
-        return found == urls.end() ? OdString() : wide(found->second);
+        return found == urls.end() ? OdString() : support::fromUtf8(found->second);
     }
 };
 

@@ -1,6 +1,7 @@
 #include "storage_test.h"
 
 #include "host/storage/storage_url.h"
+#include "tests/support/utf8.h"
 
 namespace storage_tests {
 namespace {
@@ -9,8 +10,8 @@ std::string const kHex = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff
 
 TEST(StorageUrl, NamesTheDigestOfItsContent)
 {
-    EXPECT_EQ(tav::digestOf(wide("po:" + kHex)), wide(kHex));
-    EXPECT_EQ(tav::digestOf(wide("tf:Plan_1-0a.b#" + kHex)), wide(kHex));
+    EXPECT_EQ(tav::digestOf(support::fromUtf8("po:" + kHex)), support::fromUtf8(kHex));
+    EXPECT_EQ(tav::digestOf(support::fromUtf8("tf:Plan_1-0a.b#" + kHex)), support::fromUtf8(kHex));
 }
 
 TEST(StorageUrl, IsRefusedInAnyOtherForm)
@@ -41,23 +42,23 @@ TEST(StorageUrl, IsRefusedInAnyOtherForm)
           "tf:" + std::string(101, 'a') + "#" + kHex,
           "tf:plan#" + kHex + "\n",
           "xx:plan#" + kHex}) {
-        EXPECT_EQ(tav::digestOf(wide(url)), std::nullopt) << url;
+        EXPECT_EQ(tav::digestOf(support::fromUtf8(url)), std::nullopt) << url;
     }
 }
 
 TEST(StorageUrl, ReadsBackAsItWasWritten)
 {
     for (std::string const& url : {"po:" + kHex, "tf:" + std::string(100, 'a') + "#" + kHex}) {
-        auto const parsed = tav::parseUrl(wide(url));
+        auto const parsed = tav::parseUrl(support::fromUtf8(url));
         ASSERT_TRUE(parsed.has_value());
-        EXPECT_EQ(parsed->text(), wide(url));
+        EXPECT_EQ(parsed->text(), support::fromUtf8(url));
     }
 }
 
 TEST(NewStoreName, IsLegibleAndSafe)
 {
     auto const stem = [](std::string const& path) {
-        std::string const name = tav::newStoreName(wide(path), {});
+        std::string const name = tav::newStoreName(support::fromUtf8(path), {});
         EXPECT_TRUE(tav::isStoreName(name)) << name;
         EXPECT_EQ(name[name.size() - 17], '-');
         return name.substr(0, name.size() - 17);

@@ -1,7 +1,8 @@
 // What commands, and the saves of the library, leave behind when there is not enough memory.
-#include "tests/host/failing_allocation.h"
+#include "tests/host/failing_memory.h"
 #include "tests/host/run_here.h"
 #include "tests/host/scene.h"
+#include "tests/support/rows.h"
 #include "tests/support/sanitized.h"
 #include "tests/support/temp_repository.h"
 
@@ -23,6 +24,7 @@
 namespace host_tests {
 namespace {
 
+using support::FailingAllocation;
 using Lasts = FailingAllocation::Lasts;
 
 constexpr int kWasEnough = 77;
@@ -46,7 +48,7 @@ void tell(int failures)
 /// Memory is short from the moment on when the command takes its lock.
 int openInShortage(int folder, char const* path, int flags, mode_t mode)
 {
-    FailingAllocation::begin();
+    FailingAllocation::resume();
     return openat(folder, path, flags, mode);
 }
 
@@ -63,7 +65,7 @@ protected:
     {
         return scene_.inCopy([&] {
             Words words(command_.arguments);
-            FailingAllocation const failing(n, lasts);
+            FailingMemory const failing(n, lasts);
             os::calls().openat = openInShortage;
             int code = 0;
             try {
@@ -130,7 +132,7 @@ public:
     std::int32_t accept(OdString const& /*path*/) const override { return 1; }
     void report(WriteOutcome const& outcome) const override
     {
-        FailingAllocation::end();
+        FailingAllocation::pause();
         ++reports_;
         hasFailed_ = !outcome.hasValue();
     }
@@ -171,16 +173,16 @@ protected:
     static int saveWithout(long n, support::TempRepository const& repository)
     {
         Process process(Setting(), [&] {
-            std::optional<FailingAllocation> failing;
+            std::optional<FailingMemory> failing;
             Save save = kNotSaved;
             try {
                 save = GetParam().save(repository, [&] {
-                    failing.emplace(n);
-                    FailingAllocation::begin();
+                    failing.emplace(n, Lasts::once);
+                    FailingAllocation::resume();
                 });
             } catch (std::bad_alloc const&) {
             }
-            FailingAllocation::end();
+            FailingAllocation::pause();
             return FailingAllocation::hasFailed() ? static_cast<int>(save) : kWasEnough;
         });
         return process.wait().code;
@@ -258,7 +260,7 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         SaveRow{"State", ".tav/tav.state", saveState}, SaveRow{"Config", "config/directories.state", saveConfig},
         SaveRow{"IgnoreFile", ".tav/properties/ignore", saveIgnoreFile}),
-    [](auto const& row) { return row.param.name; });
+    support::rowName);
 
 } // namespace
 } // namespace host_tests
