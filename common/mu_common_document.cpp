@@ -5,6 +5,7 @@
 
 #include "platform/ut/TextFile.h"
 #include "platform/ut/text.h"
+#include "json/json_parser.h"
 #include "json/json_reader.h"
 #include "json/json_writer.h"
 

@@ -4,10 +4,13 @@
 #include "common/mu_common_expected.h"
 
 #include "platform/sdk/OdString.h"
-#include "json/json_reader.h"
 #include "json/json_value.h"
 
 #include <string>
+
+namespace kutils::json::detail {
+class Element_sink;
+}
 
 namespace common {
 

@@ -5,6 +5,7 @@
 #include "common/mu_common_json_keys.h"
 #include "common/mu_common_translate.h"
 
+#include "json/json_parser.h"
 #include "json/json_writer.h"
 
 #include <string>

@@ -1,5 +1,6 @@
 // Any document: read, copied, compared, written and read back, in either layout and either locale.
 #include "platform/sdk/OdString.h"
+#include "json/json_parser.h"
 #include "json/json_reader.h"
 #include "json/json_writer.h"
 

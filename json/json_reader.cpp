@@ -1,5 +1,7 @@
 #include "json/json_reader.h"
 
+#include "json/json_parser.h"
+
 #include <algorithm>
 #include <array>
 #include <charconv>

@@ -1,6 +1,7 @@
 // What documents become, and which are refused.
 #include "tests/json/documents.h"
 #include "tests/support/rows.h"
+#include "json/json_parser.h"
 
 #include <cstdint>
 #include <gtest/gtest.h>

@@ -1,6 +1,7 @@
 // How text is cut into tokens.
 #include "tests/json/documents.h"
 #include "tests/support/rows.h"
+#include "json/json_parser.h"
 
 #include <cstdint>
 #include <cstring>
