@@ -374,7 +374,7 @@ TEST_P(HostileRule, IsAnsweredOrRefused)
 }
 
 std::string const kLong(250, 'a');
-std::string const kVeryLong(1'000'000, 'a');
+std::string const kVeryLong(100'000, 'a');
 std::string const kLookAheads = repeated("(?=.*x)", 50);
 
 INSTANTIATE_TEST_SUITE_P(
@@ -680,7 +680,7 @@ TEST(RandomRule, MatchesWhatTheStandardLibrarySays)
 {
     Expressions expressions;
     Names names;
-    for (int i = 0; i < 3000; ++i) {
+    for (int i = 0; i < 1000; ++i) {
         std::string const expression = expressions.next();
         std::regex const ours = RepoIgnore::compile(support::fromUtf8(expression));
         std::regex const standard(expression);

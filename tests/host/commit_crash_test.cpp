@@ -12,7 +12,7 @@
 namespace host_tests {
 namespace {
 
-constexpr int kRounds = support::kIsSanitized ? 4 : 50; // for each of the six seeds
+constexpr int kRounds = support::kIsSanitized ? 4 : 20; // for each of the six seeds
 constexpr int kFiles = 8;
 
 class CommitCrash

@@ -10,7 +10,7 @@ namespace {
 using namespace states;
 using testing::ElementsAre;
 
-constexpr std::size_t kFiles = 200'000;
+constexpr std::size_t kFiles = 100'000;
 
 OdString pathOf(std::size_t number)
 {
