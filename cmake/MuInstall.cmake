@@ -1,6 +1,6 @@
 # What `cmake --install` lays out: the libraries, their headers below include/mu_common (so that include lines read as
-# they do here), the CMake package, the pkg-config file, message catalogues, and tav with its manual page and
-# completions.
+# they do here), the CMake package, the pkg-config file, message catalogues, the documents with the examples that they
+# speak of, and tav with its manual page and completions.
 #
 # A host that brings its own platform (MU_COMMON_PLATFORM) gets none from here: its package names no platform, and its
 # users link theirs beside mu_common::mu_common.
@@ -66,6 +66,14 @@ foreach(catalogue IN LISTS catalogues)
     install(FILES "${PROJECT_BINARY_DIR}/locale/${folder}/mu_common.mo"
         DESTINATION "${CMAKE_INSTALL_LOCALEDIR}/${folder}")
 endforeach()
+
+# In the folders that links in the documents expect.
+install(FILES "${PROJECT_SOURCE_DIR}/README.md" "${PROJECT_SOURCE_DIR}/SECURITY.md" DESTINATION "${CMAKE_INSTALL_DOCDIR}")
+install(DIRECTORY "${PROJECT_SOURCE_DIR}/docs/" DESTINATION "${CMAKE_INSTALL_DOCDIR}/docs"
+    FILES_MATCHING PATTERN "*.md" PATTERN man EXCLUDE)
+install(FILES "${PROJECT_SOURCE_DIR}/examples/first_look.cpp" "${PROJECT_SOURCE_DIR}/examples/editor.cpp"
+    DESTINATION "${CMAKE_INSTALL_DOCDIR}/examples")
+install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples/consumer" DESTINATION "${CMAKE_INSTALL_DOCDIR}/examples")
 
 if(TARGET tav)
     file(RELATIVE_PATH bin_to_lib "/${CMAKE_INSTALL_BINDIR}" "/${CMAKE_INSTALL_LIBDIR}")

@@ -2,11 +2,12 @@
 #include <common/mu_common_file_utils.h>
 #include <common/mu_common_repo_prop.h>
 #include <common/mu_common_versions.h>
+#include <platform/ut/File.h>
 
+#include <array>
+#include <cstddef>
+#include <cstdint>
 #include <cstdio>
-#include <fstream>
-#include <iterator>
-#include <string>
 
 namespace {
 
@@ -15,10 +16,23 @@ void print(OdString const& text)
     std::printf("%s\n", text.ansi_str().c_str());
 }
 
-std::string contentOf(OdString const& path)
+OdString digestOf(OdString const& path)
 {
-    std::ifstream file(path.ansi_str(), std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
+    ut::File file;
+    if (!file.open(path, ut::File::kRead)) {
+        throw OdError(path + L" cannot be read.");
+    }
+    common::ContentDigest digest;
+    std::array<char, 65'536> piece;
+    std::uint64_t done = 0;
+    while (std::size_t const count = file.read(piece.data(), piece.size())) {
+        digest.update(piece.data(), count);
+        done += count;
+    }
+    if (done < file.length()) {
+        throw OdError(path + L" cannot be read.");
+    }
+    return digest.finish();
 }
 
 void listFiles(common::RootPath const& root)
@@ -28,8 +42,7 @@ void listFiles(common::RootPath const& root)
         throw OdError(files.error().message);
     }
     for (common::File const& file : files.value()) {
-        std::string const content = contentOf(root.pathTo(file.path));
-        print(generateSha(content.data(), static_cast<int>(content.size())) + L"  " + file.path);
+        print(digestOf(root.pathTo(file.path)) + L"  " + file.path);
     }
 }
 
