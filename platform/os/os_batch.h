@@ -57,7 +57,7 @@ private:
 
     Handle top_;
     Handle current_;
-    std::string currentPath_;                             ///< of `current_`; empty for the top
+    std::string currentPath_;                     ///< of `current_`; empty for the top
     std::map<std::uint64_t, Handle> fileSystems_; ///< a folder of each that was entered, by device
 };
 

@@ -1,4 +1,5 @@
-/// The calls of the operating system that change the disk, and those that an open file needs, in one table.
+/// The calls of the operating system that this folder makes to change the disk, and those that an open file needs, in
+/// one table.
 #pragma once
 
 #include "platform/mu_platform_export.h"
@@ -10,7 +11,9 @@
 namespace os {
 
 /// One entry per call, named after it and with its parameters: the result is -1 with `errno` set when it fails.
-/// Whoever writes to the disk goes through this table, so that a test can stand in for any call and make it fail.
+/// Every replacement, move and removal of a file, and every write to an open one, goes through this table, so that a
+/// test can stand in for any call and make it fail. Not in it are the library's log and `touch`,
+/// because an editor's own platform has no such table, and what SQLite writes.
 struct Calls {
     int (*openat)(int folder, char const* path, int flags, mode_t mode);
     ssize_t (*read)(int file, void* buffer, std::size_t count);

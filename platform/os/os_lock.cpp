@@ -65,9 +65,8 @@ std::error_code FileLock::acquire(std::string const& path, std::string const& no
 
 bool FileLock::isHeld(std::string const& path)
 {
-    FileLock probe;
-    probe.file_ = calls().openat(AT_FDCWD, path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC, 0);
-    return probe.file_ != -1 && calls().flock(probe.file_, LOCK_SH | LOCK_NB) == -1 && errno == EWOULDBLOCK;
+    Handle const probe = detail::openAt(AT_FDCWD, path, O_RDONLY | O_NOFOLLOW | O_NONBLOCK);
+    return probe.isOpen() && calls().flock(probe.get(), LOCK_SH | LOCK_NB) == -1 && errno == EWOULDBLOCK;
 }
 
 std::string FileLock::holder(std::string const& path)

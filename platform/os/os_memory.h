@@ -11,8 +11,8 @@ namespace os {
 /// heap.
 inline constexpr std::size_t kAlwaysMapped = std::size_t{32} << 20;
 
-/// Asks for large pages for the whole pages of `size` bytes at `begin`, which nobody has written to yet: the first touch
-/// of a page costs more than filling it. Where that is refused, pages stay small.
+/// Asks for large pages for the whole pages of `size` bytes at `begin`, which nobody has written to yet: the first
+/// touch of a page costs more than filling it. Where that is refused, pages stay small.
 MU_PLATFORM_EXPORT void adviseLargePages(void* begin, std::size_t size);
 
 } // namespace os

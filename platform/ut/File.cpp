@@ -34,8 +34,8 @@ std::uint64_t File::length() const
 std::size_t File::read(void* buffer, std::size_t count)
 {
     std::size_t done = 0;
-    if (open_) {
-        static_cast<void>(os::readBytes(open_->handle, buffer, count, done)); // What was read counts, whatever ended it.
+    if (open_) { // What was read counts, whatever ended it.
+        static_cast<void>(os::readBytes(open_->handle, buffer, count, done));
     }
     return done;
 }

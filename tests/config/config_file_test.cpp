@@ -1,6 +1,6 @@
 #include "tests/config/configurations.h"
-#include "tests/support/allocations.h"
 #include "tests/server/translations.h"
+#include "tests/support/allocations.h"
 
 #include "tests/support/as_ordinary_user.h"
 #include "tests/support/recording_io.h"

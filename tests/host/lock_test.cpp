@@ -20,7 +20,8 @@ namespace host_tests {
 namespace {
 
 std::vector<Arguments> const kChanges = {
-    {"init"}, {"add", "a.dwg"}, {"unstage", "b.dwg"}, {"mv", "a.dwg", "c.dwg"}, {"rm", "a.dwg"}, {"ignore", "--add", "x"},
+    {"init"},        {"add", "a.dwg"},         {"unstage", "b.dwg"}, {"mv", "a.dwg", "c.dwg"},
+    {"rm", "a.dwg"}, {"ignore", "--add", "x"},
 };
 
 /// A child tells its parent through a pipe that it has met a lock that somebody else holds.

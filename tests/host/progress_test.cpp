@@ -53,8 +53,8 @@ TEST(Progress, IsDrawnTenTimesASecondAtMost)
 {
     EXPECT_EQ(
         printedBy(true, {600, 99, 1, 99}).err, "\r[#######.......................] 1 of 4 files"
-                                              "\r[######################........] 3 of 4 files"
-                                              "\r\x1b[K");
+                                               "\r[######################........] 3 of 4 files"
+                                               "\r\x1b[K");
 }
 
 TEST(Progress, IsNotShownForShortWork)

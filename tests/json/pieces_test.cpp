@@ -1,6 +1,6 @@
 // Documents whose long arrays are read element by element, and documents that are written piece by piece.
-#include "json/json_parser.h"
 #include "tests/json/documents.h"
+#include "json/json_parser.h"
 
 #include <gmock/gmock.h>
 #include <sstream>
