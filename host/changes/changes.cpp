@@ -5,52 +5,56 @@
 #include "host/changes/scan_order.h"
 #include "host/failure.h"
 #include "host/repository/ignore_file.h"
-#include "host/storage/local_storage.h"
+#include "host/storage/storage_url.h"
 #include "host/text/wide.h"
 
-#include "common/mu_common_file_storage.h"
 #include "common/mu_common_file_utils.h"
 
 #include <algorithm>
-#include <filesystem>
 #include <future>
 #include <iterator>
 #include <regex>
 #include <set>
+#include <string>
+#include <string_view>
 #include <utility>
 
 namespace tav {
 
 namespace {
 
-/// A file that cannot be looked at is not taken for removed.
-bool isThere(OdString const& path, common::RootPath const& root)
-{
-    std::error_code error;
-    auto const type = std::filesystem::symlink_status(root.pathTo(path).ansi_str(), error).type();
-    return type != std::filesystem::file_type::not_found && type != std::filesystem::file_type::directory;
-}
-
-using Index = std::map<OdString, common::IndexData>;
-
-/// Goes through the index beside a list of paths that is in the same order, which saves looking each path up.
-class IndexCursor {
+/// Finds records of files that are asked for in about the order of the list: mostly it is the next one.
+class VerifiedFinder {
 public:
-    explicit IndexCursor(Index const& index) : next_(index.begin()), end_(index.end()) {}
+    explicit VerifiedFinder(VerifiedFileList const& files) : files_(files), next_(files.begin()) {}
 
-    /// Whether the index says that `file`, which comes behind the ones asked for before, is as it was committed.
-    bool isUntouched(CommittedFile const& file)
+    /// Whether the file `path`, which has the stamp `stamp`, has a content of this digest.
+    bool isKnown(std::string const& path, FileStamp const& stamp, std::string_view digest)
     {
-        while (next_ != end_ && next_->first < file.path) {
-            ++next_;
+        if (!isNext(path)) {
+            auto const isBefore = [](VerifiedFile const& file, std::string const& other) { return file.path < other; };
+            next_ = std::lower_bound(files_.begin(), files_.end(), path, isBefore);
         }
-        return next_ != end_ && next_->first == file.path && tav::isUntouched(next_->second, file.time);
+        if (!isNext(path)) {
+            return false;
+        }
+        VerifiedFile const& file = *next_++;
+        return file.stamp == stamp && file.digest == digest;
     }
 
 private:
-    Index::const_iterator next_;
-    Index::const_iterator end_;
+    bool isNext(std::string const& path) const { return next_ != files_.end() && next_->path == path; }
+
+    VerifiedFileList const& files_;
+    VerifiedFileList::const_iterator next_;
 };
+
+/// Whether a file that has been read is the one that was looked at before. The way to it is gone anew: a folder may
+/// have been replaced as well.
+bool isStill(CommittedFile const& file, common::RootPath const& root)
+{
+    return file.sight.stamp && FolderView(root).look(file.path).stamp == file.sight.stamp;
+}
 
 } // namespace
 
@@ -66,17 +70,17 @@ std::vector<common::File> scan(common::RootPath const& root)
     }
 }
 
-FolderMatch matchFolder(common::RootPath const& root, FileList committed)
+FolderMatch matchFolder(common::RootPath const& root, FileList committed, VerifiedFileList const& known)
 {
-    FolderMatch match = matchPaths(root, scan(root), std::move(committed));
-    TimeReading times(match.committed, root);
-    auto other = std::async([&] { times.run(); }); // Or later, where no thread is to be had.
-    times.run();
+    FolderMatch match = matchPaths(scan(root), std::move(committed));
+    Examination examination(match.committed, known, root);
+    auto other = std::async([&] { examination.run(); }); // Or later, where no thread is to be had.
+    examination.run();
     other.get();
     return match;
 }
 
-FolderMatch matchPaths(common::RootPath const& root, std::vector<common::File> scanned, FileList committed)
+FolderMatch matchPaths(std::vector<common::File> scanned, FileList committed)
 {
     auto const byPath = [](common::File const& a, common::File const& b) { return a.path < b.path; };
     sortScanned(scanned, byPath);
@@ -88,44 +92,46 @@ FolderMatch matchPaths(common::RootPath const& root, std::vector<common::File> s
             match.untracked.push_back(std::move(*file));
         }
         bool const isScanned = file != scanned.end() && file->path == path;
-        bool const isThere = isScanned || tav::isThere(path, root);
-        match.committed.push_back({std::move(path), std::move(url), isThere, 0});
+        match.committed.push_back({std::move(path), std::move(url)});
         file += isScanned ? 1 : 0;
     }
     std::move(file, scanned.end(), std::back_inserter(match.untracked));
     return match;
 }
 
-void TimeReading::run()
+void Examination::run()
 {
+    FolderView view(root_);
+    VerifiedFinder finder(known_);
     constexpr std::size_t kBatch = 500;
     for (std::size_t begin = next_.fetch_add(kBatch); begin < files_.size(); begin = next_.fetch_add(kBatch)) {
         std::size_t const end = std::min(begin + kBatch, files_.size());
         for (std::size_t i = begin; i < end; ++i) {
-            if (files_[i].isThere) {
-                files_[i].time = common::modifyTime(files_[i].path, root_);
-            }
+            CommittedFile& file = files_[i];
+            std::string const path = file.path.ansi_str();
+            file.sight = view.look(path);
+            file.isKnown = file.sight.stamp && finder.isKnown(path, *file.sight.stamp, digestIn(file.url));
         }
     }
 }
 
-common::RepoChanges
-compare(common::RootPath const& root, FolderMatch match, common::State const& state, VerifiedTimes* verified)
+FolderChanges compare(common::RootPath const& root, FolderMatch match, VerifiedFileList* verified)
 {
-    common::RepoChanges changes;
-    IndexCursor index(state.index);
+    FolderChanges changes;
     for (CommittedFile& file : match.committed) {
-        bool const isUntouched = file.isThere && index.isUntouched(file);
+        bool const isThere = file.sight.presence == Presence::isThere;
         OdString url = wide(file.url);
-        bool const isUnchanged = isUntouched || (file.isThere && !hasOtherContent(file.path, url, root));
-        if (isUnchanged && !isUntouched && verified) {
-            verified->emplace(file.path, file.time);
+        bool const isUnchanged = file.isKnown || (isThere && !hasOtherContent(file.path, url, root));
+        if (isUnchanged && !file.isKnown && verified && isStill(file, root)) {
+            verified->push_back({file.path.ansi_str(), std::string(digestIn(file.url)), *file.sight.stamp});
         }
         common::VersionedFile version{std::move(file.path), std::move(url)};
         if (isUnchanged) {
             changes.unchanged.push_back(std::move(version));
-        } else if (file.isThere) {
+        } else if (isThere) {
             changes.modified.push_back({nullptr, {version.path}, version, 0});
+        } else if (file.sight.presence == Presence::isBehindLink) {
+            changes.unreachable.push_back(std::move(version));
         } else {
             changes.removed.push_back({nullptr, std::move(version), 0});
         }
@@ -136,27 +142,38 @@ compare(common::RootPath const& root, FolderMatch match, common::State const& st
     return changes;
 }
 
-void dropUntouched(FolderMatch& match, common::State const& state)
+void dropKnown(FolderMatch& match)
 {
-    IndexCursor index(state.index);
-    auto const isUntouched = [&](CommittedFile const& file) { return file.isThere && index.isUntouched(file); };
-    auto const kept = std::remove_if(match.committed.begin(), match.committed.end(), isUntouched);
+    auto const isKnown = [](CommittedFile const& file) { return file.isKnown; };
+    auto const kept = std::remove_if(match.committed.begin(), match.committed.end(), isKnown);
     match.committed.erase(kept, match.committed.end());
 }
 
-void enterVerified(VerifiedTimes const& verified, std::uint64_t start, common::State& state)
+void enterVerified(VerifiedFileList const& verified, std::uint64_t start, common::State& state)
 {
-    for (auto const& [path, time] : verified) {
-        state.index.insert_or_assign(path, indexRecord(time, start));
+    for (VerifiedFile const& file : verified) {
+        state.index.insert_or_assign(
+            wide(file.path), indexRecord(static_cast<std::uint64_t>(file.stamp.modified), start));
+    }
+}
+
+void keepVerified(VerifiedFileList const& verified, LocalDatabase& database)
+{
+    if (verified.empty()) {
+        return;
+    }
+    try {
+        Change change(database.database());
+        database.addVerified(verified);
+        change.commit();
+    } catch (Failure const&) {
+        // What is needed for the work itself fails with a message of its own.
     }
 }
 
 bool hasOtherContent(OdString const& path, OdString const& url, common::RootPath const& root)
 {
-    if (common::urlToType(url) == common::StorageType::Object) {
-        return common::isDifferent(path, url, root);
-    }
-    // For a revision the library answers without a look at the file; its URL carries the digest of the content.
+    // Not by the library's own comparison: to that one a file that cannot be read is as good as an empty one.
     auto const digest = fileDigest(root.pathTo(path));
     return !digest || digest != digestOf(url);
 }

@@ -1,7 +1,9 @@
 /// How the working folder differs from the last commit.
 #pragma once
 
+#include "host/changes/folder_view.h"
 #include "host/database/commit_tables.h"
+#include "host/repository/local_database.h"
 
 #include "common/mu_common_diff.h"
 #include "common/mu_common_state.h"
@@ -9,7 +11,6 @@
 #include <atomic>
 #include <cstddef>
 #include <cstdint>
-#include <map>
 #include <string>
 #include <vector>
 
@@ -18,12 +19,12 @@ namespace tav {
 /// The files that the repository keeps. Throws `Failure` when the ignore rules cannot be used.
 std::vector<common::File> scan(common::RootPath const& root);
 
-/// A file of a commit, beside what lies in the working folder.
+/// A file of a commit, beside what there is of it in the working folder.
 struct CommittedFile {
     OdString path;
-    std::string url;        ///< as bytes
-    bool isThere = false;   ///< the ignore rules may leave it out of the scan all the same
-    std::uint64_t time = 0; ///< its modification time now
+    std::string url; ///< as bytes
+    Sight sight = {};
+    bool isKnown = false; ///< to hold the content of the commit
 };
 
 /// A commit beside the working folder; both lists are in the order of paths.
@@ -32,42 +33,53 @@ struct FolderMatch {
     std::vector<common::File> untracked;
 };
 
-/// Finds out what there is of the files `committed`, and what else. Reads no file. Throws as `scan` does. Asks the disk
-/// in two threads, where a second one is to be had.
-FolderMatch matchFolder(common::RootPath const& root, FileList committed);
+/// Finds out what there is of the files `committed`, which of them are `known`, and what else there is. Reads no file.
+/// Throws as `scan` does. Asks the disk in two threads, where a second one is to be had.
+FolderMatch matchFolder(common::RootPath const& root, FileList committed, VerifiedFileList const& known);
 
-/// The same for files that are `scanned` already, but for the modification times.
-FolderMatch matchPaths(common::RootPath const& root, std::vector<common::File> scanned, FileList committed);
+/// The same for files that are `scanned` already, without looking at the committed ones.
+FolderMatch matchPaths(std::vector<common::File> scanned, FileList committed);
 
-/// Asks the disk for the modification times of a list of files, which takes longer than finding the files.
-class TimeReading {
+/// Looks at each of a list of files, which takes longer than finding the files.
+class Examination {
 public:
-    /// Enters the times into `files`. Both arguments live longer.
-    TimeReading(std::vector<CommittedFile>& files, common::RootPath const& root) : files_(files), root_(root) {}
+    /// Enters what is seen into `files`. The arguments live longer.
+    Examination(std::vector<CommittedFile>& files, VerifiedFileList const& known, common::RootPath const& root)
+        : files_(files)
+        , known_(known)
+        , root_(root)
+    {
+    }
 
-    /// Returns when no file is left to ask for. Threads that call this at the same time share the work.
+    /// Returns when no file is left to look at. Threads that call this at the same time share the work.
     void run();
 
 private:
     std::vector<CommittedFile>& files_;
+    VerifiedFileList const& known_;
     common::RootPath const& root_;
     std::atomic<std::size_t> next_{0};
 };
 
-/// Modification times of files that were read and found to be as the last commit has them, by path.
-using VerifiedTimes = std::map<OdString, std::uint64_t>;
+/// How the working folder differs from a commit. All lists are in the order of paths.
+struct FolderChanges : common::RepoChanges {
+    /// Files of the commit in folders that links have replaced. A link may lead anywhere, and no scan enters it: what
+    /// is behind it is not read, and is not taken for removed.
+    std::vector<common::VersionedFile> unreachable;
+};
 
-/// How the working folder differs from the commit. A file whose modification time is the one in the index is taken for
-/// unchanged without being read; those that were read and are unchanged are added to `verified`, if it is given. All
-/// lists of the result are in the order of paths.
-common::RepoChanges
-compare(common::RootPath const& root, FolderMatch match, common::State const& state, VerifiedTimes* verified = nullptr);
+/// How the working folder differs from the commit. A file that is known is not read; those that were read and are
+/// unchanged are added to `verified`, if it is given.
+FolderChanges compare(common::RootPath const& root, FolderMatch match, VerifiedFileList* verified = nullptr);
 
-/// Leaves out the files that are unchanged by the index alone: `compare` would only list them.
-void dropUntouched(FolderMatch& match, common::State const& state);
+/// Leaves out the files that are known to be unchanged: `compare` would only list them.
+void dropKnown(FolderMatch& match);
 
-/// Enters the files that were read into the index, for a command that began at `start`.
-void enterVerified(VerifiedTimes const& verified, std::uint64_t start, common::State& state);
+/// Enters files that are as the last commit has them into the index, for a command that began at `start`.
+void enterVerified(VerifiedFileList const& verified, std::uint64_t start, common::State& state);
+
+/// Records what is known of files, as far as that can be done: without a record they are read again.
+void keepVerified(VerifiedFileList const& verified, LocalDatabase& database);
 
 /// Whether the working file `path` holds another content than the one stored at `url`. Reads the file.
 bool hasOtherContent(OdString const& path, OdString const& url, common::RootPath const& root);

@@ -1,5 +1,7 @@
 #include "host/changes/index_record.h"
 
+#include <algorithm>
+
 namespace tav {
 
 namespace {
@@ -22,8 +24,12 @@ std::uint64_t commandStart(common::RootPath const& root)
 
 common::IndexData indexRecord(std::uint64_t time, std::uint64_t start)
 {
-    bool const isOlder = time + granularity(time) <= start;
-    return {time, !isOlder};
+    return {time, !isOver(time, start)};
+}
+
+bool isOver(std::uint64_t time, std::uint64_t later)
+{
+    return time + granularity(time) <= later;
 }
 
 std::uint64_t timeForWrittenFiles(std::uint64_t start)
@@ -31,9 +37,15 @@ std::uint64_t timeForWrittenFiles(std::uint64_t start)
     return start - granularity(start);
 }
 
-bool isUntouched(common::IndexData const& record, std::uint64_t time)
+VerifiedFileList settledFiles(VerifiedFileList files, std::uint64_t time)
 {
-    return !record.modified && record.lastChecked == time;
+    auto const mayChange = [&](VerifiedFile const& file) {
+        bool const isSettled = isOver(static_cast<std::uint64_t>(file.stamp.modified), time) &&
+                               isOver(static_cast<std::uint64_t>(file.stamp.changed), time);
+        return !isSettled;
+    };
+    files.erase(std::remove_if(files.begin(), files.end(), mayChange), files.end());
+    return files;
 }
 
 } // namespace tav

@@ -1,5 +1,7 @@
-/// Records of the index: which files were as the last commit has them, and when that was seen.
+/// When records of files can be relied on: those of the state's index, which editors read, and those of verified files.
 #pragma once
+
+#include "host/repository/verified_files.h"
 
 #include "common/mu_common_state.h"
 
@@ -16,11 +18,15 @@ std::uint64_t commandStart(common::RootPath const& root);
 /// file has to be read next time.
 common::IndexData indexRecord(std::uint64_t time, std::uint64_t start);
 
+/// Whether files that are written at `later` cannot get the time `time` any more.
+bool isOver(std::uint64_t time, std::uint64_t later);
+
 /// A time for files that a command writes: their records can be relied on, since whoever writes them later gives them
 /// another time.
 std::uint64_t timeForWrittenFiles(std::uint64_t start);
 
-/// Whether `record` says that a file with the modification time `time` is as the last commit has it.
-bool isUntouched(common::IndexData const& record, std::uint64_t time);
+/// Those of `files` that can be relied on when they were examined after `time`: whoever changes them from then on gives
+/// them another stamp.
+VerifiedFileList settledFiles(VerifiedFileList files, std::uint64_t time);
 
 } // namespace tav

@@ -67,6 +67,7 @@ struct History {
     OdString base; ///< hash of the commit that the working folder stands on
     std::int64_t number = 0;
     FileList files; ///< of that commit
+    VerifiedFileList known;
     std::vector<common::Reference> references;
 };
 
@@ -76,7 +77,7 @@ History readHistory(LocalDatabase& database)
     CommitTables const& commits = database.commits();
     OdString const base = database.base();
     auto const commit = commits.find(base);
-    return {base, commit ? commit->number : 0, commits.fileList(base), commits.references()};
+    return {base, commit ? commit->number : 0, commits.fileList(base), database.verifiedFiles(), commits.references()};
 }
 
 struct Findings {
@@ -85,19 +86,19 @@ struct Findings {
     std::shared_ptr<common::Cache const> cache;
 };
 
-/// Looking for the files takes as long as reading what has been committed, and asking for their times longer than
+/// Looking for the files takes as long as reading what the database knows of them, and looking at them longer than
 /// reading the state; so each goes on beside the other.
 Findings lookOnce(common::RootPath const& root, LocalDatabase& database)
 {
     Findings found;
     auto scanning = std::async([&] { return scan(root); });
     found.history = readHistory(database);
-    found.match = matchPaths(root, scanning.get(), std::move(found.history.files));
-    TimeReading times(found.match.committed, root);
-    auto asking = std::async([&] { times.run(); });
+    found.match = matchPaths(scanning.get(), std::move(found.history.files));
+    Examination examination(found.match.committed, found.history.known, root);
+    auto looking = std::async([&] { examination.run(); });
     found.cache = readState(root);
-    times.run();
-    asking.get();
+    examination.run();
+    looking.get();
     return found;
 }
 
@@ -148,8 +149,8 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     status.unfinishedWork = noteOnUnfinished(root, database);
     status.conflicts = openConflicts(root);
     status.staged = stagedEntries(state, match, root);
-    dropUntouched(match, state);
-    common::RepoChanges changes = compare(root, std::move(match), state);
+    dropKnown(match);
+    FolderChanges changes = compare(root, std::move(match));
     Paths left = claimedPaths(state); // They are accounted for when they are missing.
     enterRenames(findRenames(changes, state, database, root), left, status);
     Paths named = stagedPaths(state);

@@ -37,16 +37,15 @@ std::vector<Tree> filesOf(std::vector<OdString> const& commits, LocalDatabase co
 
 /// `whole` is the update before the check: also a file that was found as it shall be is no change any more. What stays
 /// of an interrupted move may be no file of the commit.
-SettledFiles
-settledBy(TreeUpdate const& whole, TreeUpdate const& update, WrittenTimes const& times, std::uint64_t start)
+SettledFiles settledBy(TreeUpdate const& whole, TreeUpdate const& update, Updated const& updated, std::uint64_t start)
 {
     SettledFiles files;
     for (auto const& [path, url] : whole.removals) {
         files.emplace(path, std::nullopt);
     }
     for (auto const& [path, url] : whole.writes) {
-        auto const time = times.find(path);
-        if (time != times.end()) {
+        auto const time = updated.times.find(path);
+        if (time != updated.times.end()) {
             files[path] = common::IndexData{time->second, false};
         } else if (update.leftovers.count(path) == 0) {
             files[path] = indexRecord(static_cast<std::uint64_t>(update.marks.at(path).modified), start);
@@ -72,12 +71,13 @@ CheckedOut checkOutCommit(
     LocalStorage storage;
     checkUpdate(root, database, storage, claimedPaths(readState(root)->read()), discard, update);
     CheckoutUnderWay move{destination.commit, destination.branch, false, begun};
-    WrittenTimes const times = carryOut(root, storage, update, start, [&] { note(move, database); });
+    Updated const updated = carryOut(root, storage, update, start, [&] { note(move, database); });
     Change change(database.database());
     database.setBase(destination.commit);
     move.isWritten = true;
-    move.files = settledBy(whole, update, times, start);
+    move.files = settledBy(whole, update, updated, start);
     note(move, database);
+    database.addVerified(updated.verified);
     change.commit();
     finishCheckout(root, database, move);
     return {update.writes.size(), update.removals.size()};

@@ -1,8 +1,10 @@
 #include "host/checkout/working_tree.h"
 
 #include "host/changes/digest.h"
+#include "host/changes/folder_view.h"
 #include "host/changes/index_record.h"
 #include "host/changes/stored_copies.h"
+#include "host/checkout/file_clock.h"
 #include "host/failure.h"
 #include "host/paths/recorded_path.h"
 #include "host/progress.h"
@@ -97,6 +99,9 @@ private:
             bool const isStaged = finding != Finding::isAsWanted && staged_.count(path) > 0;
             if (isStaged || (isUnsaved && !isLeftover)) {
                 inTheWay_.push_back(path.ansi_str());
+            }
+            if (finding == Finding::isAsWanted && areWritten) {
+                update_.found.insert(*file);
             }
             bool const stays = finding == Finding::isAsWanted || (isUnsaved && isLeftover);
             file = stays ? files.erase(file) : std::next(file);
@@ -224,6 +229,8 @@ public:
 
     std::string pathOf(std::size_t number) const { return folder_ + "/" + std::to_string(number); }
 
+    std::string scratch() const { return folder_ + "/clock"; }
+
 private:
     void removeAll() const
     {
@@ -244,22 +251,27 @@ void requireDone(std::error_code const& error, OdString const& path, char const*
     }
 }
 
-WrittenTimes extractAll(
+/// What the files have that were written, under whatever name.
+using Stamps = std::map<OdString, FileStamp>;
+
+Stamps extractAll(
     common::RootPath const& root, LocalStorage& storage, Tree const& files, std::uint64_t time,
     Restored const& restored)
 {
-    WrittenTimes times;
+    Stamps stamps;
+    FolderView view(root);
     Progress progress("files", files.size());
     std::size_t number = 0;
     for (auto const& file : files) {
         std::string const target = restored.pathOf(number);
         extract(root, storage, file, target);
         requireDone(os::setModificationTime(target, time - number * kBetweenFiles), file.first, kNothingYet);
-        times.emplace(file.first, common::modifyTime(kRestoring + L"/" + std::to_wstring(number).c_str(), root));
+        Sight const sight = view.look(kRestoring + L"/" + std::to_wstring(number).c_str());
+        stamps.emplace(file.first, sight.stamp.value_or(FileStamp{}));
         ++number;
         progress.advance();
     }
-    return times;
+    return stamps;
 }
 
 /// People go on working while a command runs.
@@ -294,6 +306,39 @@ void placeAll(os::Batch& batch, TreeUpdate const& update, Restored const& restor
         requireUnchanged(batch, update, path, kWhole);
         requireDone(batch.place(restored.pathOf(number++), path.ansi_str()), path, kAgain);
     }
+}
+
+/// Whether a file is the one that was written. Taking its name was a change too.
+bool isWritten(FileStamp const& now, FileStamp const& written)
+{
+    return now.inode == written.inode && now.size == written.size && now.modified == written.modified;
+}
+
+/// Whether nothing has happened to a file since it was checked.
+bool isAsChecked(FileStamp const& now, os::FileMark const& mark)
+{
+    return now == FileStamp{mark.length, mark.number, mark.changed, mark.modified};
+}
+
+/// Records of the files that are as wanted, after what was written has become older than the clock.
+VerifiedFileList
+verifiedFiles(common::RootPath const& root, TreeUpdate const& update, Stamps const& written, Restored const& restored)
+{
+    std::uint64_t const now = waitForNextTick(restored.scratch());
+    FolderView view(root);
+    VerifiedFileList verified;
+    for (Tree const* const files : {&update.writes, &update.found}) {
+        for (auto const& [path, url] : *files) {
+            auto const stamp = view.look(path).stamp;
+            auto const own = written.find(path);
+            bool const isWanted = stamp && (own != written.end() ? isWritten(*stamp, own->second)
+                                                                 : isAsChecked(*stamp, update.marks.at(path)));
+            if (isWanted) {
+                verified.push_back({path.ansi_str(), std::string(digestIn(url.ansi_str())), *stamp});
+            }
+        }
+    }
+    return settledFiles(std::move(verified), now);
 }
 
 /// Adds to `update` what is in the way of `to` only where files of `begun` have been written.
@@ -374,19 +419,24 @@ void checkUpdate(
     }
 }
 
-WrittenTimes carryOut(
+Updated carryOut(
     common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start,
     std::function<void()> const& begin)
 {
     os::Batch batch(root.path().ansi_str());
     Restored const restored(root);
-    WrittenTimes times = extractAll(root, storage, update.writes, timeForWrittenFiles(start), restored);
+    Stamps const stamps = extractAll(root, storage, update.writes, timeForWrittenFiles(start), restored);
     requireDone(batch.flush(), kRestoring, kNothingYet);
     requireAllUnchanged(batch, update);
     begin();
     placeAll(batch, update, restored);
     requireDone(batch.flush(), root.path(), kAgain);
-    return times;
+    Updated updated;
+    for (auto const& [path, stamp] : stamps) {
+        updated.times.emplace(path, static_cast<std::uint64_t>(stamp.modified));
+    }
+    updated.verified = verifiedFiles(root, update, stamps, restored);
+    return updated;
 }
 
 } // namespace tav

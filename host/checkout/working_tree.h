@@ -22,6 +22,8 @@ struct TreeUpdate {
     std::set<OdString> leftovers;
     /// URLs of the contents that files have there unless somebody has changed them.
     std::multimap<OdString, OdString> expected;
+    /// Files that were found as wanted, once that has been checked.
+    Tree found;
     /// What stood at each of the paths when it was checked.
     std::map<OdString, os::FileMark> marks;
 };
@@ -44,16 +46,21 @@ void checkUpdate(
     common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
     std::set<OdString> const& staged, Discard discard, TreeUpdate& update);
 
-/// Modification times of the files that were written, by path. As far as the file system tells them apart, no two are
-/// equal: a file that is moved over another of them shows.
-using WrittenTimes = std::map<OdString, std::uint64_t>;
+/// What an update has brought about.
+struct Updated {
+    /// Modification times of the files that were written, by path. As far as the file system tells them apart, no two
+    /// are equal: a file that is moved over another of them shows.
+    std::map<OdString, std::uint64_t> times;
+    /// What may be recorded of the files that are as wanted now.
+    VerifiedFileList verified;
+};
 
 /// Carries out an update that has been checked. Every file is whole before it takes its name, and when this returns all
 /// of it is safe on the disk. Folders that become empty are removed. `begin` is called when all contents lie ready and
 /// the working folder is still what it was. A file that somebody has changed since it was checked stays as it is, and
 /// ends it. Throws `Failure`; what was written until then stays, and doing the same again completes it. The caller
 /// holds the lock of the repository since `start`.
-WrittenTimes carryOut(
+Updated carryOut(
     common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start,
     std::function<void()> const& begin = [] {});
 

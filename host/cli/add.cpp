@@ -1,4 +1,5 @@
 #include "host/changes/changes.h"
+#include "host/changes/index_record.h"
 #include "host/changes/last_commit.h"
 #include "host/changes/staging.h"
 #include "host/changes/stored_copies.h"
@@ -46,8 +47,7 @@ bool isUnchangedFolder(std::string const& name, common::RepoChanges const& chang
     return folder.isEmpty() || std::any_of(changes.unchanged.begin(), changes.unchanged.end(), isInside);
 }
 
-[[noreturn]] void
-failForUnknown(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
+[[noreturn]] void failForUnknown(std::string const& name, FolderChanges const& changes, common::RootPath const& root)
 {
     OdString const path = pathInRepository(root, name);
     for (auto const& file : changes.removed) {
@@ -64,7 +64,7 @@ struct Chosen {
     std::vector<common::VersionedFile> unchanged; ///< files that were named, and are as they were committed
 };
 
-Chosen chosenFiles(AddOptions const& options, common::RepoChanges const& changes, common::RootPath const& root)
+Chosen chosenFiles(AddOptions const& options, FolderChanges const& changes, common::RootPath const& root)
 {
     NameFinder const finder(changes, root);
     if (options.all) {
@@ -101,14 +101,15 @@ std::size_t repair(std::vector<common::VersionedFile> const& files, common::Root
 
 void addFilesToStage(AddOptions const& options)
 {
-    Work const work(openRepository(""), "add", Work::Unfinished::mayStay);
+    Work work(openRepository(""), "add", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
+    VerifiedFileList verified;
+    FolderChanges const changes =
+        compare(root, matchFolder(root, lastCommitFiles(root), work.database().verifiedFiles()), &verified);
+    keepVerified(settledFiles(verified, work.start()), work.database());
     std::size_t count = 0;
     std::size_t repaired = 0;
     changeState(root, [&](common::Cache& cache) {
-        VerifiedTimes verified;
-        common::RepoChanges const changes =
-            compare(root, matchFolder(root, lastCommitFiles(root)), cache.read(), &verified);
         enterVerified(verified, work.start(), cache.write());
         Chosen const chosen = chosenFiles(options, changes, root);
         repaired = repair(chosen.unchanged, root);

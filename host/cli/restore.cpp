@@ -1,3 +1,4 @@
+#include "host/changes/changes.h"
 #include "host/changes/staging.h"
 #include "host/checkout/working_tree.h"
 #include "host/cli/commands.h"
@@ -72,7 +73,8 @@ void unstageRemovals(Tree const& files, common::State& state)
 }
 
 /// Files that are now as the last commit has them are no changes any more.
-void enterFiles(Tree const& files, Tree const& base, WrittenTimes const& times, common::State& state)
+void enterFiles(
+    Tree const& files, Tree const& base, std::map<OdString, std::uint64_t> const& times, common::State& state)
 {
     unstageRemovals(files, state);
     std::vector<common::StagedFile> unchanged;
@@ -106,8 +108,9 @@ void restoreFiles(RestoreOptions const& options)
     checkUpdate(
         root, work.database(), storage, stagedContents(readState(root)->read(), root),
         options.force ? Discard::everything : Discard::copies, update);
-    WrittenTimes const times = carryOut(root, storage, update, work.start());
-    changeState(root, [&](common::Cache& cache) { enterFiles(files, base, times, cache.write()); });
+    Updated const updated = carryOut(root, storage, update, work.start());
+    changeState(root, [&](common::Cache& cache) { enterFiles(files, base, updated.times, cache.write()); });
+    keepVerified(updated.verified, work.database());
     print(
         counted(files.size(), "file") + " as in commit " + std::to_string(commit.number) + ", " +
         std::to_string(update.writes.size()) + " written.\n");

@@ -26,6 +26,8 @@ namespace tav {
 
 namespace {
 
+namespace fs = std::filesystem;
+
 template <class List, class PathOf>
 bool holds(List const& list, OdString const& path, PathOf const& pathOf)
 {
@@ -91,16 +93,36 @@ std::vector<common::StagedFile> without(std::set<OdString> const& renamed, std::
     return files;
 }
 
-NameFinder finderOfCommitted(common::RepoChanges const& changes, common::RootPath const& root)
+/// The files that may be removed, and where the storage has what they hold.
+struct Removable {
+    Tree reachable; ///< in the working folder, unless they are gone already
+    Tree others;    ///< behind links: they are not touched
+};
+
+Removable removableIn(FolderChanges const& changes)
 {
-    std::vector<common::StagedFile> files;
+    Removable files;
     for (common::VersionedFile const& file : changes.unchanged) {
-        files.emplace_back(file.path, common::FileChange::removed);
+        files.reachable.emplace(file.path, file.storagePath);
     }
     for (auto const& file : changes.removed) {
-        files.emplace_back(file.committed.path, common::FileChange::removed);
+        files.reachable.emplace(file.committed.path, file.committed.storagePath);
     }
-    return {files, root};
+    for (common::VersionedFile const& file : changes.unreachable) {
+        files.others.emplace(file.path, file.storagePath);
+    }
+    return files;
+}
+
+NameFinder finderOf(Removable const& files, common::RootPath const& root)
+{
+    std::vector<common::StagedFile> all;
+    for (Tree const* const tree : {&files.reachable, &files.others}) {
+        for (auto const& [path, url] : *tree) {
+            all.emplace_back(path, common::FileChange::removed);
+        }
+    }
+    return {all, root};
 }
 
 /// The paths come from a database that anybody may have made, and folders may have become links meanwhile.
@@ -109,74 +131,105 @@ void checkPath(OdString const& path, common::RootPath const& root)
     if (auto const fault = whyUnsafe(path)) {
         throw Failure(*fault, "Nothing has been removed.");
     }
-    std::filesystem::path const folder = std::filesystem::path(path.ansi_str()).parent_path();
+    fs::path const folder = fs::path(path.ansi_str()).parent_path();
     auto const link = folder.empty() ? std::nullopt : linkOnTheWay(root.path().ansi_str(), wide(folder.string()));
     if (link) {
         throw Failure(*link, "Nothing has been removed; move that away first.");
     }
 }
 
-/// The file may be the last good copy of what it was committed with. `unchanged` is in the order of paths.
-void keepContent(
-    OdString const& path, std::vector<common::VersionedFile> const& unchanged, common::RootPath const& root)
-{
-    auto const isBefore = [](common::VersionedFile const& file, OdString const& other) { return file.path < other; };
-    auto const file = std::lower_bound(unchanged.begin(), unchanged.end(), path, isBefore);
-    if (file != unchanged.end() && file->path == path) {
-        LocalStorage storage;
-        requireStored(root, storage, path, file->storagePath);
-    }
-}
+/// Files on their way out: they wait in the repository's own folder until the new state is safe. A command that was
+/// killed may have left some.
+class Departures {
+public:
+    explicit Departures(common::RootPath const& root) : root_(root), top_(root.path().ansi_str()), moves_(top_) {}
 
-/// Where a removed file waits until the new state is safe. A command that was killed may have left such files.
-std::string waitingName(common::RootPath const& root, std::size_t number)
-{
-    std::string const prefix = ".tav/removed-";
-    std::string const top = root.path().ansi_str() + "/";
-    while (std::filesystem::exists(std::filesystem::symlink_status(top + prefix + std::to_string(number)))) {
-        ++number;
+    /// Takes a file away; false when it is gone. Throws `Failure` when it does not hold the content at `url`, and when
+    /// it is the last copy of that. It is compared where it waits: nobody writes to it there, and all files go back to
+    /// their places after a failure.
+    bool take(OdString const& path, OdString const& url)
+    {
+        if (!ut::FileName::fileExists(root_.pathTo(path))) {
+            return false;
+        }
+        checkPath(path, root_);
+        requireStored(root_, storage_, path, url);
+        waiting_.push_back(freeName());
+        std::string const& place = waiting_.back();
+        moves_.move(path.ansi_str(), place);
+        bool const isLink = fs::is_symlink(fs::symlink_status(fullPath(place))); // What it leads to stays.
+        if (!isLink && hasOtherContent(wide(place), url, root_)) {
+            failForChanges(path.ansi_str());
+        }
+        return true;
     }
-    return prefix + std::to_string(number);
+
+    void finish()
+    {
+        moves_.keep();
+        for (std::string const& name : waiting_) {
+            if (std::error_code const error = os::removeFile(fullPath(name))) {
+                printError("'" + fullPath(name) + "' is left over: " + error.message() + ".", "Delete it yourself.");
+            }
+        }
+    }
+
+private:
+    std::string fullPath(std::string const& name) const { return std::string(top_).append("/").append(name); }
+
+    std::string freeName() const
+    {
+        std::size_t number = waiting_.size();
+        auto const name = [&] { return ".tav/removed-" + std::to_string(number); };
+        while (fs::exists(fs::symlink_status(fullPath(name())))) {
+            ++number;
+        }
+        return name();
+    }
+
+    common::RootPath const& root_;
+    std::string const top_;
+    LocalStorage storage_;
+    FileMoves moves_;
+    std::vector<std::string> waiting_;
+};
+
+std::vector<common::StagedFile> chosenFiles(
+    std::vector<std::string> const& names, FolderChanges const& changes, NameFinder const& committed,
+    common::State const& state, common::RootPath const& root)
+{
+    std::vector<common::StagedFile> chosen;
+    for (std::string const& name : names) {
+        failIfRenamed(name, state, root);
+        std::vector<common::StagedFile> const found = removableFiles(name, changes, committed, root);
+        chosen.insert(chosen.end(), found.begin(), found.end());
+    }
+    return chosen;
 }
 
 } // namespace
 
 void removeFiles(std::vector<std::string> const& names)
 {
-    Work const work(openRepository(""), "rm", Work::Unfinished::mayStay);
+    Work work(openRepository(""), "rm", Work::Unfinished::mayStay);
     common::RootPath const& root = work.root();
-    std::string const top = root.path().ansi_str();
-    FileMoves moves(top);
-    std::vector<std::string> waiting;
+    Departures departures(root);
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
-        common::RepoChanges const changes = compare(root, matchFolder(root, lastCommitFiles(root)), cache.read());
+        FolderChanges const changes =
+            compare(root, matchFolder(root, lastCommitFiles(root), work.database().verifiedFiles()));
+        Removable const files = removableIn(changes);
+        std::vector<common::StagedFile> const chosen =
+            chosenFiles(names, changes, finderOf(files, root), cache.read(), root);
         std::set<OdString> const renamed = formerPaths(cache.read());
-        NameFinder const committed = finderOfCommitted(changes, root);
-        std::vector<common::StagedFile> staged;
-        for (std::string const& name : names) {
-            failIfRenamed(name, cache.read(), root);
-            std::vector<common::StagedFile> const found = removableFiles(name, changes, committed, root);
-            staged.insert(staged.end(), found.begin(), found.end());
+        for (common::StagedFile const& file : chosen) {
+            auto const reachable = files.reachable.find(file.path);
+            bool const isTaken = reachable != files.reachable.end() && departures.take(file.path, reachable->second);
+            count += isTaken ? renamed.count(file.path) : 0; // Those are not staged below.
         }
-        for (common::StagedFile const& file : staged) {
-            if (ut::FileName::fileExists(root.pathTo(file.path))) {
-                checkPath(file.path, root);
-                keepContent(file.path, changes.unchanged, root);
-                waiting.push_back(waitingName(root, waiting.size()));
-                moves.move(file.path.ansi_str(), waiting.back());
-                count += renamed.count(file.path); // Those are not staged below.
-            }
-        }
-        count += stage(without(renamed, staged), cache.write());
+        count += stage(without(renamed, chosen), cache.write());
     });
-    moves.keep();
-    for (std::string const& name : waiting) {
-        std::string const file = std::string(top).append("/").append(name);
-        if (std::error_code const error = os::removeFile(file)) {
-            printError("'" + file + "' is left over: " + error.message() + ".", "Delete it yourself.");
-        }
-    }
+    departures.finish();
     print("Removed " + counted(count, "file") + "; the next commit takes that.\n");
 }
 

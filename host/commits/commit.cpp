@@ -13,6 +13,7 @@
 #include "host/storage/local_storage.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
+#include "host/text/wide.h"
 
 #include "common/mu_common_serialization.h"
 #include "common/mu_common_versions.h"
@@ -41,19 +42,28 @@ struct Draft {
     Tree files;        ///< of the new commit, in the end
     Previous previous; ///< paths of renamed files before
     CommitUnderWay work;
+    VerifiedFileList verified = {}; ///< all files that were read
 };
+
+/// The way to the file is gone anew each time: a folder may be replaced meanwhile.
+FileStamp stampOf(OdString const& path, common::RootPath const& root)
+{
+    return FolderView(root).look(path).stamp.value_or(FileStamp{});
+}
 
 /// Stores a content that does not change meanwhile, and notes when the file had it.
 OdString storeSteady(Draft& draft, LocalStorage& storage, OdString const& path)
 {
     for (int attempt = 0; attempt < kMostAttempts; ++attempt) {
-        std::uint64_t const before = common::modifyTime(path, draft.root);
+        FileStamp const before = stampOf(path, draft.root);
         auto const url = storage.store(draft.root, path);
-        if (common::modifyTime(path, draft.root) != before) {
+        if (stampOf(path, draft.root) != before) {
             continue;
         }
-        draft.work.files[path] = indexRecord(before, draft.start);
-        return valueOrFail(url, "Nothing has been committed; mend that and run the command again.");
+        draft.work.files[path] = indexRecord(static_cast<std::uint64_t>(before.modified), draft.start);
+        OdString const stored = valueOrFail(url, "Nothing has been committed; mend that and run the command again.");
+        draft.verified.push_back({path.ansi_str(), std::string(digestIn(stored.ansi_str())), before});
+        return stored;
     }
     throw Failure(
         quoted(path) + " is being written by another program all the time.",
@@ -225,17 +235,18 @@ void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& d
     change.commit();
 }
 
-common::RepoChanges compareWithBase(Draft& draft, common::State const& state)
+FolderChanges compareWithBase(Draft& draft)
 {
-    VerifiedTimes verified;
     FileList committed;
     committed.reserve(draft.files.size());
     for (auto const& [path, url] : draft.files) {
         committed.push_back({path, url.ansi_str()});
     }
-    common::RepoChanges changes = compare(draft.root, matchFolder(draft.root, std::move(committed)), state, &verified);
-    for (auto const& [path, time] : verified) {
-        draft.work.files.emplace(path, indexRecord(time, draft.start));
+    FolderChanges changes = compare(
+        draft.root, matchFolder(draft.root, std::move(committed), draft.database.verifiedFiles()), &draft.verified);
+    for (VerifiedFile const& file : draft.verified) {
+        draft.work.files.emplace(
+            wide(file.path), indexRecord(static_cast<std::uint64_t>(file.stamp.modified), draft.start));
     }
     return changes;
 }
@@ -316,7 +327,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     learnHistory(root, database, server, Compared::theEnd);
     failIfNotAtTheEnd(database, state.head);
     Draft draft{root, database, start, database.commits().files(database.base()), {}, {}};
-    common::RepoChanges const changes = compareWithBase(draft, state);
+    FolderChanges const changes = compareWithBase(draft);
     std::vector<PlannedFile> const plan =
         planCommit(state, changes, findRenames(changes, state, database, root), draft.files, root);
     if (plan.empty()) {
@@ -335,7 +346,10 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     failIfBack(plan, state, root);
     draft.work.document = documentOf(draft, order, state.head);
     NewCommit checked = readCommitInfo(draft.work.document); // What is refused must not be noted: it could never end.
+    Change change(database.database());
     note(draft.work, database);
+    database.addVerified(settledFiles(std::move(draft.verified), start));
+    change.commit();
     return {finish(root, database, draft.work, std::move(checked)), true};
 }
 

@@ -104,10 +104,11 @@ Database::Database(std::string const& path, std::chrono::milliseconds patience)
     : path_(path)
     , handle_(nullptr, sqlite3_close_v2)
 {
+    constexpr int kOneThread = SQLITE_OPEN_NOMUTEX; // Locks took a tenth of the time of reading a long table.
     int code = SQLITE_OK;
-    handle_.reset(opened(path, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, code));
+    handle_.reset(opened(path, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE | kOneThread, code));
     if (code == SQLITE_CANTOPEN) {
-        handle_.reset(opened(path, SQLITE_OPEN_READONLY, code));
+        handle_.reset(opened(path, SQLITE_OPEN_READONLY | kOneThread, code));
     }
     if (code != SQLITE_OK) {
         fail(code);

@@ -1,7 +1,5 @@
 #include "host/repository/verified_files.h"
 
-#include <algorithm>
-
 namespace tav {
 
 namespace {
@@ -16,11 +14,6 @@ CREATE TABLE verified_files (
     modified INTEGER NOT NULL
 ) WITHOUT ROWID;
 )";
-
-bool isBefore(VerifiedFile const& a, VerifiedFile const& b)
-{
-    return a.path < b.path;
-}
 
 } // namespace
 
@@ -38,10 +31,7 @@ VerifiedFileList VerifiedFiles::all() const
         FileStamp const stamp{
             static_cast<std::uint64_t>(row.integer(2)), static_cast<std::uint64_t>(row.integer(3)), row.integer(4),
             row.integer(5)};
-        files.push_back({row.text(0), std::string(row.bytes(1)), stamp});
-    }
-    if (!std::is_sorted(files.begin(), files.end(), isBefore)) { // The database has its own order for paths that are
-        std::sort(files.begin(), files.end(), isBefore);         // no UTF-8.
+        files.push_back({std::string(row.bytes(0)), std::string(row.bytes(1)), stamp});
     }
     return files;
 }
@@ -50,7 +40,7 @@ void VerifiedFiles::put(VerifiedFileList const& files)
 {
     Statement row = database_->prepare("INSERT OR REPLACE INTO verified_files VALUES (?, ?, ?, ?, ?, ?)");
     for (VerifiedFile const& file : files) {
-        row.with(file.path).with(std::string_view(file.digest));
+        row.with(std::string_view(file.path)).with(std::string_view(file.digest));
         row.with(static_cast<std::int64_t>(file.stamp.size)).with(static_cast<std::int64_t>(file.stamp.inode));
         row.with(file.stamp.changed).with(file.stamp.modified).run();
     }

@@ -13,12 +13,12 @@
 namespace tav {
 
 struct VerifiedFile {
-    OdString path;
-    std::string digest; ///< in lower-case hexadecimal digits, as bytes: few of them are ever shown
+    std::string path;   ///< in bytes, as the digest: none of them is ever shown
+    std::string digest; ///< in lower-case hexadecimal digits
     FileStamp stamp;
 };
 
-/// In ascending order of paths, each path once.
+/// Each path once, in ascending order of bytes.
 using VerifiedFileList = std::vector<VerifiedFile>;
 
 /// One thread. Every operation throws `Failure` when the database cannot be used.

@@ -2,6 +2,7 @@
 
 #include "common/mu_common_versions.h"
 
+#include <algorithm>
 #include <string_view>
 
 namespace tav {
@@ -12,6 +13,7 @@ constexpr std::string_view kStore = "tf:";
 constexpr std::string_view kObject = "po:";
 constexpr std::size_t kLongestName = 100;
 constexpr std::size_t kLongestStem = 40;
+constexpr std::size_t kDigits = 64;      // of a digest
 constexpr std::size_t kDistinction = 16; // digits of the digest in a name
 
 bool isLegible(char c)
@@ -78,6 +80,11 @@ std::optional<OdString> digestOf(OdString const& url)
 {
     std::optional<StorageUrl> const parsed = parseUrl(url);
     return parsed ? std::optional<OdString>(OdString(hexOf(parsed->digest).c_str(), CP_UTF_8)) : std::nullopt;
+}
+
+std::string_view digestIn(std::string_view url)
+{
+    return url.substr(url.size() - std::min(url.size(), kDigits));
 }
 
 std::string newStoreName(OdString const& path, DigestBytes const& digest)

@@ -7,6 +7,7 @@
 
 #include <optional>
 #include <string>
+#include <string_view>
 
 namespace tav {
 
@@ -27,6 +28,9 @@ std::optional<StorageUrl> parseUrl(OdString const& url);
 /// The SHA-256 digest, in lower-case hexadecimal digits, of the content that `url` names; none when `url` is not of
 /// this storage (`parseUrl`).
 std::optional<OdString> digestOf(OdString const& url);
+
+/// The part of `url`, in bytes, where a URL has its digest. What is there is not checked.
+std::string_view digestIn(std::string_view url);
 
 /// Whether `name` can be a NAME.
 bool isStoreName(std::string const& name);

@@ -1,12 +1,16 @@
 #include "host/changes/changes.h"
 #include "host/failure.h"
+#include "host/storage/storage_url.h"
 
 #include "tests/support/temp_repository.h"
 #include "tests/support/utf8.h"
 
 #include <gmock/gmock.h>
 
+#include <algorithm>
+#include <cstdio>
 #include <string>
+#include <sys/stat.h>
 #include <unistd.h>
 
 namespace {
@@ -24,14 +28,17 @@ protected:
         committed_[support::fromUtf8(name)] = L"po:" + generateSha(content.data(), static_cast<int>(content.size()));
     }
 
-    void index(std::string const& name, bool modified)
+    /// Records that the file, as it is now, has the content of the commit.
+    void know(std::string const& name)
     {
-        state_.index[support::fromUtf8(name)] = {common::modifyTime(support::fromUtf8(name), repo.root()), modified};
+        auto const file = committed_.find(support::fromUtf8(name));
+        std::string const url = file == committed_.end() ? std::string() : file->second.ansi_str();
+        known_.push_back({name, std::string(tav::digestIn(url)), *tav::FolderView(repo.root()).look(support::fromUtf8(name)).stamp});
     }
 
-    common::RepoChanges compare() const
+    tav::FolderChanges compare() const
     {
-        return tav::compare(repo.root(), tav::matchFolder(repo.root(), committedFiles()), state_);
+        return tav::compare(repo.root(), tav::matchFolder(repo.root(), committedFiles(), known_));
     }
 
     tav::FileList committedFiles() const
@@ -82,12 +89,12 @@ protected:
 
     support::TempRepository const repo;
     tav::Tree committed_;
-    common::State state_;
+    tav::VerifiedFileList known_;
 };
 
 TEST_F(Compare, FindsNothingInAnEmptyFolder)
 {
-    common::RepoChanges const changes = compare();
+    tav::FolderChanges const changes = compare();
     EXPECT_THAT(unchanged(changes), IsEmpty());
     EXPECT_THAT(modified(changes), IsEmpty());
     EXPECT_THAT(untracked(changes), IsEmpty());
@@ -102,7 +109,7 @@ TEST_F(Compare, SortsEveryFileIntoOneList)
     commit("gone.dwg");
     unlink(repo.pathTo("gone.dwg").c_str());
     repo.add({"new.dwg"});
-    common::RepoChanges const changes = compare();
+    tav::FolderChanges const changes = compare();
     EXPECT_THAT(unchanged(changes), ElementsAre("same.dwg"));
     EXPECT_THAT(modified(changes), ElementsAre("changed.dwg"));
     EXPECT_THAT(untracked(changes), ElementsAre("new.dwg"));
@@ -117,7 +124,7 @@ TEST_F(Compare, ListsFilesInTheOrderOfPaths)
         committed_[support::fromUtf8("gone/" + std::string(name))] = L"po:";
     }
     repo.add({"b/new.dwg", "new.dwg"});
-    common::RepoChanges const changes = compare();
+    tav::FolderChanges const changes = compare();
     EXPECT_THAT(modified(changes), ElementsAre("a/x.dwg", "b/z.dwg", "y.dwg"));
     EXPECT_THAT(untracked(changes), ElementsAre("b/new.dwg", "new.dwg"));
     EXPECT_THAT(removed(changes), ElementsAre("gone/a/x.dwg", "gone/b/z.dwg", "gone/y.dwg"));
@@ -130,7 +137,7 @@ TEST_F(Compare, KeepsTrackOfACommittedFileThatIsIgnoredOrHiddenByNow)
     commit("changed.old");
     repo.write("changed.old", "changed");
     repo.ignore("^.*\\.old$\n^ignore$");
-    common::RepoChanges const changes = compare();
+    tav::FolderChanges const changes = compare();
     EXPECT_THAT(unchanged(changes), ElementsAre(".hidden.dwg", "a.old"));
     EXPECT_THAT(modified(changes), ElementsAre("changed.old"));
     EXPECT_THAT(removed(changes), IsEmpty());
@@ -144,29 +151,33 @@ TEST_F(Compare, TakesAFileForRemovedThatAFolderHasReplaced)
     EXPECT_THAT(removed(compare()), ElementsAre("a.dwg"));
 }
 
-TEST_F(Compare, AsksForTheTimesOfAllOfManyFiles)
+TEST_F(Compare, LooksAtEachOfManyFiles)
 {
     std::vector<std::string> names;
     for (int i = 1'000; i < 2'200; ++i) {
         names.push_back(std::to_string(i) + ".dwg");
         repo.write(names.back(), "not as committed");
         committed_[support::fromUtf8(names.back())] = L"po:";
-        index(names.back(), i == 1'500 || i == 2'199);
+        if (i != 1'500 && i != 2'199) {
+            know(names.back());
+        }
     }
-    common::RepoChanges const changes = compare();
+    tav::FolderChanges const changes = compare();
     EXPECT_THAT(modified(changes), ElementsAre("1500.dwg", "2199.dwg"));
     EXPECT_EQ(unchanged(changes).size(), 1'198);
 }
 
-TEST_F(Compare, LeavesOutWhatTheIndexVouchesForOnRequest)
+TEST_F(Compare, LeavesOutWhatIsKnownToBeUnchangedOnRequest)
 {
     for (char const* const name : {"a.dwg", "b.dwg", "c.dwg", "gone.dwg"}) {
         commit(name);
-        index(name, std::string(name) == "b.dwg");
+        if (std::string(name) != "b.dwg") {
+            know(name);
+        }
     }
     unlink(repo.pathTo("gone.dwg").c_str());
-    tav::FolderMatch match = tav::matchFolder(repo.root(), committedFiles());
-    tav::dropUntouched(match, state_);
+    tav::FolderMatch match = tav::matchFolder(repo.root(), committedFiles(), known_);
+    tav::dropKnown(match);
     std::vector<std::string> left;
     for (tav::CommittedFile const& file : match.committed) {
         left.push_back(file.path.ansi_str());
@@ -174,42 +185,154 @@ TEST_F(Compare, LeavesOutWhatTheIndexVouchesForOnRequest)
     EXPECT_THAT(left, ElementsAre("b.dwg", "gone.dwg"));
 }
 
-TEST_F(Compare, TrustsTheIndexForAFileOfUnchangedTime)
+TEST_F(Compare, DoesNotReadAFileThatIsKnown)
 {
     commit("a.dwg");
     repo.write("a.dwg", "other");
-    index("a.dwg", false);
+    know("a.dwg");
     EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg"));
 }
 
-TEST_F(Compare, ReadsAFileOfAnotherTimeThanInTheIndex)
+TEST_F(Compare, FindsWhatIsKnownAlsoOfNamesThatAreNoText)
+{
+    for (char const* const name : {"a.dwg", "\xFF.dwg", "\xF0\x9F\x8F\xA0.dwg", "\xC3\xA9.dwg"}) {
+        commit(name);
+        repo.write(name, "other");
+        know(name);
+    }
+    std::sort(known_.begin(), known_.end(), [](auto const& a, auto const& b) { return a.path < b.path; });
+    EXPECT_THAT(modified(compare()), IsEmpty());
+}
+
+TEST_F(Compare, ReadsAFileThatIsKnownToHaveAnotherContentThanTheCommit)
+{
+    commit("a.dwg");
+    know("a.dwg");
+    repo.write("b.dwg", "committed a.dwg");
+    committed_[L"b.dwg"] = committed_[L"a.dwg"];
+    know("b.dwg");
+    known_[1].digest = std::string(64, 'a');
+    repo.write("c.dwg", "other");
+    committed_[L"c.dwg"] = committed_[L"a.dwg"];
+    know("c.dwg");
+    known_[2].digest = std::string(64, 'a');
+    EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg", "b.dwg"));
+    EXPECT_THAT(modified(compare()), ElementsAre("c.dwg"));
+}
+
+struct StampRow {
+    char const* name;
+    void (*change)(tav::FileStamp& stamp);
+};
+
+class CompareStamps
+    : public Compare
+    , public testing::WithParamInterface<StampRow> {};
+
+TEST_P(CompareStamps, ReadsAFileThatHasAnother)
 {
     commit("a.dwg");
     commit("b.dwg");
-    index("a.dwg", false);
-    index("b.dwg", false);
     repo.write("b.dwg", "other");
-    --state_.index[L"a.dwg"].lastChecked;
-    --state_.index[L"b.dwg"].lastChecked;
+    know("a.dwg");
+    know("b.dwg");
+    GetParam().change(known_[0].stamp);
+    GetParam().change(known_[1].stamp);
     EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg"));
     EXPECT_THAT(modified(compare()), ElementsAre("b.dwg"));
 }
 
-TEST_F(Compare, ReadsAFileThatIsMarkedInTheIndex)
+INSTANTIATE_TEST_SUITE_P(
+    Parts, CompareStamps,
+    testing::Values(
+        StampRow{"Size", [](tav::FileStamp& stamp) { ++stamp.size; }},
+        StampRow{"Inode", [](tav::FileStamp& stamp) { ++stamp.inode; }},
+        StampRow{"TimeOfChange", [](tav::FileStamp& stamp) { --stamp.changed; }},
+        StampRow{"TimeOfModification", [](tav::FileStamp& stamp) { --stamp.modified; }}),
+    [](auto const& row) { return std::string(row.param.name); });
+
+TEST_F(Compare, SaysWhatItHasReadAndFoundUnchanged)
 {
-    commit("a.dwg");
-    commit("b.dwg");
-    repo.write("b.dwg", "other");
-    index("a.dwg", true);
-    index("b.dwg", true);
-    EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg"));
-    EXPECT_THAT(modified(compare()), ElementsAre("b.dwg"));
+    for (char const* const name : {"known.dwg", "other.dwg", "read.dwg"}) {
+        commit(name);
+    }
+    know("known.dwg");
+    repo.write("other.dwg", "other");
+    tav::VerifiedFileList verified;
+    tav::compare(repo.root(), tav::matchFolder(repo.root(), committedFiles(), known_), &verified);
+    ASSERT_EQ(verified.size(), 1U);
+    EXPECT_EQ(verified[0].path, "read.dwg");
+    EXPECT_EQ(L"po:" + support::fromUtf8(verified[0].digest), committed_[L"read.dwg"]);
+    EXPECT_EQ(verified[0].stamp, *tav::FolderView(repo.root()).look(L"read.dwg").stamp);
 }
 
-TEST_F(Compare, AsksTheIndexOnlyAboutCommittedFiles)
+TEST_F(Compare, KnowsNothingOfAFileThatWasReplacedAfterItWasLookedAt)
+{
+    commit("a.dwg");
+    tav::FolderMatch match = tav::matchFolder(repo.root(), committedFiles(), known_);
+    match.committed[0].sight.stamp->inode += 1;
+    tav::VerifiedFileList verified;
+    EXPECT_THAT(unchanged(tav::compare(repo.root(), match, &verified)), ElementsAre("a.dwg"));
+    EXPECT_THAT(verified, IsEmpty());
+}
+
+TEST_F(Compare, TakesAFileThatCannotBeReadForModified)
+{
+    committed_[L"a.dwg"] = L"po:" + generateSha("", 0);
+    ASSERT_EQ(mkfifo(repo.pathTo("a.dwg").c_str(), 0600), 0);
+    EXPECT_THAT(modified(compare()), ElementsAre("a.dwg"));
+}
+
+TEST_F(Compare, FollowsALinkToAFileAndNoticesWhatItLeadsTo)
+{
+    commit("a.dwg");
+    repo.write("elsewhere/plan.txt", "committed a.dwg");
+    unlink(repo.pathTo("a.dwg").c_str());
+    repo.makeLink("a.dwg", "elsewhere/plan.txt");
+    EXPECT_THAT(unchanged(compare()), ElementsAre("a.dwg"));
+    know("a.dwg");
+    repo.write("elsewhere/plan.txt", "longer than what was committed");
+    EXPECT_THAT(modified(compare()), ElementsAre("a.dwg"));
+}
+
+TEST_F(Compare, ReadsNothingBehindALinkToAFolder)
+{
+    commit("plans/a.dwg");
+    commit("plans/deep/b.dwg");
+    commit("plans-2/c.dwg");
+    ASSERT_EQ(rename(repo.pathTo("plans").c_str(), repo.pathTo(".moved").c_str()), 0);
+    repo.makeLink("plans", ".moved");
+    tav::FolderChanges const changes = compare();
+    EXPECT_THAT(unchanged(changes), ElementsAre("plans-2/c.dwg"));
+    EXPECT_THAT(removed(changes), IsEmpty());
+    EXPECT_THAT(untracked(changes), IsEmpty());
+    ASSERT_EQ(changes.unreachable.size(), 2U);
+    EXPECT_EQ(changes.unreachable[0].path, OdString(L"plans/a.dwg"));
+    EXPECT_EQ(changes.unreachable[1].path, OdString(L"plans/deep/b.dwg"));
+}
+
+TEST_F(Compare, TakesNothingForRemovedBehindALinkThatLeadsNowhere)
+{
+    commit("plans/a.dwg");
+    ASSERT_EQ(rename(repo.pathTo("plans").c_str(), repo.pathTo(".moved").c_str()), 0);
+    repo.makeLink("plans", "/nowhere");
+    tav::FolderChanges const changes = compare();
+    EXPECT_THAT(removed(changes), IsEmpty());
+    EXPECT_EQ(changes.unreachable.size(), 1U);
+}
+
+TEST_F(Compare, TakesFilesForRemovedWhenAFileHasReplacedTheirFolder)
+{
+    commit("plans/a.dwg");
+    ASSERT_EQ(rename(repo.pathTo("plans").c_str(), repo.pathTo(".moved").c_str()), 0);
+    repo.add({"plans"});
+    EXPECT_THAT(removed(compare()), ElementsAre("plans/a.dwg"));
+}
+
+TEST_F(Compare, KnowsOnlyCommittedFiles)
 {
     repo.add({"new.dwg"});
-    index("new.dwg", false);
+    know("new.dwg");
     EXPECT_THAT(untracked(compare()), ElementsAre("new.dwg"));
 }
 
@@ -232,7 +355,7 @@ TEST_F(Compare, ComparesNamesExactly)
     auto node = committed_.extract(L"a.dwg");
     node.key() = L"A.dwg";
     committed_.insert(std::move(node));
-    common::RepoChanges const changes = compare();
+    tav::FolderChanges const changes = compare();
     EXPECT_THAT(untracked(changes), ElementsAre("a.dwg"));
     EXPECT_THAT(removed(changes), ElementsAre("A.dwg"));
 }

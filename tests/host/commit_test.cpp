@@ -301,17 +301,6 @@ TEST_F(Commit, ReadsAFileThatWasNotOlderThanTheCommand)
     EXPECT_THAT(status(), testing::StartsWith("Modified, not staged:\n"));
 }
 
-TEST_F(Commit, DoesNotReadAFileOfUnchangedTimeThatIsOld)
-{
-    repo.write("a.dwg", "one");
-    timespec const past = {1700000000, 7};
-    setTime("a.dwg", past);
-    commitAll("the first");
-    repo.write("a.dwg", "two");
-    setTime("a.dwg", past);
-    EXPECT_EQ(status(), kClean);
-}
-
 TEST_F(Commit, FindsADrawingUnchangedThatWasOnlyTouched)
 {
     repo.write("a.dwg", "one");

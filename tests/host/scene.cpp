@@ -3,8 +3,11 @@
 #include "tests/host/run_here.h"
 #include "tests/host/sqlite_calls.h"
 
+#include "host/changes/digest.h"
+#include "host/changes/folder_view.h"
 #include "host/repository/local_database.h"
 #include "host/storage/local_storage.h"
+#include "host/text/wide.h"
 #include "platform/os/os_calls.h"
 
 #include <algorithm>
@@ -108,6 +111,21 @@ std::string commitsIn(tav::Database const& database)
            rowsOf(database, "parents", "number || ' ' || parent") +
            rowsOf(database, "changes", "number || ' ' || path || ' ' || url || ' ' || previous_path") +
            rowsOf(database, "refs", "name || ' ' || type || ' ' || number");
+}
+
+/// The verified files that have the recorded stamp and another content than the recorded one.
+std::string falseRecords(common::RootPath const& root)
+{
+    std::string names;
+    tav::FolderView view(root);
+    for (tav::VerifiedFile const& file : tav::LocalDatabase::open(root).verifiedFiles()) {
+        bool const isBelieved = view.look(file.path).stamp == file.stamp;
+        if (isBelieved &&
+            tav::fileDigest(root.pathTo(tav::wide(file.path))) != OdString(file.digest.c_str(), CP_UTF_8)) {
+            names += "wrongly believed: " + file.path + "\n";
+        }
+    }
+    return names;
 }
 
 } // namespace
@@ -217,7 +235,7 @@ std::string Scene::situation() const
     tav::Database const local(folder() + "/.tav/tav.db");
     return text + withoutTimes(place_.read("now/repository/.tav/tav.state")) + "\nserver:\n" + commitsIn(server) +
            "local:\n" + commitsIn(local) + rowsOf(local, "settings", "key || ' ' || value") +
-           rowsOf(local, "contents", "url || ' ' || digest || ' ' || size");
+           rowsOf(local, "contents", "url || ' ' || digest || ' ' || size") + falseRecords(root());
 }
 
 std::string difference(std::string const& before, std::string const& after)

@@ -1,0 +1,44 @@
+/// Looking at files of the working folder without reading them.
+#pragma once
+
+#include "host/changes/file_stamp.h"
+
+#include "common/mu_common_repo_prop.h"
+#include "platform/os/os_handle.h"
+
+#include <optional>
+#include <string>
+
+namespace tav {
+
+enum class Presence {
+    isGone,       ///< nothing is there, or a folder
+    isThere,      ///< a file, or something that cannot be looked at: that is not taken for removed
+    isBehindLink, ///< one of its folders is a link by now, and no scan enters links to folders
+};
+
+/// What there is of a file.
+struct Sight {
+    Presence presence = Presence::isGone;
+    std::optional<FileStamp> stamp; ///< of a regular file; through a link to one, of that file
+};
+
+/// Quick when paths that follow each other are in one folder. One thread.
+class FolderView {
+public:
+    explicit FolderView(common::RootPath const& root);
+
+    /// Looks at `path`, in bytes and relative to the working folder.
+    Sight look(std::string const& path);
+    Sight look(OdString const& path) { return look(path.ansi_str()); }
+
+private:
+    Presence enter(std::string const& folder);
+
+    os::Handle top_;
+    os::Handle current_;
+    std::optional<std::string> currentPath_;
+    Presence way_ = Presence::isThere; ///< whether files of the current folder can be looked at
+};
+
+} // namespace tav
