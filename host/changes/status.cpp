@@ -1,6 +1,7 @@
 #include "host/changes/status.h"
 
 #include "host/changes/changes.h"
+#include "host/changes/missing_files.h"
 #include "host/changes/scan_order.h"
 #include "host/changes/staging.h"
 #include "host/repository/conflicts.h"
@@ -162,6 +163,9 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     status.modified = takeSorted(changes.modified, named, workingPath);
     status.untracked = takeSorted(changes.untracked, named, workingPath);
     status.removed = takeSorted(changes.removed, left, committedPath);
+    status.isRemovalDoubtful = mayBeMistake(status.removed, root);
+    auto const pathOf = [](auto& file) -> OdString& { return file.path; };
+    status.unreachable = takeSorted(changes.unreachable, left, pathOf);
     if (withIgnored) {
         status.ignored = ignoredFiles(root);
         sortScanned(status.ignored, std::less<>());

@@ -27,16 +27,18 @@ struct Status {
     std::string unfinishedWork; ///< what an interrupted command has left, in a sentence
     std::vector<common::ConflictInfo> conflicts;
     std::vector<StagedEntry> staged;
-    std::vector<OdString> modified;  ///< not staged
-    std::vector<OdString> untracked; ///< not staged
-    Renames renamed;                 ///< not staged; the next commit takes that without staging
-    std::vector<OdString> removed;   ///< gone from the working folder; the next commit takes that without staging
-    std::vector<OdString> ignored;   ///< filled in when it is asked for
+    std::vector<OdString> modified;    ///< not staged
+    std::vector<OdString> untracked;   ///< not staged
+    Renames renamed;                   ///< not staged; the next commit takes that without staging
+    std::vector<OdString> removed;     ///< gone from the working folder; the next commit takes that without staging
+    bool isRemovalDoubtful = false;    ///< the next commit takes `removed` only when it is told to
+    std::vector<OdString> unreachable; ///< committed files in folders that links have replaced
+    std::vector<OdString> ignored;     ///< filled in when it is asked for
 
     bool isClean() const
     {
         return conflicts.empty() && staged.empty() && modified.empty() && untracked.empty() && renamed.empty() &&
-               removed.empty();
+               removed.empty() && unreachable.empty();
     }
 };
 

@@ -47,9 +47,25 @@ bool isUnchangedFolder(std::string const& name, common::RepoChanges const& chang
     return folder.isEmpty() || std::any_of(changes.unchanged.begin(), changes.unchanged.end(), isInside);
 }
 
+/// Whether `path` is a link to a folder that the last commit has, or lies behind a link.
+bool isBehindLink(OdString const& path, FolderChanges const& changes, common::RootPath const& root)
+{
+    OdString const prefix = path + L"/";
+    auto const isInside = [&](common::VersionedFile const& file) {
+        return file.path.left(prefix.getLength()) == prefix;
+    };
+    return FolderView(root).look(path).presence == Presence::isBehindLink ||
+           std::any_of(changes.unreachable.begin(), changes.unreachable.end(), isInside);
+}
+
 [[noreturn]] void failForUnknown(std::string const& name, FolderChanges const& changes, common::RootPath const& root)
 {
     OdString const path = pathInRepository(root, name);
+    if (isBehindLink(path, changes, root)) {
+        throw Failure(
+            "'" + name + "' is behind a link to a folder, which tav does not enter.",
+            "Put the folder itself in the place of the link.");
+    }
     for (auto const& file : changes.removed) {
         if (file.committed.path == path) {
             throw Failure("'" + name + "' has been removed.", "The next commit takes that without staging.");

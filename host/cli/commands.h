@@ -39,6 +39,8 @@ void removeFiles(std::vector<std::string> const& names);
 struct CommitOptions {
     std::string message;
     std::string author; ///< empty: the user on this machine
+    bool allRemoved = false;
+    bool withoutRemoved = false;
 };
 void makeCommit(CommitOptions const& options);
 

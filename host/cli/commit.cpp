@@ -28,6 +28,13 @@ void printCommit(CommitRecord const& commit, char const* verb)
         ").\n");
 }
 
+Missing missingFilesOf(CommitOptions const& options)
+{
+    return options.allRemoved       ? Missing::areAllRemoved
+           : options.withoutRemoved ? Missing::areKept
+                                    : Missing::areRemoved;
+}
+
 /// Whether the order is the one that was interrupted: repeating it makes no second commit.
 bool isRepeated(CommitOrder const& order, Work const& work)
 {
@@ -38,7 +45,8 @@ bool isRepeated(CommitOrder const& order, Work const& work)
 
 void makeCommit(CommitOptions const& options)
 {
-    CommitOrder const order{wide(options.author.empty() ? userName() : options.author), wide(options.message)};
+    CommitOrder const order{
+        wide(options.author.empty() ? userName() : options.author), wide(options.message), missingFilesOf(options)};
     checkText(options.message, "message");
     checkText(order.author.ansi_str(), "author");
     Work work(openRepository(""), "commit");

@@ -74,6 +74,7 @@ void printDocument(Status const& status, bool withIgnored)
     object[L"untracked"] = documentOf(status.untracked);
     object[L"removed"] = documentOf(status.removed);
     object[L"renamed"] = documentOf(status.renamed);
+    object[L"unreachable"] = documentOf(status.unreachable);
     if (withIgnored) {
         object[L"ignored"] = documentOf(status.ignored);
     }
@@ -159,7 +160,15 @@ void printForPeople(Status const& status)
     printGroup(
         "Modified, not staged:", "use 'tav add NAME' to stage a file", "modified: ", Colour::red, status.modified);
     printRenamed(status.renamed);
-    printGroup("Removed:", "the next commit takes these without staging", "removed:  ", Colour::red, status.removed);
+    printGroup(
+        "Removed:",
+        status.isRemovalDoubtful
+            ? "use 'tav commit --all-removed' to remove these, or '--without-removed' to keep them in the repository"
+            : "the next commit takes these without staging",
+        "removed:  ", Colour::red, status.removed);
+    printGroup(
+        "Behind links to folders:", "tav does not enter these; the next commit keeps the files as they are", "",
+        Colour::red, status.unreachable);
     printGroup("New, not staged:", "use 'tav add NAME' or 'tav add --all' to stage", "", Colour::red, status.untracked);
     printGroup("Ignored:", "see 'tav ignore' for the rules", "", Colour::none, status.ignored);
     if (status.isClean()) {

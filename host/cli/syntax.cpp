@@ -95,6 +95,13 @@ void addCommit(CLI::App& app)
     auto const options = std::make_shared<CommitOptions>();
     command->add_option("-m,--message", options->message, "What has changed, and why")->required();
     command->add_option("--author", options->author, "Who made it; by default your name and machine");
+    CLI::Option* const all = command->add_flag(
+        "--all-removed", options->allRemoved, "Remove files that are gone even when a whole folder or many are");
+    command
+        ->add_flag(
+            "--without-removed", options->withoutRemoved,
+            "Keep files that are gone in the repository unless 'tav rm' has removed them")
+        ->excludes(all);
     command->callback([options] { makeCommit(*options); });
 }
 

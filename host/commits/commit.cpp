@@ -275,6 +275,20 @@ void checkNames(std::vector<PlannedFile> const& plan)
     }
 }
 
+/// What is behind a link is not in the working folder, and no removal either.
+void failIfBehindLink(common::State const& state, common::RootPath const& root)
+{
+    FolderView view(root);
+    for (common::StagedFile const& file : state.stagedFiles) {
+        bool const isTaken = file.change != common::FileChange::removed;
+        if (isTaken && view.look(file.path).presence == Presence::isBehindLink) {
+            throw Failure(
+                quoted(file.path) + " is staged, but a link has taken the place of its folder.",
+                "Put the folder itself in its place, or run 'tav unstage' for the file.");
+        }
+    }
+}
+
 /// Programs that save by renaming let a file be gone for a moment: that is no removal.
 void failIfBack(std::vector<PlannedFile> const& plan, common::State const& state, common::RootPath const& root)
 {
@@ -328,8 +342,10 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     failIfNotAtTheEnd(database, state.head);
     Draft draft{root, database, start, database.commits().files(database.base()), {}, {}};
     FolderChanges const changes = compareWithBase(draft);
-    std::vector<PlannedFile> const plan =
+    failIfBehindLink(state, root);
+    std::vector<PlannedFile> plan =
         planCommit(state, changes, findRenames(changes, state, database, root), draft.files, root);
+    planMissing(plan, state, order.missing, root);
     if (plan.empty()) {
         if (auto const last = lastCommitIfOf(order, database)) {
             return {*last, false};

@@ -64,7 +64,7 @@ _tav_options() { # COMMAND
         init) printf '%s\n' --server ;;
         status) printf '%s\n' --ignored --json ;;
         add | unstage) printf '%s\n' --all ;;
-        commit) printf '%s\n' -m --message --author ;;
+        commit) printf '%s\n' -m --message --author --all-removed --without-removed ;;
         log) printf '%s\n' -n --count --json ;;
         restore) printf '%s\n' --from --force ;;
         checkout | switch) printf '%s\n' --force ;;

@@ -97,6 +97,8 @@ complete -c tav -n '__fish_seen_subcommand_from mv' -F
 complete -c tav -n '__fish_seen_subcommand_from rm' -F
 complete -c tav -n '__fish_seen_subcommand_from commit' -s m -l message -x -d 'What has changed, and why'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l author -x -d 'Who made it'
+complete -c tav -n '__fish_seen_subcommand_from commit' -l all-removed -d 'Remove files that are gone even when many are'
+complete -c tav -n '__fish_seen_subcommand_from commit' -l without-removed -d 'Keep files that are gone in the repository'
 complete -c tav -n '__fish_seen_subcommand_from log' -s n -l count -x -d 'Show so many commits at most'
 complete -c tav -n '__fish_seen_subcommand_from log' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from log' -a '(__tav_references branch tag)'

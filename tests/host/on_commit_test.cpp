@@ -104,6 +104,8 @@ New, not staged:
     ],
     "staged" : [
     ],
+    "unreachable" : [
+    ],
     "untracked" : [
         "new.dwg"
     ]

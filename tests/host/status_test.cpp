@@ -31,6 +31,8 @@ TEST_F(Status, SaysThatNothingHasChanged)
     ],
     "staged" : [
     ],
+    "unreachable" : [
+    ],
     "untracked" : [
     ]
 }
@@ -183,6 +185,8 @@ TEST_F(StatusOfEverything, IsADocumentForPrograms)
             "missing" : false,
             "path" : "removed.dwg"
         }
+    ],
+    "unreachable" : [
     ],
     "untracked" : [
         "a/z.dwg"

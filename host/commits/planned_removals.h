@@ -1,0 +1,22 @@
+/// Which removals go into a commit.
+#pragma once
+
+#include "host/commits/commit_plan.h"
+
+#include <vector>
+
+namespace tav {
+
+/// What a commit does with files that are gone and were not removed with 'tav rm'.
+enum class Missing {
+    areRemoved,    ///< unless so much is missing that it may be a mistake
+    areAllRemoved, ///< however many they are
+    areKept        ///< the commit has them as the one before
+};
+
+/// Takes the missing files out of `plan`, or leaves them in. Throws `Failure`, which lists them, when that takes the
+/// user's word.
+void planMissing(
+    std::vector<PlannedFile>& plan, common::State const& state, Missing missing, common::RootPath const& root);
+
+} // namespace tav
