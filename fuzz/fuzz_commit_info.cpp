@@ -41,10 +41,12 @@ void checkTree(std::vector<tav::FileRecord> const& files)
     }
 }
 
-void check(std::vector<common::Reference> const& references)
+void check(std::vector<tav::ReferenceChange> const& changes)
 {
     std::set<std::string> names;
-    for (common::Reference const& reference : references) {
+    for (tav::ReferenceChange const& change : changes) {
+        common::Reference const& reference = change.reference;
+        require(!change.expected || change.expected->isEmpty() || tav::isHash(*change.expected));
         require(!tav::whyNoReferenceName(reference.name) && tav::isHash(reference.commitHash));
         require(names.insert(reference.name.ansi_str()).second);
     }

@@ -99,6 +99,13 @@ struct IgnoreOptions {
 void ignore(IgnoreOptions const& options);
 
 void fetchHistory();
+
+struct ServerOptions {
+    std::string folder; ///< empty: where it is
+    bool send = false;
+};
+void server(ServerOptions const& options);
+
 void listProjects(bool json);
 void verifyAll(bool json);
 void collectGarbage();

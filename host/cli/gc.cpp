@@ -6,12 +6,14 @@
 #include "host/repository/contents.h"
 #include "host/repository/history.h"
 #include "host/repository/open.h"
+#include "host/repository/unfinished.h"
 #include "host/repository/work.h"
 #include "host/storage/local_storage.h"
 #include "host/text/wide.h"
 
 #include <set>
 #include <string>
+#include <variant>
 #include <vector>
 
 namespace tav {
@@ -23,19 +25,50 @@ std::set<OdString> setOf(std::vector<OdString> const& urls)
     return {urls.begin(), urls.end()};
 }
 
+bool concernsServer(Failure const& failure)
+{
+    return failure.code != static_cast<std::int32_t>(ServerError::other);
+}
+
+/// Learns from the server which commits there are. Returns why that cannot be known now; empty when it is known.
+std::string learnWhatIsNeeded(Work& work)
+{
+    if (std::holds_alternative<CommitUnderWay>(unfinishedOf(work.database()))) {
+        return "A commit waits for the server.";
+    }
+    try {
+        Connection connection(work.database());
+        learnHistory(work.root(), work.database(), connection, Compared::everything);
+        return {};
+    } catch (Failure const& failure) {
+        if (!concernsServer(failure)) {
+            throw;
+        }
+        return failure.what + " " + failure.next;
+    }
+}
+
+Freed removeWhatNobodyNeeds(Work& work, LocalStorage& storage)
+{
+    std::string const doubt = learnWhatIsNeeded(work);
+    if (!doubt.empty()) {
+        printNote("Only leftovers are removed, as the server does not say what its commits need. " + doubt);
+        return valueOrFail(storage.removeLeftovers(work.root()), "Check your rights in '.tav'.");
+    }
+    Contents const needed = contentsOf(work.root(), work.database());
+    return valueOrFail(
+        storage.keepOnly(work.root(), setOf(needed.here), setOf(needed.elsewhere)),
+        "Run 'tav verify' to see whether anything is damaged.");
+}
+
 } // namespace
 
 void collectGarbage()
 {
-    Work work(openRepository(""), "gc");
+    Work work(openRepository(""), "gc", Work::Unfinished::mayStay);
     work.database().failIfDamaged();
-    Connection connection(work.database());
-    learnHistory(work.root(), work.database(), connection, Compared::everything); // The server says what is needed.
-    Contents const needed = contentsOf(work.root(), work.database());
     LocalStorage storage;
-    Freed const freed = valueOrFail(
-        storage.keepOnly(work.root(), setOf(needed.here), setOf(needed.elsewhere)),
-        "Run 'tav verify' to see whether anything is damaged.");
+    Freed const freed = removeWhatNobodyNeeds(work, storage);
     RemovedFiles const files = cleanRemovedFiles(work.root(), work.database(), storage);
     print(
         "Removed " + counted(freed.contents, "stored version") + " that no commit needs; " + sizeText(freed.bytes) +

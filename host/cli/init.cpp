@@ -4,16 +4,13 @@
 #include "host/projects.h"
 #include "host/repository/ignore_file.h"
 #include "host/repository/open.h"
+#include "host/repository/rebuild.h"
 #include "host/repository/server_of.h"
 #include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/characters.h"
 #include "host/text/wide.h"
 
-#include "common/mu_common_serialization.h"
-#include "json/json_reader.h"
-
-#include <algorithm>
+#include <cstddef>
 #include <filesystem>
 #include <string>
 
@@ -27,57 +24,27 @@ std::string absolute(std::string const& folder)
     return path.has_filename() ? path.string() : path.parent_path().string();
 }
 
-/// The server takes names that can be shown.
-OdString withoutControls(OdString const& name)
+/// The folder that the user named; empty when there is none.
+OdString namedServer(InitOptions const& options)
 {
-    OdString clean;
-    for (std::size_t i = 0; i < name.getLength(); ++i) {
-        clean += isControl(name.getAt(i)) ? L'_' : name.getAt(i);
-    }
-    return clean;
+    return options.server.empty() ? OdString() : namedServerFolder(options.server);
 }
 
-OdString documentOf(std::string const& name)
+OdString namedOrDefault(OdString const& server)
 {
-    kutils::json::Object object;
-    object[L"name"] = jsonText(withoutControls(wide(name)));
-    return compactText(std::move(object));
+    return server.isEmpty() ? namedServerFolder(defaultServerFolder()) : server;
 }
 
-/// Makes a repository on the server and returns its identifier.
-OdString registerAt(OdString const& server, std::string const& name)
+void chooseServer(LocalDatabase& database, OdString const& named, std::string const& folder, std::string const& name)
 {
-    OdString const answer = valueOrFail(
-        connect(server, EmbeddedServer::Missing::isMade)->request(L"init", documentOf(name)),
-        "Check the folder of the server.");
-    kutils::json::Value document;
-    kutils::json::read_string(document, answer);
-    return valueOrFail(common::deserializeInitData(document.get_object()), "Check the folder of the server.");
-}
-
-/// What lies in the working folder is versioned with it, unless it is hidden: going back to an earlier commit would
-/// take the server back too.
-void failIfInside(std::string const& server, std::string const& workingFolder)
-{
-    std::filesystem::path const relative =
-        std::filesystem::weakly_canonical(server).lexically_relative(std::filesystem::weakly_canonical(workingFolder));
-    auto const isHidden = [](std::filesystem::path const& part) { return part.string().front() == '.'; };
-    if (std::none_of(relative.begin(), relative.end(), isHidden)) {
-        throw Failure("'" + server + "' lies in the working folder.", "Name a folder outside of it for the server.");
-    }
-}
-
-void chooseServer(
-    LocalDatabase& database, InitOptions const& options, std::string const& folder, std::string const& name)
-{
-    OdString const chosen = wide(absolute(options.server.empty() ? defaultServerFolder() : options.server));
     if (database.repositoryId().isEmpty()) {
-        failIfInside(chosen.ansi_str(), folder);
-        database.setServer(chosen, registerAt(chosen, name));
-    } else if (!options.server.empty() && database.serverFolder() != chosen) {
+        OdString const chosen = namedOrDefault(named);
+        failIfInside(chosen, folder);
+        database.setServer(chosen, makeRepository(chosen, name));
+    } else if (!named.isEmpty() && database.serverFolder() != named) {
         throw Failure(
             "The repository has its server already, in '" + database.serverFolder().ansi_str() + "'.",
-            "Run 'tav init' without --server.");
+            "Run 'tav init' without --server, or 'tav server' to name another place.");
     }
 }
 
@@ -91,11 +58,23 @@ void enterProject(LocalDatabase const& database, std::string const& folder, std:
     }
 }
 
+/// Makes a lost database again, and says what the user should know of it.
+std::string rebuilt(common::RootPath const& root, std::string const& folder, OdString const& server)
+{
+    Rebuilt const made = rebuildDatabase(root, wide(folder), server);
+    std::string const place =
+        made.base == 0 ? ""
+                       : " The folder is taken to stand on commit " + std::to_string(made.base) + "; see 'tav status'.";
+    return "Made the database again from the server, with " +
+           counted(static_cast<std::size_t>(made.commits), "commit") + "." + place + "\n";
+}
+
 } // namespace
 
 void init(InitOptions const& options)
 {
     OdString const path = wide(options.folder);
+    OdString const server = namedServer(options); // What is wrong with it is said before anything is made.
     bool const existed = common::RootPath::get(path, false).hasValue();
     common::RootPath const root =
         valueOrFail(common::RootPath::get(path, true), "Check that the folder is one and that you may write there.");
@@ -105,9 +84,12 @@ void init(InitOptions const& options)
     os::FileLock const lock = lockRepository(root, "init");
     makeIgnoreFile(root);
     makeState(root);
+    std::string const found =
+        LocalDatabase::isLost(root) ? rebuilt(root, folder, namedOrDefault(server)) : std::string();
     LocalDatabase database = LocalDatabase::make(root);
-    chooseServer(database, options, folder, name);
+    chooseServer(database, server, folder, name);
     enterProject(database, folder, name);
+    print(found);
     print(
         existed ? "The repository in '" + shown(path) + "' was there already; it is complete.\n"
                 : "Made a repository in '" + shown(path) + "'.\n");

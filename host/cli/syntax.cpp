@@ -178,6 +178,15 @@ void addReferences(CLI::App& command, void (*run)(ReferenceOptions const& option
     command.callback([options, run] { run(*options); });
 }
 
+void addServer(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("server", "Show where the history is kept, or name its new place");
+    auto const options = std::make_shared<ServerOptions>();
+    command->add_option("FOLDER", options->folder, "Where the server is now, as in: tav server /mnt/office/tav");
+    command->add_flag("--send", options->send, "Send the commits that are known here and not there");
+    command->callback([options] { server(*options); });
+}
+
 void addFiles(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("files", "List the files that the repository keeps");
@@ -235,6 +244,7 @@ void addCommands(CLI::App& app)
     addReferences(*app.add_subcommand("branch", "List the branches, or make one"), branch);
     addReferences(*app.add_subcommand("tag", "List the tags, or make one"), tag);
     app.add_subcommand("fetch", "Learn the commits, branches and tags that the server has")->callback(fetchHistory);
+    addServer(app);
     addFiles(app);
     addIgnore(app);
     addOnlyJson(*app.add_subcommand("projects", "List the repositories that you have made"), listProjects);

@@ -66,7 +66,7 @@ std::optional<Failure> differenceFromServer(LocalDatabase const& database)
     if (comparison.unknownThere > 0) {
         return Failure(
             "The server lacks " + counted(comparison.unknownThere, "commit") + " that are known here.",
-            "Put a newer copy of it in its place.");
+            "An older copy of it may have been put back: run 'tav server --send' to send them again.");
     }
     if (comparison.unknownHere > 0) {
         return Failure(

@@ -10,6 +10,7 @@
 #include "host/repository/server_of.h"
 #include "host/repository/working_state.h"
 #include "host/server/commit_document.h"
+#include "host/server/commit_hash.h"
 #include "host/storage/local_storage.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
@@ -22,6 +23,7 @@
 #include "platform/ut/FileName.h"
 
 #include <algorithm>
+#include <ctime>
 #include <set>
 #include <utility>
 
@@ -111,61 +113,24 @@ void readBack(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& 
     }
 }
 
-class Digest {
-public:
-    Digest& add(OdString const& text)
-    {
-        std::string const bytes = text.ansi_str();
-        std::string const length = std::to_string(bytes.size()) + ":"; // Else "ab","c" would be "a","bc".
-        digest_.update(length.data(), length.size());
-        digest_.update(bytes.data(), bytes.size());
-        return *this;
-    }
-    OdString finish() { return digest_.finish(); }
-
-private:
-    common::ContentDigest digest_;
-};
-
-/// The name of a commit follows from what is in it, its time excepted: the same order gives the same commit.
-OdString hashOf(common::CommitInfo const& info)
-{
-    Digest digest;
-    digest.add(L"tav commit").add(info.author).add(info.message);
-    for (OdString const& parent : info.parents) {
-        digest.add(parent);
-    }
-    digest.add(OdString::kEmpty);
-    for (common::RepoFile const& file : info.files) {
-        digest.add(file.path).add(file.storagePath).add(file.base ? file.base->path : OdString::kEmpty);
-    }
-    return digest.finish();
-}
-
-common::RepoFile recorded(OdString const& path, OdString const& url, Previous const& previous)
-{
-    auto const rename = previous.find(path);
-    if (rename == previous.end()) {
-        return {withPairs(path), url};
-    }
-    return {withPairs(path), url, std::make_unique<common::BaseFile>(withPairs(rename->second))};
-}
-
 OdString documentOf(Draft const& draft, CommitOrder const& order, OdString const& branch)
 {
-    common::CommitInfo info;
+    NewCommit added;
+    added.commit.author = order.author;
+    added.commit.message = order.message;
+    added.commit.date = std::time(nullptr);
+    if (OdString const parent = draft.database.base(); !parent.isEmpty()) {
+        added.commit.parents.push_back(parent);
+    }
     for (auto const& [path, url] : draft.files) {
-        info.files.push_back(recorded(path, url, draft.previous));
+        auto const rename = draft.previous.find(path);
+        added.files.push_back({path, url, rename == draft.previous.end() ? OdString::kEmpty : rename->second});
     }
-    OdString const parent = draft.database.base();
-    if (!parent.isEmpty()) {
-        info.parents.push_back(parent);
-    }
-    info.author = withPairs(order.author);
-    info.message = withPairs(order.message);
-    info.hash = hashOf(info);
-    info.references.emplace_back(withPairs(branch), info.hash, common::EType::branch);
-    return compactText(common::serializeCommitInfo(info));
+    added.commit.hash = commitHash(added.commit, added.files);
+    auto const end = draft.database.commits().reference(branch);
+    added.references.push_back(
+        {{branch, added.commit.hash, common::EType::branch}, end ? end->commitHash : OdString::kEmpty});
+    return commitInfoDocument(added);
 }
 
 void failIfNotAtTheEnd(LocalDatabase const& database, OdString const& branch)
@@ -189,10 +154,12 @@ sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& dat
     try {
         kutils::json::read_string(answer, connection.request("commit", document));
     } catch (Failure& failure) {
-        if (!isOnServer(commit.commit.hash, connection)) {
+        bool const isElsewhere = failure.code == static_cast<std::int32_t>(ServerError::noRepository);
+        if (isElsewhere || !isOnServer(commit.commit.hash, connection)) {
             note(std::monostate(), database);
         }
-        failure.next += " With 'tav branch NAME' and 'tav switch NAME' you have a branch of your own.";
+        failure.next += isElsewhere ? " What was to be committed is staged as before."
+                                    : " With 'tav branch NAME' and 'tav switch NAME' you have a branch of your own.";
         throw;
     }
     auto const numbers = valueOrFail(common::deserializeCommitNumbers(answer.get_array()), kAskOwner);
@@ -225,8 +192,8 @@ void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& d
         failUnlessNext(commit.commit.number, database);
         database.commits().add(commit.commit, commit.files);
     }
-    for (common::Reference const& reference : commit.references) {
-        setUnlessPassed(reference, database);
+    for (ReferenceChange const& moved : commit.references) {
+        setUnlessPassed(moved.reference, database);
     }
     for (NewContent const& content : work.contents) {
         database.addContent(content.url, content.digest, content.size);
@@ -362,6 +329,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     failIfBack(plan, state, root);
     draft.work.document = documentOf(draft, order, state.head);
     NewCommit checked = readCommitInfo(draft.work.document); // What is refused must not be noted: it could never end.
+    requireHash(checked);
     Change change(database.database());
     note(draft.work, database);
     database.addVerified(settledFiles(std::move(draft.verified), start));

@@ -4,22 +4,8 @@
 #include "host/repository/server_of.h"
 #include "host/server/commit_document.h"
 #include "host/text/characters.h"
-#include "host/text/json_text.h"
 
 namespace tav {
-
-namespace {
-
-OdString documentOf(common::Reference const& reference)
-{
-    kutils::json::Object object;
-    object[L"name"] = jsonText(reference.name);
-    object[L"commitHash"] = jsonText(reference.commitHash);
-    object[L"refType"] = reference.type == common::EType::branch ? L"branch" : L"tag";
-    return compactText(kutils::json::Array{std::move(object)});
-}
-
-} // namespace
 
 void makeReference(LocalDatabase& database, common::Reference const& reference)
 {
@@ -30,7 +16,8 @@ void makeReference(LocalDatabase& database, common::Reference const& reference)
     if (auto const fault = whyNoReferenceName(reference.name)) {
         throw Failure("The name " + quoted(reference.name) + " " + *fault + ".", "Choose another name.");
     }
-    Connection(database).request("references", documentOf(reference));
+    Connection(database).request(
+        "references", referenceChanges({{reference, OdString::kEmpty}})); // It is made, not moved.
     Change change(database.database());
     database.commits().set(reference);
     change.commit();

@@ -68,6 +68,7 @@ _tav_options() { # COMMAND
         log) printf '%s\n' -n --count --json ;;
         restore) printf '%s\n' --from --force ;;
         checkout | switch) printf '%s\n' --force ;;
+        server) printf '%s\n' --send ;;
         files) printf '%s\n' --hash --json ;;
         ignore) printf '%s\n' --add --json ;;
         show | diff | branch | tag | projects | verify) printf '%s\n' --json ;;
@@ -95,15 +96,15 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
             _tav_offer < <(_tav_paths modified removed)
             ;;
         mv:[12] | rm:*) _tav_offer_files -f ;;
-        init:1 | files:1 | export:2) _tav_offer_files -d ;;
+        init:1 | server:1 | files:1 | export:2) _tav_offer_files -d ;;
         switch:1) _tav_offer < <(_tav_references branch) ;;
         log:1 | show:1 | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
     esac
 }
 
 _tav() {
-    local commands='init status add unstage mv rm commit log show diff restore checkout switch branch tag fetch files
-        ignore projects verify gc export'
+    local commands='init status add unstage mv rm commit log show diff restore checkout switch branch tag fetch server
+        files ignore projects verify gc export'
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
     local command='' folder='' number=1 word i
     COMPREPLY=()

@@ -1,7 +1,7 @@
 # Completion of tav for fish: commands, options, files, branches and tags.
 
-set -l commands init status add unstage mv rm commit log show diff restore checkout switch branch tag fetch files \
-    ignore projects verify gc export
+set -l commands init status add unstage mv rm commit log show diff restore checkout switch branch tag fetch server \
+    files ignore projects verify gc export
 
 # Runs tav on the repository that the line names with -C, for what it knows.
 function __tav_ask
@@ -77,6 +77,7 @@ __tav_command switch 'Go on with the work on another branch' $commands
 __tav_command branch 'List the branches, or make one' $commands
 __tav_command tag 'List the tags, or make one' $commands
 __tav_command fetch 'Learn the commits, branches and tags that the server has' $commands
+__tav_command server 'Show where the history is kept, or name its new place' $commands
 __tav_command files 'List the files that the repository keeps' $commands
 __tav_command ignore 'Show the rules for names to ignore, or add one' $commands
 __tav_command projects 'List the repositories that you have made' $commands
@@ -117,6 +118,8 @@ complete -c tav -n '__fish_seen_subcommand_from branch' -l json -d 'Print a docu
 complete -c tav -n '__fish_seen_subcommand_from branch; and __tav_arguments 1 branch' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from tag' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from tag; and __tav_arguments 1 tag' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from server' -l send -d 'Send the commits that are known here and not there'
+complete -c tav -n '__fish_seen_subcommand_from server' -a '(__fish_complete_directories)'
 complete -c tav -n '__fish_seen_subcommand_from files' -l hash -d 'Show the SHA-256 digest of each file'
 complete -c tav -n '__fish_seen_subcommand_from files' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from files' -a '(__fish_complete_directories)'

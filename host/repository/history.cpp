@@ -10,6 +10,7 @@
 
 #include <algorithm>
 #include <iterator>
+#include <set>
 #include <tuple>
 #include <utility>
 
@@ -18,6 +19,9 @@ namespace tav {
 namespace {
 
 constexpr char const* kAskOwner = "The server is damaged, or is not a server of tav; ask its owner.";
+
+constexpr char const* kSendThem =
+    "An older copy of it may have been put back: run 'tav server --send' to send them again.";
 
 /// What `read` makes of an answer of the server, which is checked as strictly as what clients send.
 template <class Read>
@@ -72,40 +76,30 @@ void enterContents(
     }
 }
 
-/// Enters the commits of a page behind the number `last`, in one change. Returns how many were unknown.
-std::size_t enterPage(
-    common::RootPath const& root, LocalDatabase& database, std::vector<ChangedCommit> const& page, std::int64_t last)
+/// Returns how many of the commits were unknown. Part of a `Change` of the caller.
+std::size_t enterPage(common::RootPath const& root, LocalDatabase& database, std::vector<ChangedCommit> const& page)
 {
-    Change change(database.database());
     LocalStorage storage;
     std::size_t added = 0;
     for (ChangedCommit const& next : page) {
-        if (next.commit.number != ++last) {
-            throw Failure("The server does not send its commit " + std::to_string(last) + ".", kAskOwner);
-        }
         if (!database.commits().find(next.commit.hash)) {
             database.commits().addChanges(next.commit, next.changes);
             ++added;
         }
         enterContents(root, database, storage, next.changes);
     }
-    change.commit();
     return added;
 }
 
-std::size_t enterCommits(
-    common::RootPath const& root, LocalDatabase& database, Connection& connection, std::int64_t known, std::int64_t end)
+std::size_t
+enterCommits(common::RootPath const& root, LocalDatabase& database, Connection& connection, std::int64_t known)
 {
     std::size_t added = 0;
-    while (known < end) {
-        std::vector<ChangedCommit> const page =
-            readAnswer(connection.request("history", numbersDocument(known)), readHistoryPage);
-        if (page.empty()) {
-            throw Failure("The server does not send its commit " + std::to_string(known + 1) + ".", kAskOwner);
-        }
-        added += enterPage(root, database, page, known);
-        known = page.back().commit.number;
-    }
+    forEachPageThere(connection, known, [&](std::vector<ChangedCommit> const& page) {
+        Change change(database.database());
+        added += enterPage(root, database, page);
+        change.commit();
+    });
     return added;
 }
 
@@ -136,31 +130,89 @@ HistoryComparison compareHistory(LocalDatabase const& database, Connection& conn
     return {without(there, here).size(), without(here, there).size()};
 }
 
+void forEachPageThere(
+    Connection& connection, std::int64_t known, std::function<void(std::vector<ChangedCommit> const&)> const& take)
+{
+    for (;;) {
+        std::vector<ChangedCommit> const page =
+            readAnswer(connection.request("history", numbersDocument(known)), readHistoryPage);
+        for (ChangedCommit const& next : page) {
+            if (next.commit.number != ++known) {
+                throw Failure("The server does not send its commit " + std::to_string(known) + ".", kAskOwner);
+            }
+        }
+        if (page.empty()) {
+            return;
+        }
+        take(page);
+    }
+}
+
+std::vector<common::Reference> referencesThere(Connection& connection)
+{
+    return readAnswer(connection.request("references", L"[]"), [](OdString const& text) {
+        std::vector<common::Reference> references;
+        for (ReferenceChange const& there : readReferences(text)) {
+            references.push_back(there.reference);
+        }
+        return references;
+    });
+}
+
 bool isOnServer(OdString const& hash, Connection& connection)
 {
     std::vector<CommitNumber> const there = numbersThere(connection, 1);
     return std::any_of(there.begin(), there.end(), [&](CommitNumber const& commit) { return commit.hash == hash; });
 }
 
+std::vector<OdString> missingThere(LocalDatabase const& database, Connection& connection)
+{
+    std::set<OdString> there;
+    for (CommitNumber const& commit : numbersThere(connection, 1)) {
+        there.insert(commit.hash);
+    }
+    std::vector<OdString> missing;
+    for (CommitNumber const& commit : database.commits().numbersFrom(1)) {
+        if (there.count(commit.hash) == 0) {
+            missing.push_back(commit.hash);
+        }
+    }
+    return missing;
+}
+
+// References are asked for first: should another program add a commit meanwhile, what they name is still among the
+// commits.
 Learned learnHistory(common::RootPath const& root, LocalDatabase& database, Connection& connection, Compared compared)
 {
-    // References first: should another program add a commit meanwhile, what they name is among the commits all the
-    // same.
-    std::vector<common::Reference> references =
-        readAnswer(connection.request("references", L"[]"), [](OdString const& text) { return readReferences(text); });
+    std::vector<common::Reference> references = referencesThere(connection);
     std::int64_t const known = database.commits().lastWithoutGap();
     std::int64_t const first = compared == Compared::everything ? 1 : known;
     std::vector<CommitNumber> const there = numbersThere(connection, first);
     if (!without(database.commits().numbersFrom(first), there).empty()) {
-        throw Failure(
-            "The server in '" + database.serverFolder().ansi_str() + "' lacks commits that are known here.",
-            "Put a newer copy of it in its place.");
+        Failure failure(
+            "The server in '" + connection.serverFolder().ansi_str() + "' lacks commits that are known here.",
+            kSendThem);
+        failure.code = static_cast<std::int32_t>(ServerError::isBehind);
+        throw failure;
     }
-    std::int64_t const end = there.empty() ? 0 : there.back().number;
     Learned learned;
-    learned.commits = enterCommits(root, database, connection, known, end);
+    if (!there.empty() && there.back().number > known) {
+        learned.commits = enterCommits(root, database, connection, known);
+    }
     learned.references = enterReferences(database, std::move(references));
     return learned;
+}
+
+void replaceHistory(common::RootPath const& root, LocalDatabase& database, Connection& connection)
+{
+    std::vector<common::Reference> const references = referencesThere(connection);
+    Change change(database.database());
+    database.commits().clear();
+    forEachPageThere(connection, 0, [&](std::vector<ChangedCommit> const& page) { enterPage(root, database, page); });
+    for (common::Reference const& reference : references) {
+        database.commits().set(reference);
+    }
+    change.commit();
 }
 
 } // namespace tav

@@ -6,8 +6,12 @@
 #pragma once
 
 #include "host/repository/server_of.h"
+#include "host/server/history_document.h"
 
 #include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <vector>
 
 namespace tav {
 
@@ -19,8 +23,18 @@ struct HistoryComparison {
 
 HistoryComparison compareHistory(LocalDatabase const& database, Connection& connection);
 
+/// Gives all commits that the server has behind the number `known` to `take`, in ascending order, page by page.
+void forEachPageThere(
+    Connection& connection, std::int64_t known, std::function<void(std::vector<ChangedCommit> const&)> const& take);
+
+/// What the branches and tags of the server name.
+std::vector<common::Reference> referencesThere(Connection& connection);
+
 /// Whether the server has the commit, known here or not.
 bool isOnServer(OdString const& hash, Connection& connection);
+
+/// The commits that are known here and not there under any number, in the order of their numbers.
+std::vector<OdString> missingThere(LocalDatabase const& database, Connection& connection);
 
 /// How much of what is known here is looked up at the server before it is believed to have all of it.
 enum class Compared {
@@ -37,5 +51,9 @@ struct Learned {
 /// Throws `Failure` when the server lacks what is known here; nothing is entered then. After any other failure whole
 /// commits have been entered, and the next call goes on behind them. The caller holds the lock of the repository.
 Learned learnHistory(common::RootPath const& root, LocalDatabase& database, Connection& connection, Compared compared);
+
+/// Puts the history of the server in the place of the one that is known here, in one change. The server has all that is
+/// known here, under whatever numbers.
+void replaceHistory(common::RootPath const& root, LocalDatabase& database, Connection& connection);
 
 } // namespace tav

@@ -33,17 +33,12 @@ constexpr std::array kSteps = {makeFirstTables, VerifiedFiles::create};
 constexpr std::int64_t kVersion = kSteps.size();
 constexpr std::int64_t kFirstWithVerifiedFiles = 2;
 
-/// A database that is missing beside stored contents has been lost: a new one would hide the history.
 void failIfLost(common::RootPath const& root)
 {
-    std::error_code error;
-    auto const size = std::filesystem::file_size(root.dbPath().ansi_str(), error);
-    bool const isThere = !error && size > 0;
-    bool const hasContents = ut::Dir::exists(root.tavPath() + L"/objects") || ut::Dir::exists(root.tavPath() + L"/tf");
-    if (!isThere && hasContents) {
+    if (LocalDatabase::isLost(root)) {
         throw Failure(
             "The database '" + root.dbPath().ansi_str() + "' is missing or empty, though versions are stored here.",
-            "Put a copy of it from a backup in its place.");
+            "Run 'tav init' to make it again from the server.");
     }
 }
 
@@ -60,6 +55,19 @@ LocalDatabase LocalDatabase::make(common::RootPath const& root)
 {
     failIfLost(root);
     return {root.dbPath().ansi_str(), Use::changing};
+}
+
+LocalDatabase LocalDatabase::makeAt(std::string const& path)
+{
+    return {path, Use::changing};
+}
+
+bool LocalDatabase::isLost(common::RootPath const& root)
+{
+    std::error_code error;
+    auto const size = std::filesystem::file_size(root.dbPath().ansi_str(), error);
+    bool const isThere = !error && size > 0;
+    return !isThere && (ut::Dir::exists(root.tavPath() + L"/objects") || ut::Dir::exists(root.tavPath() + L"/tf"));
 }
 
 LocalDatabase LocalDatabase::openForChanges(common::RootPath const& root)

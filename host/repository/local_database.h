@@ -18,10 +18,15 @@ public:
     /// Opens the database, and makes it when it is missing. One that an earlier tav made is brought to the form of this
     /// one. The caller holds the lock of the repository.
     static LocalDatabase make(common::RootPath const& root);
-    /// The same, but where it is missing an empty one is used instead, which is gone afterwards.
+    /// The same for the file `path`, in bytes, whatever is beside it.
+    static LocalDatabase makeAt(std::string const& path);
+    /// Like `make`, but where it is missing an empty one is used instead, which is gone afterwards.
     static LocalDatabase openForChanges(common::RootPath const& root);
     /// For commands that only read: one that an earlier tav made stays as it is.
     static LocalDatabase open(common::RootPath const& root);
+
+    /// Whether it is missing or empty beside stored contents: a new one would hide the history.
+    static bool isLost(common::RootPath const& root);
 
     LocalDatabase(LocalDatabase const&) = delete;
     LocalDatabase& operator=(LocalDatabase const&) = delete;

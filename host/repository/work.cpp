@@ -32,6 +32,9 @@ Work::Work(common::RootPath const& root, std::string const& name, Unfinished unf
     , start_(commandStart(root))
     , database_(LocalDatabase::openForChanges(root))
 {
+    if (unfinished == Unfinished::isLeft) {
+        return;
+    }
     try {
         finish();
     } catch (Failure const&) {

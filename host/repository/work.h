@@ -14,7 +14,11 @@ namespace tav {
 class Work {
 public:
     /// Whether a command can do without what an interrupted one has left to finish, as long as the server is away.
-    enum class Unfinished { mustEnd, mayStay };
+    enum class Unfinished {
+        mustEnd,
+        mayStay,
+        isLeft ///< not even tried: the command changes where the server is
+    };
 
     /// Takes the lock for the command `name` and finishes the commit or move that an interrupted command has left.
     /// Throws `Failure`.

@@ -1,14 +1,19 @@
 #include "host/server/commit_document.h"
 
+#include "host/failure.h"
+#include "host/server/commit_hash.h"
 #include "host/server/document.h"
 #include "host/server/members.h"
 #include "host/text/characters.h"
+#include "host/text/json_text.h"
 
 #include "common/mu_common_json_keys.h"
+#include "platform/sdk/OdTimeStamp.h"
 
 #include <algorithm>
 #include <array>
 #include <cstddef>
+#include <memory>
 #include <utility>
 
 namespace tav {
@@ -18,6 +23,7 @@ namespace {
 namespace keys = common::json;
 
 constexpr std::size_t kHashLength = 64;
+constexpr wchar_t const* kExpected = L"expected";
 constexpr std::size_t kLongestName = 255;
 
 bool isDigit(wchar_t c)
@@ -185,19 +191,30 @@ OdString readReferenceName(Part const& part)
     return name;
 }
 
-common::Reference readReference(Part const& part)
+/// An empty text, or a hash.
+std::optional<OdString> readExpected(Part const& part)
 {
-    return common::Reference(
-        readReferenceName(part.member(keys::s_ref_name.c_str())), readHash(part.member(keys::s_commitHash.c_str())),
-        readType(part.member(L"refType")));
+    auto const expected = part.optionalMember(kExpected);
+    if (!expected || expected->text().isEmpty()) {
+        return expected ? std::optional(OdString()) : std::nullopt;
+    }
+    return readHash(*expected);
 }
 
-void checkNames(Part const& part, std::vector<common::Reference> const& references)
+ReferenceChange readReference(Part const& part)
+{
+    common::Reference const reference(
+        readReferenceName(part.member(keys::s_ref_name.c_str())), readHash(part.member(keys::s_commitHash.c_str())),
+        readType(part.member(L"refType")));
+    return {reference, readExpected(part)};
+}
+
+void checkNames(Part const& part, std::vector<ReferenceChange> const& changes)
 {
     std::vector<OdString> names;
-    names.reserve(references.size());
-    for (common::Reference const& reference : references) {
-        names.push_back(reference.name);
+    names.reserve(changes.size());
+    for (ReferenceChange const& change : changes) {
+        names.push_back(change.reference.name);
     }
     std::sort(names.begin(), names.end());
     auto const twice = std::adjacent_find(names.begin(), names.end());
@@ -206,9 +223,9 @@ void checkNames(Part const& part, std::vector<common::Reference> const& referenc
     }
 }
 
-std::vector<common::Reference> readReferences(Part const& part)
+std::vector<ReferenceChange> readReferences(Part const& part)
 {
-    std::vector<common::Reference> references;
+    std::vector<ReferenceChange> references;
     std::size_t const count = part.size();
     for (std::size_t i = 0; i < count; ++i) {
         references.push_back(readReference(part[i]));
@@ -257,7 +274,74 @@ bool hasFormOfTime(OdString const& text)
            });
 }
 
+OdString timeText(std::int64_t seconds)
+{
+    OdTimeStamp time;
+    time.setPackedValue(seconds);
+    OdString text;
+    time.strftime(L"%Y-%m-%dT%H:%M:%SZ", text);
+    return text;
+}
+
+kutils::json::Array referenceArray(std::vector<ReferenceChange> const& changes)
+{
+    kutils::json::Array array;
+    for (ReferenceChange const& change : changes) {
+        kutils::json::Object object;
+        object[keys::s_commitHash.c_str()] = jsonText(change.reference.commitHash);
+        object[keys::s_ref_name.c_str()] = jsonText(change.reference.name);
+        object[L"refType"] = change.reference.type == common::EType::branch ? L"branch" : L"tag";
+        if (change.expected) {
+            object[kExpected] = jsonText(*change.expected);
+        }
+        array.emplace_back(std::move(object));
+    }
+    return array;
+}
+
+common::RepoFile recorded(FileRecord const& file)
+{
+    if (file.previousPath.isEmpty()) {
+        return {withPairs(file.path), file.url};
+    }
+    return {withPairs(file.path), file.url, std::make_unique<common::BaseFile>(withPairs(file.previousPath))};
+}
+
 } // namespace
+
+OdString commitInfoDocument(NewCommit const& commit)
+{
+    common::CommitInfo info;
+    for (FileRecord const& file : commit.files) {
+        info.files.push_back(recorded(file));
+    }
+    info.parents = commit.commit.parents;
+    info.hash = commit.commit.hash;
+    info.author = withPairs(commit.commit.author);
+    info.message = withPairs(commit.commit.message);
+    kutils::json::Value document = common::serializeCommitInfo(info);
+    kutils::json::Object& whole = document.get_object();
+    kutils::json::Object& only = whole[L"commits"].get_array().front().get_object();
+    only[keys::s_annotation.c_str()].get_object()[L"date"] = jsonText(timeText(commit.commit.date));
+    whole[keys::s_references.c_str()] = referenceArray(commit.references);
+    return compactText(document);
+}
+
+void requireHash(NewCommit const& commit)
+{
+    OdString const hash = commitHash(commit.commit, commit.files);
+    if (hash != commit.commit.hash) {
+        throw Failure(
+            "'commits[0].hash' is " + quoted(commit.commit.hash) + ", but what is in the commit gives " + quoted(hash) +
+                ".",
+            kNothingChanged);
+    }
+}
+
+OdString referenceChanges(std::vector<ReferenceChange> const& changes)
+{
+    return compactText(referenceArray(changes));
+}
 
 NewCommit readCommitInfo(OdString const& document)
 {
@@ -275,7 +359,7 @@ NewCommit readCommitInfo(OdString const& document)
     return result;
 }
 
-std::vector<common::Reference> readReferences(OdString const& document)
+std::vector<ReferenceChange> readReferences(OdString const& document)
 {
     kutils::json::Value const value = parsed(document);
     return readReferences(Part(value));

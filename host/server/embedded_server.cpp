@@ -81,11 +81,18 @@ Value numbersDocument(std::vector<CommitNumber> const& commits)
     return pairs;
 }
 
+Failure withCode(Failure failure, ServerError code)
+{
+    failure.code = static_cast<std::int32_t>(code);
+    return failure;
+}
+
 Repository repositoryOrFail(Database const& database, OdString const& id)
 {
     Statement row = database.prepare("SELECT key, name FROM repositories WHERE id = ?");
     if (!row.with(id).next()) {
-        throw Failure("The server has no repository " + quoted(id) + ".", kNothingChanged);
+        throw withCode(
+            Failure("The server has no repository " + quoted(id) + ".", kNothingChanged), ServerError::noRepository);
     }
     return {row.integer(0), id, row.text(1)};
 }
@@ -134,8 +141,24 @@ void requireForward(CommitTables const& tables, common::Reference const& there, 
     }
 }
 
-void setReference(CommitTables& tables, common::Reference const& wanted, Force force)
+/// One that names the wanted commit already is as good: an earlier request, whose answer was lost, may have done it.
+void requireExpected(std::optional<common::Reference> const& there, ReferenceChange const& change)
 {
+    OdString const now = there ? there->commitHash : OdString();
+    if (!change.expected || now == *change.expected || now == change.reference.commitHash) {
+        return;
+    }
+    std::string const kind = change.reference.type == common::EType::tag ? "tag " : "branch ";
+    std::string const name = kind + quoted(change.reference.name);
+    if (change.expected->isEmpty()) {
+        throw Failure("There is a " + name + " already.", "Choose another name.");
+    }
+    throw Failure("The " + name + " names another commit by now.", "Fetch what others have done, and try again.");
+}
+
+void setReference(CommitTables& tables, ReferenceChange const& change, Force force)
+{
+    common::Reference const& wanted = change.reference;
     if (!tables.find(wanted.commitHash)) {
         throw Failure(
             "The server does not have the commit " + quoted(wanted.commitHash) + " of " + quoted(wanted.name) + ".",
@@ -144,9 +167,10 @@ void setReference(CommitTables& tables, common::Reference const& wanted, Force f
     auto const there = tables.reference(wanted.name);
     if (there) {
         requireSameType(*there, wanted);
-        if (force == Force::no && there->commitHash != wanted.commitHash) {
-            requireForward(tables, *there, wanted);
-        }
+    }
+    requireExpected(there, change);
+    if (there && force == Force::no && there->commitHash != wanted.commitHash) {
+        requireForward(tables, *there, wanted);
     }
     tables.set(wanted);
 }
@@ -200,11 +224,12 @@ OdString answerRepositories(Request const& request)
 OdString answerCommit(Request const& request, Force force)
 {
     NewCommit added = readCommitInfo(request.document);
+    requireHash(added);
     CommitTables tables(request.database, request.repository.key);
     Change change(request.database);
     bool const isNew = addUnlessThere(tables, added);
-    for (common::Reference const& reference : added.references) {
-        if (isNew || force == Force::yes || !hasPassed(tables, reference, added.commit.hash)) {
+    for (ReferenceChange const& reference : added.references) {
+        if (isNew || force == Force::yes || !hasPassed(tables, reference.reference, added.commit.hash)) {
             setReference(tables, reference, force);
         }
     }
@@ -214,11 +239,14 @@ OdString answerCommit(Request const& request, Force force)
 
 OdString answerReferences(Request const& request, Force force)
 {
-    std::vector<common::Reference> const wanted = readReferences(request.document);
+    std::vector<ReferenceChange> wanted = readReferences(request.document);
     CommitTables tables(request.database, request.repository.key);
     if (!wanted.empty()) { // Who only asks does not wait for those who write.
         Change change(request.database);
-        for (common::Reference const& reference : wanted) {
+        for (ReferenceChange& reference : wanted) {
+            if (force == Force::no && !reference.expected) {
+                reference.expected = OdString(); // Who does not say what is there does not know of it.
+            }
             setReference(tables, reference, force);
         }
         change.commit();
@@ -312,7 +340,9 @@ Expected<OdString> EmbeddedServer::request(OdString const& verb, OdString const&
     try {
         return answer(verb, document);
     } catch (Failure const& failure) {
-        return messageOf(failure.what + " " + failure.next);
+        ErrorMessage message = messageOf(failure.what + " " + failure.next);
+        message.code = failure.code;
+        return message;
     } catch (std::bad_alloc const&) {
         return messageOf(std::string("There is not enough memory for the request. ") + kNothingChanged);
     } catch (std::exception const& error) {
@@ -334,7 +364,9 @@ Database& EmbeddedServer::openDatabase()
         return *database_;
     }
     if (missing_ == Missing::isAnError && !ut::FileName::fileExists(wide(folder_ + "/server.db"))) {
-        throw Failure("There is no server in '" + folder_ + "'.", "Bring it back; it may lie on a drive that is off.");
+        throw withCode(
+            Failure("There is no server in '" + folder_ + "'.", "Bring it back; it may lie on a drive that is off."),
+            ServerError::noServer);
     }
     if (auto const error = os::makeFolders(folder_, kFolderPermissions)) {
         throw Failure(

@@ -5,7 +5,17 @@
 
 #include "platform/sdk/OdString.h"
 
+#include <cstdint>
+
 namespace tav {
+
+/// The kinds of errors of a server that clients tell apart, as the `code` of the error.
+enum class ServerError : std::int32_t {
+    other = 0,
+    noServer = 1,     ///< the place where it was is empty; it may come back
+    noRepository = 2, ///< it is there, and does not have the repository
+    isBehind = 3      ///< it lacks commits that the client knows; the client finds that out
+};
 
 /// A server, wherever it is. docs/formats/server-protocol.md lists its requests and their documents; nothing else
 /// passes between it and tav, so that another transport or another database can stand behind this interface.

@@ -581,10 +581,15 @@ public:
         }
     }
 
+    Freed runOnLeftovers()
+    {
+        removeLeftovers();
+        return freed_;
+    }
+
     Freed run()
     {
-        removeAllIn(incomingFolder(root_));
-        removeAllIn(restoringFolder(root_));
+        removeLeftovers();
         cleanObjects();
         cleanStores();
         for (std::string const& folder : {objectFolder(root_), storeFolder(root_)}) {
@@ -608,6 +613,18 @@ private:
         }
     }
 
+    void removeLeftovers()
+    {
+        removeAllIn(incomingFolder(root_));
+        removeAllIn(restoringFolder(root_));
+        std::string const newEnd = std::string(kStoreEnd) + ".new";
+        for (std::string const& name : entriesOf(storeFolder(root_))) {
+            if (endsWith(name, newEnd)) {
+                removeCounted(storeFolder(root_).append("/").append(name), 0, freed_);
+            }
+        }
+    }
+
     void cleanObjects()
     {
         std::set<DigestBytes> const& kept = kept_[{}];
@@ -621,12 +638,6 @@ private:
 
     void cleanStores()
     {
-        std::string const newEnd = std::string(kStoreEnd) + ".new";
-        for (std::string const& name : entriesOf(storeFolder(root_))) {
-            if (endsWith(name, newEnd)) {
-                removeCounted(storeFolder(root_).append("/").append(name), 0, freed_);
-            }
-        }
         for (std::string const& name : entriesOf(storeFolder(root_))) {
             std::string const store = name.substr(0, name.rfind('.'));
             if (endsWith(name, kStoreEnd) && isStoreName(store) && leftAlone_.count(store) == 0) {
@@ -664,6 +675,14 @@ Expected<Freed> LocalStorage::keepOnly(
     return guarded<Freed>([&] {
         flushBatch();
         return Cleaning(root, urls, elsewhere).run();
+    });
+}
+
+Expected<Freed> LocalStorage::removeLeftovers(common::RootPath const& root)
+{
+    return guarded<Freed>([&] {
+        flushBatch();
+        return Cleaning(root, {}, {}).runOnLeftovers();
     });
 }
 

@@ -101,6 +101,9 @@ public:
     Expected<Freed>
     keepOnly(common::RootPath const& root, std::set<OdString> const& urls, std::set<OdString> const& elsewhere = {});
 
+    /// Removes only what interrupted operations have left. No content goes, whether a commit needs it or not.
+    Expected<Freed> removeLeftovers(common::RootPath const& root);
+
 private:
     struct Object {
         std::string incoming; // path meanwhile

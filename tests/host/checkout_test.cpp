@@ -664,14 +664,12 @@ TEST_F(Moving, EndsAtAConflictFolderThatCannotBeRead)
 TEST_F(Moving, MissingDatabaseIsNotMistakenForANewRepository)
 {
     ASSERT_EQ(unlink(repo.pathTo(".tav/tav.db").c_str()), 0);
-    for (char const* const command : {"status", "log", "init"}) {
+    for (char const* const command : {"status", "log", "gc"}) {
         EXPECT_EQ(
-            tav({command}),
-            failed(
-                std::string("tav: The database '") + (command == std::string("init") ? "." : repo.path()) +
-                "/.tav/tav.db" +
-                "' is missing or empty, though versions are stored here. Put a copy of it from a backup in its "
-                "place.\n"));
+            tav({command}), failed(
+                                "tav: The database '" + repo.path() +
+                                "/.tav/tav.db' is missing or empty, though versions are stored here. Run 'tav init' to "
+                                "make it again from the server.\n"));
     }
     EXPECT_FALSE(repo.has(".tav/tav.db"));
 }
@@ -689,7 +687,7 @@ TEST_F(Moving, MissingServerIsNotMadeAgain)
         tavIn(other.path(), {"commit", "-m", "drawn"}),
         failed(
             "tav: There is no server in '" + server +
-            "'. Bring it back; it may lie on a drive that is off. The folder of the server is '" + server + "'.\n"));
+            "'. Bring it back; it may lie on a drive that is off. If it has a new place, run 'tav server FOLDER'.\n"));
     EXPECT_FALSE(place.has("server"));
 }
 

@@ -37,6 +37,7 @@ Subcommands:
   branch                      List the branches, or make one
   tag                         List the tags, or make one
   fetch                       Learn the commits, branches and tags that the server has
+  server                      Show where the history is kept, or name its new place
   files                       List the files that the repository keeps
   ignore                      Show the rules for names to ignore, or add one
   projects                    List the repositories that you have made

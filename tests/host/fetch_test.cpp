@@ -190,6 +190,21 @@ TEST_F(TwoFolders, RefuseAFolderThatFollowsAnEarlierCommitOfItsBranch)
                "'tav switch NAME' to go on from here, or 'tav switch master' to go back to its end.\n"));
 }
 
+TEST_F(TwoFolders, DoNotMoveABranchOfTheOther)
+{
+    commitFile("plan.dwg", "two", "second");
+    ASSERT_EQ(inOther({"branch", "side"}).code, 0);
+    EXPECT_EQ(
+        tav({"branch", "side"}),
+        failed("tav: There is a branch 'side' already. Choose another name. Your working folder is as it was.\n"));
+    EXPECT_EQ(
+        tav({"tag", "side"}),
+        failed("tav: 'side' is the name of a branch already. Choose another name. Your working folder is as it "
+               "was.\n"));
+    EXPECT_EQ(inOther({"fetch"}).code, 0);
+    EXPECT_THAT(inOther({"branch"}).out, HasSubstr("  side  (commit 1)\n"));
+}
+
 TEST_F(TwoFolders, LearnBranchesAndTagsWithACommit)
 {
     makeBranchInOther();

@@ -115,6 +115,17 @@ TEST_F(Init, FailsWhereTheNameOfThePropertiesIsTaken)
             "tav: The folder './.tav/properties' cannot be made. Check the free space and your rights in '.tav'.\n"));
 }
 
+TEST_F(Init, MakesNothingForAServerThatIsNamedByAURL)
+{
+    for (std::string const url : {"https://drawings.example.org", "FILE:///srv/tav", "x-y+z.1://"}) {
+        EXPECT_EQ(
+            tav({"init", "north", "--server", url}),
+            failed("tav: '" + url + "' is a URL, and servers are reached through folders only. Name a folder.\n"));
+    }
+    EXPECT_TRUE(place.list().empty());
+    EXPECT_EQ(tav({"init", "north", "--server", "1://server"}).code, 0) << "no URL has such a beginning";
+}
+
 TEST_F(Init, FailsForAnEmptyName)
 {
     EXPECT_EQ(

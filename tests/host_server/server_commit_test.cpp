@@ -59,7 +59,7 @@ TEST_F(ServerCommit, TakesAMergeOfTwoParents)
 {
     send(commit('a', "", {}, {"branch main a"}));
     send(commit('b', "a", {}, {"branch main b"}));
-    send(commit('c', "a", {}, {"branch side c"}));
+    send(commit('c', "a", {"side 1"}, {"branch side c"}));
     EXPECT_EQ(send(commit('d', "bc", {}, {"branch main d", "branch side d"})), R"([{"commitNo":4,"hash":"<d>"}])");
 }
 
@@ -69,7 +69,7 @@ TEST_F(ServerCommit, KeepsOthersFromBeingOverwritten)
     send(commit('b', "a", {}, {"branch main b"}));
     std::string const before = everything();
     EXPECT_EQ(
-        send(commit('c', "a", {}, {"branch main c"})),
+        send(commit('c', "a", {"plan 1"}, {"branch main c"})),
         "error: The branch 'main' has commits that the new one does not follow. Merge what others have done, or "
         "send it as a branch of its own.");
     EXPECT_EQ(everything(), before) << "the commit itself must not stay either";
@@ -80,7 +80,7 @@ TEST_F(ServerCommit, MovesReferencesAnywhereWhenForced)
     send(commit('a', "", {}, {"branch main a", "tag v1 a"}));
     send(commit('b', "a", {}, {"branch main b"}));
     EXPECT_EQ(
-        ask("force-commit <id>", commit('c', "a", {}, {"branch main c", "tag v1 c"})),
+        ask("force-commit <id>", commit('c', "a", {"plan 1"}, {"branch main c", "tag v1 c"})),
         R"([{"commitNo":3,"hash":"<c>"}])");
     EXPECT_EQ(references(), server::references({"branch main c", "tag v1 c"}));
 }
@@ -89,7 +89,7 @@ TEST_F(ServerCommit, RefusesASecondBeginning)
 {
     send(commit('a', "", {}, {}));
     EXPECT_EQ(
-        send(commit('b', "", {}, {})),
+        send(commit('b', "", {"plan 1"}, {})),
         "error: The repository has commits already; one without a parent would not follow them. Merge what others "
         "have done, or send it as a branch of its own.");
 }
@@ -125,6 +125,50 @@ TEST_F(ServerCommit, RefusesToMakeABranchOfATagAlsoWhenForced)
     EXPECT_EQ(
         ask("force-commit <id>", commit('b', "a", {}, {"tag main b"})),
         "error: 'main' is the name of a branch already. Choose another name.");
+}
+
+TEST_F(ServerCommit, LeavesABranchThatItIsNotExpectedToFind)
+{
+    send(commit('a', "", {}, {"branch main a -"}));
+    EXPECT_EQ(
+        send(commit('b', "a", {}, {"branch main b -"})),
+        "error: There is a branch 'main' already. Choose another name.");
+    EXPECT_EQ(send(commit('b', "a", {}, {"branch main b a"})), R"([{"commitNo":2,"hash":"<b>"}])");
+    EXPECT_EQ(
+        send(commit('c', "b", {}, {"branch main c a"})),
+        "error: The branch 'main' names another commit by now. Fetch what others have done, and try again.");
+}
+
+TEST_F(ServerCommit, RefusesAHashThatDoesNotFollowFromWhatIsInIt)
+{
+    send(commit('0', "", {}, {}));
+    std::string const good = commit('a', "0", {"plan.dwg 1", "new.dwg 2 old.dwg"}, {});
+    for (auto const& [what, with] : std::vector<std::pair<std::string, std::string>>{
+             {"\"ann\"", "\"bob\""},
+             {"moves", "removes"},
+             {"plan.dwg", "roof.dwg"},
+             {"po:<1>", "po:<2>"},
+             {"old.dwg", "older.dwg"},
+             {"\"<0>\"", ""}}) {
+        std::string const document = replaced(good, what, with);
+        server::renameCommit('z', document);
+        EXPECT_EQ(
+            send(document), "error: 'commits[0].hash' is '<a>', but what is in the commit gives '<z>'. Nothing has "
+                            "changed on the server.")
+            << what;
+    }
+    EXPECT_EQ(send(good), R"([{"commitNo":2,"hash":"<a>"}])");
+}
+
+TEST_F(ServerCommit, HasTheHashThatTheProtocolDescribes)
+{
+    tav::CommitRecord commit;
+    commit.author = L"ann@studio";
+    commit.message = L"first";
+    commit.parents = {server::wideText(std::string(64, 'p'))};
+    std::vector<tav::FileRecord> const files = {{L"b.dwg", L"po:b", L"old.dwg"}, {L"a.dwg", L"po:a", OdString()}};
+    EXPECT_EQ(
+        tav::commitHash(commit, files).ansi_str(), "8f828f322f599dceffab1869022ac2166905b997cf84f7864e425a332f9779e2");
 }
 
 TEST_F(ServerCommit, RefusesAFileThatIsTheFolderOfAnotherWhateverStandsBetween)

@@ -4,6 +4,8 @@
 #include "tests/support/rows.h"
 #include "tests/support/utf8.h"
 
+#include "host/server/history_document.h"
+
 #include <gtest/gtest.h>
 
 namespace {
@@ -58,14 +60,19 @@ TEST_F(ServerDocuments, AreReadByTheLibrary)
 TEST_F(ServerDocuments, ThatTheLibraryWritesAreTaken)
 {
     CommitInfo info;
-    OdString const hash = server::wideText(std::string(64, 'c'));
+    tav::CommitRecord commit;
+    commit.author = L"ann@example.org";
+    commit.message = L"moves the stairs";
+    commit.parents = {server::wideText(server::hashNamed('b'))};
     OdString const url = server::wideText("tf:plan#" + std::string(64, '7'));
+    OdString const hash = tav::commitHash(commit, {{L"house/plan.dwg", url, L"new"}});
+    server::commitHashes()['c'] = hash.ansi_str();
     info.files.emplace_back(L"house/plan.dwg", url, std::make_unique<BaseFile>(L"new"));
     info.references.emplace_back(L"main", hash, EType::branch);
-    info.parents = {server::wideText(std::string(64, 'b'))};
+    info.parents = commit.parents;
     info.hash = hash;
-    info.author = L"ann@example.org";
-    info.message = L"moves the stairs";
+    info.author = commit.author;
+    info.message = commit.message;
     EXPECT_EQ(ask("commit <id>", server::pretty(serializeCommitInfo(info))), R"([{"commitNo":3,"hash":"<c>"}])");
 }
 
@@ -154,6 +161,8 @@ TEST_F(DocumentedProtocol, IsTheServers)
     EXPECT_EQ(id, "fetch 5f0c1d2e3b4a59687766554433221100");
     std::string const fetched = documented("## fetch", 1);
     EXPECT_EQ(ask("fetch <id>", documented("## fetch", 0)), server::replaced(fetched, id.substr(6), "<id>"));
+    EXPECT_EQ(ask("numbers <id>", R"([{"commitNo":1,"hash":""}])"), documented("## numbers", 0));
+    EXPECT_EQ(tav::readHistoryPage(server::wideText(server::expanded(documented("## history", 0)))).size(), 1u);
     EXPECT_EQ(init("bridge").size(), 32u);
     EXPECT_EQ(documented("## init", 0), R"({"name":"bridge"})");
     EXPECT_EQ(documented("## init", 1), R"({"id":"5f0c1d2e3b4a59687766554433221100"})");

@@ -102,6 +102,7 @@ TEST_F(ServerFetch, GivesTextsBackAsTheyWere)
     document = replaced(document, "old.dwg", path + "x");
     document = replaced(document, "\"ann\"", "\"\\uD83D\\uDE00\"");
     document = replaced(document, "moves the stairs", "one\\ntwo \\u202E");
+    server::renameCommit('a', document);
     send(replaced(document, "main", "\\uD83D\\uDE00"));
     std::string expected = answer({received(1, 'a', "", {"plan.dwg 1 old.dwg"})}, {"branch main a"});
     std::string const back = R"(\u041F\uD83D\uDE00 \"\uDCFF/\u00E9)";

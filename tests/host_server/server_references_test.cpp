@@ -6,6 +6,7 @@ namespace {
 
 using server::commit;
 using server::references;
+using server::replaced;
 
 class ServerReferences : public server::ServerTest {
 protected:
@@ -13,7 +14,7 @@ protected:
     {
         ask("commit <id>", commit('a', "", {}, {"branch main a", "tag v1 a"}));
         ask("commit <id>", commit('b', "a", {}, {}));
-        ask("commit <id>", commit('c', "a", {}, {}));
+        ask("commit <id>", commit('c', "a", {"plan 1"}, {}));
     }
 
     std::string move(std::string const& document) { return ask("references <id>", document); }
@@ -29,8 +30,27 @@ TEST_F(ServerReferences, AreListedInTheOrderOfTheirNames)
 TEST_F(ServerReferences, AreMadeAndMovedForward)
 {
     EXPECT_EQ(
-        move(references({"branch side c", "branch main b", "tag v2 b"})),
+        move(references({"branch side c", "branch main b a", "tag v2 b -"})),
         references({"branch main b", "branch side c", "tag v1 a", "tag v2 b"}));
+}
+
+TEST_F(ServerReferences, AreNotMovedByWhoDoesNotSayWhereTheyAre)
+{
+    EXPECT_EQ(move(references({"branch main b"})), "error: There is a branch 'main' already. Choose another name.");
+    EXPECT_EQ(move(references({"branch main b -"})), "error: There is a branch 'main' already. Choose another name.");
+    EXPECT_EQ(move(references({"tag v1 b"})), "error: There is a tag 'v1' already. Choose another name.");
+    EXPECT_EQ(move("[]"), references({"branch main a", "tag v1 a"}));
+}
+
+TEST_F(ServerReferences, MoveOnlyFromWhereTheyAreExpectedAlsoWhenForced)
+{
+    std::string const refusal =
+        "error: The branch 'main' names another commit by now. Fetch what others have done, and try again.";
+    EXPECT_EQ(move(references({"branch main b c"})), refusal);
+    EXPECT_EQ(force(references({"branch main b c"})), refusal);
+    EXPECT_EQ(move(references({"branch other b a"})), replaced(refusal, "main", "other"));
+    EXPECT_EQ(move(references({"branch main b a"})), references({"branch main b", "tag v1 a"}));
+    EXPECT_EQ(move(references({"branch main b a"})), references({"branch main b", "tag v1 a"})) << "repeated";
 }
 
 TEST_F(ServerReferences, MayStayWhereTheyAre)
@@ -41,7 +61,7 @@ TEST_F(ServerReferences, MayStayWhereTheyAre)
 TEST_F(ServerReferences, MoveAllOrNone)
 {
     EXPECT_EQ(
-        move(references({"branch main b", "tag v1 b"})),
+        move(references({"branch main b a", "tag v1 b a"})),
         "error: The tag 'v1' names another commit already. Choose another name.");
     EXPECT_EQ(move("[]"), references({"branch main a", "tag v1 a"}));
 }
@@ -51,9 +71,9 @@ TEST_F(ServerReferences, DoNotMoveBackOrAsideUnlessForced)
     std::string const refusal =
         "error: The branch 'main' has commits that the new one does not follow. Merge what others have done, or "
         "send it as a branch of its own.";
-    move(references({"branch main b"}));
-    EXPECT_EQ(move(references({"branch main a"})), refusal);
-    EXPECT_EQ(move(references({"branch main c"})), refusal);
+    move(references({"branch main b a"}));
+    EXPECT_EQ(move(references({"branch main a b"})), refusal);
+    EXPECT_EQ(move(references({"branch main c b"})), refusal);
     EXPECT_EQ(force(references({"branch main c", "tag v1 b"})), references({"branch main c", "tag v1 b"}));
     EXPECT_EQ(force(references({"branch main a"})), references({"branch main a", "tag v1 b"}));
 }
@@ -80,6 +100,9 @@ TEST_F(ServerReferences, AreCheckedLikeThoseOfACommit)
     EXPECT_EQ(
         move(references({"branch new b", "tag new b"})),
         "error: The document must not hold the name 'new' twice. Nothing has changed on the server.");
+    EXPECT_EQ(
+        move(R"([{"commitHash":"<b>","expected":"b","name":"new","refType":"tag"}])"),
+        "error: '[0].expected' must be a hash of 64 lower-case hexadecimal digits. Nothing has changed on the server.");
     EXPECT_EQ(move(""), "error: The document is no JSON. Nothing has changed on the server.");
 }
 

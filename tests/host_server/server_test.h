@@ -1,15 +1,21 @@
 /// A server in a temporary folder, driven through its documents alone.
 ///
-/// In the texts here "<a>" stands for a hash of 64 characters 'a', and "<id>" for the identifier of the repository.
+/// In the texts here "<a>" stands for the hash of the commit that `commit` has made last under the name 'a', for a hash
+/// of 64 characters 'a' where there is none and for contents ("po:<a>"), and "<id>" for the identifier of the
+/// repository.
 #pragma once
 
+#include "host/server/commit_document.h"
+#include "host/server/commit_hash.h"
 #include "host/server/embedded_server.h"
 
 #include "tests/support/temp_folder.h"
 
+#include <algorithm>
 #include <cctype>
 #include <cstddef>
 #include <gtest/gtest.h>
+#include <map>
 #include <sstream>
 #include <stdexcept>
 #include <string>
@@ -32,30 +38,45 @@ inline std::string replaced(std::string text, std::string const& what, std::stri
     return text.replace(place, what.size(), with);
 }
 
+/// Hashes of commits by their names in texts.
+inline std::map<char, std::string>& commitHashes()
+{
+    static std::map<char, std::string> hashes;
+    return hashes;
+}
+
+inline std::string hashNamed(char name)
+{
+    auto const known = commitHashes().find(name);
+    return known == commitHashes().end() ? std::string(64, name) : known->second;
+}
+
 /// Writes out what stands for hashes.
 inline std::string expanded(std::string const& text)
 {
     std::string result;
     for (std::size_t i = 0; i < text.size(); ++i) {
         bool const isHash = i + 2 < text.size() && text[i] == '<' && text[i + 2] == '>';
-        result += isHash ? std::string(64, text[i + 1]) : std::string(1, text[i]);
+        bool const isContent = isHash && i > 0 && (text[i - 1] == ':' || text[i - 1] == '#');
+        result += isContent ? std::string(64, text[i + 1]) : isHash ? hashNamed(text[i + 1]) : std::string(1, text[i]);
         i += isHash ? 2 : 0;
     }
     return result;
 }
 
 /// The way back.
-inline std::string shortened(std::string const& text)
+inline std::string shortened(std::string text)
 {
-    std::string result;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        char const c = text[i];
-        bool const isHash =
-            std::isxdigit(static_cast<unsigned char>(c)) != 0 && text.compare(i, 64, std::string(64, c)) == 0;
-        result += isHash ? std::string("<") + c + ">" : std::string(1, c);
-        i += isHash ? 63 : 0;
+    std::multimap<char, std::string> names(commitHashes().begin(), commitHashes().end());
+    for (char const name : std::string("0123456789abcdef")) {
+        names.emplace(name, std::string(64, name));
     }
-    return result;
+    for (auto const& [name, hash] : names) {
+        for (std::size_t place = text.find(hash); place != std::string::npos; place = text.find(hash)) {
+            text.replace(place, hash.size(), std::string("<") + name + ">");
+        }
+    }
+    return text;
 }
 
 inline std::string joined(std::vector<std::string> const& items)
@@ -67,15 +88,20 @@ inline std::string joined(std::vector<std::string> const& items)
     return "[" + text + "]";
 }
 
-/// References, each as "branch main a".
+/// References, each as "branch main a", or as "branch main a b" where it is expected to name b; "-" is none.
 inline std::string references(std::vector<std::string> const& lines)
 {
     std::vector<std::string> items;
     for (std::string const& line : lines) {
         std::istringstream words(line);
-        std::string type, name, hash;
-        words >> type >> name >> hash;
-        items.push_back(R"({"commitHash":"<)" + hash + R"(>","name":")" + name + R"(","refType":")" + type + R"("})");
+        std::string type, name, hash, expected;
+        words >> type >> name >> hash >> expected;
+        if (!expected.empty()) {
+            expected = R"("expected":")" + (expected == "-" ? "" : "<" + expected + ">") + R"(",)";
+        }
+        items.push_back(
+            R"({"commitHash":"<)" + hash + R"(>",)" + expected + R"("name":")" + name + R"(","refType":")" + type +
+            R"("})");
     }
     return joined(items);
 }
@@ -94,11 +120,36 @@ inline std::string files(std::vector<std::string> const& lines)
     return joined(items);
 }
 
-/// A commit-info document for the commit `hash` behind the commits `parents`, one character each.
+/// The file that `files` writes for one of its lines.
+inline tav::FileRecord fileRecord(std::string const& line)
+{
+    std::istringstream words(line);
+    std::string path, content, previous;
+    words >> path >> content >> previous;
+    previous = previous == path ? "" : previous; // No renaming.
+    return {wideText(path), wideText(expanded("po:<" + content + ">")), wideText(previous)};
+}
+
+inline std::string hashOf(std::string const& parents, std::vector<std::string> const& fileLines)
+{
+    tav::CommitRecord commit;
+    commit.author = L"ann";
+    commit.message = L"moves the stairs";
+    for (char const parent : parents) {
+        commit.parents.push_back(wideText(hashNamed(parent)));
+    }
+    std::vector<tav::FileRecord> files(fileLines.size());
+    std::transform(fileLines.begin(), fileLines.end(), files.begin(), fileRecord);
+    return tav::commitHash(commit, files).ansi_str();
+}
+
+/// A commit-info document for a commit behind the commits `parents`, one character each, that has the name `hash` in
+/// texts from now on.
 inline std::string commit(
     char hash, std::string const& parents, std::vector<std::string> const& fileLines,
     std::vector<std::string> const& referenceLines)
 {
+    commitHashes()[hash] = hashOf(parents, fileLines);
     std::vector<std::string> hashes;
     for (char const parent : parents) {
         hashes.push_back(std::string("\"<") + parent + ">\"");
@@ -109,9 +160,20 @@ inline std::string commit(
            R"("references":)" + references(referenceLines) + "}";
 }
 
+/// Lets `name` stand for the hash that a document with another content needs.
+inline void renameCommit(char name, std::string const& document)
+{
+    tav::NewCommit const changed = tav::readCommitInfo(wideText(expanded(document)));
+    commitHashes()[name] = tav::commitHash(changed.commit, changed.files).ansi_str();
+}
+
 class ServerTest : public testing::Test {
 protected:
-    ServerTest() { id_ = init("bridge"); } // Asking looks at the identifier already.
+    ServerTest()
+    {
+        commitHashes().clear();
+        id_ = init("bridge"); // Asking looks at the identifier already.
+    }
 
     /// The server's answer, or "error: " and its message.
     std::string ask(std::string const& verb, std::string const& document) { return ask(server_, verb, document); }

@@ -1,0 +1,377 @@
+// Servers that were moved, lost or put back, and a database that was lost: what is whole somewhere comes back.
+#include "host/database/sqlite.h"
+
+#include "tests/host/history_test.h"
+
+#include <gmock/gmock.h>
+
+#include <filesystem>
+
+namespace host_tests {
+namespace {
+
+namespace fs = std::filesystem;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::StartsWith;
+
+constexpr char const* kNothingToGc = "Removed 0 stored versions that no commit needs; 0 bytes freed.\n";
+
+/// Two commits, a tag and a branch of the repository "repository", with the server in "server".
+class ServerPlace : public testing::Test {
+protected:
+    ServerPlace()
+    {
+        place.makeFolder("repository");
+        EXPECT_EQ(tav({"init", "--server", server()}).code, 0);
+        commitFile("plan.dwg", "one", "first");
+        EXPECT_EQ(tav({"tag", "as built"}).code, 0);
+        EXPECT_EQ(tav({"mv", "plan.dwg", "roof.dwg"}).code, 0);
+        commitFile("note.txt", "text", "second");
+        EXPECT_EQ(tav({"branch", "side", "1"}).code, 0);
+    }
+
+    Outcome tav(Arguments const& arguments) const
+    {
+        Setting setting;
+        setting.folder = place.pathTo("repository");
+        return run(setting, arguments);
+    }
+
+    void commitFile(std::string const& name, std::string const& content, std::string const& message) const
+    {
+        place.write("repository/" + name, content);
+        EXPECT_EQ(tav({"add", "--all"}).code, 0);
+        EXPECT_EQ(tav({"commit", "-m", message, "--author", "ann@studio"}).code, 0);
+    }
+
+    void move(std::string const& from, std::string const& to) const
+    {
+        ASSERT_EQ(rename(place.pathTo(from).c_str(), place.pathTo(to).c_str()), 0);
+    }
+
+    /// Everything that is known of the history.
+    std::string history() const
+    {
+        return tav({"log", "--json"}).out + tav({"branch"}).out + tav({"tag"}).out + tav({"show", "2"}).out;
+    }
+
+    std::string hashes() const
+    {
+        tav::Database const database(place.pathTo("repository/.tav/tav.db"));
+        tav::Statement rows = database.prepare("SELECT number || ' ' || message FROM commits ORDER BY number");
+        std::string text;
+        while (rows.next()) {
+            text += rows.text(0).ansi_str() + "\n";
+        }
+        return text;
+    }
+
+    std::string server() const { return place.pathTo("server"); }
+
+    support::TempFolder const place;
+};
+
+TEST_F(ServerPlace, IsShown)
+{
+    EXPECT_THAT(tav({"server"}).out, StartsWith("The history is kept in '" + server() + "', as the repository "));
+    EXPECT_THAT(tav({"server"}).out, HasSubstr("\nIt has the commits that are known here, and no other.\n"));
+}
+
+TEST_F(ServerPlace, FollowsAMovedServer)
+{
+    move("server", "moved");
+    EXPECT_EQ(
+        tav({"fetch"}), failed(
+                            "tav: There is no server in '" + server() +
+                            "'. Bring it back; it may lie on a drive that is off. If it has a new place, run 'tav "
+                            "server FOLDER'.\n"));
+    EXPECT_EQ(tav({"server", "../moved"}), done("The history is kept in '" + place.pathTo("moved") + "' now.\n"));
+    commitFile("note.txt", "more", "third");
+    EXPECT_EQ(tav({"gc"}), done(kNothingToGc));
+    EXPECT_FALSE(place.has("server"));
+}
+
+TEST_F(ServerPlace, IsNoServerWithAnotherHistory)
+{
+    place.makeFolder("other");
+    Setting setting;
+    setting.folder = place.pathTo("other");
+    ASSERT_EQ(run(setting, {"init", "--server", place.pathTo("strange")}).code, 0);
+    Outcome const outcome = tav({"server", place.pathTo("strange")});
+    EXPECT_THAT(outcome.err, StartsWith("tav: The server has no repository "));
+    EXPECT_THAT(
+        outcome.err, HasSubstr(
+                         "The folder of the server is '" + place.pathTo("strange") +
+                         "'. Run 'tav server FOLDER' with the one that has it, or add --send to make it "
+                         "there.\n"));
+    EXPECT_THAT(tav({"server", place.pathTo("nowhere")}).err, StartsWith("tav: There is no server in "));
+    EXPECT_THAT(tav({"server", "https://tav.example.org"}).err, HasSubstr(" is a URL"));
+    EXPECT_THAT(tav({"server", "."}).err, HasSubstr("lies in the working folder"));
+    EXPECT_THAT(tav({"server"}).out, StartsWith("The history is kept in '" + server() + "'"));
+}
+
+class OlderServer : public ServerPlace {
+protected:
+    /// A server as it was after the second of four commits.
+    OlderServer()
+    {
+        std::string const old = place.read("server/server.db");
+        commitFile("note.txt", "three", "third");
+        commitFile("note.txt", "four", "fourth");
+        EXPECT_EQ(tav({"tag", "late"}).code, 0);
+        place.write("server/server.db", old);
+    }
+
+    std::string lacks() const { return "The server in '" + server() + "' lacks commits that are known here. "; }
+};
+
+constexpr char const* kSendThem =
+    "An older copy of it may have been put back: run 'tav server --send' to send them again.\n";
+
+TEST_F(OlderServer, IsNoticedBeforeAnythingHappens)
+{
+    place.write("repository/note.txt", "five");
+    ASSERT_EQ(tav({"add", "--all"}).code, 0);
+    EXPECT_EQ(tav({"commit", "-m", "fifth"}), failed("tav: " + lacks() + kSendThem));
+    EXPECT_EQ(tav({"fetch"}), failed("tav: " + lacks() + kSendThem));
+    EXPECT_EQ(
+        tav({"gc"}), (Outcome{
+                         0, kNothingToGc,
+                         "tav: Only leftovers are removed, as the server does not say what its commits need. " +
+                             lacks() + kSendThem}));
+    EXPECT_THAT(tav({"verify"}).err, StartsWith("tav: The server lacks 2 commits that are known here. An older copy"));
+    EXPECT_THAT(tav({"server"}).out, HasSubstr("\nIt lacks 2 commits that are known here. 'tav server --send' sends"));
+    EXPECT_THAT(tav({"status"}).out, HasSubstr("modified: note.txt"));
+}
+
+TEST_F(OlderServer, GetsWhatItLacks)
+{
+    std::string const before = history();
+    EXPECT_EQ(tav({"server", "--send"}), done("Sent 2 commits.\nThe history is kept in '" + server() + "' now.\n"));
+    EXPECT_EQ(history(), before);
+    EXPECT_EQ(tav({"fetch"}), done("Nothing is new on the server.\n"));
+    EXPECT_EQ(tav({"verify"}).code, 0);
+    commitFile("note.txt", "five", "fifth");
+    EXPECT_EQ(tav({"tag"}), done("  as built  (commit 1)\n  late  (commit 4)\n"));
+}
+
+TEST_F(OlderServer, GetsItUnderNewNumbersWhereOthersHaveCommitted)
+{
+    ASSERT_EQ(tav({"server"}).code, 0);
+    fs::copy(place.pathTo("repository"), place.pathTo("copy"), fs::copy_options::recursive);
+    tav::Database(place.pathTo("copy/.tav/tav.db"))
+        .run("PRAGMA foreign_keys = OFF; DELETE FROM refs WHERE number > 2; DELETE FROM changes WHERE number > 2;"
+             "DELETE FROM parents WHERE number > 2; DELETE FROM commits WHERE number > 2;"
+             "UPDATE settings SET value = (SELECT hash FROM commits WHERE number = 1) WHERE key = 'base'");
+    Setting setting;
+    setting.folder = place.pathTo("copy");
+    ASSERT_EQ(run(setting, {"fetch"}).code, 0);
+    ASSERT_EQ(run(setting, {"switch", "side", "--force"}).code, 0);
+    place.write("copy/side.txt", "text");
+    ASSERT_EQ(run(setting, {"add", "side.txt"}).code, 0);
+    ASSERT_EQ(run(setting, {"commit", "-m", "aside"}).code, 0);
+    EXPECT_EQ(tav({"fetch"}), failed("tav: " + lacks() + kSendThem));
+    EXPECT_EQ(tav({"server", "--send"}).code, 0);
+    EXPECT_EQ(hashes(), "1 first\n2 second\n3 aside\n4 third\n5 fourth\n");
+    EXPECT_EQ(tav({"branch"}), done("* master  (commit 5)\n  side  (commit 3)\n"));
+    EXPECT_EQ(tav({"tag"}), done("  as built  (commit 1)\n  late  (commit 5)\n"));
+    EXPECT_THAT(tav({"status"}).out, HasSubstr("Nothing has changed since the last commit."));
+    EXPECT_EQ(tav({"checkout", "4"}).code, 0);
+    EXPECT_EQ(place.read("repository/note.txt"), "three");
+    EXPECT_EQ(run(setting, {"fetch"}).code, 0);
+}
+
+class NoRepository : public ServerPlace {
+protected:
+    NoRepository()
+    {
+        tav::Database(place.pathTo("server/server.db"))
+            .run("DELETE FROM refs; DELETE FROM changes; DELETE FROM parents; DELETE FROM commits;"
+                 "DELETE FROM repositories;");
+    }
+};
+
+TEST_F(NoRepository, LetsEverythingGoOnThatNeedsNoServer)
+{
+    EXPECT_EQ(tav({"status"}).code, 0);
+    EXPECT_EQ(tav({"log"}).code, 0);
+    EXPECT_EQ(tav({"switch", "side"}).code, 0);
+    EXPECT_EQ(place.read("repository/plan.dwg"), "one");
+    place.write("repository/.tav/restoring/0", "left");
+    Outcome const cleaned = tav({"gc"});
+    EXPECT_EQ(cleaned.out, "Removed 0 stored versions that no commit needs; 4 bytes freed.\n");
+    EXPECT_THAT(
+        cleaned.err, StartsWith("tav: Only leftovers are removed, as the server does not say what its "
+                                "commits need. The server has no repository '"));
+    Outcome const verified = tav({"verify"});
+    EXPECT_EQ(verified.code, 0);
+    EXPECT_THAT(verified.err, StartsWith("tav: The history could not be compared with the server's. "));
+}
+
+TEST_F(NoRepository, IsMadeAgainFromWhatIsKnown)
+{
+    std::string const before = history();
+    EXPECT_EQ(tav({"server", "--send"}), done("Sent 2 commits.\nThe history is kept in '" + server() + "' now.\n"));
+    EXPECT_EQ(history(), before);
+    commitFile("note.txt", "more", "third");
+    EXPECT_EQ(tav({"verify"}).code, 0);
+}
+
+TEST_F(ServerPlace, IsMadeAnewWhereTheServerIsLost)
+{
+    std::string const before = history();
+    fs::remove_all(server());
+    EXPECT_THAT(tav({"server", "--send"}).err, StartsWith("tav: There is no server in "));
+    EXPECT_FALSE(place.has("server"));
+    EXPECT_EQ(
+        tav({"server", place.pathTo("new"), "--send"}),
+        done("Sent 2 commits.\nThe history is kept in '" + place.pathTo("new") + "' now.\n"));
+    EXPECT_EQ(history(), before);
+    commitFile("note.txt", "more", "third");
+    EXPECT_EQ(tav({"gc"}), done(kNothingToGc));
+}
+
+/// A commit whose note was written before the server went away.
+class WaitingCommit : public ServerPlace {
+protected:
+    WaitingCommit()
+    {
+        std::string const old = place.read("server/server.db");
+        place.write("repository/note.txt", "three");
+        EXPECT_EQ(tav({"add", "--all"}).code, 0);
+        std::string const state = place.read("repository/.tav/tav.state");
+        std::string const database = place.read("repository/.tav/tav.db");
+        EXPECT_EQ(tav({"commit", "-m", "third", "--author", "ann@studio"}).code, 0);
+        std::string const document = documentOfLastCommit();
+        place.write("server/server.db", old);
+        place.write("repository/.tav/tav.db", database);
+        place.write("repository/.tav/tav.state", state);
+        tav::Database local(place.pathTo("repository/.tav/tav.db"));
+        tav::Statement row = local.prepare("INSERT OR REPLACE INTO settings VALUES ('unfinished', ?)");
+        row.with(OdString(document.c_str(), CP_UTF_8)).run();
+    }
+
+private:
+    /// The note as the commit wrote it: the server keeps all that is in its document.
+    std::string documentOfLastCommit() const
+    {
+        tav::Database const database(place.pathTo("repository/.tav/tav.db"));
+        auto const one = [&](char const* statement) {
+            tav::Statement row = database.prepare(statement);
+            return row.next() ? row.text(0).ansi_str() : std::string();
+        };
+        std::string files;
+        tav::Statement rows = database.prepare("SELECT path, url FROM changes WHERE number = 3");
+        std::string const roof = one("SELECT url FROM changes WHERE path = 'roof.dwg'");
+        std::string const ignore = one("SELECT url FROM changes WHERE path = '.tav/properties/ignore'");
+        std::string const note = one("SELECT url FROM changes WHERE number = 3");
+        for (auto const& [path, url] : std::vector<std::pair<std::string, std::string>>{
+                 {".tav/properties/ignore", ignore}, {"note.txt", note}, {"roof.dwg", roof}}) {
+            files +=
+                (files.empty() ? "" : ",") + (R"({\"path\":\")" + path + R"(\",\"storagePath\":\")") + url + R"(\"})";
+        }
+        std::string const hash = one("SELECT hash FROM commits WHERE number = 3");
+        std::string const parent = one("SELECT hash FROM commits WHERE number = 2");
+        return R"({"contents":[],"files":[],"document":"{\"commits\":[{\"annotation\":{\"author\":\"ann@studio\",)"
+               R"(\"date\":\"2024-03-05T14:07:09Z\",\"message\":\"third\"},\"files\":[)" +
+               files + R"(],\"hash\":\")" + hash + R"(\",\"parentsHashes\":[\")" + parent +
+               R"(\"]}],\"references\":[{\"commitHash\":\")" + hash +
+               R"(\",\"name\":\"master\",\"refType\":\"branch\"}]}"})";
+    }
+};
+
+TEST_F(WaitingCommit, IsSentWhenTheServerIsFoundAgain)
+{
+    move("server", "moved");
+    EXPECT_EQ(
+        tav({"log"}).err, "tav: A commit was interrupted. The next command that changes something completes it.\n");
+    EXPECT_THAT(tav({"switch", "side"}).err, HasSubstr("run 'tav server FOLDER'"));
+    EXPECT_EQ(tav({"server", place.pathTo("moved")}).code, 0);
+    EXPECT_EQ(tav({"commit", "-m", "third", "--author", "ann@studio"}).out.substr(0, 18), "Completed commit 3");
+    EXPECT_EQ(tav({"log"}).err, "");
+}
+
+TEST_F(WaitingCommit, IsTakenBackWhereTheServerHasNoSuchRepository)
+{
+    tav::Database(place.pathTo("server/server.db"))
+        .run("DELETE FROM refs; DELETE FROM changes; DELETE FROM parents; DELETE FROM commits;"
+             "DELETE FROM repositories;");
+    EXPECT_THAT(tav({"switch", "side"}).err, HasSubstr("What was to be committed is staged as before."));
+    EXPECT_EQ(tav({"log"}).err, "");
+    EXPECT_THAT(tav({"status"}).out, HasSubstr("modified: note.txt"));
+    EXPECT_EQ(tav({"server", "--send"}).code, 0);
+    EXPECT_EQ(tav({"commit", "-m", "third", "--author", "ann@studio"}).out.substr(0, 13), "Made commit 3");
+}
+
+class LostDatabase : public ServerPlace {
+protected:
+    void loseDatabase() const { fs::remove(place.pathTo("repository/.tav/tav.db")); }
+};
+
+TEST_F(LostDatabase, IsMadeAgainFromTheServer)
+{
+    std::string const before = history();
+    loseDatabase();
+    EXPECT_EQ(
+        tav({"status"}), failed(
+                             "tav: The database '" + place.pathTo("repository/.tav/tav.db") +
+                             "' is missing or empty, though versions are stored here. Run 'tav init' to make it "
+                             "again from the server.\n"));
+    EXPECT_EQ(
+        tav({"init", "--server", server()}),
+        done("Made the database again from the server, with 2 commits. The folder is taken to stand on commit 2; see "
+             "'tav status'.\n"
+             "The repository in '.' was there already; it is complete.\n"));
+    EXPECT_EQ(history(), before);
+    EXPECT_THAT(tav({"status"}).out, HasSubstr("Nothing has changed since the last commit."));
+    EXPECT_EQ(tav({"gc"}), done(kNothingToGc));
+    EXPECT_EQ(tav({"verify"}), done("Read 3 stored versions; nothing is damaged.\n"));
+    commitFile("note.txt", "more", "third");
+    EXPECT_FALSE(place.has("repository/.tav/tav.db.new"));
+}
+
+TEST_F(LostDatabase, IsThatOfTheRepositoryWhoseVersionsAreHere)
+{
+    place.makeFolder("other");
+    place.write("other/note.txt", "text");
+    Setting setting;
+    setting.folder = place.pathTo("other");
+    ASSERT_EQ(run(setting, {"init", "--server", server()}).code, 0);
+    ASSERT_EQ(run(setting, {"add", "--all"}).code, 0);
+    ASSERT_EQ(run(setting, {"commit", "-m", "another"}).code, 0);
+    std::string const before = history();
+    loseDatabase();
+    EXPECT_EQ(tav({"init", "--server", server()}).code, 0);
+    EXPECT_EQ(history(), before);
+}
+
+TEST_F(LostDatabase, IsNotTakenFromAServerThatHasNothingOfIt)
+{
+    place.makeFolder("other");
+    Setting setting;
+    setting.folder = place.pathTo("other");
+    ASSERT_EQ(run(setting, {"init", "--server", place.pathTo("strange")}).code, 0);
+    loseDatabase();
+    EXPECT_EQ(
+        tav({"init", "--server", place.pathTo("strange")}),
+        failed(
+            "tav: The server in '" + place.pathTo("strange") +
+            "' has no repository to which the versions here belong. Name the folder of the right one with "
+            "--server.\n"));
+    EXPECT_FALSE(place.has("repository/.tav/tav.db"));
+}
+
+TEST_F(LostDatabase, IsMadeAgainAfterAnInterruption)
+{
+    std::string const before = history();
+    loseDatabase();
+    place.write("repository/.tav/tav.db.new", "left of a killed command");
+    place.write("repository/.tav/tav.db-journal", "of the lost one");
+    EXPECT_EQ(tav({"init", "--server", server()}).code, 0);
+    EXPECT_EQ(history(), before);
+    EXPECT_FALSE(place.has("repository/.tav/tav.db-journal"));
+}
+
+} // namespace
+} // namespace host_tests
