@@ -28,8 +28,7 @@ Presence presenceBehind(os::Handle const& folder, std::string const& name)
 {
     Presence const presence = presenceAfterError();
     struct stat entry;
-    bool const isLink =
-        fstatat(folder.get(), name.c_str(), &entry, AT_SYMLINK_NOFOLLOW) == 0 && S_ISLNK(entry.st_mode);
+    bool const isLink = fstatat(folder.get(), name.c_str(), &entry, AT_SYMLINK_NOFOLLOW) == 0 && S_ISLNK(entry.st_mode);
     return isLink ? Presence::isBehindLink : presence;
 }
 

@@ -33,7 +33,8 @@ protected:
     {
         auto const file = committed_.find(support::fromUtf8(name));
         std::string const url = file == committed_.end() ? std::string() : file->second.ansi_str();
-        known_.push_back({name, std::string(tav::digestIn(url)), *tav::FolderView(repo.root()).look(support::fromUtf8(name)).stamp});
+        known_.push_back(
+            {name, std::string(tav::digestIn(url)), *tav::FolderView(repo.root()).look(support::fromUtf8(name)).stamp});
     }
 
     tav::FolderChanges compare() const
