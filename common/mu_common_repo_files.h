@@ -135,9 +135,8 @@ struct MU_COMMON_EXPORT Versions<VersionedFile, std::shared_ptr<File>> {
 };
 
 /// Appends the line "<local time> - <text>" to the log file of `root`, in UTF-8, creating the file if need be.
-/// False when the file cannot be opened or something else than a regular file has its place, without waiting for it;
-/// errors of writing are not detected. Any thread may call it, but lines that are
-/// written at the same moment may mix.
+/// False when the file cannot be opened or is not a regular file, without waiting for it; errors of writing are not
+/// detected. Any thread may call it, but lines that are written at the same moment may mix.
 MU_COMMON_EXPORT bool logString(OdString const& text, RootPath const& root);
 
 /// Whether the working file `relativePath` of `root` differs from the recorded `hash`: a prefix of three characters
