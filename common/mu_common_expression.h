@@ -23,7 +23,7 @@ struct Expression {
     static constexpr std::size_t kEndless = ~std::size_t{0};
 
     Kind kind = Kind::sequence;
-    std::string_view text{};         ///< of characters, as they are written
+    std::string_view text{};         ///< of characters and assertions, as they are written
     std::vector<Expression> parts{}; ///< a group, look-ahead or repetition has one
     std::size_t number = 0;          ///< of a group that is captured, or of the one referred to; counted from 1
     std::size_t least = 1;           ///< of a repetition

@@ -3,6 +3,7 @@
 #include "common/mu_common_expression_ways.h"
 
 #include <algorithm>
+#include <string_view>
 
 namespace common {
 
@@ -18,7 +19,10 @@ constexpr double kMostStates = kMostParts;
 // A step takes up to 40 ns: the worst expressions take half a second for a name that is made for them. Those that users
 // write stay far below: a list of 250 names, or a word that comes twice, is compiled and matched in a millisecond.
 constexpr double kMostSteps = 1 << 24;
-constexpr double kStepsToStartALookAhead = 4;
+// Compiling a class asks the locale about each of 256 characters: 0.13 ms.
+constexpr double kStepsOfAClass = 1 << 12;
+// Of a look-ahead: the marks of that many states are cleared for each character.
+constexpr double kStatesOfAStep = 1024;
 constexpr double kUnbounded = 1e9; // Keeps products finite.
 
 double capped(double value)
@@ -29,11 +33,15 @@ double capped(double value)
 /// Positions in a text of `length` characters where something may begin.
 struct Positions {
     double length;
+    double states = 0; ///< of the whole automaton
     double first = 0;
     double last = 0;
 
     double count() const { return std::min(last, length) - std::min(first, length) + 1; }
-    Positions behind(double shortest, double longest) const { return {length, first + shortest, last + longest}; }
+    Positions behind(double shortest, double longest) const
+    {
+        return {length, states, first + shortest, last + longest};
+    }
 };
 
 struct Cost {
@@ -46,6 +54,7 @@ struct Cost {
     double longest = 0;
     double steps = 0; ///< to match at once
     double pairs = 0; ///< of alternatives
+    double classes = 0;
 };
 
 Cost costOf(Expression const& expression, Positions at);
@@ -58,6 +67,7 @@ void addPart(Cost& cost, Cost const& part)
     cost.perCharacter = std::max(cost.perCharacter, part.perCharacter);
     cost.steps += part.steps;
     cost.pairs += part.pairs;
+    cost.classes += part.classes;
 }
 
 Cost costOfSequence(Expression const& expression, Positions at)
@@ -105,13 +115,14 @@ Cost costOfGroup(Expression const& expression, Positions at)
 
 Cost costOfLookAhead(Expression const& expression, Positions at)
 {
-    Cost cost = costOf(expression.parts.front(), {at.length});
+    Cost cost = costOf(expression.parts.front(), {at.length, at.states});
+    double const characters = std::min(cost.longest, at.length);
     cost.states += 2;
     cost.aheadLevels += cost.emptyStates + kLevelsOfAGroup;
     cost.emptyStates = 1;
     cost.levels += kLevelsOfAGroup;
     cost.shortest = cost.longest = 0;
-    cost.steps = at.count() * (kStepsToStartALookAhead + cost.steps);
+    cost.steps = at.count() * (stepsToLookAhead(at.states) + characters * at.states / kStatesOfAStep + cost.steps);
     return cost;
 }
 
@@ -138,6 +149,13 @@ Cost costOfRepetition(Expression const& expression, Positions at)
     return cost;
 }
 
+/// A class that is repeated is compiled once.
+bool isClass(std::string_view text)
+{
+    constexpr std::string_view kNamed = "dDsSwW";
+    return text.front() == '[' || (text.size() == 2 && kNamed.find(text[1]) != kNamed.npos);
+}
+
 Cost costOf(Expression const& expression, Positions at)
 {
     switch (expression.kind) {
@@ -154,7 +172,8 @@ Cost costOf(Expression const& expression, Positions at)
     cost.emptyStates = isCharacter ? 0 : 1;
     cost.shortest = isCharacter ? 1 : 0;
     cost.longest = expression.kind == Kind::backReference ? kUnbounded : cost.shortest;
-    cost.steps = at.count();
+    cost.steps = at.count() * stepsOfALook(expression);
+    cost.classes = isCharacter && isClass(expression.text) ? 1 : 0;
     return cost;
 }
 
@@ -170,12 +189,14 @@ void refuseUnless(bool isWithinBounds)
 void checkCompiling(Expression const& expression)
 {
     Cost const cost = costOf(expression, {0});
-    refuseUnless(cost.levels <= kMostLevels && cost.states <= kMostStates && cost.pairs <= kMostSteps);
+    refuseUnless(cost.levels <= kMostLevels && cost.states <= kMostStates);
+    refuseUnless(cost.pairs + cost.classes * kStepsOfAClass <= kMostSteps);
 }
 
 void checkMatchingAtOnce(Expression const& expression, std::size_t longestText)
 {
-    Cost const cost = costOf(expression, {static_cast<double>(longestText)});
+    double const states = costOf(expression, {0}).states;
+    Cost const cost = costOf(expression, {static_cast<double>(longestText), states});
     refuseUnless(cost.emptyStates + cost.aheadLevels <= kMostLevels && cost.steps <= kMostSteps);
 }
 
@@ -183,7 +204,7 @@ void checkMatchingWayByWay(Expression const& expression, std::size_t longestText
 {
     Cost const cost = costOf(expression, {0});
     refuseUnless(cost.perCharacter * kLongestText + cost.emptyStates + cost.aheadLevels <= kMostLevels);
-    refuseUnless(stepsWayByWay(expression, longestText) <= kMostSteps);
+    refuseUnless(stepsWayByWay(expression, longestText, cost.states) <= kMostSteps);
 }
 
 } // namespace common

@@ -16,7 +16,8 @@ constexpr std::size_t kLongestText = 1024;
 // the levels of recursion that it may take, in the states of its automaton, and in steps. A step is one look at one
 // state of the automaton for one character of the text.
 
-/// Compiling: its recursion, its memory, and its time, which is quadratic in the number of alternatives.
+/// Compiling: its recursion, its memory, and its time, which is quadratic in the number of alternatives and long for
+/// classes.
 void checkCompiling(Expression const& expression);
 
 /// Matching a text of up to `longestText` characters in all ways at once, without back references: each state is looked

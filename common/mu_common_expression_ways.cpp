@@ -25,8 +25,14 @@ Set everything()
     return Set().set();
 }
 
+// Comparing one takes up to 0.3 ms.
+constexpr std::size_t kMostClasses = 1024;
+
 Set charactersOf(std::string_view text)
 {
+    if (text.size() == 1 && text != ".") {
+        return Set().set(static_cast<unsigned char>(text.front()));
+    }
     std::regex single;
     single.imbue(std::locale::classic());
     single.assign(text.begin(), text.end());
@@ -103,6 +109,9 @@ private:
     Set const& charactersIn(std::string_view text)
     {
         auto const [set, isNew] = sets_.try_emplace(text);
+        if (sets_.size() > kEnd + kMostClasses) {
+            refuseExpression();
+        }
         if (isNew) {
             set->second = charactersOf(text);
         }
@@ -118,9 +127,10 @@ private:
 /// come there, and a way is known by the positions at which its undecided loops were left, in ascending order.
 class Ways {
 public:
-    Ways(Expression const& expression, std::size_t longestText)
+    Ways(Expression const& expression, std::size_t longestText, double states)
         : beginnings_(expression)
         , length_(static_cast<double>(longestText))
+        , stepsToLookAhead_(stepsToLookAhead(states))
     {
         walk(expression, Set().set(kEnd));
     }
@@ -136,7 +146,7 @@ private:
         case Kind::repetition: return walkRepetition(expression, next);
         case Kind::lookAhead: return walkLookAhead(expression);
         case Kind::group: walk(expression.parts.front(), next); [[fallthrough]];
-        default: steps_ += ways();
+        default: steps_ += ways() * stepsOfALook(expression);
         }
     }
 
@@ -209,7 +219,7 @@ private:
     {
         State const before = state_;
         state_ = {before.left + before.running, 0, false};
-        steps_ += ways();
+        steps_ += ways() * stepsToLookAhead_;
         walk(expression.parts.front(), everything());
         state_ = before;
     }
@@ -234,6 +244,7 @@ private:
 
     Beginnings const beginnings_;
     double const length_;
+    double const stepsToLookAhead_;
     double steps_ = 0;
     double choices_ = 1; // ways by alternatives and options
     State state_;
@@ -241,9 +252,22 @@ private:
 
 } // namespace
 
-double stepsWayByWay(Expression const& expression, std::size_t longestText)
+// Measured with libstdc++ 12, as all figures here: `\b` takes 0.5 us.
+double stepsOfALook(Expression const& expression)
 {
-    return Ways(expression, longestText).steps();
+    bool const isWordBoundary = expression.kind == Kind::assertion && expression.text.size() == 2;
+    return isWordBoundary ? 16 : 1;
+}
+
+// 0.5 us, and 10 us for 10,000 states.
+double stepsToLookAhead(double states)
+{
+    return 16 + states / 32;
+}
+
+double stepsWayByWay(Expression const& expression, std::size_t longestText, double states)
+{
+    return Ways(expression, longestText, states).steps();
 }
 
 } // namespace common

@@ -73,11 +73,12 @@ class MU_COMMON_EXPORT RepoIgnore {
 public:
     /// Loads the rules of `root`. Throws `std::regex_error` for a line that is not a valid expression, and for one that
     /// could exhaust the stack or take more than about a second for one file name, however unlikely that name is.
-    /// Refused are: groups nested deeper than 100; more than about 8,000 characters in a row, 4,000 alternatives or
-    /// 16,000 characters in all, with counted repetitions written out; repeated look-aheads that repeat much
-    /// themselves; and with a back reference, loops in loops that can divide a text in several ways, as in `(a*)*`, or
-    /// more than three loops like `.*` whose end the next character does not decide.
-    /// Throws `OdError`, naming the file, when the ignore file is there but cannot be read.
+    /// Refused are: groups nested deeper than 100; more than about 8,000 characters in a row, 4,000 alternatives, 4,000
+    /// classes like `[a-z]` or 16,000 characters in all, with counted repetitions written out, but for classes;
+    /// thousands of `\b` behind a loop; repeated look-aheads that repeat much themselves or are many; and with a back
+    /// reference, loops in loops that can divide a text in several ways, as in `(a*)*`, or more than two loops like
+    /// `.*` whose end the next character does not decide (three in a very short expression). Throws `OdError`, naming
+    /// the file, when the ignore file is there but cannot be read.
     explicit RepoIgnore(RootPath const& root);
 
     /// Appends the rules once more. Throws as the constructor does.

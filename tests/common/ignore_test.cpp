@@ -15,6 +15,7 @@
 #include <regex>
 #include <set>
 #include <string>
+#include <string_view>
 #include <sys/stat.h>
 #include <vector>
 
@@ -508,6 +509,40 @@ INSTANTIATE_TEST_SUITE_P(
         Hostile{"BesideALookAheadBehindALoop", "(a)\\1.*.*.*(?=.*x)y", "aa" + std::string(250, 'b'), "refused"},
         Hostile{"EscapedBackslashIsNone", "(a*)*\\\\1", "a\\1", "match"}),
     support::rowName);
+
+// From U+0400, Cyrillic and others.
+std::string alternativesByNumber(std::size_t count)
+{
+    constexpr std::string_view kDigits = "0123456789abcdef";
+    std::string text;
+    for (std::size_t code = 0x400; code < 0x400 + count; ++code) {
+        text += code > 0x400 ? "|\\u0" : "\\u0";
+        for (unsigned const shift : {8U, 4U, 0U}) {
+            text += kDigits[code >> shift & 15U];
+        }
+    }
+    return text;
+}
+
+// Few steps, but each takes far longer than most, or compiling does.
+INSTANTIATE_TEST_SUITE_P(
+    LongSteps, HostileRule,
+    testing::Values(
+        Hostile{"LookAheadsInALargeRule", "(.*" + repeated("(?!b)", 800) + ")|x{8000}", kLong, "refused"},
+        Hostile{"LongLookAheadsInALargeRule", "(.*" + repeated("(?=.*)", 100) + ")|x{8000}", kLong, "refused"},
+        Hostile{"LookAheadsBesideABackReference", "(a*)(a*)" + repeated("(?!\\1b)", 80) + "c", kLong, "refused"},
+        Hostile{
+            "LookAheadsInALargeRuleWithABackReference", "(a*)(" + repeated("(?!b)", 400) + "|x{8000})\\1b", kLong,
+            "refused"},
+        Hostile{"WordBoundaries", ".*" + repeated("\\B", 7000) + "b", kLong, "refused"},
+        Hostile{"WordBoundariesBesideABackReference", "(a*)(a*)" + repeated("\\B", 400) + "\\1b", kLong, "refused"},
+        Hostile{"WordsThatFit", ".*\\bplan\\b.*", "a plan b", "match"},
+        Hostile{"Classes", repeated("[b]", 8000), kLong, "refused"},
+        Hostile{"NamedClasses", repeated("\\d", 8000), kLong, "refused"},
+        Hostile{"ClassesThatFit", repeated("[b]", 400) + "\\w{4000}", kLong, "no match"},
+        Hostile{
+            "CharactersByNumberBesideABackReference", "(a|" + alternativesByNumber(1500) + ")\\1", kLong, "refused"}),
+    [](auto const& row) { return row.param.name; });
 
 // These need more than a small stack, but no more than a thread has by itself.
 TEST(LargeRule, IsAnsweredUpToItsLimit)

@@ -217,7 +217,7 @@ TEST(StepsWayByWay, AreNeverMoreThanForeseen)
         }
         ++accepted;
         std::regex const compiled = common::compilePattern(support::fromUtf8(expression), kLength);
-        double const foreseen = common::stepsWayByWay(common::readExpression(expression), kLength);
+        double const foreseen = common::stepsWayByWay(common::readExpression(expression), kLength, 0);
         for (std::string const& text : texts) {
             ASSERT_LE(looksOfMatching(text, compiled), foreseen * kLength) << expression << " on " << text;
         }
