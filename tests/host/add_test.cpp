@@ -308,7 +308,9 @@ TEST_F(Add, FollowsNoLinksToFolders)
     repo.add({"a/b.dwg"});
     repo.makeLink("link", "a");
     EXPECT_EQ(tav({"add", "link"}), unknown("link"));
-    EXPECT_EQ(tav({"add", "link/b.dwg"}), unknown("link/b.dwg"));
+    EXPECT_EQ(
+        tav({"add", "link/b.dwg"}), failed("tav: 'link/b.dwg' is behind a link to a folder, which tav does not enter. "
+                                           "Put the folder itself in the place of the link.\n"));
 }
 
 TEST_F(Add, CountsBothOfTwoCommandsAtTheSameTime)

@@ -13,11 +13,11 @@ class HistoryTest : public TavTest {
 protected:
     HistoryTest() { EXPECT_EQ(tav({"init"}).code, 0); }
 
-    /// Stages everything and commits it.
+    /// Stages everything and commits it, with all removals.
     Outcome commitAll(std::string const& message) const
     {
         EXPECT_EQ(tav({"add", "--all"}).code, 0);
-        return tav({"commit", "-m", message, "--author", "ann@studio"});
+        return tav({"commit", "-m", message, "--author", "ann@studio", "--all-removed"});
     }
 
     /// What status shows below the line of the branch.

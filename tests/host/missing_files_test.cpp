@@ -164,7 +164,7 @@ TEST_F(MissingFiles, AreEitherRemovedOrKept)
 {
     EXPECT_EQ(
         commit({"--all-removed", "--without-removed"}),
-        misused("tav: --without-removed excludes --all-removed. Run 'tav commit --help' for more information.\n"));
+        misused("tav: --all-removed excludes --without-removed. Run 'tav commit --help' to see how it is used.\n"));
 }
 
 } // namespace

@@ -156,7 +156,7 @@ Scene::Scene(std::function<void(Scene const&)> const& prepare)
     fs::remove_all(folder() + "/old");
     write("new/fresh.dwg", drawing(3));
     require(tav({"add", "--all"}).code == 0, "stage");
-    require(tav({"commit", "-m", "second", "--author", "ann@studio"}).code == 0, "commit");
+    require(tav({"commit", "-m", "second", "--author", "ann@studio", "--all-removed"}).code == 0, "commit");
     prepare(*this);
     copyTree(place_.pathTo("now"), place_.pathTo("first"));
 }
@@ -328,7 +328,7 @@ void storeWhatNobodyNeeds(Scene const& scene)
 std::vector<SceneRow> const& sceneRows()
 {
     static std::vector<SceneRow> const rows = {
-        {"Commit", {"commit", "-m", "third", "--author", "ann@studio"}, changeFiles},
+        {"Commit", {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"}, changeFiles},
         {"Restore", {"restore", "plan.dwg", "note.txt", "old/gone.dwg", "--from", "1"}, [](Scene const&) {}},
         {"Checkout", {"checkout", "1"}, stageWhatIsWanted},
         {"Gc", {"gc"}, storeWhatNobodyNeeds}};
