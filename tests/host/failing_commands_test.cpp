@@ -56,7 +56,9 @@ protected:
         if (outcome.code != 0) {
             return faultOfFailure(outcome);
         }
-        return !outcome.err.empty() ? "it complains" : scene_.situation() == after_ ? "" : "not everything is done";
+        return !outcome.err.empty()           ? "it complains"
+               : scene_.situation() == after_ ? ""
+                                              : ("not everything is done" + difference(after_, scene_.situation()));
     }
 
     SceneRow const command_ = std::get<0>(GetParam());

@@ -228,6 +228,9 @@ std::string Scene::situation() const
                 std::to_string(std::hash<std::string>()(content)) + "\n";
     }
     for (std::string const& name : place_.list()) {
+        if (name == "now/repository/.tav/restoring/clock") { // A probe; the next command removes what is left there.
+            continue;
+        }
         bool const isInside = name.rfind("now/repository/.tav/", 0) == 0 || name.rfind("now/server/", 0) == 0;
         text += isInside ? name + "\n" : "";
     }
