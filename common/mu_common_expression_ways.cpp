@@ -225,7 +225,11 @@ private:
     }
 
     /// A choice that the next character does not decide.
-    void choose(double ways) { choices_ *= state_.isRepeated ? std::numeric_limits<double>::infinity() : ways; }
+    void choose(double ways)
+    {
+        double const repeated = std::numeric_limits<double>::infinity();
+        choices_ = state_.isRepeated ? repeated : choices_ * ways;
+    }
 
     double ways() const
     {

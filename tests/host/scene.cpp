@@ -227,18 +227,21 @@ std::string Scene::situation() const
         text += path + ": " + std::to_string(content.size()) + " bytes " +
                 std::to_string(std::hash<std::string>()(content)) + "\n";
     }
+    // Read before the names are listed: it takes back what was left of an interrupted change.
+    tav::Database const server(place_.pathTo("now/server/server.db"));
+    tav::Database const local(folder() + "/.tav/tav.db");
+    std::string const rows = "\nserver:\n" + commitsIn(server) + "local:\n" + commitsIn(local) +
+                             rowsOf(local, "settings", "key || ' ' || value") +
+                             rowsOf(local, "contents", "url || ' ' || digest || ' ' || size") + falseRecords(root());
     for (std::string const& name : place_.list()) {
-        if (name == "now/repository/.tav/restoring/clock") { // A probe; the next command removes what is left there.
+        // What the next command removes or uses again: a probe of the clock, and a journal of SQLite that has ended.
+        if (name == "now/repository/.tav/restoring/clock" || name == "now/repository/.tav/tav.db-journal") {
             continue;
         }
         bool const isInside = name.rfind("now/repository/.tav/", 0) == 0 || name.rfind("now/server/", 0) == 0;
         text += isInside ? name + "\n" : "";
     }
-    tav::Database const server(place_.pathTo("now/server/server.db"));
-    tav::Database const local(folder() + "/.tav/tav.db");
-    return text + withoutTimes(place_.read("now/repository/.tav/tav.state")) + "\nserver:\n" + commitsIn(server) +
-           "local:\n" + commitsIn(local) + rowsOf(local, "settings", "key || ' ' || value") +
-           rowsOf(local, "contents", "url || ' ' || digest || ' ' || size") + falseRecords(root());
+    return text + withoutTimes(place_.read("now/repository/.tav/tav.state")) + rows;
 }
 
 std::string difference(std::string const& before, std::string const& after)
