@@ -27,7 +27,8 @@ std::set<OdString> setOf(std::vector<OdString> const& urls)
 
 bool concernsServer(Failure const& failure)
 {
-    return failure.code != static_cast<std::int32_t>(ServerError::other);
+    auto const kind = static_cast<ServerError>(failure.code);
+    return kind == ServerError::noServer || kind == ServerError::noRepository || kind == ServerError::isBehind;
 }
 
 /// Learns from the server which commits there are. Returns why that cannot be known now; empty when it is known.

@@ -9,6 +9,7 @@
 #include "json/json_reader.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <iterator>
 #include <set>
 #include <tuple>
@@ -70,8 +71,11 @@ void enterContents(
         if (change.url.isEmpty() || database.sizeOf(change.url)) {
             continue;
         }
-        if (auto const size = storage.size(root, change.url); size.hasValue()) {
+        auto const size = storage.size(root, change.url);
+        if (size.hasValue()) {
             database.addContent(change.url, *digestOf(change.url), size.value());
+        } else if (size.error().code != 0 && size.error().code != ENOENT) { // It may be here all the same.
+            throw Failure(size.error(), "Check the disk and your rights, and run the command again.");
         }
     }
 }

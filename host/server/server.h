@@ -9,12 +9,12 @@
 
 namespace tav {
 
-/// The kinds of errors of a server that clients tell apart, as the `code` of the error.
+/// The kinds of errors of a server that clients tell apart, as the `code` of the error; apart from those of the system.
 enum class ServerError : std::int32_t {
     other = 0,
-    noServer = 1,     ///< the place where it was is empty; it may come back
-    noRepository = 2, ///< it is there, and does not have the repository
-    isBehind = 3      ///< it lacks commits that the client knows; the client finds that out
+    noServer = 1001,     ///< the place where it was is empty; it may come back
+    noRepository = 1002, ///< it is there, and does not have the repository
+    isBehind = 1003      ///< it lacks commits that the client knows; the client finds that out
 };
 
 /// A server, wherever it is. docs/formats/server-protocol.md lists its requests and their documents; nothing else

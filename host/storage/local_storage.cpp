@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <array>
 #include <atomic>
+#include <cerrno>
 #include <new>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -31,6 +32,12 @@ std::string quoted(OdString const& text)
     return "'" + text.ansi_str() + "'";
 }
 
+ErrorMessage withCode(ErrorMessage message, int code)
+{
+    message.code = code;
+    return message;
+}
+
 /// The result of `work`, which throws on an error.
 template <class T, class Work>
 Expected<T> guarded(Work const& work)
@@ -38,9 +45,9 @@ Expected<T> guarded(Work const& work)
     try {
         return work();
     } catch (StorageError const& error) {
-        return ErrorMessage(wide(error.what));
+        return withCode(ErrorMessage(wide(error.what)), error.code);
     } catch (std::bad_alloc const&) {
-        return ErrorMessage(OdString(L"There is not enough memory to work on the storage."));
+        return withCode(ErrorMessage(OdString(L"There is not enough memory to work on the storage.")), ENOMEM);
     }
 }
 

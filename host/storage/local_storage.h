@@ -9,7 +9,8 @@
 ///
 /// An object works on one repository, on one thread at a time. What changes the storage is for who holds the lock of
 /// the repository; reading needs none. All errors are sentences in English that name what they speak of. No content
-/// ends the process: lack of memory is an error too.
+/// ends the process: lack of memory is an error too. The code of an error is the system's, as in `errno`, and 0 where a
+/// content is missing or damaged.
 ///
 /// Memory: files up to 64 MiB are held whole, with their base, a spare for unpacking it and the result, so a file of n
 /// MiB needs about four times n. Beyond that, work goes by segments of 64 MiB, whatever the length. No operation uses

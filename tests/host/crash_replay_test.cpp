@@ -67,7 +67,7 @@ TEST_P(CrashReplay, LosesNothingAndSucceedsWhenItIsRepeated)
             if (end == steps_.size() && !comesBack()) { // The user has been told that it is done.
                 EXPECT_EQ(difference(after_, scene_.situation()), "");
             }
-            Outcome const repeated = scene_.verifyAndRepeat(command_.arguments);
+            Outcome const repeated = scene_.verifyAndRepeat(command_);
             EXPECT_TRUE(repeated.code == 0 && repeated.err.empty()) << testing::PrintToString(repeated);
             EXPECT_EQ(difference(after_, scene_.situation()), "");
         }
@@ -78,6 +78,10 @@ TEST_P(CrashReplay, LosesNothingAndSucceedsWhenItIsRepeated)
 }
 
 INSTANTIATE_TEST_SUITE_P(Commands, CrashReplay, testing::ValuesIn(sceneRows()), [](auto const& row) {
+    return row.param.name;
+});
+
+INSTANTIATE_TEST_SUITE_P(History, CrashReplay, testing::ValuesIn(historyRows()), [](auto const& row) {
     return row.param.name;
 });
 

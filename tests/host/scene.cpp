@@ -195,11 +195,12 @@ Outcome Scene::inCopy(std::function<int()> const& body) const
     return process.wait();
 }
 
-Outcome Scene::verifyAndRepeat(Arguments const& arguments) const
+Outcome Scene::verifyAndRepeat(SceneRow const& row) const
 {
+    Arguments const verify = {"verify"};
     Outcome outcome = inCopy([&] {
-        int const code = runHere({"verify"});
-        return code == 0 ? runHere(arguments) : code;
+        int const code = runHere(row.isVerifiedFirst ? verify : row.arguments);
+        return code == 0 ? runHere(row.isVerifiedFirst ? row.arguments : verify) : code;
     });
     if (outcome.out.find("Repaired") != std::string::npos) { // Something was damaged all the same.
         outcome.code = 1;
@@ -329,7 +330,61 @@ void storeWhatNobodyNeeds(Scene const& scene)
     scene.place().write("now/repository/.tav/tf/left.tf.new", "left");
 }
 
+/// Somebody else commits on a branch of his own, in a copy of the folder that goes then, and makes a tag.
+void commitElsewhere(Scene const& scene)
+{
+    std::string const other = scene.place().pathTo("now/other");
+    copyTree(scene.folder(), other);
+    auto const inOther = [&](Arguments arguments) {
+        arguments.insert(arguments.begin(), {"-C", other});
+        require(scene.tav(arguments).code == 0, "commit elsewhere");
+    };
+    inOther({"branch", "side", "1"});
+    inOther({"switch", "side", "--force"});
+    scene.place().write("now/other/note.txt", "theirs");
+    inOther({"add", "--all"});
+    inOther({"commit", "-m", "theirs", "--author", "bob@studio"});
+    inOther({"tag", "seen"});
+    fs::remove_all(other);
+}
+
+void commitBesideOthers(Scene const& scene)
+{
+    commitElsewhere(scene);
+    changeFiles(scene);
+}
+
+/// An older copy of the server is put back, and somebody else gets the number of the commit that it lacks.
+void loseACommitOnTheServer(Scene const& scene)
+{
+    std::string const server = scene.place().read("now/server/server.db");
+    std::string const old = scene.place().read("now/repository/.tav/tav.db");
+    changeFiles(scene);
+    require(scene.tav({"commit", "-m", "third", "--author", "ann@studio", "--all-removed"}).code == 0, "commit");
+    std::string const current = scene.place().read("now/repository/.tav/tav.db");
+    scene.place().write("now/server/server.db", server);
+    scene.place().write("now/repository/.tav/tav.db", old);
+    commitElsewhere(scene);
+    scene.place().write("now/repository/.tav/tav.db", current);
+}
+
 } // namespace
+
+std::vector<SceneRow> const& historyRows()
+{
+    static std::vector<SceneRow> const rows = {
+        {"Fetch", {"fetch"}, commitElsewhere, false},
+        {"CommitBesideOthers",
+         {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"},
+         commitBesideOthers,
+         false},
+        {"Send", {"server", "--send"}, loseACommitOnTheServer, false},
+        {"Init",
+         {"init", "--server", "../server"},
+         [](Scene const& scene) { fs::remove(scene.folder() + "/.tav/tav.db"); },
+         false}};
+    return rows;
+}
 
 std::vector<SceneRow> const& sceneRows()
 {

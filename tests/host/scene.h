@@ -20,6 +20,18 @@ using Files = std::map<std::string, std::string>;
 /// Whether every file of `now` is as in one of the others, and missing only where it is missing in one of them.
 bool areOldOrNew(Files const& now, Files const& before, Files const& after);
 
+class Scene;
+
+/// A command, and what it finds.
+struct SceneRow {
+    friend void PrintTo(SceneRow const& row, std::ostream* stream) { *stream << row.name; }
+
+    char const* name;
+    Arguments arguments;
+    std::function<void(Scene const&)> prepare;
+    bool isVerifiedFirst = true; ///< else `verify` would find fault with what the command is to bring about
+};
+
 /// Two commits of three files, their server, and what `prepare` adds to that. All of it lies in "now" of a folder for
 /// itself and is copied to "first": `reset` makes "now" what "first" is.
 class Scene {
@@ -40,8 +52,9 @@ public:
     /// SQLite go through `os::calls()`.
     Outcome inCopy(std::function<int()> const& body) const;
 
-    /// What a user does after a failure: sees that all versions are there, and runs the command again.
-    Outcome verifyAndRepeat(Arguments const& arguments) const;
+    /// What a user does after a failure: sees that all versions are there, and runs the command again, or the other way
+    /// round.
+    Outcome verifyAndRepeat(SceneRow const& row) const;
 
     Files files() const;
     /// What a command is to bring about, in lines: contents, the names of everything in ".tav" and the folder of the
@@ -59,15 +72,6 @@ std::string drawing(unsigned seed, std::size_t size = 3000);
 /// The same with a few bytes changed, so that it is stored as a difference.
 std::string edited(std::string content, unsigned seed);
 
-/// A command, and what it finds.
-struct SceneRow {
-    friend void PrintTo(SceneRow const& row, std::ostream* stream) { *stream << row.name; }
-
-    char const* name;
-    Arguments arguments;
-    std::function<void(Scene const&)> prepare;
-};
-
 /// The lines that only one of two texts has.
 std::string difference(std::string const& before, std::string const& after);
 
@@ -77,5 +81,9 @@ std::string faultOfFailure(Outcome const& outcome);
 
 /// The commands whose failures and crashes are tested: each writes, replaces and removes something.
 std::vector<SceneRow> const& sceneRows();
+
+/// The same for commands that bring the history here and that of the server together. The two differ before them, which
+/// `verify` reports.
+std::vector<SceneRow> const& historyRows();
 
 } // namespace host_tests
