@@ -68,12 +68,15 @@ foreach(catalogue IN LISTS catalogues)
 endforeach()
 
 # In the folders that links in the documents expect.
-install(FILES "${PROJECT_SOURCE_DIR}/README.md" "${PROJECT_SOURCE_DIR}/SECURITY.md" DESTINATION "${CMAKE_INSTALL_DOCDIR}")
+foreach(document IN ITEMS README CHANGELOG SECURITY CONTRIBUTING)
+    install(FILES "${PROJECT_SOURCE_DIR}/${document}.md" DESTINATION "${CMAKE_INSTALL_DOCDIR}")
+endforeach()
 install(DIRECTORY "${PROJECT_SOURCE_DIR}/docs/" DESTINATION "${CMAKE_INSTALL_DOCDIR}/docs"
-    FILES_MATCHING PATTERN "*.md" PATTERN man EXCLUDE)
+    FILES_MATCHING PATTERN "*.md" PATTERN man EXCLUDE PATTERN design EXCLUDE)
 install(FILES "${PROJECT_SOURCE_DIR}/examples/first_look.cpp" "${PROJECT_SOURCE_DIR}/examples/editor.cpp"
     DESTINATION "${CMAKE_INSTALL_DOCDIR}/examples")
-install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples/consumer" DESTINATION "${CMAKE_INSTALL_DOCDIR}/examples")
+install(DIRECTORY "${PROJECT_SOURCE_DIR}/examples/consumer" "${PROJECT_SOURCE_DIR}/examples/preview"
+    DESTINATION "${CMAKE_INSTALL_DOCDIR}/examples")
 
 if(TARGET tav)
     file(RELATIVE_PATH bin_to_lib "/${CMAKE_INSTALL_BINDIR}" "/${CMAKE_INSTALL_LIBDIR}")
