@@ -1,9 +1,9 @@
 // The first byte chooses a document that clients send, the rest is the document. It is refused with a text, or what was
 // read is clean: every path leads into the working folder, and no file is the folder of another.
-#include "host/failure.h"
-#include "host/paths/recorded_path.h"
-#include "host/server/commit_document.h"
-#include "host/server/members.h"
+#include "host/errors/failure.h"
+#include "host/history/tracked_path.h"
+#include "host/protocol/commit_document.h"
+#include "host/protocol/members.h"
 
 #include <cstddef>
 #include <cstdint>

@@ -3,10 +3,10 @@
 #include "host/changes/digest.h"
 #include "host/changes/index_record.h"
 #include "host/changes/scan_order.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/ignore_file.h"
 #include "host/storage/storage_url.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "common/mu_common_file_utils.h"
 
@@ -120,7 +120,7 @@ FolderChanges compare(common::RootPath const& root, FolderMatch match, VerifiedF
     FolderChanges changes;
     for (CommittedFile& file : match.committed) {
         bool const isThere = file.sight.presence == Presence::isThere;
-        OdString url = wide(file.url);
+        OdString url = fromUtf8(file.url);
         bool const isUnchanged = file.isKnown || (isThere && !hasOtherContent(file.path, url, root));
         if (isUnchanged && !file.isKnown && verified && isStill(file, root)) {
             verified->push_back({file.path.ansi_str(), std::string(digestIn(file.url)), *file.sight.stamp});
@@ -153,7 +153,7 @@ void enterVerified(VerifiedFileList const& verified, std::uint64_t start, common
 {
     for (VerifiedFile const& file : verified) {
         state.index.insert_or_assign(
-            wide(file.path), indexRecord(static_cast<std::uint64_t>(file.stamp.modified), start));
+            fromUtf8(file.path), indexRecord(static_cast<std::uint64_t>(file.stamp.modified), start));
     }
 }
 
@@ -163,9 +163,9 @@ void keepVerified(VerifiedFileList const& verified, LocalDatabase& database)
         return;
     }
     try {
-        Change change(database.database());
+        WriteTransaction transaction(database.database());
         database.addVerified(verified);
-        change.commit();
+        transaction.commit();
     } catch (Failure const&) {
         // What is needed for the work itself fails with a message of its own.
     }

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "host/changes/folder_view.h"
-#include "host/database/commit_tables.h"
+#include "host/history/commit_tables.h"
 #include "host/repository/local_database.h"
 
 #include "common/mu_common_diff.h"

@@ -1,7 +1,7 @@
 /// Looking at files of the working folder without reading them.
 #pragma once
 
-#include "host/changes/file_stamp.h"
+#include "host/repository/file_stamp.h"
 
 #include "common/mu_common_repo_prop.h"
 #include "platform/os/os_handle.h"

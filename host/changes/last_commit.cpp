@@ -7,7 +7,7 @@ namespace tav {
 FileList lastCommitFiles(common::RootPath const& root)
 {
     LocalDatabase const database = LocalDatabase::open(root);
-    return database.commits().fileList(database.base());
+    return database.commits().fileList(database.currentCommit());
 }
 
 } // namespace tav

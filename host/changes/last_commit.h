@@ -1,7 +1,7 @@
 /// The commit that the working folder stands on.
 #pragma once
 
-#include "host/database/commit_tables.h"
+#include "host/history/commit_tables.h"
 
 #include "common/mu_common_repo_prop.h"
 

@@ -1,7 +1,7 @@
 #include "host/changes/line_diff.h"
 
 #include "host/text/characters.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include <dtl/dtl.hpp>
 
@@ -18,7 +18,7 @@ bool isText(std::string const& content)
     if (!isPlain) {
         return false;
     }
-    OdString const text = wide(content);
+    OdString const text = fromUtf8(content);
     for (std::size_t i = 0; i < text.getLength(); ++i) {
         if (text.getAt(i) >= 0xD800 && text.getAt(i) <= 0xDFFF) { // stands for a byte that is no UTF-8
             return false;

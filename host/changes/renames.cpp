@@ -2,7 +2,7 @@
 
 #include "host/changes/digest.h"
 #include "host/changes/staging.h"
-#include "host/paths/recorded_path.h"
+#include "host/history/tracked_path.h"
 #include "host/storage/local_storage.h"
 
 #include <algorithm>

@@ -1,7 +1,7 @@
 #include "host/changes/staging.h"
 
-#include "host/failure.h"
-#include "host/paths/recorded_path.h"
+#include "host/errors/failure.h"
+#include "host/history/tracked_path.h"
 #include "host/text/characters.h"
 
 #include <algorithm>
@@ -133,6 +133,20 @@ std::size_t unstage(std::vector<common::StagedFile> const& files, common::State&
         state.renames.erase(file.path);
     }
     return dropStaged(paths, state);
+}
+
+void applyIndexUpdates(IndexUpdates const& files, common::State& state)
+{
+    std::vector<common::StagedFile> committed;
+    for (auto const& [path, record] : files) {
+        committed.emplace_back(path, common::FileChange::modified);
+        if (record) {
+            state.index.insert_or_assign(path, *record);
+        } else {
+            state.index.erase(path);
+        }
+    }
+    unstage(committed, state);
 }
 
 void stageMoves(std::vector<Move> const& moves, common::State& state)

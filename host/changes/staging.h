@@ -1,6 +1,8 @@
 /// What the commands change in the working state.
 #pragma once
 
+#include "host/repository/journal.h"
+
 #include "common/mu_common_state.h"
 
 #include <cstddef>
@@ -30,6 +32,9 @@ std::set<OdString> claimedPaths(common::State const& state);
 
 /// Takes `files` out of the staged ones, with what was noted of their renames. Returns how many were staged.
 std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state);
+
+/// Enters the index records of files that are as the current commit has them, and takes them out of the staged ones.
+void applyIndexUpdates(IndexUpdates const& files, common::State& state);
 
 /// A file of the repository that has a new path.
 struct Move {

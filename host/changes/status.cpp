@@ -5,8 +5,8 @@
 #include "host/changes/scan_order.h"
 #include "host/changes/staging.h"
 #include "host/repository/conflicts.h"
+#include "host/repository/journal.h"
 #include "host/repository/local_database.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
 
 #include <algorithm>
@@ -74,9 +74,9 @@ struct History {
 
 History readHistory(LocalDatabase& database)
 {
-    Snapshot const snapshot(database.database());
+    ReadTransaction const transaction(database.database());
     CommitTables const& commits = database.commits();
-    OdString const base = database.base();
+    OdString const base = database.currentCommit();
     auto const commit = commits.find(base);
     return {base, commit ? commit->number : 0, commits.fileList(base), database.verifiedFiles(), commits.references()};
 }
@@ -108,7 +108,7 @@ Findings lookOnce(common::RootPath const& root, LocalDatabase& database)
 Findings lookAround(common::RootPath const& root, LocalDatabase& database)
 {
     Findings found = lookOnce(root, database);
-    while (database.base() != found.history.base) {
+    while (database.currentCommit() != found.history.base) {
         found = lookOnce(root, database);
     }
     return found;
@@ -147,7 +147,7 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     auto [history, match, cache] = lookAround(root, database);
     common::State const& state = cache->read();
     enterPlace(history, state, status);
-    status.unfinishedWork = noteOnUnfinished(root, database);
+    status.unfinishedWork = pendingNotice(root, database);
     status.conflicts = openConflicts(root);
     status.staged = stagedEntries(state, match, root);
     dropKnown(match);

@@ -2,7 +2,7 @@
 
 #include "host/changes/changes.h"
 #include "host/changes/digest.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/text/characters.h"
 
 #include <cstdint>

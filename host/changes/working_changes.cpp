@@ -51,8 +51,8 @@ void joinRenamed(Renames const& renames, ByPath& all)
 std::vector<WorkingChange> workingChanges(common::RootPath const& root, LocalDatabase const& database)
 {
     auto const cache = readState(root);
-    FolderChanges const changes =
-        compare(root, matchFolder(root, database.commits().fileList(database.base()), database.verifiedFiles()));
+    FolderChanges const changes = compare(
+        root, matchFolder(root, database.commits().fileList(database.currentCommit()), database.verifiedFiles()));
     ByPath all = plainChanges(changes);
     joinRenamed(cache->read().renames, all);
     joinRenamed(findRenames(changes, cache->read(), database, root), all);

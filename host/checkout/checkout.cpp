@@ -14,8 +14,8 @@ namespace {
 /// The targets of moves whose files may be in the working folder beside those of the last commit.
 std::vector<OdString> begunCheckouts(LocalDatabase const& database)
 {
-    Unfinished const unfinished = unfinishedOf(database);
-    auto const* const move = std::get_if<CheckoutUnderWay>(&unfinished);
+    PendingOperation const pending = readJournal(database);
+    auto const* const move = std::get_if<PendingCheckout>(&pending);
     if (!move) {
         return {};
     }
@@ -37,9 +37,9 @@ std::vector<Tree> filesOf(std::vector<OdString> const& commits, LocalDatabase co
 
 /// `whole` is the update before the check: also a file that was found as it shall be is no change any more. What stays
 /// of an interrupted move may be no file of the commit.
-SettledFiles settledBy(TreeUpdate const& whole, TreeUpdate const& update, Updated const& updated, std::uint64_t start)
+IndexUpdates settledBy(TreeUpdate const& whole, TreeUpdate const& update, Updated const& updated, std::uint64_t start)
 {
-    SettledFiles files;
+    IndexUpdates files;
     for (auto const& [path, url] : whole.removals) {
         files.emplace(path, std::nullopt);
     }
@@ -65,31 +65,31 @@ CheckedOut checkOutCommit(
     requireNoConflicts(root);
     std::vector<OdString> const begun = begunCheckouts(database);
     TreeUpdate const whole = updateBetween(
-        database.commits().files(database.base()), filesOf(begun, database),
+        database.commits().files(database.currentCommit()), filesOf(begun, database),
         database.commits().files(destination.commit));
     TreeUpdate update = whole;
     LocalStorage storage;
     checkUpdate(root, database, storage, claimedPaths(readState(root)->read()), discard, update);
-    CheckoutUnderWay move{destination.commit, destination.branch, false, begun};
-    Updated const updated = carryOut(root, storage, update, start, [&] { note(move, database); });
-    Change change(database.database());
-    database.setBase(destination.commit);
+    PendingCheckout move{destination.commit, destination.branch, false, begun};
+    Updated const updated = carryOut(root, storage, update, start, [&] { writeJournal(move, database); });
+    WriteTransaction transaction(database.database());
+    database.setCurrentCommit(destination.commit);
     move.isWritten = true;
     move.files = settledBy(whole, update, updated, start);
-    note(move, database);
+    writeJournal(move, database);
     database.addVerified(updated.verified);
-    change.commit();
+    transaction.commit();
     finishCheckout(root, database, move);
     return {update.writes.size(), update.removals.size()};
 }
 
-void finishCheckout(common::RootPath const& root, LocalDatabase& database, CheckoutUnderWay const& move)
+void finishCheckout(common::RootPath const& root, LocalDatabase& database, PendingCheckout const& move)
 {
     changeState(root, [&](common::Cache& cache) {
         cache.write().head = move.branch;
-        settle(move.files, cache.write());
+        applyIndexUpdates(move.files, cache.write());
     });
-    note(std::monostate(), database);
+    clearJournal(database);
 }
 
 } // namespace tav

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "host/checkout/working_tree.h"
-#include "host/repository/unfinished.h"
+#include "host/repository/journal.h"
 
 #include <cstdint>
 
@@ -29,6 +29,6 @@ CheckedOut checkOutCommit(
     std::uint64_t start);
 
 /// Ends a move whose files are written, unless that has been done.
-void finishCheckout(common::RootPath const& root, LocalDatabase& database, CheckoutUnderWay const& move);
+void finishCheckout(common::RootPath const& root, LocalDatabase& database, PendingCheckout const& move);
 
 } // namespace tav

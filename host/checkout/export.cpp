@@ -1,10 +1,10 @@
 #include "host/checkout/export.h"
 
 #include "host/checkout/working_tree.h"
-#include "host/failure.h"
-#include "host/paths/recorded_path.h"
-#include "host/progress.h"
+#include "host/errors/failure.h"
+#include "host/history/tracked_path.h"
 #include "host/storage/local_storage.h"
+#include "host/terminal/progress.h"
 
 #include "platform/os/os_batch.h"
 #include "platform/os/os_files.h"

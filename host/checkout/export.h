@@ -1,7 +1,7 @@
 /// Files of a commit outside of the repository.
 #pragma once
 
-#include "host/database/commit_tables.h"
+#include "host/history/commit_tables.h"
 
 #include "common/mu_common_repo_prop.h"
 

@@ -1,6 +1,6 @@
 #include "host/checkout/file_moves.h"
 
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include "platform/os/os_move.h"
 

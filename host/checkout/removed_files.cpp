@@ -1,10 +1,10 @@
 #include "host/checkout/removed_files.h"
 
 #include "host/changes/digest.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/storage/cleaning.h"
 #include "host/storage/storage_error.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "platform/os/os_files.h"
 
@@ -49,8 +49,8 @@ bool isStored(
 {
     std::error_code error;
     bool const isFile = fs::symlink_status(file, error).type() == fs::file_type::regular;
-    auto const digest = isFile ? fileDigest(wide(file)) : std::nullopt;
-    OdString const path = wide(file.substr(root.path().ansi_str().size() + 1));
+    auto const digest = isFile ? fileDigest(fromUtf8(file)) : std::nullopt;
+    OdString const path = fromUtf8(file.substr(root.path().ansi_str().size() + 1));
     return digest && std::any_of(urls.begin(), urls.end(), [&](OdString const& url) {
                return digestOf(url) == digest && storage.repair(root, url, path).hasValue();
            });

@@ -5,10 +5,10 @@
 #include "host/changes/index_record.h"
 #include "host/changes/stored_copies.h"
 #include "host/checkout/file_clock.h"
-#include "host/failure.h"
-#include "host/paths/recorded_path.h"
-#include "host/progress.h"
-#include "host/text/wide.h"
+#include "host/errors/failure.h"
+#include "host/history/tracked_path.h"
+#include "host/terminal/progress.h"
+#include "host/text/utf8.h"
 
 #include "platform/os/os_batch.h"
 #include "platform/os/os_files.h"
@@ -169,7 +169,7 @@ private:
         for (; !error && entry != fs::recursive_directory_iterator(); entry.increment(error)) {
             std::string const name = entry->path().string().substr(top.size() + 1);
             bool const isFolder = entry->symlink_status(error).type() == fs::file_type::directory;
-            if (!isFolder && update_.removals.count(wide(name)) == 0) {
+            if (!isFolder && update_.removals.count(fromUtf8(name)) == 0) {
                 throw Failure(
                     "'" + name + "' lies in a folder whose place a file of the commit takes.",
                     "Nothing has been written; move it away first.");

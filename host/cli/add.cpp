@@ -5,12 +5,12 @@
 #include "host/changes/stored_copies.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/plural.h"
 
 #include <algorithm>
 #include <string>
@@ -117,16 +117,16 @@ std::size_t repair(std::vector<common::VersionedFile> const& files, common::Root
 
 void addFilesToStage(AddOptions const& options)
 {
-    Work work(openRepository(""), "add", Work::Unfinished::mayStay);
-    common::RootPath const& root = work.root();
+    WriteSession session(openRepository(""), "add", Recovery::attempted);
+    common::RootPath const& root = session.root();
     VerifiedFileList verified;
     FolderChanges const changes =
-        compare(root, matchFolder(root, lastCommitFiles(root), work.database().verifiedFiles()), &verified);
-    keepVerified(settledFiles(verified, work.start()), work.database());
+        compare(root, matchFolder(root, lastCommitFiles(root), session.database().verifiedFiles()), &verified);
+    keepVerified(settledFiles(verified, session.start()), session.database());
     std::size_t count = 0;
     std::size_t repaired = 0;
     changeState(root, [&](common::Cache& cache) {
-        enterVerified(verified, work.start(), cache.write());
+        enterVerified(verified, session.start(), cache.write());
         Chosen const chosen = chosenFiles(options, changes, root);
         repaired = repair(chosen.unchanged, root);
         count = stage(chosen.files, cache.write());

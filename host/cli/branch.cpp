@@ -2,11 +2,11 @@
 #include "host/cli/output.h"
 #include "host/commits/commit_names.h"
 #include "host/commits/references.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/utf8.h"
 
 #include <string>
 
@@ -78,11 +78,11 @@ void list(ReferenceOptions const& options, Kind const& kind)
 
 void make(ReferenceOptions const& options, Kind const& kind)
 {
-    Work work(openRepository(""), kind.name);
-    CommitRecord const commit = findCommit(work.database(), options.commit);
-    makeReference(work.database(), {wide(*options.name), commit.hash, kind.type});
+    WriteSession session(openRepository(""), kind.name);
+    CommitRecord const commit = findCommit(session.database(), options.commit);
+    makeReference(session.database(), {fromUtf8(*options.name), commit.hash, kind.type});
     print(
-        std::string("Made the ") + kind.name + " '" + shown(wide(*options.name)) + "' at commit " +
+        std::string("Made the ") + kind.name + " '" + shown(fromUtf8(*options.name)) + "' at commit " +
         std::to_string(commit.number) + ".\n");
 }
 

@@ -2,11 +2,12 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/commits/commit_names.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/plural.h"
+#include "host/text/utf8.h"
 
 #include <string>
 
@@ -32,19 +33,20 @@ std::string described(CheckedOut const& result, common::RootPath const& root)
 
 void checkOut(CheckoutOptions const& options)
 {
-    Work work(openRepository(""), "checkout");
-    CommitRecord const commit = findCommit(work.database(), options.target);
-    OdString const branch = readState(work.root())->read().head;
+    WriteSession session(openRepository(""), "checkout");
+    CommitRecord const commit = findCommit(session.database(), options.target);
+    OdString const branch = readState(session.root())->read().head;
     CheckedOut const result =
-        checkOutCommit(work.root(), work.database(), {commit.hash, branch}, discardOf(options), work.start());
+        checkOutCommit(session.root(), session.database(), {commit.hash, branch}, discardOf(options), session.start());
     print(
-        "The working folder is at commit " + std::to_string(commit.number) + " now: " + described(result, work.root()));
+        "The working folder is at commit " + std::to_string(commit.number) +
+        " now: " + described(result, session.root()));
 }
 
 void switchBranch(CheckoutOptions const& options)
 {
-    Work work(openRepository(""), "switch");
-    auto const branch = work.database().commits().reference(wide(options.target));
+    WriteSession session(openRepository(""), "switch");
+    auto const branch = session.database().commits().reference(fromUtf8(options.target));
     if (branch && branch->type == common::EType::tag) {
         throw Failure("'" + options.target + "' is a tag.", "Use 'tav checkout " + options.target + "' to go there.");
     }
@@ -54,8 +56,8 @@ void switchBranch(CheckoutOptions const& options)
             "Run 'tav branch' to see those that there are, or 'tav branch NAME' to make one.");
     }
     CheckedOut const result = checkOutCommit(
-        work.root(), work.database(), {branch->commitHash, branch->name}, discardOf(options), work.start());
-    print("On branch " + shown(branch->name) + " now: " + described(result, work.root()));
+        session.root(), session.database(), {branch->commitHash, branch->name}, discardOf(options), session.start());
+    print("On branch " + shown(branch->name) + " now: " + described(result, session.root()));
 }
 
 } // namespace tav

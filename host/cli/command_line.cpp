@@ -2,7 +2,7 @@
 
 #include "host/cli/output.h"
 #include "host/cli/syntax.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include "platform/sdk/OdError.h"
 

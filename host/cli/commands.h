@@ -98,7 +98,7 @@ struct IgnoreOptions {
 };
 void ignore(IgnoreOptions const& options);
 
-void fetchHistory();
+void fetch();
 
 struct ServerOptions {
     std::string folder; ///< empty: where it is

@@ -1,11 +1,11 @@
 #include "host/commits/commit.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
-#include "host/text/wide.h"
-#include "host/user_folders.h"
+#include "host/session/write_session.h"
+#include "host/text/utf8.h"
+#include "host/user/user_folders.h"
 
 #include <string>
 
@@ -36,9 +36,10 @@ Missing missingFilesOf(CommitOptions const& options)
 }
 
 /// Whether the order is the one that was interrupted: repeating it makes no second commit.
-bool isRepeated(CommitOrder const& order, Work const& work)
+bool isRepeated(CommitOrder const& order, WriteSession const& session)
 {
-    return work.finished() && work.finished()->message == order.message && work.finished()->author == order.author;
+    return session.recoveredCommit() && session.recoveredCommit()->message == order.message &&
+           session.recoveredCommit()->author == order.author;
 }
 
 } // namespace
@@ -46,16 +47,17 @@ bool isRepeated(CommitOrder const& order, Work const& work)
 void makeCommit(CommitOptions const& options)
 {
     CommitOrder const order{
-        wide(options.author.empty() ? userName() : options.author), wide(options.message), missingFilesOf(options)};
+        fromUtf8(options.author.empty() ? userName() : options.author), fromUtf8(options.message),
+        missingFilesOf(options)};
     checkText(options.message, "message");
     checkText(order.author.ansi_str(), "author");
-    Work work(openRepository(""), "commit");
-    work.failIfBetweenCommits();
-    if (isRepeated(order, work)) {
-        printCommit(*work.finished(), "Completed");
+    WriteSession session(openRepository(""), "commit");
+    session.failIfBetweenCommits();
+    if (isRepeated(order, session)) {
+        printCommit(*session.recoveredCommit(), "Completed");
         return;
     }
-    Committed const committed = commit(work.root(), work.database(), order, work.start());
+    Committed const committed = commit(session.root(), session.database(), order, session.start());
     printCommit(committed.commit, committed.isNew ? "Made" : "Nothing has changed since");
 }
 

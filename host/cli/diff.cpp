@@ -4,11 +4,11 @@
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/storage/local_storage.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "platform/os/os_files.h"
 
@@ -129,7 +129,7 @@ void printLines(std::string const& text)
     std::istringstream lines(text);
     for (std::string line; std::getline(lines, line);) {
         Colour const colour = line[0] == '+' ? Colour::green : line[0] == '-' ? Colour::red : Colour::none;
-        print("    " + coloured(colour, shownLine(wide(line))) + "\n");
+        print("    " + coloured(colour, shownLine(fromUtf8(line))) + "\n");
     }
 }
 

@@ -2,9 +2,10 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/commits/commit_names.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/open.h"
-#include "host/text/wide.h"
+#include "host/text/plural.h"
+#include "host/text/utf8.h"
 
 #include <string>
 #include <utility>
@@ -19,7 +20,7 @@ void exportCommit(std::string const& typed, std::string const& target)
     std::size_t const count = exportFiles(root, database.commits().files(commit.hash), target);
     print(
         "Wrote " + counted(count, "file") + " of commit " + std::to_string(commit.number) + " into '" +
-        shown(wide(target)) + "'.\n");
+        shown(fromUtf8(target)) + "'.\n");
 }
 
 } // namespace tav

@@ -1,26 +1,26 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/repository/history.h"
+#include "host/client/history.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/plural.h"
 
 #include <string>
 
 namespace tav {
 
-void fetchHistory()
+void fetch()
 {
-    Work work(openRepository(""), "fetch");
-    Connection connection(work.database());
-    Learned const learned = learnHistory(work.root(), work.database(), connection, Compared::everything);
-    if (learned.commits == 0 && learned.references == 0) {
+    WriteSession session(openRepository(""), "fetch");
+    Connection connection(session.database());
+    Fetched const fetched = fetchHistory(session.root(), session.database(), connection, Compared::everything);
+    if (fetched.commits == 0 && fetched.references == 0) {
         print("Nothing is new on the server.\n");
         return;
     }
-    print("Learned " + counted(learned.commits, "commit") + ".\n");
-    if (learned.references > 0) {
-        print("Branches and tags that are new or have moved: " + std::to_string(learned.references) + ".\n");
+    print("Fetched " + counted(fetched.commits, "commit") + ".\n");
+    if (fetched.references > 0) {
+        print("Branches and tags that are new or have moved: " + std::to_string(fetched.references) + ".\n");
     }
 }
 

@@ -2,9 +2,9 @@
 #include "host/changes/digest.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
-#include "host/progress.h"
+#include "host/errors/failure.h"
 #include "host/repository/open.h"
+#include "host/terminal/progress.h"
 
 #include <unistd.h>
 

@@ -2,14 +2,14 @@
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
-#include "host/repository/contents.h"
-#include "host/repository/history.h"
+#include "host/client/contents.h"
+#include "host/client/history.h"
+#include "host/errors/failure.h"
+#include "host/repository/journal.h"
 #include "host/repository/open.h"
-#include "host/repository/unfinished.h"
-#include "host/repository/work.h"
+#include "host/session/write_session.h"
 #include "host/storage/local_storage.h"
-#include "host/text/wide.h"
+#include "host/text/plural.h"
 
 #include <set>
 #include <string>
@@ -32,14 +32,14 @@ bool concernsServer(Failure const& failure)
 }
 
 /// Learns from the server which commits there are. Returns why that cannot be known now; empty when it is known.
-std::string learnWhatIsNeeded(Work& work)
+std::string learnWhatIsNeeded(WriteSession& session)
 {
-    if (std::holds_alternative<CommitUnderWay>(unfinishedOf(work.database()))) {
+    if (std::holds_alternative<PendingCommit>(readJournal(session.database()))) {
         return "A commit waits for the server.";
     }
     try {
-        Connection connection(work.database());
-        learnHistory(work.root(), work.database(), connection, Compared::everything);
+        Connection connection(session.database());
+        fetchHistory(session.root(), session.database(), connection, Compared::everything);
         return {};
     } catch (Failure const& failure) {
         if (!concernsServer(failure)) {
@@ -49,16 +49,16 @@ std::string learnWhatIsNeeded(Work& work)
     }
 }
 
-Freed removeWhatNobodyNeeds(Work& work, LocalStorage& storage)
+Freed removeWhatNobodyNeeds(WriteSession& session, LocalStorage& storage)
 {
-    std::string const doubt = learnWhatIsNeeded(work);
+    std::string const doubt = learnWhatIsNeeded(session);
     if (!doubt.empty()) {
         printNote("Only leftovers are removed, as the server does not say what its commits need. " + doubt);
-        return valueOrFail(storage.removeLeftovers(work.root()), "Check your rights in '.tav'.");
+        return valueOrFail(storage.removeLeftovers(session.root()), "Check your rights in '.tav'.");
     }
-    Contents const needed = contentsOf(work.root(), work.database());
+    Contents const needed = contentsOf(session.root(), session.database());
     return valueOrFail(
-        storage.keepOnly(work.root(), setOf(needed.here), setOf(needed.elsewhere)),
+        storage.keepOnly(session.root(), setOf(needed.here), setOf(needed.elsewhere)),
         "Run 'tav verify' to see whether anything is damaged.");
 }
 
@@ -66,11 +66,11 @@ Freed removeWhatNobodyNeeds(Work& work, LocalStorage& storage)
 
 void collectGarbage()
 {
-    Work work(openRepository(""), "gc", Work::Unfinished::mayStay);
-    work.database().failIfDamaged();
+    WriteSession session(openRepository(""), "gc", Recovery::attempted);
+    session.database().failIfDamaged();
     LocalStorage storage;
-    Freed const freed = removeWhatNobodyNeeds(work, storage);
-    RemovedFiles const files = cleanRemovedFiles(work.root(), work.database(), storage);
+    Freed const freed = removeWhatNobodyNeeds(session, storage);
+    RemovedFiles const files = cleanRemovedFiles(session.root(), session.database(), storage);
     print(
         "Removed " + counted(freed.contents, "stored version") + " that no commit needs; " + sizeText(freed.bytes) +
         " freed.\n");

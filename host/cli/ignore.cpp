@@ -1,10 +1,10 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/ignore_file.h"
-#include "host/repository/lock.h"
 #include "host/repository/open.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/utf8.h"
 
 #include <string>
 
@@ -14,8 +14,8 @@ namespace {
 
 void addRule(common::RootPath const& root, std::string const& rule)
 {
-    os::FileLock const lock = lockRepository(root, "ignore");
-    OdString const pattern = wide(rule);
+    WriteSession const session(root, "ignore", Recovery::attempted);
+    OdString const pattern = fromUtf8(rule);
     print(
         addIgnoreRule(root, pattern) ? "Names that match '" + shown(pattern) + "' are ignored from now on.\n"
                                      : "The rule '" + shown(pattern) + "' was there already.\n");

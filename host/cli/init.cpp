@@ -1,18 +1,20 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
-#include "host/projects.h"
+#include "host/client/connection.h"
+#include "host/client/rebuild.h"
+#include "host/errors/failure.h"
 #include "host/repository/ignore_file.h"
 #include "host/repository/open.h"
-#include "host/repository/rebuild.h"
-#include "host/repository/server_of.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/plural.h"
+#include "host/text/utf8.h"
+#include "host/user/projects.h"
 
 #include <cstddef>
 #include <filesystem>
 #include <string>
+#include <utility>
 
 namespace tav {
 
@@ -52,7 +54,7 @@ void chooseServer(LocalDatabase& database, OdString const& named, std::string co
 void enterProject(LocalDatabase const& database, std::string const& folder, std::string const& name)
 {
     try {
-        addProject(wide(folder), wide(name), database.repositoryId());
+        addProject(fromUtf8(folder), fromUtf8(name), database.repositoryId());
     } catch (Failure const& failure) {
         printNote("The repository is complete, but 'tav projects' does not know it: " + failure.what);
     }
@@ -61,7 +63,7 @@ void enterProject(LocalDatabase const& database, std::string const& folder, std:
 /// Makes a lost database again, and says what the user should know of it.
 std::string rebuilt(common::RootPath const& root, std::string const& folder, OdString const& server)
 {
-    Rebuilt const made = rebuildDatabase(root, wide(folder), server);
+    Rebuilt const made = rebuildDatabase(root, fromUtf8(folder), server);
     std::string const place =
         made.base == 0 ? ""
                        : " The folder is taken to stand on commit " + std::to_string(made.base) + "; see 'tav status'.";
@@ -73,7 +75,7 @@ std::string rebuilt(common::RootPath const& root, std::string const& folder, OdS
 
 void init(InitOptions const& options)
 {
-    OdString const path = wide(options.folder);
+    OdString const path = fromUtf8(options.folder);
     OdString const server = namedServer(options); // What is wrong with it is said before anything is made.
     bool const existed = common::RootPath::get(path, false).hasValue();
     common::RootPath const root =
@@ -81,14 +83,15 @@ void init(InitOptions const& options)
     requireOwnFiles(root);
     std::string const folder = absolute(options.folder);
     std::string const name = std::filesystem::path(folder).filename().string();
-    os::FileLock const lock = lockRepository(root, "init");
+    os::FileLock lock = lockRepository(root, "init");
     makeIgnoreFile(root);
     makeState(root);
     std::string const found =
         LocalDatabase::isLost(root) ? rebuilt(root, folder, namedOrDefault(server)) : std::string();
-    LocalDatabase database = LocalDatabase::make(root);
-    chooseServer(database, server, folder, name);
-    enterProject(database, folder, name);
+    LocalDatabase::make(root);
+    WriteSession session(root, std::move(lock), Recovery::attempted);
+    chooseServer(session.database(), server, folder, name);
+    enterProject(session.database(), folder, name);
     print(found);
     print(
         existed ? "The repository in '" + shown(path) + "' was there already; it is complete.\n"

@@ -2,9 +2,9 @@
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
 #include "host/commits/commit_names.h"
+#include "host/repository/journal.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "common/mu_common_history.h"
 
@@ -20,7 +20,7 @@ namespace {
 OdString titleOf(CommitRecord const& commit)
 {
     std::string const message = commit.message.ansi_str();
-    return wide(message.substr(0, message.find('\n')));
+    return fromUtf8(message.substr(0, message.find('\n')));
 }
 
 /// What the library shows of an entry, put together here: its texts are of Qt, which keeps no bytes that are not UTF-8.
@@ -76,11 +76,11 @@ void showLog(LogOptions const& options)
 {
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
-    if (std::string const unfinished = noteOnUnfinished(root, database); !unfinished.empty()) {
-        printNote(unfinished);
+    if (std::string const notice = pendingNotice(root, database); !notice.empty()) {
+        printNote(notice);
     }
-    std::vector<CommitRecord> commits =
-        database.commits().history(options.start.empty() ? database.base() : findCommit(database, options.start).hash);
+    std::vector<CommitRecord> commits = database.commits().history(
+        options.start.empty() ? database.currentCommit() : findCommit(database, options.start).hash);
     if (options.count > 0 && commits.size() > options.count) {
         commits.resize(options.count);
     }

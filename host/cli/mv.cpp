@@ -4,12 +4,12 @@
 #include "host/checkout/file_moves.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/utf8.h"
 
 #include "platform/ut/Dir.h"
 #include "platform/ut/FileName.h"
@@ -42,7 +42,7 @@ OdString targetOf(OdString const& from, std::string const& typed, common::RootPa
         return to;
     }
     std::string const name = std::filesystem::path(from.ansi_str()).filename().string();
-    return to.isEmpty() ? wide(name) : to + L"/" + wide(name);
+    return to.isEmpty() ? fromUtf8(name) : to + L"/" + fromUtf8(name);
 }
 
 /// A scan does not follow links to folders, so what lies behind one would be lost to the repository.
@@ -78,7 +78,7 @@ void checkTarget(OdString const& to, common::RootPath const& root)
         throw Failure(*fault, "Choose another name.");
     }
     common::RepoIgnore const rules(root);
-    failIfAnyPart(to, [&](std::filesystem::path const& part) { return rules.matches(wide(part.string())); });
+    failIfAnyPart(to, [&](std::filesystem::path const& part) { return rules.matches(fromUtf8(part.string())); });
 }
 
 /// The files that move when `from` becomes `to`: itself, or all that lie in it.
@@ -143,7 +143,7 @@ std::vector<common::StagedFile> changedAndBack(
         auto const rename = state.renames.find(move.from);
         bool const isBack = rename != state.renames.end() && rename->second == move.to;
         ListedFile const* const file = find(committed, move.to);
-        if (isBack && file && hasOtherContent(move.to, wide(file->url), root)) {
+        if (isBack && file && hasOtherContent(move.to, fromUtf8(file->url), root)) {
             changed.emplace_back(move.to, common::FileChange::modified);
         }
     }
@@ -154,8 +154,8 @@ std::vector<common::StagedFile> changedAndBack(
 
 void moveFiles(std::string const& typedFrom, std::string const& typedTo)
 {
-    Work const work(openRepository(""), "mv", Work::Unfinished::mayStay);
-    common::RootPath const& root = work.root();
+    WriteSession const session(openRepository(""), "mv", Recovery::attempted);
+    common::RootPath const& root = session.root();
     OdString const from = pathInRepository(root, typedFrom);
     OdString const to = targetOf(from, typedTo, root);
     std::vector<Move> const moves = movesOf(from, to, scan(root));

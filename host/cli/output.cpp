@@ -1,7 +1,7 @@
 #include "host/cli/output.h"
 
 #include "host/text/characters.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "json/json_writer.h"
 
@@ -62,7 +62,7 @@ std::string onOneLine(std::string text)
     for (char& c : text) {
         c = c == '\n' || c == '\t' ? ' ' : c;
     }
-    return escaped(wide(text), cannotBeSeen);
+    return escaped(fromUtf8(text), cannotBeSeen);
 }
 
 std::string asSentence(std::string const& text)

@@ -1,4 +1,4 @@
-#include "host/projects.h"
+#include "host/user/projects.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 

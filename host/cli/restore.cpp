@@ -4,12 +4,12 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/commits/commit_names.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/plural.h"
 
 #include "platform/ut/FileName.h"
 
@@ -97,20 +97,20 @@ void enterFiles(
 
 void restoreFiles(RestoreOptions const& options)
 {
-    Work work(openRepository(""), "restore", Work::Unfinished::mayStay);
-    common::RootPath const& root = work.root();
-    CommitRecord const commit = findCommit(work.database(), options.commit);
-    Tree const files = chosenFiles(options, work.database().commits().files(commit.hash), commit, root);
-    Tree const base = work.database().commits().files(work.database().base());
+    WriteSession session(openRepository(""), "restore", Recovery::attempted);
+    common::RootPath const& root = session.root();
+    CommitRecord const commit = findCommit(session.database(), options.commit);
+    Tree const files = chosenFiles(options, session.database().commits().files(commit.hash), commit, root);
+    Tree const base = session.database().commits().files(session.database().currentCommit());
     TreeUpdate update;
     update.writes = files;
     LocalStorage storage;
     checkUpdate(
-        root, work.database(), storage, stagedContents(readState(root)->read(), root),
+        root, session.database(), storage, stagedContents(readState(root)->read(), root),
         options.force ? Discard::everything : Discard::copies, update);
-    Updated const updated = carryOut(root, storage, update, work.start());
+    Updated const updated = carryOut(root, storage, update, session.start());
     changeState(root, [&](common::Cache& cache) { enterFiles(files, base, updated.times, cache.write()); });
-    keepVerified(updated.verified, work.database());
+    keepVerified(updated.verified, session.database());
     print(
         counted(files.size(), "file") + " as in commit " + std::to_string(commit.number) + ", " +
         std::to_string(update.writes.size()) + " written.\n");

@@ -5,13 +5,14 @@
 #include "host/checkout/file_moves.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
-#include "host/paths/recorded_path.h"
+#include "host/errors/failure.h"
+#include "host/history/tracked_path.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/plural.h"
+#include "host/text/utf8.h"
 
 #include "platform/os/os_files.h"
 
@@ -132,7 +133,7 @@ void checkPath(OdString const& path, common::RootPath const& root)
         throw Failure(*fault, "Nothing has been removed.");
     }
     fs::path const folder = fs::path(path.ansi_str()).parent_path();
-    auto const link = folder.empty() ? std::nullopt : linkOnTheWay(root.path().ansi_str(), wide(folder.string()));
+    auto const link = folder.empty() ? std::nullopt : linkOnTheWay(root.path().ansi_str(), fromUtf8(folder.string()));
     if (link) {
         throw Failure(*link, "Nothing has been removed; move that away first.");
     }
@@ -158,7 +159,7 @@ public:
         std::string const& place = waiting_.back();
         moves_.move(path.ansi_str(), place);
         bool const isLink = fs::is_symlink(fs::symlink_status(fullPath(place))); // What it leads to stays.
-        if (!isLink && hasOtherContent(wide(place), url, root_)) {
+        if (!isLink && hasOtherContent(fromUtf8(place), url, root_)) {
             failForChanges(path.ansi_str());
         }
         return true;
@@ -211,13 +212,13 @@ std::vector<common::StagedFile> chosenFiles(
 
 void removeFiles(std::vector<std::string> const& names)
 {
-    Work work(openRepository(""), "rm", Work::Unfinished::mayStay);
-    common::RootPath const& root = work.root();
+    WriteSession session(openRepository(""), "rm", Recovery::attempted);
+    common::RootPath const& root = session.root();
     Departures departures(root);
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
         FolderChanges const changes =
-            compare(root, matchFolder(root, lastCommitFiles(root), work.database().verifiedFiles()));
+            compare(root, matchFolder(root, lastCommitFiles(root), session.database().verifiedFiles()));
         Removable const files = removableIn(changes);
         std::vector<common::StagedFile> const chosen =
             chosenFiles(names, changes, finderOf(files, root), cache.read(), root);

@@ -1,12 +1,13 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/commits/resend.h"
-#include "host/failure.h"
-#include "host/projects.h"
-#include "host/repository/history.h"
+#include "host/client/history.h"
+#include "host/client/resend.h"
+#include "host/errors/failure.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/plural.h"
+#include "host/text/utf8.h"
+#include "host/user/projects.h"
 
 #include <algorithm>
 #include <filesystem>
@@ -59,14 +60,14 @@ bool hasRepository(OdString const& server, OdString const& repository)
 
 /// Makes the repository on a server that has none. A server is made only in a folder that the user named just now: the
 /// drive of the other may be off.
-void requireRepository(Work& work, OdString const& server, ServerOptions const& options)
+void requireRepository(WriteSession& session, OdString const& server, ServerOptions const& options)
 {
-    LocalDatabase& database = work.database();
+    LocalDatabase& database = session.database();
     bool const isToBeMade = !options.folder.empty() && !std::filesystem::exists((server + L"/server.db").ansi_str());
     if (isToBeMade || !hasRepository(server, database.repositoryId())) {
-        std::string const name = std::filesystem::absolute(work.root().path().ansi_str()).filename().string();
+        std::string const name = std::filesystem::absolute(session.root().path().ansi_str()).filename().string();
         database.setServer(server, makeRepository(server, name));
-        addProject(work.root().path(), wide(name), database.repositoryId());
+        addProject(session.root().path(), fromUtf8(name), database.repositoryId());
     }
 }
 
@@ -77,22 +78,22 @@ void server(ServerOptions const& options)
     if (options.folder.empty() && !options.send) {
         return showServer();
     }
-    Work work(openRepository(""), "server", Work::Unfinished::isLeft);
-    LocalDatabase& database = work.database();
+    WriteSession session(openRepository(""), "server", Recovery::skipped);
+    LocalDatabase& database = session.database();
     requireServer(database);
     OdString const folder = options.folder.empty() ? database.serverFolder() : namedServerFolder(options.folder);
-    failIfInside(folder, work.root().path().ansi_str());
+    failIfInside(folder, session.root().path().ansi_str());
     if (options.send) {
-        requireRepository(work, folder, options);
+        requireRepository(session, folder, options);
     } else {
         requireHistory(database, folder);
     }
     database.setServer(folder, database.repositoryId());
     Connection connection(database);
     if (options.send) {
-        print("Sent " + counted(sendAgain(work.root(), database, connection), "commit") + ".\n");
+        print("Sent " + counted(sendAgain(session.root(), database, connection), "commit") + ".\n");
     } else {
-        learnHistory(work.root(), database, connection, Compared::everything);
+        fetchHistory(session.root(), database, connection, Compared::everything);
     }
     print("The history is kept in '" + shown(folder) + "' now.\n");
 }

@@ -2,10 +2,10 @@
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
 #include "host/commits/commit_names.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/open.h"
 #include "host/storage/storage_url.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include <sstream>
 #include <string>
@@ -62,7 +62,7 @@ void printMessage(OdString const& message)
     std::istringstream lines(message.ansi_str());
     print("\n");
     for (std::string line; std::getline(lines, line);) {
-        print("    " + shownLine(wide(line)) + "\n");
+        print("    " + shownLine(fromUtf8(line)) + "\n");
     }
     print("\n");
 }

@@ -1,7 +1,7 @@
 #include "host/changes/status.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/open.h"
 
 #include <string>

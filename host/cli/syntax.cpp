@@ -243,7 +243,7 @@ void addCommands(CLI::App& app)
     addSwitch(app);
     addReferences(*app.add_subcommand("branch", "List the branches, or make one"), branch);
     addReferences(*app.add_subcommand("tag", "List the tags, or make one"), tag);
-    app.add_subcommand("fetch", "Learn the commits, branches and tags that the server has")->callback(fetchHistory);
+    app.add_subcommand("fetch", "Learn the commits, branches and tags that the server has")->callback(fetch);
     addServer(app);
     addFiles(app);
     addIgnore(app);

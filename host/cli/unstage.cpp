@@ -1,12 +1,12 @@
 #include "host/changes/staging.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
-#include "host/repository/work.h"
 #include "host/repository/working_state.h"
-#include "host/text/wide.h"
+#include "host/session/write_session.h"
+#include "host/text/plural.h"
 
 #include <string>
 #include <vector>
@@ -15,8 +15,8 @@ namespace tav {
 
 void unstageFiles(UnstageOptions const& options)
 {
-    Work const work(openRepository(""), "unstage", Work::Unfinished::mayStay);
-    common::RootPath const& root = work.root();
+    WriteSession const session(openRepository(""), "unstage", Recovery::attempted);
+    common::RootPath const& root = session.root();
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
         NameFinder const finder(cache.read().stagedFiles, root);

@@ -1,15 +1,15 @@
 #include "host/changes/stored_copies.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
-#include "host/failure.h"
-#include "host/progress.h"
-#include "host/repository/contents.h"
-#include "host/repository/history.h"
+#include "host/client/contents.h"
+#include "host/client/history.h"
+#include "host/errors/failure.h"
 #include "host/repository/local_database.h"
 #include "host/repository/lock.h"
 #include "host/repository/open.h"
 #include "host/storage/local_storage.h"
-#include "host/text/wide.h"
+#include "host/terminal/progress.h"
+#include "host/text/plural.h"
 
 #include "common/mu_common_file_storage.h"
 
@@ -51,8 +51,7 @@ damagesOf(common::RootPath const& root, CommitTables const& commits, std::vector
 /// How the history that is known here differs from the server's; none when it does not, or the server is away.
 std::optional<Failure> differenceFromServer(LocalDatabase const& database)
 {
-    bool const isUnfinished =
-        !database.unfinished().isEmpty(); // The server may have a commit already that is noted here.
+    bool const isUnfinished = !database.journal().isEmpty(); // The server may have a commit already that is noted here.
     if (database.repositoryId().isEmpty() || isUnfinished) {
         return std::nullopt;
     }

@@ -3,18 +3,18 @@
 #include "host/changes/changes.h"
 #include "host/changes/index_record.h"
 #include "host/changes/staging.h"
-#include "host/failure.h"
-#include "host/progress.h"
+#include "host/client/connection.h"
+#include "host/client/history.h"
+#include "host/errors/failure.h"
+#include "host/history/commit_hash.h"
+#include "host/protocol/commit_document.h"
 #include "host/repository/conflicts.h"
-#include "host/repository/history.h"
-#include "host/repository/server_of.h"
 #include "host/repository/working_state.h"
-#include "host/server/commit_document.h"
-#include "host/server/commit_hash.h"
 #include "host/storage/local_storage.h"
+#include "host/terminal/progress.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "common/mu_common_serialization.h"
 #include "common/mu_common_versions.h"
@@ -43,7 +43,7 @@ struct Draft {
     std::uint64_t start;
     Tree files;        ///< of the new commit, in the end
     Previous previous; ///< paths of renamed files before
-    CommitUnderWay work;
+    PendingCommit pending;
     VerifiedFileList verified = {}; ///< all files that were read
 };
 
@@ -53,7 +53,7 @@ FileStamp stampOf(OdString const& path, common::RootPath const& root)
     return FolderView(root).look(path).stamp.value_or(FileStamp{});
 }
 
-/// Stores a content that does not change meanwhile, and notes when the file had it.
+/// Stores a content that does not change meanwhile, and keeps the stamp that the file had then.
 OdString storeSteady(Draft& draft, LocalStorage& storage, OdString const& path)
 {
     for (int attempt = 0; attempt < kMostAttempts; ++attempt) {
@@ -62,7 +62,7 @@ OdString storeSteady(Draft& draft, LocalStorage& storage, OdString const& path)
         if (stampOf(path, draft.root) != before) {
             continue;
         }
-        draft.work.files[path] = indexRecord(static_cast<std::uint64_t>(before.modified), draft.start);
+        draft.pending.files[path] = indexRecord(static_cast<std::uint64_t>(before.modified), draft.start);
         OdString const stored = valueOrFail(url, "Nothing has been committed; mend that and run the command again.");
         draft.verified.push_back({path.ansi_str(), std::string(digestIn(stored.ansi_str())), before});
         return stored;
@@ -86,7 +86,7 @@ void storeAll(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& 
     for (PlannedFile const& file : plan) {
         if (file.change == common::FileChange::removed) {
             draft.files.erase(file.path);
-            draft.work.files[file.path] = std::nullopt;
+            draft.pending.files[file.path] = std::nullopt;
         } else {
             draft.files[file.path] = storeSteady(draft, storage, file.path);
         }
@@ -109,7 +109,7 @@ void readBack(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& 
         OdString const& url = version->second;
         valueOrFail(storage.verify(draft.root, url), "Nothing has been committed; the disk may be failing.");
         std::uint64_t const size = valueOrFail(storage.size(draft.root, url), "Nothing has been committed.");
-        draft.work.contents.push_back({url, *digestOf(url), size});
+        draft.pending.contents.push_back({url, *digestOf(url), size});
     }
 }
 
@@ -119,7 +119,7 @@ OdString documentOf(Draft const& draft, CommitOrder const& order, OdString const
     added.commit.author = order.author;
     added.commit.message = order.message;
     added.commit.date = std::time(nullptr);
-    if (OdString const parent = draft.database.base(); !parent.isEmpty()) {
+    if (OdString const parent = draft.database.currentCommit(); !parent.isEmpty()) {
         added.commit.parents.push_back(parent);
     }
     for (auto const& [path, url] : draft.files) {
@@ -136,7 +136,7 @@ OdString documentOf(Draft const& draft, CommitOrder const& order, OdString const
 void failIfNotAtTheEnd(LocalDatabase const& database, OdString const& branch)
 {
     auto const reference = database.commits().reference(branch);
-    if (!reference || reference->commitHash == database.base()) {
+    if (!reference || reference->commitHash == database.currentCommit()) {
         return;
     }
     throw Failure(
@@ -146,7 +146,7 @@ void failIfNotAtTheEnd(LocalDatabase const& database, OdString const& branch)
 }
 
 /// Sends the commit and returns its number. One that the server refuses is given up; after any other failure the server
-/// may have it from a try before, so the note stays until that is known.
+/// may have it from a try before, so the journal keeps it until that is known.
 std::int64_t
 sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& database, Connection& connection)
 {
@@ -156,7 +156,7 @@ sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& dat
     } catch (Failure& failure) {
         bool const isElsewhere = failure.code == static_cast<std::int32_t>(ServerError::noRepository);
         if (isElsewhere || !isOnServer(commit.commit.hash, connection)) {
-            note(std::monostate(), database);
+            clearJournal(database);
         }
         failure.next += isElsewhere ? " What was to be committed is staged as before."
                                     : " With 'tav branch NAME' and 'tav switch NAME' you have a branch of your own.";
@@ -185,9 +185,9 @@ void failUnlessNext(std::int64_t number, LocalDatabase const& database)
     }
 }
 
-void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& database)
+void enter(NewCommit const& commit, PendingCommit const& pending, LocalDatabase& database)
 {
-    Change change(database.database());
+    WriteTransaction transaction(database.database());
     if (!database.commits().find(commit.commit.hash)) {
         failUnlessNext(commit.commit.number, database);
         database.commits().add(commit.commit, commit.files);
@@ -195,11 +195,11 @@ void enter(NewCommit const& commit, CommitUnderWay const& work, LocalDatabase& d
     for (ReferenceChange const& moved : commit.references) {
         setUnlessPassed(moved.reference, database);
     }
-    for (NewContent const& content : work.contents) {
+    for (NewContent const& content : pending.contents) {
         database.addContent(content.url, content.digest, content.size);
     }
-    database.setBase(commit.commit.hash);
-    change.commit();
+    database.setCurrentCommit(commit.commit.hash);
+    transaction.commit();
 }
 
 FolderChanges compareWithBase(Draft& draft)
@@ -212,15 +212,15 @@ FolderChanges compareWithBase(Draft& draft)
     FolderChanges changes = compare(
         draft.root, matchFolder(draft.root, std::move(committed), draft.database.verifiedFiles()), &draft.verified);
     for (VerifiedFile const& file : draft.verified) {
-        draft.work.files.emplace(
-            wide(file.path), indexRecord(static_cast<std::uint64_t>(file.stamp.modified), draft.start));
+        draft.pending.files.emplace(
+            fromUtf8(file.path), indexRecord(static_cast<std::uint64_t>(file.stamp.modified), draft.start));
     }
     return changes;
 }
 
 std::optional<CommitRecord> lastCommitIfOf(CommitOrder const& order, LocalDatabase const& database)
 {
-    auto last = database.commits().find(database.base());
+    auto last = database.commits().find(database.currentCommit());
     bool const isSame = last && last->author == order.author && last->message == order.message;
     return isSame ? last : std::nullopt;
 }
@@ -284,16 +284,17 @@ void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
     readBack(draft, plan, storage);
 }
 
-CommitRecord finish(common::RootPath const& root, LocalDatabase& database, CommitUnderWay const& work, NewCommit commit)
+CommitRecord
+finish(common::RootPath const& root, LocalDatabase& database, PendingCommit const& pending, NewCommit commit)
 {
     Connection connection(database);
-    commit.commit.number = sentNumber(commit, work.document, database, connection);
+    commit.commit.number = sentNumber(commit, pending.document, database, connection);
     if (commit.commit.number != database.commits().lastWithoutGap() + 1) { // Others have committed meanwhile.
-        learnHistory(root, database, connection, Compared::everything);
+        fetchHistory(root, database, connection, Compared::everything);
     }
-    enter(commit, work, database);
-    changeState(root, [&](common::Cache& cache) { settle(work.files, cache.write()); });
-    note(std::monostate(), database);
+    enter(commit, pending, database);
+    changeState(root, [&](common::Cache& cache) { applyIndexUpdates(pending.files, cache.write()); });
+    clearJournal(database);
     return commit.commit;
 }
 
@@ -305,9 +306,9 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     auto const cache = readState(root);
     common::State const& state = cache->read();
     Connection server(database); // Without one there is nothing to begin.
-    learnHistory(root, database, server, Compared::theEnd);
+    fetchHistory(root, database, server, Compared::theEnd);
     failIfNotAtTheEnd(database, state.head);
-    Draft draft{root, database, start, database.commits().files(database.base()), {}, {}};
+    Draft draft{root, database, start, database.commits().files(database.currentCommit()), {}, {}};
     FolderChanges const changes = compareWithBase(draft);
     failIfBehindLink(state, root);
     std::vector<PlannedFile> plan =
@@ -327,19 +328,20 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     }
     keepContents(draft, plan);
     failIfBack(plan, state, root);
-    draft.work.document = documentOf(draft, order, state.head);
-    NewCommit checked = readCommitInfo(draft.work.document); // What is refused must not be noted: it could never end.
+    draft.pending.document = documentOf(draft, order, state.head);
+    NewCommit checked =
+        readCommitInfo(draft.pending.document); // What is refused must not get into the journal: it could never end.
     requireHash(checked);
-    Change change(database.database());
-    note(draft.work, database);
+    WriteTransaction transaction(database.database());
+    writeJournal(draft.pending, database);
     database.addVerified(settledFiles(std::move(draft.verified), start));
-    change.commit();
-    return {finish(root, database, draft.work, std::move(checked)), true};
+    transaction.commit();
+    return {finish(root, database, draft.pending, std::move(checked)), true};
 }
 
-CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, CommitUnderWay const& work)
+CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, PendingCommit const& pending)
 {
-    return finish(root, database, work, readCommitInfo(work.document));
+    return finish(root, database, pending, readCommitInfo(pending.document));
 }
 
 } // namespace tav

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "host/commits/planned_removals.h"
-#include "host/repository/unfinished.h"
+#include "host/repository/journal.h"
 
 #include <cstdint>
 
@@ -27,6 +27,6 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
 
 /// Sends a commit whose contents are stored, unless the server has it, and enters it here. Throws `Failure`; when it is
 /// the server that refuses, the commit is given up.
-CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, CommitUnderWay const& work);
+CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, PendingCommit const& pending);
 
 } // namespace tav

@@ -1,7 +1,7 @@
 #include "host/commits/commit_names.h"
 
-#include "host/failure.h"
-#include "host/text/wide.h"
+#include "host/errors/failure.h"
+#include "host/text/utf8.h"
 
 #include <charconv>
 #include <optional>
@@ -25,7 +25,7 @@ std::optional<CommitRecord> findByHash(CommitTables const& commits, std::string 
     if (typed.size() < kShortestPrefix) {
         return std::nullopt;
     }
-    std::vector<CommitRecord> found = commits.withPrefix(wide(typed));
+    std::vector<CommitRecord> found = commits.withPrefix(fromUtf8(typed));
     if (found.size() > 1) {
         throw Failure("Several commits begin with '" + typed + "'.", "Type more of the hash, or the number.");
     }
@@ -36,9 +36,9 @@ std::optional<CommitRecord> find(LocalDatabase const& database, std::string cons
 {
     CommitTables const& commits = database.commits();
     if (typed.empty()) {
-        return commits.find(database.base());
+        return commits.find(database.currentCommit());
     }
-    if (auto const reference = commits.reference(wide(typed))) {
+    if (auto const reference = commits.reference(fromUtf8(typed))) {
         return commits.find(reference->commitHash);
     }
     if (auto const number = numberIn(typed)) {

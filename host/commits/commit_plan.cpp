@@ -1,6 +1,6 @@
 #include "host/commits/commit_plan.h"
 
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include "common/mu_common_diff.h"
 

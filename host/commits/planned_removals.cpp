@@ -1,7 +1,7 @@
 #include "host/commits/planned_removals.h"
 
 #include "host/changes/missing_files.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include <algorithm>
 #include <set>

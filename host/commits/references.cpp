@@ -1,8 +1,8 @@
 #include "host/commits/references.h"
 
-#include "host/failure.h"
-#include "host/repository/server_of.h"
-#include "host/server/commit_document.h"
+#include "host/client/connection.h"
+#include "host/errors/failure.h"
+#include "host/protocol/commit_document.h"
 #include "host/text/characters.h"
 
 namespace tav {
@@ -18,9 +18,9 @@ void makeReference(LocalDatabase& database, common::Reference const& reference)
     }
     Connection(database).request(
         "references", referenceChanges({{reference, OdString::kEmpty}})); // It is made, not moved.
-    Change change(database.database());
+    WriteTransaction transaction(database.database());
     database.commits().set(reference);
-    change.commit();
+    transaction.commit();
 }
 
 } // namespace tav

@@ -1,6 +1,6 @@
 #include "host/database/sqlite.h"
 
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include <sqlite3.h>
 
@@ -171,12 +171,12 @@ void Database::fail(int code) const
 }
 
 // A savepoint, unlike a transaction, may stand inside of a change.
-Snapshot::Snapshot(Database& database) : database_(database)
+ReadTransaction::ReadTransaction(Database& database) : database_(database)
 {
     database_.run("SAVEPOINT reading");
 }
 
-Snapshot::~Snapshot()
+ReadTransaction::~ReadTransaction()
 {
     try {
         database_.run("RELEASE reading");
@@ -185,12 +185,12 @@ Snapshot::~Snapshot()
     }
 }
 
-Change::Change(Database& database) : database_(database)
+WriteTransaction::WriteTransaction(Database& database) : database_(database)
 {
     database_.run("BEGIN IMMEDIATE");
 }
 
-Change::~Change()
+WriteTransaction::~WriteTransaction()
 {
     if (!isOpen_) {
         return;
@@ -202,7 +202,7 @@ Change::~Change()
     }
 }
 
-void Change::commit()
+void WriteTransaction::commit()
 {
     database_.run("COMMIT");
     isOpen_ = false;

@@ -83,12 +83,12 @@ private:
 
 /// While it lives everything that is read is of one moment, whatever others change meanwhile. Other programs have to
 /// wait with their changes, so it is not held for long.
-class Snapshot {
+class ReadTransaction {
 public:
-    explicit Snapshot(Database& database);
-    Snapshot(Snapshot const&) = delete;
-    Snapshot& operator=(Snapshot const&) = delete;
-    ~Snapshot();
+    explicit ReadTransaction(Database& database);
+    ReadTransaction(ReadTransaction const&) = delete;
+    ReadTransaction& operator=(ReadTransaction const&) = delete;
+    ~ReadTransaction();
 
 private:
     Database& database_;
@@ -96,12 +96,12 @@ private:
 
 /// Makes changes one: all of them are in the file when `commit` returns, and none when it is not called or a crash
 /// comes first. Others wait until the change is over.
-class Change {
+class WriteTransaction {
 public:
-    explicit Change(Database& database);
-    Change(Change const&) = delete;
-    Change& operator=(Change const&) = delete;
-    ~Change();
+    explicit WriteTransaction(Database& database);
+    WriteTransaction(WriteTransaction const&) = delete;
+    WriteTransaction& operator=(WriteTransaction const&) = delete;
+    ~WriteTransaction();
 
     void commit();
 

@@ -1,6 +1,6 @@
 #include "host/repository/conflicts.h"
 
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include "platform/os/os_files.h"
 

@@ -1,6 +1,6 @@
 #include "host/repository/ignore_file.h"
 
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include "platform/os/os_open_file.h"
 #include "platform/ut/FileName.h"

@@ -1,7 +1,7 @@
 #include "host/repository/local_database.h"
 
-#include "host/failure.h"
-#include "host/text/wide.h"
+#include "host/errors/failure.h"
+#include "host/text/utf8.h"
 
 #include "platform/ut/Dir.h"
 #include "platform/ut/FileName.h"
@@ -96,12 +96,12 @@ LocalDatabase::LocalDatabase(std::string const& path, Use use)
 
 void LocalDatabase::migrate()
 {
-    Change change(database_);
+    WriteTransaction transaction(database_);
     for (std::int64_t version = database_.version(); version < kVersion; ++version) { // Another process may have been
         kSteps[static_cast<std::size_t>(version)](database_);                         // faster.
         database_.setVersion(version + 1);
     }
-    change.commit();
+    transaction.commit();
 }
 
 VerifiedFileList LocalDatabase::verifiedFiles() const
@@ -125,10 +125,10 @@ void LocalDatabase::failIfDamaged() const
 
 void LocalDatabase::setServer(OdString const& folder, OdString const& repositoryId)
 {
-    Change change(database_);
+    WriteTransaction transaction(database_);
     setValue("server", folder);
     setValue("repository", repositoryId);
-    change.commit();
+    transaction.commit();
 }
 
 OdString LocalDatabase::urlOf(OdString const& digest) const
@@ -158,13 +158,13 @@ void LocalDatabase::addContent(OdString const& url, OdString const& digest, std:
 OdString LocalDatabase::value(char const* key) const
 {
     Statement row = database_.prepare("SELECT value FROM settings WHERE key = ?");
-    return row.with(wide(key)).next() ? row.text(0) : OdString();
+    return row.with(fromUtf8(key)).next() ? row.text(0) : OdString();
 }
 
 void LocalDatabase::setValue(char const* key, OdString const& value)
 {
     Statement row = database_.prepare("INSERT OR REPLACE INTO settings VALUES (?, ?)");
-    row.with(wide(key)).with(value).run();
+    row.with(fromUtf8(key)).with(value).run();
 }
 
 } // namespace tav

@@ -1,7 +1,7 @@
 /// What a working folder knows of its history: the database "tav.db" in ".tav".
 #pragma once
 
-#include "host/database/commit_tables.h"
+#include "host/history/commit_tables.h"
 #include "host/repository/verified_files.h"
 
 #include "common/mu_common_repo_prop.h"
@@ -39,7 +39,7 @@ public:
 
     /// What is known of working files without reading them.
     VerifiedFileList verifiedFiles() const;
-    void addVerified(VerifiedFileList const& files); ///< part of a `Change` of the caller
+    void addVerified(VerifiedFileList const& files); ///< part of a `WriteTransaction` of the caller
 
     /// Where the history is kept, and under which identifier; empty before `tav init` has found out.
     OdString serverFolder() const { return value("server"); }
@@ -47,12 +47,12 @@ public:
     void setServer(OdString const& folder, OdString const& repositoryId);
 
     /// Hash of the commit that the working folder stands on; empty before the first commit.
-    OdString base() const { return value("base"); }
-    void setBase(OdString const& hash) { setValue("base", hash); }
+    OdString currentCommit() const { return value("base"); }
+    void setCurrentCommit(OdString const& hash) { setValue("base", hash); }
 
     /// What a command has begun and not ended, as the document that the command wrote; empty when there is nothing.
-    OdString unfinished() const { return value("unfinished"); }
-    void setUnfinished(OdString const& document) { setValue("unfinished", document); }
+    OdString journal() const { return value("unfinished"); }
+    void setJournal(OdString const& document) { setValue("unfinished", document); }
 
     /// URL of a content of this digest that is kept in a revision store; empty when none is known.
     OdString urlOf(OdString const& digest) const;

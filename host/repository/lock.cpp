@@ -1,6 +1,6 @@
 #include "host/repository/lock.h"
 
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include <unistd.h>
 

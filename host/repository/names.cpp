@@ -1,7 +1,7 @@
 #include "host/repository/names.h"
 
-#include "host/failure.h"
-#include "host/text/wide.h"
+#include "host/errors/failure.h"
+#include "host/text/utf8.h"
 
 #include <filesystem>
 #include <regex>
@@ -44,8 +44,8 @@ OdString pathInRepository(common::RootPath const& root, std::string const& typed
     if (typed.empty()) {
         throw Failure("An empty name names no file.", "Type '.' for the folder that you are in.");
     }
-    common::RootPath const absolute(wide(normalized((root.path() + L"/").ansi_str()).string()));
-    OdString const path = wide(normalized(typed).string());
+    common::RootPath const absolute(fromUtf8(normalized((root.path() + L"/").ansi_str()).string()));
+    OdString const path = fromUtf8(normalized(typed).string());
     if (path == absolute.path()) {
         return OdString::kEmpty;
     }
@@ -61,7 +61,7 @@ OdString pathInRepository(common::RootPath const& root, std::string const& typed
 OdString findUnchanged(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root)
 {
     try {
-        return common::RepoFileExplorer(changes, root).findUnchanged(wide(name));
+        return common::RepoFileExplorer(changes, root).findUnchanged(fromUtf8(name));
     } catch (std::regex_error const&) {
         throw noExpression(name);
     }
@@ -96,7 +96,7 @@ std::vector<common::StagedFile> NameFinder::find(std::string const& typed) const
         return {common::StagedFile(exact->first, exact->second)};
     }
     std::vector<common::StagedFile> inFolder = findInFolder(path);
-    return inFolder.empty() ? findByExpression(wide(typed)) : inFolder;
+    return inFolder.empty() ? findByExpression(fromUtf8(typed)) : inFolder;
 }
 
 std::vector<common::StagedFile> NameFinder::findInFolder(OdString const& folder) const

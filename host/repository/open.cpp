@@ -1,7 +1,7 @@
 #include "host/repository/open.h"
 
-#include "host/failure.h"
-#include "host/text/wide.h"
+#include "host/errors/failure.h"
+#include "host/text/utf8.h"
 
 #include <filesystem>
 
@@ -26,16 +26,16 @@ fs::path currentFolder()
 common::RootPath findRepository(std::string const& folder)
 {
     if (!folder.empty()) {
-        return valueOrFail(common::RootPath::get(wide(folder), false), kHowToInit);
+        return valueOrFail(common::RootPath::get(fromUtf8(folder), false), kHowToInit);
     }
     fs::path const start = currentFolder();
     for (fs::path place = start;; place = place.parent_path()) {
-        auto const found = common::RootPath::get(wide(place.string()), false);
+        auto const found = common::RootPath::get(fromUtf8(place.string()), false);
         if (found.hasValue()) {
             return found.value();
         }
         if (place == place.parent_path()) {
-            return valueOrFail(common::RootPath::get(wide(start.string()), false), kHowToInit);
+            return valueOrFail(common::RootPath::get(fromUtf8(start.string()), false), kHowToInit);
         }
     }
 }

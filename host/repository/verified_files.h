@@ -4,8 +4,8 @@
 /// on, and may be written at any time after the file was read.
 #pragma once
 
-#include "host/changes/file_stamp.h"
 #include "host/database/sqlite.h"
+#include "host/repository/file_stamp.h"
 
 #include <string>
 #include <vector>
@@ -31,7 +31,7 @@ public:
     static void create(Database& database);
 
     VerifiedFileList all() const;
-    /// Adds `files`, in place of what was recorded of the same paths. Part of a `Change` of the caller.
+    /// Adds `files`, in place of what was recorded of the same paths. Part of a `WriteTransaction` of the caller.
     void put(VerifiedFileList const& files);
 
 private:

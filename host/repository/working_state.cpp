@@ -1,6 +1,6 @@
 #include "host/repository/working_state.h"
 
-#include "host/save_report.h"
+#include "host/errors/save_report.h"
 
 #include "platform/os/os_files.h"
 

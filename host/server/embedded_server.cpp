@@ -1,13 +1,13 @@
 #include "host/server/embedded_server.h"
 
-#include "host/failure.h"
-#include "host/server/commit_document.h"
-#include "host/server/document.h"
-#include "host/server/fetch_document.h"
-#include "host/server/history_document.h"
+#include "host/errors/failure.h"
+#include "host/protocol/commit_document.h"
+#include "host/protocol/document.h"
+#include "host/protocol/fetch_document.h"
+#include "host/protocol/history_document.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "common/mu_common_json_keys.h"
 #include "platform/os/os_files.h"
@@ -55,11 +55,11 @@ void createTables(Database& database)
 void prepareTables(Database& database)
 {
     if (database.version() == 0) {
-        Change change(database);
+        WriteTransaction transaction(database);
         if (database.version() == 0) {
             createTables(database);
         }
-        change.commit();
+        transaction.commit();
     }
     if (database.version() != kTablesVersion) {
         throw Failure(
@@ -199,7 +199,7 @@ OdString answerVersion(Request const&)
 OdString answerInit(Request const& request)
 {
     OdString const name = readRepositoryName(request.document);
-    Change change(request.database);
+    WriteTransaction transaction(request.database);
     Statement addRepository =
         request.database.prepare("INSERT INTO repositories(id, name) VALUES (lower(hex(randomblob(16))), ?)");
     addRepository.with(name).run();
@@ -207,7 +207,7 @@ OdString answerInit(Request const& request)
     Object answer;
     answer[L"id"] = jsonText(row.next() ? row.text(0) : OdString());
     row.reset();
-    change.commit();
+    transaction.commit();
     return compactText(answer);
 }
 
@@ -226,14 +226,14 @@ OdString answerCommit(Request const& request, Force force)
     NewCommit added = readCommitInfo(request.document);
     requireHash(added);
     CommitTables tables(request.database, request.repository.key);
-    Change change(request.database);
+    WriteTransaction transaction(request.database);
     bool const isNew = addUnlessThere(tables, added);
     for (ReferenceChange const& reference : added.references) {
         if (isNew || force == Force::yes || !hasPassed(tables, reference.reference, added.commit.hash)) {
             setReference(tables, reference, force);
         }
     }
-    change.commit();
+    transaction.commit();
     return compactText(numbersDocument({{added.commit.number, added.commit.hash}}));
 }
 
@@ -242,14 +242,14 @@ OdString answerReferences(Request const& request, Force force)
     std::vector<ReferenceChange> wanted = readReferences(request.document);
     CommitTables tables(request.database, request.repository.key);
     if (!wanted.empty()) { // Who only asks does not wait for those who write.
-        Change change(request.database);
+        WriteTransaction transaction(request.database);
         for (ReferenceChange& reference : wanted) {
             if (force == Force::no && !reference.expected) {
                 reference.expected = OdString(); // Who does not say what is there does not know of it.
             }
             setReference(tables, reference, force);
         }
-        change.commit();
+        transaction.commit();
     }
     return compactText(referencesDocument(tables.references()));
 }
@@ -328,7 +328,7 @@ Verb const& verbOrFail(OdString const& name, OdString const& repository)
 
 ErrorMessage messageOf(std::string const& text)
 {
-    return ErrorMessage(wide(text));
+    return ErrorMessage(fromUtf8(text));
 }
 
 } // namespace
@@ -363,7 +363,7 @@ Database& EmbeddedServer::openDatabase()
     if (database_) {
         return *database_;
     }
-    if (missing_ == Missing::isAnError && !ut::FileName::fileExists(wide(folder_ + "/server.db"))) {
+    if (missing_ == Missing::isAnError && !ut::FileName::fileExists(fromUtf8(folder_ + "/server.db"))) {
         throw withCode(
             Failure("There is no server in '" + folder_ + "'.", "Bring it back; it may lie on a drive that is off."),
             ServerError::noServer);

@@ -1,9 +1,9 @@
 /// A server in a folder, for those who share a network drive and run no other.
 #pragma once
 
-#include "host/server/server.h"
+#include "host/protocol/server.h"
 
-#include "host/database/commit_tables.h"
+#include "host/history/commit_tables.h"
 
 #include <optional>
 #include <string>

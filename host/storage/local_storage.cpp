@@ -2,6 +2,8 @@
 
 #include "host/storage/cleaning.h"
 #include "host/storage/storage_error.h"
+#include "host/text/characters.h"
+#include "host/text/utf8.h"
 
 #include "platform/os/os_files.h"
 
@@ -22,16 +24,6 @@ namespace {
 constexpr std::size_t kFewFiles = 8;
 constexpr char const* kStoreEnd = ".tf";
 
-OdString wide(std::string const& text)
-{
-    return OdString(text.data(), text.size(), CP_UTF_8);
-}
-
-std::string quoted(OdString const& text)
-{
-    return "'" + text.ansi_str() + "'";
-}
-
 ErrorMessage withCode(ErrorMessage message, int code)
 {
     message.code = code;
@@ -45,7 +37,7 @@ Expected<T> guarded(Work const& work)
     try {
         return work();
     } catch (StorageError const& error) {
-        return withCode(ErrorMessage(wide(error.what)), error.code);
+        return withCode(ErrorMessage(fromUtf8(error.what)), error.code);
     } catch (std::bad_alloc const&) {
         return withCode(ErrorMessage(OdString(L"There is not enough memory to work on the storage.")), ENOMEM);
     }
@@ -238,7 +230,7 @@ Expected<bool> LocalStorage::repair(common::RootPath const& root, OdString const
 // Where it should be: what is damaged or gone there is mended for all commits that name it.
 std::optional<StorageUrl> LocalStorage::knownPlace(DigestBytes const& digest) const
 {
-    std::optional<StorageUrl> url = knownUrl_ ? parseUrl(knownUrl_(wide(hexOf(digest)))) : std::nullopt;
+    std::optional<StorageUrl> url = knownUrl_ ? parseUrl(knownUrl_(fromUtf8(hexOf(digest)))) : std::nullopt;
     return url && url->digest == digest ? url : std::nullopt;
 }
 

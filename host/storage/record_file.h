@@ -2,8 +2,8 @@
 #pragma once
 
 #include "host/storage/content.h"
+#include "host/storage/frames.h"
 #include "host/storage/record.h"
-#include "host/storage/segments.h"
 
 #include "platform/os/os_open_file.h"
 

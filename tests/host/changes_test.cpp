@@ -1,5 +1,5 @@
 #include "host/changes/changes.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/storage/storage_url.h"
 
 #include "tests/support/temp_repository.h"

@@ -56,7 +56,7 @@ protected:
 
 TEST_F(OlderDatabase, LearnsWhatTheServerHas)
 {
-    EXPECT_EQ(tav({"fetch"}), done("Learned 3 commits.\nBranches and tags that are new or have moved: 1.\n"));
+    EXPECT_EQ(tav({"fetch"}), done("Fetched 3 commits.\nBranches and tags that are new or have moved: 1.\n"));
     EXPECT_THAT(numbersKnown(), ElementsAre("1", "2", "3", "4"));
     EXPECT_EQ(tav({"fetch"}), done("Nothing is new on the server.\n"));
     EXPECT_EQ(tav({"switch", "master"}).code, 0);
@@ -153,7 +153,7 @@ TEST_F(TwoFolders, LearnEachOthersCommitsWithTheirOwn)
     for (std::string const commit : {"1", "2", "3"}) {
         EXPECT_EQ(shownIn(other(), commit), shownIn(repo.path(), commit));
     }
-    EXPECT_EQ(inOther({"fetch"}), done("Learned 1 commit.\nBranches and tags that are new or have moved: 1.\n"));
+    EXPECT_EQ(inOther({"fetch"}), done("Fetched 1 commit.\nBranches and tags that are new or have moved: 1.\n"));
     EXPECT_EQ(shownIn(other(), "4"), shownIn(repo.path(), "4"));
     EXPECT_EQ(inOther({"log", "master"}).out, tav({"log", "master"}).out);
 }

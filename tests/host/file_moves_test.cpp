@@ -1,5 +1,5 @@
 #include "host/checkout/file_moves.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include "platform/os/os_calls.h"
 #include "tests/support/failing_call.h"

@@ -1,6 +1,6 @@
 #include "host/repository/local_database.h"
 
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include "tests/support/temp_repository.h"
 

@@ -1,7 +1,7 @@
 #include "tests/host/run_here.h"
 #include "tests/host/tav_test.h"
 
-#include "host/repository/unfinished.h"
+#include "host/repository/journal.h"
 
 #include "platform/os/os_calls.h"
 #include "platform/os/os_lock.h"
@@ -175,7 +175,7 @@ TEST_F(Lock, IsNotTakenThroughALink)
 TEST_F(Lock, OfARunningCommandKeepsItsWorkFromBeingCalledInterrupted)
 {
     tav::LocalDatabase database = tav::LocalDatabase::make(repo.root());
-    tav::note(tav::CommitUnderWay{L"{}", {}, {}}, database);
+    tav::writeJournal(tav::PendingCommit{L"{}", {}, {}}, database);
     {
         os::FileLock const lock = hold("'tav commit', process 7 on studio");
         for (char const* const command : {"status", "log"}) {

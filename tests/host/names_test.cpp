@@ -1,4 +1,4 @@
-#include "host/failure.h"
+#include "host/errors/failure.h"
 #include "host/repository/names.h"
 
 #include "tests/support/rows.h"

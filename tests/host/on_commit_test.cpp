@@ -1,7 +1,7 @@
 #include "host/changes/folder_view.h"
 #include "host/repository/local_database.h"
 #include "host/storage/storage_url.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "tests/host/tav_test.h"
 
@@ -25,13 +25,13 @@ protected:
             std::string const content = "committed " + std::string(name);
             repo.write(name, content);
             OdString const digest = generateSha(content.data(), static_cast<int>(content.size()));
-            files_.push_back({tav::wide(name), L"po:" + digest, OdString()});
+            files_.push_back({tav::fromUtf8(name), L"po:" + digest, OdString()});
             database.addContent(L"po:" + digest, digest, content.size());
         }
         ++number_;
         OdString const hash = OdString().format(L"%064d", number_);
         database.commits().add({number_, hash, L"ann", L"drawn", 0, {}}, files_);
-        database.setBase(hash);
+        database.setCurrentCommit(hash);
     }
 
     void remove(std::string_view name) const { ASSERT_EQ(unlink(repo.pathTo(name).c_str()), 0); }
@@ -151,7 +151,7 @@ TEST_F(StatusOnCommit, DoesNotReadAFileThatIsKnown)
     commit({"a.dwg"});
     repo.write("a.dwg", "changed");
     tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
-    std::string const url = database.commits().fileList(database.base()).front().url;
+    std::string const url = database.commits().fileList(database.currentCommit()).front().url;
     database.addVerified(
         {{"a.dwg", std::string(tav::digestIn(url)), *tav::FolderView(repo.root()).look(L"a.dwg").stamp}});
     EXPECT_EQ(status(), "Nothing has changed since the last commit.\n");

@@ -1,4 +1,4 @@
-#include "host/progress.h"
+#include "host/terminal/progress.h"
 
 #include "tests/host/run_tav.h"
 

@@ -7,7 +7,7 @@
 #include "host/changes/folder_view.h"
 #include "host/repository/local_database.h"
 #include "host/storage/local_storage.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 #include "platform/os/os_calls.h"
 
 #include <algorithm>
@@ -121,7 +121,7 @@ std::string falseRecords(common::RootPath const& root)
     for (tav::VerifiedFile const& file : tav::LocalDatabase::open(root).verifiedFiles()) {
         bool const isBelieved = view.look(file.path).stamp == file.stamp;
         if (isBelieved &&
-            tav::fileDigest(root.pathTo(tav::wide(file.path))) != OdString(file.digest.c_str(), CP_UTF_8)) {
+            tav::fileDigest(root.pathTo(tav::fromUtf8(file.path))) != OdString(file.digest.c_str(), CP_UTF_8)) {
             names += "wrongly believed: " + file.path + "\n";
         }
     }
@@ -319,7 +319,7 @@ void storeWhatNobodyNeeds(Scene const& scene)
     scene.write("note.txt", "nobody's");
     {
         tav::LocalDatabase const database = tav::LocalDatabase::open(scene.root());
-        tav::Tree const files = database.commits().files(database.base());
+        tav::Tree const files = database.commits().files(database.currentCommit());
         tav::LocalStorage storage([&](OdString const& path) { return files.at(path); });
         require(storage.store(scene.root(), L"plan.dwg").hasValue(), "store a drawing");
         require(storage.store(scene.root(), L"note.txt").hasValue(), "store a text");

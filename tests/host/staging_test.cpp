@@ -1,5 +1,5 @@
 #include "host/changes/staging.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include <gmock/gmock.h>
 

@@ -1,5 +1,5 @@
-#include "host/database/commit_tables.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
+#include "host/history/commit_tables.h"
 
 #include "tests/host_server/server_test.h"
 
@@ -42,9 +42,9 @@ protected:
             words >> path >> url >> previous;
             files.push_back({wideText(path), wideText(url), wideText(previous)});
         }
-        tav::Change change(database);
+        tav::WriteTransaction transaction(database);
         tables.add(commit, files);
-        change.commit();
+        transaction.commit();
     }
 
     std::string files(char hash) const

@@ -1,5 +1,5 @@
 #include "host/database/sqlite.h"
-#include "host/failure.h"
+#include "host/errors/failure.h"
 
 #include "tests/support/temp_folder.h"
 
@@ -79,12 +79,12 @@ TEST_F(DatabaseTest, RunsNothingThatAStrangerPutIntoTheFile)
     EXPECT_THROW(database.prepare("SELECT * FROM shown"), tav::Failure);
 }
 
-TEST_F(DatabaseTest, ReadsOneMomentWhileASnapshotLives)
+TEST_F(DatabaseTest, ReadsOneMomentWhileAReadTransactionLives)
 {
     add(1, L"one");
     tav::Database other(path);
     {
-        tav::Snapshot const snapshot(database);
+        tav::ReadTransaction const transaction(database);
         EXPECT_EQ(notes(database), "1 one;");
         EXPECT_THROW(
             tav::Database(path, std::chrono::milliseconds(0)).run("INSERT INTO notes VALUES (2, 'two')"), tav::Failure);
@@ -94,49 +94,49 @@ TEST_F(DatabaseTest, ReadsOneMomentWhileASnapshotLives)
     EXPECT_EQ(notes(database), "1 one;3 three;");
 }
 
-TEST_F(DatabaseTest, TakesASnapshotInsideOfAChange)
+TEST_F(DatabaseTest, ReadsInsideOfAWriteTransaction)
 {
-    tav::Change change(database);
+    tav::WriteTransaction transaction(database);
     add(1, L"one");
     {
-        tav::Snapshot const snapshot(database);
+        tav::ReadTransaction const reading(database);
         EXPECT_EQ(notes(database), "1 one;");
     }
-    change.commit();
+    transaction.commit();
     EXPECT_EQ(notes(database), "1 one;");
 }
 
-TEST_F(DatabaseTest, KeepsAChangeThatWasCommitted)
+TEST_F(DatabaseTest, KeepsWhatWasCommitted)
 {
-    tav::Change change(database);
+    tav::WriteTransaction transaction(database);
     add(1, L"one");
-    change.commit();
+    transaction.commit();
     EXPECT_EQ(notes(tav::Database(path)), "1 one;");
 }
 
-TEST_F(DatabaseTest, UndoesAChangeThatWasNotCommitted)
+TEST_F(DatabaseTest, UndoesWhatWasNotCommitted)
 {
     {
-        tav::Change const change(database);
+        tav::WriteTransaction const transaction(database);
         add(1, L"one");
         EXPECT_EQ(notes(database), "1 one;");
     }
     EXPECT_EQ(notes(database), "");
 }
 
-TEST_F(DatabaseTest, ShowsOthersNothingOfAnOpenChange)
+TEST_F(DatabaseTest, ShowsOthersNothingOfAnOpenTransaction)
 {
-    tav::Change const change(database);
+    tav::WriteTransaction const transaction(database);
     add(1, L"one");
     EXPECT_EQ(notes(tav::Database(path, milliseconds(1))), "");
 }
 
 TEST_F(DatabaseTest, SaysThatAnotherProgramUsesIt)
 {
-    tav::Change const change(database);
+    tav::WriteTransaction const transaction(database);
     tav::Database other(path, milliseconds(1));
     EXPECT_EQ(
-        failureOf([&] { tav::Change const second(other); }),
+        failureOf([&] { tav::WriteTransaction const second(other); }),
         "The database '" + path +
             "' cannot be used: database is locked. Another program uses it; run the command again when that is done.");
 }

@@ -4,7 +4,7 @@
 #include "tests/support/rows.h"
 #include "tests/support/utf8.h"
 
-#include "host/server/history_document.h"
+#include "host/protocol/history_document.h"
 
 #include <gtest/gtest.h>
 

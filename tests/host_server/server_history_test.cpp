@@ -1,8 +1,8 @@
 #include "tests/host_server/server_test.h"
 #include "tests/support/rows.h"
 
-#include "host/failure.h"
-#include "host/server/history_document.h"
+#include "host/errors/failure.h"
+#include "host/protocol/history_document.h"
 
 #include <gtest/gtest.h>
 

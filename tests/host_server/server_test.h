@@ -5,8 +5,8 @@
 /// repository.
 #pragma once
 
-#include "host/server/commit_document.h"
-#include "host/server/commit_hash.h"
+#include "host/history/commit_hash.h"
+#include "host/protocol/commit_document.h"
 #include "host/server/embedded_server.h"
 
 #include "tests/support/temp_folder.h"

@@ -1,8 +1,8 @@
 // Small files that unfold into a lot. The commands on them run with little memory.
-#include "host/failure.h"
+#include "host/errors/failure.h"
+#include "host/protocol/commit_document.h"
 #include "host/repository/local_database.h"
-#include "host/server/commit_document.h"
-#include "host/text/wide.h"
+#include "host/text/utf8.h"
 
 #include "tests/host/history_test.h"
 #include "tests/host/run_here.h"
@@ -125,7 +125,7 @@ TEST_P(BombInAFile, IsRefusedAsADocumentForTheServer)
     Process process(setting(), [&] {
         limitMemory(4 * kMemory);
         try {
-            tav::readCommitInfo(tav::wide(GetParam().text()));
+            tav::readCommitInfo(tav::fromUtf8(GetParam().text()));
         } catch (tav::Failure const&) {
             return 1;
         } catch (std::bad_alloc const&) {
@@ -140,7 +140,7 @@ INSTANTIATE_TEST_SUITE_P(Kinds, BombInAFile, testing::ValuesIn(kBombs), support:
 
 TEST_P(BombInAFile, IsToldWhereACommandNotedWhatItHasBegun)
 {
-    tav::LocalDatabase::make(repo.root()).setUnfinished(tav::wide(GetParam().text()));
+    tav::LocalDatabase::make(repo.root()).setJournal(tav::fromUtf8(GetParam().text()));
     repo.write("a.dwg", "new");
     for (Arguments const& command : {Arguments{"status"}, {"add", "--all"}}) {
         expectAnswer(limited(command));

@@ -1,8 +1,8 @@
 // A history that somebody else has written into the database of a repository.
 #include "host/database/sqlite.h"
-#include "host/failure.h"
-#include "host/paths/recorded_path.h"
-#include "host/text/wide.h"
+#include "host/errors/failure.h"
+#include "host/history/tracked_path.h"
+#include "host/text/utf8.h"
 
 #include "tests/host/history_test.h"
 #include "tests/support/rows.h"
@@ -119,8 +119,8 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST_F(ForeignHistory, RemovesNothingOutsideOfTheRepository)
 {
-    callIt(tav::wide(wayOut()));
-    std::string const why = *tav::whyUnsafe(tav::wide(wayOut()));
+    callIt(tav::fromUtf8(wayOut()));
+    std::string const why = *tav::whyUnsafe(tav::fromUtf8(wayOut()));
     EXPECT_EQ(tav({"rm", "victim.dwg"}), failed("tav: " + why + " Nothing has been removed.\n"));
     EXPECT_EQ(tav({"rm", "."}), failed("tav: " + why + " Nothing has been removed.\n"));
     EXPECT_TRUE(repo.has("b.dwg"));
@@ -150,7 +150,7 @@ TEST_F(ForeignHistory, WritesNothingBehindALink)
 
 TEST_F(ForeignHistory, LeavesNoCommitBehindThatCannotBeCompleted)
 {
-    callIt(tav::wide(wayOut()));
+    callIt(tav::fromUtf8(wayOut()));
     repo.write("b.dwg", "changed");
     EXPECT_EQ(tav({"add", "b.dwg"}).code, 0);
     EXPECT_EQ(tav({"commit", "-m", "third"}).code, 1);

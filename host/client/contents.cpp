@@ -1,0 +1,32 @@
+#include "host/client/contents.h"
+
+#include "host/storage/local_storage.h"
+
+namespace tav {
+
+namespace {
+
+/// What has been entered as a content of this folder has to be here. Of the others some may have come by another way.
+bool isHere(OdString const& url, common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage)
+{
+    if (database.sizeOf(url)) {
+        return true;
+    }
+    auto const isKept = storage.contains(root, url);
+    return !isKept.hasValue() || isKept.value(); // One that cannot be looked for is not given up.
+}
+
+} // namespace
+
+Contents contentsOf(common::RootPath const& root, LocalDatabase const& database)
+{
+    Contents contents;
+    LocalStorage storage;
+    for (OdString const& url : database.commits().urls()) {
+        bool const here = isHere(url, root, database, storage);
+        (here ? contents.here : contents.elsewhere).push_back(url);
+    }
+    return contents;
+}
+
+} // namespace tav

@@ -1,0 +1,49 @@
+/// The session that every command which changes a repository runs in.
+#pragma once
+
+#include "host/repository/local_database.h"
+#include "host/repository/lock.h"
+
+#include <cstdint>
+#include <optional>
+#include <string>
+
+namespace tav {
+
+/// What a session does about an operation that an interrupted command has left in the journal.
+enum class Recovery {
+    required,  ///< completes it, or fails
+    attempted, ///< completes it unless that fails: the command can do without, for example while the server is away
+    skipped    ///< leaves it: the command changes where the server is
+};
+
+/// Holds the lock of a repository, so that nobody else changes it, and has completed what was interrupted.
+class WriteSession {
+public:
+    /// Takes the lock for the command `name`, and recovers. Throws `Failure`.
+    WriteSession(common::RootPath const& root, std::string const& name, Recovery recovery = Recovery::required);
+    /// The same for a command that holds the lock already, because it had to make files of the repository first.
+    WriteSession(common::RootPath const& root, os::FileLock lock, Recovery recovery);
+
+    common::RootPath const& root() const { return root_; }
+    LocalDatabase& database() { return database_; }
+    /// When the session began, by the clock of the file system that the working folder is on.
+    std::uint64_t start() const { return start_; }
+
+    /// The commit that the recovery has completed, if any.
+    std::optional<CommitRecord> const& recoveredCommit() const { return recoveredCommit_; }
+
+    /// Throws `Failure` when an interrupted command has left the files of two commits in the working folder.
+    void failIfBetweenCommits() const;
+
+private:
+    void recover();
+
+    common::RootPath root_;
+    os::FileLock lock_;
+    std::uint64_t start_;
+    LocalDatabase database_;
+    std::optional<CommitRecord> recoveredCommit_;
+};
+
+} // namespace tav

@@ -1,0 +1,15 @@
+/// Numbers of things in messages.
+#pragma once
+
+#include <cstddef>
+#include <string>
+
+namespace tav {
+
+/// "1 file", "2 files".
+inline std::string counted(std::size_t count, std::string const& noun)
+{
+    return std::to_string(count) + " " + noun + (count == 1 ? "" : "s");
+}
+
+} // namespace tav
