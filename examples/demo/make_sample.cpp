@@ -1,4 +1,4 @@
-// Makes the project that the demo shows: drawings, notes, prints, and what drawing editors leave lying about.
+// Makes the project that the demo shows: drawings, notes, prints, and what drawing editors leave behind.
 // The same bytes every time. Usage: make_sample FOLDER, which must not exist yet.
 
 #include <algorithm>
