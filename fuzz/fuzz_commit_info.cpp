@@ -2,6 +2,7 @@
 // read is clean: every path leads into the working folder, and no file is the folder of another.
 #include "host/errors/failure.h"
 #include "host/history/tracked_path.h"
+#include "host/history/reference_name.h"
 #include "host/protocol/commit_document.h"
 #include "host/protocol/members.h"
 
@@ -47,7 +48,7 @@ void check(std::vector<tav::ReferenceChange> const& changes)
     for (tav::ReferenceChange const& change : changes) {
         common::Reference const& reference = change.reference;
         require(!change.expected || change.expected->isEmpty() || tav::isHash(*change.expected));
-        require(!tav::whyNoReferenceName(reference.name) && tav::isHash(reference.commitHash));
+        require(!tav::whyNotReferenceName(reference.name) && tav::isHash(reference.commitHash));
         require(names.insert(reference.name.ansi_str()).second);
     }
 }

@@ -7,7 +7,10 @@
 #include "host/client/history.h"
 #include "host/errors/failure.h"
 #include "host/history/commit_hash.h"
+#include "host/history/tracked_path.h"
+#include "host/history/tree.h"
 #include "host/protocol/commit_document.h"
+#include "host/protocol/members.h"
 #include "host/repository/conflicts.h"
 #include "host/repository/working_state.h"
 #include "host/storage/local_storage.h"
@@ -113,7 +116,7 @@ void readBack(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& 
     }
 }
 
-OdString documentOf(Draft const& draft, CommitOrder const& order, OdString const& branch)
+NewCommit newCommit(Draft const& draft, CommitOrder const& order, OdString const& branch)
 {
     NewCommit added;
     added.commit.author = order.author;
@@ -130,7 +133,7 @@ OdString documentOf(Draft const& draft, CommitOrder const& order, OdString const
     auto const end = draft.database.commits().reference(branch);
     added.references.push_back(
         {{branch, added.commit.hash, common::EType::branch}, end ? end->commitHash : OdString::kEmpty});
-    return commitInfoDocument(added);
+    return added;
 }
 
 void failIfNotAtTheEnd(LocalDatabase const& database, OdString const& branch)
@@ -270,6 +273,34 @@ void failIfBack(std::vector<PlannedFile> const& plan, common::State const& state
     }
 }
 
+void requireSound(OdString const& text, std::string const& what)
+{
+    wchar_t const* const begin = text.c_str();
+    wchar_t const* const end = begin + text.getLength();
+    if (!isSound(text) || std::find(begin, end, L'\0') != end) {
+        throw Failure(what + " holds a NUL or half a character.", "Nothing has been committed; correct it.");
+    }
+}
+
+/// What the server can only refuse must not get into the journal: it could never end. The files of the last commit come
+/// from the database, which may come from anywhere.
+void requireRecordable(NewCommit const& added)
+{
+    requireSound(added.commit.author, "The author");
+    requireSound(added.commit.message, "The message");
+    for (FileRecord const& file : added.files) {
+        if (auto const fault = whyUnsafe(file.path)) {
+            throw Failure(*fault, "Nothing has been committed; rename the file.");
+        }
+        if (!isContentUrl(file.url)) {
+            throw Failure("The last commit has no content of " + quoted(file.path) + ".", "Run 'tav verify'.");
+        }
+    }
+    if (auto const fault = whyNotTree(added.files)) {
+        throw Failure("A commit " + *fault + ".", "Nothing has been committed; commit the removal of one of them too.");
+    }
+}
+
 /// Brings the contents into the storage, for good.
 void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
 {
@@ -328,15 +359,14 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     }
     keepContents(draft, plan);
     failIfBack(plan, state, root);
-    draft.pending.document = documentOf(draft, order, state.head);
-    NewCommit checked =
-        readCommitInfo(draft.pending.document); // What is refused must not get into the journal: it could never end.
-    requireHash(checked);
+    NewCommit added = newCommit(draft, order, state.head);
+    draft.pending.document = commitInfoDocument(added);
+    requireRecordable(added);
     WriteTransaction transaction(database.database());
     writeJournal(draft.pending, database);
     database.addVerified(settledFiles(std::move(draft.verified), start));
     transaction.commit();
-    return {finish(root, database, draft.pending, std::move(checked)), true};
+    return {finish(root, database, draft.pending, std::move(added)), true};
 }
 
 CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, PendingCommit const& pending)

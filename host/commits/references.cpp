@@ -2,6 +2,7 @@
 
 #include "host/client/connection.h"
 #include "host/errors/failure.h"
+#include "host/history/reference_name.h"
 #include "host/protocol/commit_document.h"
 #include "host/text/characters.h"
 
@@ -13,7 +14,7 @@ void makeReference(LocalDatabase& database, common::Reference const& reference)
         std::string const kind = old->type == common::EType::branch ? "branch" : "tag";
         throw Failure("There is a " + kind + " '" + reference.name.ansi_str() + "' already.", "Choose another name.");
     }
-    if (auto const fault = whyNoReferenceName(reference.name)) {
+    if (auto const fault = whyNotReferenceName(reference.name)) {
         throw Failure("The name " + quoted(reference.name) + " " + *fault + ".", "Choose another name.");
     }
     Connection(database).request(

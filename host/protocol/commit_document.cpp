@@ -2,16 +2,17 @@
 
 #include "host/errors/failure.h"
 #include "host/history/commit_hash.h"
+#include "host/history/reference_name.h"
+#include "host/history/tree.h"
 #include "host/protocol/document.h"
 #include "host/protocol/members.h"
+#include "host/protocol/timestamp.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
 
 #include "common/mu_common_json_keys.h"
-#include "platform/sdk/OdTimeStamp.h"
 
 #include <algorithm>
-#include <array>
 #include <cstddef>
 #include <memory>
 #include <utility>
@@ -22,81 +23,7 @@ namespace {
 
 namespace keys = common::json;
 
-constexpr std::size_t kHashLength = 64;
 constexpr wchar_t const* kExpected = L"expected";
-constexpr std::size_t kLongestName = 255;
-
-bool isDigit(wchar_t c)
-{
-    return c >= L'0' && c <= L'9';
-}
-
-bool isHex(wchar_t c)
-{
-    return isDigit(c) || (c >= L'a' && c <= L'f') || (c >= L'A' && c <= L'F');
-}
-
-template <class Predicate>
-bool all(OdString const& text, Predicate const& predicate)
-{
-    wchar_t const* const begin = text.c_str();
-    return std::all_of(begin, begin + text.getLength(), predicate);
-}
-
-bool contains(OdString const& text, wchar_t const* part)
-{
-    return std::wstring_view(text.c_str(), text.getLength()).find(part) != std::wstring_view::npos;
-}
-
-bool beginsWith(OdString const& text, OdString const& beginning)
-{
-    return text.getLength() >= beginning.getLength() &&
-           std::equal(beginning.c_str(), beginning.c_str() + beginning.getLength(), text.c_str());
-}
-
-bool isEdge(OdString const& name, wchar_t c)
-{
-    return name.getAt(0) == c || name.getAt(name.getLength() - 1) == c;
-}
-
-/// What is wrong with a name that people read; null when nothing is.
-char const* faultOfName(OdString const& name)
-{
-    if (name.isEmpty()) {
-        return "is empty";
-    }
-    if (name.ansi_str().size() > kLongestName) {
-        return "is longer than 255 bytes";
-    }
-    if (!all(name, [](wchar_t c) { return !isControl(c); })) {
-        return "holds a control character";
-    }
-    if (!isSound(name)) {
-        return "holds half a character";
-    }
-    return isEdge(name, L' ') ? "begins or ends with a blank" : nullptr;
-}
-
-char const* faultOfReferenceName(OdString const& name)
-{
-    if (char const* const fault = faultOfName(name)) {
-        return fault;
-    }
-    if (name.getAt(0) == L'-') {
-        return "begins with a dash";
-    }
-    if (isEdge(name, L'/')) {
-        return "begins or ends with a slash";
-    }
-    if (contains(name, L"..")) {
-        return "holds two dots in a row";
-    }
-    if (all(name, isDigit)) {
-        return "could be taken for the number of a commit";
-    }
-    return name.getLength() == kHashLength && all(name, isHex) ? "could be taken for the hash of a commit" : nullptr;
-}
-
 std::int64_t readDate(Part const& part)
 {
     auto const seconds = secondsOf(part.text());
@@ -118,34 +45,6 @@ FileRecord readFile(Part const& part)
     return file;
 }
 
-/// Sorts '/' before every other character, so that the content of a folder follows the folder at once.
-bool isBeforeInTree(FileRecord const* a, FileRecord const* b)
-{
-    auto const rank = [](wchar_t c) { return c == L'/' ? L'\0' : c; };
-    return std::lexicographical_compare(
-        a->path.c_str(), a->path.c_str() + a->path.getLength(), b->path.c_str(), b->path.c_str() + b->path.getLength(),
-        [rank](wchar_t c, wchar_t d) { return rank(c) < rank(d); });
-}
-
-void checkTree(Part const& part, std::vector<FileRecord> const& files)
-{
-    std::vector<FileRecord const*> sorted;
-    sorted.reserve(files.size());
-    for (FileRecord const& file : files) {
-        sorted.push_back(&file);
-    }
-    std::sort(sorted.begin(), sorted.end(), isBeforeInTree);
-    for (std::size_t i = 1; i < sorted.size(); ++i) {
-        OdString const& before = sorted[i - 1]->path;
-        if (before == sorted[i]->path) {
-            part.refuse("must not hold the path " + quoted(before) + " twice");
-        }
-        if (beginsWith(sorted[i]->path, before + L"/")) {
-            part.refuse("must not hold " + quoted(before) + " both as a file and as a folder");
-        }
-    }
-}
-
 std::vector<FileRecord> readFiles(Part const& part)
 {
     std::vector<FileRecord> files;
@@ -154,7 +53,9 @@ std::vector<FileRecord> readFiles(Part const& part)
     for (std::size_t i = 0; i < count; ++i) {
         files.push_back(readFile(part[i]));
     }
-    checkTree(part, files);
+    if (auto const fault = whyNotTree(files)) {
+        part.refuse(*fault);
+    }
     return files;
 }
 
@@ -185,8 +86,8 @@ common::EType readType(Part const& part)
 OdString readReferenceName(Part const& part)
 {
     OdString name = part.text();
-    if (char const* const fault = faultOfReferenceName(name)) {
-        part.refuse(fault);
+    if (auto const fault = whyNotReferenceName(name)) {
+        part.refuse(*fault);
     }
     return name;
 }
@@ -232,55 +133,6 @@ std::vector<ReferenceChange> readReferences(Part const& part)
     }
     checkNames(part, references);
     return references;
-}
-
-constexpr std::array<int, 12> kDaysBefore = {0, 31, 59, 90, 120, 151, 181, 212, 243, 273, 304, 334};
-
-bool isLeap(int year)
-{
-    return (year % 4 == 0 && year % 100 != 0) || year % 400 == 0;
-}
-
-int daysIn(int year, int month)
-{
-    constexpr std::array<int, 12> kDays = {31, 28, 31, 30, 31, 30, 31, 31, 30, 31, 30, 31};
-    return kDays[static_cast<std::size_t>(month - 1)] + (month == 2 && isLeap(year) ? 1 : 0);
-}
-
-/// Days from 0000-01-01 to the day.
-std::int64_t dayNumber(int year, int month, int day)
-{
-    int const leapDays = year == 0 ? 0 : (year - 1) / 4 - (year - 1) / 100 + (year - 1) / 400 + 1;
-    int const leapDay = month > 2 && isLeap(year) ? 1 : 0;
-    return std::int64_t{365} * year + leapDays + kDaysBefore[static_cast<std::size_t>(month - 1)] + leapDay + day - 1;
-}
-
-int numberAt(OdString const& text, std::size_t first, std::size_t count)
-{
-    int number = 0;
-    for (std::size_t i = first; i < first + count; ++i) {
-        number = number * 10 + (text.getAt(i) - L'0');
-    }
-    return number;
-}
-
-bool hasFormOfTime(OdString const& text)
-{
-    constexpr std::wstring_view kForm = L"0000-00-00T00:00:00Z";
-    wchar_t const* const begin = text.c_str();
-    return text.getLength() == kForm.size() &&
-           std::equal(kForm.begin(), kForm.end(), begin, [](wchar_t form, wchar_t c) {
-               return form == L'0' ? isDigit(c) : form == c;
-           });
-}
-
-OdString timeText(std::int64_t seconds)
-{
-    OdTimeStamp time;
-    time.setPackedValue(seconds);
-    OdString text;
-    time.strftime(L"%Y-%m-%dT%H:%M:%SZ", text);
-    return text;
 }
 
 kutils::json::Array referenceArray(std::vector<ReferenceChange> const& changes)
@@ -395,35 +247,10 @@ OdString readRepositoryName(OdString const& document)
     Part const whole(value);
     Part const part = whole.member(keys::s_ref_name.c_str());
     OdString name = part.text();
-    if (char const* const fault = faultOfName(name)) {
-        part.refuse(fault);
+    if (auto const fault = whyNotName(name)) {
+        part.refuse(*fault);
     }
     return name;
-}
-
-std::optional<std::int64_t> secondsOf(OdString const& time)
-{
-    if (!hasFormOfTime(time)) {
-        return std::nullopt;
-    }
-    int const year = numberAt(time, 0, 4);
-    int const month = numberAt(time, 5, 2);
-    int const day = numberAt(time, 8, 2);
-    int const hour = numberAt(time, 11, 2);
-    int const minute = numberAt(time, 14, 2);
-    int const second = numberAt(time, 17, 2);
-    bool const isDay = month >= 1 && month <= 12 && day >= 1 && day <= daysIn(year, month);
-    if (!isDay || hour > 23 || minute > 59 || second > 59) {
-        return std::nullopt;
-    }
-    std::int64_t const days = dayNumber(year, month, day) - dayNumber(1970, 1, 1);
-    return ((days * 24 + hour) * 60 + minute) * 60 + second;
-}
-
-std::optional<std::string> whyNoReferenceName(OdString const& name)
-{
-    char const* const fault = faultOfReferenceName(name);
-    return fault ? std::optional<std::string>(fault) : std::nullopt;
 }
 
 } // namespace tav

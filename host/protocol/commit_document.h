@@ -49,10 +49,4 @@ std::vector<CommitNumber> readNumbers(OdString const& document);
 /// The name in the document that asks for a new repository.
 OdString readRepositoryName(OdString const& document);
 
-/// The second of a time written as "2024-03-05T14:07:09Z"; none for any other text.
-std::optional<std::int64_t> secondsOf(OdString const& time);
-
-/// Why `name` cannot be the name of a branch or tag, as the end of a sentence ("begins with a dash"); none when it can.
-std::optional<std::string> whyNoReferenceName(OdString const& name);
-
 } // namespace tav

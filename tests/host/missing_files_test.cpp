@@ -138,6 +138,18 @@ TEST_F(MissingFiles, StayAlsoWhenTheyWereStagedBefore)
     EXPECT_EQ(changes(), std::vector<std::string>{"notes.txt"});
 }
 
+TEST_F(MissingFiles, CannotStayWhereAFolderHasTakenTheirPlace)
+{
+    lose("plan-1.dwg");
+    repo.write("plan-1.dwg/detail.dwg", "new");
+    tav({"add", "plan-1.dwg/detail.dwg"});
+    EXPECT_EQ(
+        commit({"--without-removed"}),
+        failed("tav: A commit must not hold 'plan-1.dwg' both as a file and as a folder. Nothing has been committed; "
+               "commit the removal of one of them too.\n"));
+    EXPECT_EQ(commit({"--all-removed"}).code, 0);
+}
+
 TEST_F(MissingFiles, AloneMakeNoCommitWhenTheyStay)
 {
     lose("plan-1.dwg");

@@ -64,8 +64,10 @@ void release(void* memory) noexcept
 
 } // namespace
 
-// A request that no machine can meet fails as it does without the address sanitizer, which would end the process instead.
-extern "C" char const* __asan_default_options() // NOLINT(bugprone-reserved-identifier): the sanitizer asks for this name
+// A request that no machine can meet fails as it does without the address sanitizer, which would end the process
+// instead.
+extern "C" char const*
+__asan_default_options() // NOLINT(bugprone-reserved-identifier): the sanitizer asks for this name
 {
     return "allocator_may_return_null=1";
 }
