@@ -10,6 +10,8 @@
 #include "host/storage/local_storage.h"
 #include "host/text/utf8.h"
 
+#include "common/mu_common_file_storage.h"
+
 #include "platform/os/os_files.h"
 
 #include <filesystem>

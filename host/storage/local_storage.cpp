@@ -5,15 +5,15 @@
 #include "host/text/characters.h"
 #include "host/text/utf8.h"
 
+#include "common/mu_common_file_storage.h"
+
 #include "platform/os/os_files.h"
 
 #include <algorithm>
 #include <array>
-#include <atomic>
 #include <cerrno>
 #include <new>
 #include <sys/stat.h>
-#include <unistd.h>
 #include <utility>
 
 namespace tav {
@@ -76,12 +76,6 @@ std::string incomingFolder(common::RootPath const& root)
 std::string restoringFolder(common::RootPath const& root)
 {
     return tavFolder(root) + "/restoring";
-}
-
-std::string newRestoringName()
-{
-    static std::atomic<unsigned long> counter{0};
-    return std::to_string(getpid()) + "-" + std::to_string(counter++);
 }
 
 void makeFolders(std::string const& path)
@@ -149,21 +143,6 @@ std::optional<std::size_t> baseIn(RecordFile const& file, DigestBytes const& pre
     } catch (StorageError const&) {
         return std::nullopt;
     }
-}
-
-/// `target` inside the working folder. It may come from a stranger's commit.
-std::string targetPath(common::RootPath const& root, OdString const& target)
-{
-    std::string const path = target.ansi_str() + "/";
-    for (std::size_t begin = 0; begin < path.size();) {
-        std::size_t const end = path.find('/', begin);
-        std::string const part = path.substr(begin, end - begin);
-        if (part.empty() || part == "." || part == ".." || part.find('\0') != std::string::npos) {
-            throw StorageError(quoted(target) + " is no path inside the working folder.");
-        }
-        begin = end + 1;
-    }
-    return root.pathTo(target).ansi_str();
 }
 
 void flushFile(std::string const& path)
@@ -452,12 +431,11 @@ WriteOutcome LocalStorage::verify(common::RootPath const& root, OdString const& 
     return guarded([&] { read(root, url, [](std::string_view) {}); });
 }
 
-void LocalStorage::extractTo(
-    common::RootPath const& root, OdString const& url, std::string const& path, mode_t permissions) const
+void LocalStorage::extractTo(common::RootPath const& root, OdString const& url, std::string const& path) const
 {
     Found const found = find(root, url);
     os::OpenFile file;
-    check(file.create(path, permissions), "'" + path + "' cannot be made");
+    check(file.create(path, 0666), "'" + path + "' cannot be made");
     std::uint64_t offset = 0;
     try {
         found.file.read(found.index, tavFolder(root), nullptr, [&](std::string_view piece) {
@@ -472,28 +450,7 @@ void LocalStorage::extractTo(
 
 WriteOutcome LocalStorage::extract(common::RootPath const& root, OdString const& url, std::string const& path)
 {
-    return guarded([&] { extractTo(root, url, path, 0666); });
-}
-
-void LocalStorage::restoreTo(common::RootPath const& root, OdString const& url, OdString const& target) const
-{
-    std::string const path = targetPath(root, target);
-    makeFolders(restoringFolder(root));
-    std::string const restoring = restoringFolder(root) + "/" + newRestoringName();
-    mode_t const permissions = exists(path) ? 0600 : 0666; // Nobody reads it before its permissions are right.
-    extractTo(root, url, restoring, permissions);
-    try {
-        makeFolders(path.substr(0, path.rfind('/')));
-        check(os::replaceFileBy(path, restoring), quoted(target) + " cannot be replaced");
-    } catch (...) {
-        [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(restoring);
-        throw;
-    }
-}
-
-WriteOutcome LocalStorage::restore(common::RootPath const& root, OdString const& url, OdString const& target)
-{
-    return guarded([&] { restoreTo(root, url, target); });
+    return guarded([&] { extractTo(root, url, path); });
 }
 
 Expected<bool> LocalStorage::contains(common::RootPath const& root, OdString const& url)
@@ -506,60 +463,6 @@ Expected<std::uint64_t> LocalStorage::size(common::RootPath const& root, OdStrin
     return guarded<std::uint64_t>([&] {
         Found const found = find(root, url);
         return found.file.entries()[found.index].record.length;
-    });
-}
-
-Expected<std::vector<OdString>> LocalStorage::revisions(common::RootPath const& root, OdString const& text)
-{
-    return guarded<std::vector<OdString>>([&] {
-        StorageUrl url = urlOf(text);
-        Found const found = find(root, text);
-        std::vector<OdString> all;
-        std::set<DigestBytes> seen;
-        for (Entry const& entry : found.file.entries()) {
-            url.digest = entry.record.digest;
-            if (seen.insert(url.digest).second) {
-                all.push_back(url.text());
-            }
-        }
-        return all;
-    });
-}
-
-Expected<bool> LocalStorage::mergeFromStorage(common::RootPath const& root, OdString const& target, OdString const& url)
-{
-    return guarded<bool>([&] {
-        if (!isKept(root, url)) {
-            return false;
-        }
-        std::string const path = targetPath(root, target);
-        if (!exists(path)) {
-            restoreTo(root, url, target);
-        } else if (digestOf(openContent(path, quoted(target), 0)) != urlOf(url).digest) {
-            throw StorageError(quoted(target) + " differs from the stored version, and the two cannot be merged here.");
-        }
-        return true;
-    });
-}
-
-WriteOutcome LocalStorage::remove(common::RootPath const& root, OdString const& text)
-{
-    return guarded([&] {
-        flushBatch();
-        Found const found = find(root, text);
-        StorageUrl const url = urlOf(text);
-        Freed freed;
-        if (url.isObject()) {
-            removeCounted(pathOf(root, url), 1, freed);
-            return check(os::flushFolder(objectFolder(root)), "'" + objectFolder(root) + "' cannot be written");
-        }
-        std::set<DigestBytes> others;
-        for (Entry const& entry : found.file.entries()) {
-            others.insert(entry.record.digest);
-        }
-        others.erase(url.digest);
-        reduceStore(pathOf(root, url), "The revision store '" + url.store + "'", others, tavFolder(root), freed);
-        check(os::flushFolder(storeFolder(root)), "'" + storeFolder(root) + "' cannot be written");
     });
 }
 

@@ -17,7 +17,8 @@
 /// more than some 400 MiB; storing a second version of a file of 1.5 GiB was measured to use 223.
 #pragma once
 
-#include "common/mu_common_file_storage.h"
+#include "common/mu_common_expected.h"
+#include "common/mu_common_repo_prop.h"
 
 #include "host/storage/record_file.h"
 #include "host/storage/storage_url.h"
@@ -43,7 +44,7 @@ struct Freed {
 };
 
 /// See above.
-class LocalStorage final : public common::FileStorage {
+class LocalStorage {
 public:
     /// Answers with a URL, or an empty text when there is none.
     using LookUp = std::function<OdString(OdString const&)>;
@@ -53,14 +54,14 @@ public:
     /// Either may be empty. Only tests give a `segmentLog`: contents are worked on in pieces of 2^`segmentLog` bytes.
     explicit LocalStorage(LookUp previousUrl = {}, LookUp knownUrl = {}, unsigned segmentLog = kSegmentLog);
     /// Takes back what was stored and not flushed.
-    ~LocalStorage() override;
+    ~LocalStorage();
 
     /// Keeps the content of `path`, which is relative to the working folder. The URL may be handed on once `flush` has
     /// succeeded; this object reads the content at once. A repetition gives the same URL. A content that is kept
     /// already is read, once in a batch, and stored again under its URL where it is damaged or gone. What is kept is
     /// what was read, under its own digest; a file seen to change meanwhile is an error ("has changed while it was
     /// being stored"), after which the caller tries again. An error leaves nothing of the file behind.
-    Expected<OdString> store(common::RootPath const& root, OdString const& path) override;
+    Expected<OdString> store(common::RootPath const& root, OdString const& path);
     /// Makes the content at `url` readable: where it is damaged or gone it is stored again, flushed and read back, from
     /// the file `path`, relative to the working folder, which has that content. True when it was stored again.
     Expected<bool> repair(common::RootPath const& root, OdString const& url, OdString const& path);
@@ -68,9 +69,6 @@ public:
     /// is kept, and its URLs are void.
     WriteOutcome flush(common::RootPath const& root);
 
-    /// Writes the content into `target`, relative to the working folder and inside it; missing folders are made. The
-    /// old file, whose permissions are kept, gives way to the new one, whole and flushed, in one step.
-    WriteOutcome restore(common::RootPath const& root, OdString const& url, OdString const& target) override;
     /// Writes the content into the new file `path`, a full path in bytes, and does not flush it. When the name is
     /// taken, nothing is touched; after any other error there is no file.
     WriteOutcome extract(common::RootPath const& root, OdString const& url, std::string const& path);
@@ -80,20 +78,12 @@ public:
     read(common::RootPath const& root, OdString const& url, std::function<bool(char const*, std::size_t)> const& sink);
 
     /// Whether the content is kept; that it is whole, `verify` finds out. Error: no URL of this storage.
-    Expected<bool> contains(common::RootPath const& root, OdString const& url) override;
+    Expected<bool> contains(common::RootPath const& root, OdString const& url);
     /// Length of the content in bytes, without unpacking it.
     Expected<std::uint64_t> size(common::RootPath const& root, OdString const& url);
     /// Reads the content and checks its digest.
-    WriteOutcome verify(common::RootPath const& root, OdString const& url) override;
-    /// Revisions in the store of `url`, each once; of an object the object alone.
-    Expected<std::vector<OdString>> revisions(common::RootPath const& root, OdString const& url) override;
+    WriteOutcome verify(common::RootPath const& root, OdString const& url);
 
-    /// True at once where `target`, relative to the working folder, has that content already; restores a target that
-    /// is missing. Differing contents cannot be merged here: error, with the target untouched.
-    Expected<bool> mergeFromStorage(common::RootPath const& root, OdString const& target, OdString const& url) override;
-
-    /// Removes the content. A revision that others build on stays in the store until they go.
-    WriteOutcome remove(common::RootPath const& root, OdString const& url) override;
     /// Removes everything but `urls` and the revisions that they build on, and what interrupted operations have left.
     /// A store is rewritten beside the old one, flushed, read back, and takes its place. A store in which something to
     /// be kept cannot be read stays as it is; the rest is cleaned, and then that is the error. So does a store that
@@ -138,9 +128,7 @@ private:
     bool isReadable(common::RootPath const& root, StorageUrl const& url) const;
     Found find(common::RootPath const& root, OdString const& url) const;
     void read(common::RootPath const& root, OdString const& url, Sink const& sink) const;
-    void
-    extractTo(common::RootPath const& root, OdString const& url, std::string const& path, mode_t permissions) const;
-    void restoreTo(common::RootPath const& root, OdString const& url, OdString const& target) const;
+    void extractTo(common::RootPath const& root, OdString const& url, std::string const& path) const;
 
     LookUp previousUrl_;
     LookUp knownUrl_;

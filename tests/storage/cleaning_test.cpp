@@ -24,11 +24,6 @@ protected:
                                 : messageOf(freed);
     }
 
-    std::string remove(std::string const& url) const
-    {
-        return messageOf(newStorage().remove(repo.root(), support::fromUtf8(url)));
-    }
-
     /// Versions of "plan.dwg", a new whole one every third time.
     void commitMany()
     {
@@ -124,22 +119,6 @@ TEST_F(Cleaning, FlushesFirst)
     OdString const url = storage.store(repo.root(), L"file").value();
     EXPECT_EQ(messageOf(storage.keepOnly(repo.root(), {url})), "success");
     EXPECT_EQ(contentOf(url.ansi_str()), "text");
-}
-
-TEST_F(Cleaning, RemovesOneContent)
-{
-    commitMany();
-    std::string const object = store("file", "text");
-    EXPECT_EQ(remove(object), "success");
-    EXPECT_FALSE(contains(object));
-    EXPECT_EQ(remove(object), "'" + object + "' is not in the storage.");
-    EXPECT_EQ(remove(urls[8]), "success");
-    EXPECT_FALSE(contains(urls[8]));
-    EXPECT_EQ(remove(urls[0]), "success");
-    EXPECT_TRUE(contains(urls[0])); // Others build on it.
-    for (std::size_t i = 0; i < 8; ++i) {
-        EXPECT_EQ(contentOf(urls[i]), contents[i]) << i;
-    }
 }
 
 } // namespace

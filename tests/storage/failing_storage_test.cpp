@@ -160,28 +160,6 @@ TEST_P(FailingStorage, NeverLosesARevisionWithADamagedHeader)
     }
 }
 
-TEST_P(FailingStorage, RestoresTheOldFileOrTheNewOne)
-{
-    bool more = true;
-    for (int n = 0; more; ++n) {
-        Scene const scene;
-        scene.repo.write("plan.dwg", "old");
-        bool succeeded = false;
-        std::string name;
-        {
-            FailingCall const failing(n, GetParam());
-            succeeded =
-                scene.newStorage().restore(scene.repo.root(), support::fromUtf8(scene.second), L"plan.dwg").hasValue();
-            more = failing.hasFailed();
-            name = failing.name();
-        }
-        std::string const newContent = edited(drawing(1, 3 * kSegment), 1);
-        std::string const content = scene.repo.read("plan.dwg");
-        EXPECT_TRUE(content == newContent || (!succeeded && content == "old")) << name;
-        EXPECT_EQ(scene.files(), scene.before) << name;
-    }
-}
-
 TEST_P(FailingStorage, ExtractsTheWholeContentOrNothing)
 {
     bool more = true;
@@ -236,7 +214,9 @@ TEST(InterruptedStorage, GoesOnWhicheverCallIsInterrupted)
         std::vector<std::string> urls;
         FailingCall const failing(n, EINTR);
         EXPECT_TRUE(storeThree(scene, urls)) << failing.name();
-        EXPECT_TRUE(scene.newStorage().restore(scene.repo.root(), support::fromUtf8(urls.at(0)), L"new").hasValue())
+        EXPECT_TRUE(scene.newStorage()
+                        .extract(scene.repo.root(), support::fromUtf8(urls.at(0)), scene.repo.pathTo("copy"))
+                        .hasValue())
             << failing.name();
         EXPECT_TRUE(scene.newStorage().keepOnly(scene.repo.root(), {support::fromUtf8(urls.at(0))}).hasValue())
             << failing.name();

@@ -20,11 +20,6 @@ std::string const kNothing = "e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca4
 
 class LocalStorage : public StorageTest {
 protected:
-    std::string restore(std::string const& url, std::string const& target) const
-    {
-        return messageOf(newStorage().restore(repo.root(), support::fromUtf8(url), support::fromUtf8(target)));
-    }
-
     std::string extract(std::string const& url, std::string const& path) const
     {
         return messageOf(newStorage().extract(repo.root(), support::fromUtf8(url), repo.pathTo(path)));
@@ -240,8 +235,8 @@ TEST_F(LocalStorage, AppendsToTheStoreOfADrawingThatWasRenamed)
     committed["sub/north wing.dwg"] = first;
     std::string const second = store("sub/north wing.dwg", edited(drawing(1, 2000), 1));
     EXPECT_EQ(fileOf(second), fileOf(first));
-    auto const all = newStorage().revisions(repo.root(), support::fromUtf8(second));
-    EXPECT_THAT(all.value(), ElementsAre(support::fromUtf8(first), support::fromUtf8(second)));
+    EXPECT_EQ(contentOf(first), drawing(1, 2000));
+    EXPECT_EQ(contentOf(second), edited(drawing(1, 2000), 1));
     EXPECT_LT(repo.read(fileOf(first)).size(), 2500u);
 }
 
@@ -318,59 +313,14 @@ TEST_F(LocalStorage, RefusesAFileThatBecomesShorterWhileItIsStored)
     EXPECT_THAT(files(), IsEmpty());
 }
 
-TEST_F(LocalStorage, RestoresAFileWithTheFoldersItNeeds)
-{
-    std::string const url = store("plan.dwg", "abc");
-    EXPECT_EQ(restore(url, "a/b\xff/c.dwg"), "success");
-    EXPECT_EQ(repo.read("a/b\xff/c.dwg"), "abc");
-    EXPECT_EQ(restore(store("large", drawing(1, 5 * kSegment)), "large copy"), "success");
-    EXPECT_EQ(repo.read("large copy"), drawing(1, 5 * kSegment));
-    mode_t const mask = umask(0);
-    umask(mask);
-    EXPECT_EQ(modeOf("large copy"), 0666U & ~mask);
-}
-
-TEST_F(LocalStorage, RestoresOverAFileAndKeepsItsPermissionsAndLinks)
-{
-    std::string const url = store("plan.dwg", "abc");
-    repo.write("target.dwg", "a longer content");
-    EXPECT_EQ(chmod(repo.pathTo("target.dwg").c_str(), 0640), 0);
-    repo.makeLink("link.dwg", "target.dwg");
-    EXPECT_EQ(restore(url, "link.dwg"), "success");
-    EXPECT_EQ(repo.read("target.dwg"), "abc");
-    EXPECT_EQ(modeOf("target.dwg"), 0640U);
-    EXPECT_THAT(files(), ElementsAre(fileOf(url)));
-}
-
-TEST_F(LocalStorage, LeavesTheTargetAsItWasWhenItCannotBeRestored)
-{
-    std::string const url = store("plan.dwg", "abc");
-    repo.write("target", "old");
-    repo.makeFolder("folder");
-    EXPECT_EQ(restore(url, "folder"), "'folder' cannot be replaced: Is a directory.");
-    EXPECT_EQ(restore("po:" + kNothing, "target"), "'po:" + kNothing + "' is not in the storage.");
-    std::string bytes = repo.read(fileOf(url));
-    bytes.back() = static_cast<char>(bytes.back() ^ 1);
-    repo.write(fileOf(url), bytes);
-    EXPECT_EQ(restore(url, "target"), "The content of '" + url + "' is damaged.");
-    EXPECT_EQ(repo.read("target"), "old");
-    EXPECT_THAT(files(), ElementsAre(fileOf(url)));
-}
-
-TEST_F(LocalStorage, RestoresNothingOutsideTheWorkingFolder)
-{
-    std::string const url = store("plan.dwg", "abc");
-    for (char const* const target : {"", "../x", "a/../../x", "/tmp/x", "a//b", "./x", "a/"}) {
-        EXPECT_EQ(restore(url, target), "'" + std::string(target) + "' is no path inside the working folder.");
-    }
-    EXPECT_EQ(restore(url, std::string("a\0b", 3)), R"('a\u0000b' is no path inside the working folder.)");
-}
-
 TEST_F(LocalStorage, ExtractsIntoANewFileOnly)
 {
     std::string const url = store("plan.dwg", drawing(1, 3 * kSegment));
     EXPECT_EQ(extract(url, "copy"), "success");
     EXPECT_EQ(repo.read("copy"), drawing(1, 3 * kSegment));
+    mode_t const mask = umask(0);
+    umask(mask);
+    EXPECT_EQ(modeOf("copy"), 0666U & ~mask);
     repo.write("taken", "old");
     repo.makeLink("dangling", "nowhere");
     EXPECT_EQ(extract(url, "taken"), "'" + repo.pathTo("taken") + "' cannot be made: File exists.");
@@ -408,29 +358,6 @@ TEST_F(LocalStorage, SaysWhatIsKept)
     EXPECT_EQ(verify(other), "'" + other + "' is not in the storage.");
     EXPECT_EQ(
         messageOf(newStorage().size(repo.root(), support::fromUtf8(other))), "'" + other + "' is not in the storage.");
-    EXPECT_EQ(
-        messageOf(newStorage().revisions(repo.root(), support::fromUtf8(other))),
-        "'" + other + "' is not in the storage.");
-    std::string const object = store("file", "text");
-    EXPECT_THAT(
-        newStorage().revisions(repo.root(), support::fromUtf8(object)).value(), ElementsAre(support::fromUtf8(object)));
-}
-
-TEST_F(LocalStorage, MergesOnlyWhatIsEqualOrMissing)
-{
-    std::string const url = store("plan.dwg", "abc");
-    auto const merge = [&](char const* target, std::string const& version) {
-        return newStorage().mergeFromStorage(repo.root(), support::fromUtf8(target), support::fromUtf8(version));
-    };
-    EXPECT_TRUE(merge("plan.dwg", url).value());
-    EXPECT_TRUE(merge("new.dwg", url).value());
-    EXPECT_EQ(repo.read("new.dwg"), "abc");
-    EXPECT_FALSE(merge("plan.dwg", "po:" + kNothing).value());
-    repo.write("plan.dwg", "other");
-    EXPECT_EQ(
-        messageOf(merge("plan.dwg", url)),
-        "'plan.dwg' differs from the stored version, and the two cannot be merged here.");
-    EXPECT_EQ(repo.read("plan.dwg"), "other");
 }
 
 TEST_F(LocalStorage, FlushesManyFilesAtOnceAndEachWhereThatIsNotKnown)
