@@ -122,7 +122,9 @@ void addShow(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("show", "Show a commit and what it changed");
     auto const options = std::make_shared<ShowOptions>();
-    command->add_option("COMMIT", options->commit, "Number, hash, branch or tag; by default where you are");
+    command->add_option(
+        "COMMIT", options->commit,
+        "Number, hash, branch or tag, HEAD~2 or master@{yesterday}; by default where you are");
     addJson(*command, options->json);
     command->callback([options] { showCommit(*options); });
 }
@@ -141,7 +143,10 @@ void addRestore(CLI::App& app)
     CLI::App* const command = app.add_subcommand("restore", "Bring files back as a commit has them");
     auto const options = std::make_shared<RestoreOptions>();
     command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path")->required();
-    command->add_option("--from", options->commit, "Number, hash, branch or tag; by default where you are")
+    command
+        ->add_option(
+            "--from", options->commit,
+            "Number, hash, branch or tag, HEAD~2 or master@{yesterday}; by default where you are")
         ->type_name("COMMIT");
     command->add_flag("--force", options->force, "Overwrite uncommitted changes");
     command->callback([options] { restoreFiles(*options); });

@@ -188,8 +188,9 @@ std::optional<CommitRecord> CommitTables::find(std::int64_t number) const
 std::vector<CommitRecord> CommitTables::withPrefix(OdString const& prefix) const
 {
     Statement rows = database_->prepare(
-        (std::string(kCommitColumns) + "WHERE repository = ? AND substr(hash, 1, ?) = ? LIMIT 2").c_str());
-    rows.with(repository_).with(static_cast<std::int64_t>(prefix.getLength())).with(prefix);
+        (std::string(kCommitColumns) + "WHERE repository = ? AND hash >= ? AND hash < ? ORDER BY number LIMIT 2")
+            .c_str());
+    rows.with(repository_).with(prefix).with(prefix + L"g"); // Behind all hexadecimal digits.
     return readAll(std::move(rows));
 }
 
