@@ -1,8 +1,8 @@
 // The first byte chooses a document that clients send, the rest is the document. It is refused with a text, or what was
 // read is clean: every path leads into the working folder, and no file is the folder of another.
 #include "host/errors/failure.h"
-#include "host/history/tracked_path.h"
 #include "host/history/reference_name.h"
+#include "host/history/tracked_path.h"
 #include "host/protocol/commit_document.h"
 #include "host/protocol/members.h"
 
