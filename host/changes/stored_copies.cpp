@@ -44,9 +44,9 @@ bool isCandidate(OdString const& path, Wanted const& wanted, common::RootPath co
 
 } // namespace
 
-bool requireStored(common::RootPath const& root, LocalStorage& storage, OdString const& path, OdString const& url)
+bool requireStored(LocalStorage& storage, OdString const& path, OdString const& url)
 {
-    auto const repaired = storage.repair(root, url, path);
+    auto const repaired = storage.repair(url, path);
     if (!repaired.hasValue()) {
         throw Failure(
             "The stored version of " + quoted(path) +
@@ -69,7 +69,7 @@ std::map<OdString, OdString> repairFromFolder(
         auto const digest = isCandidate(file.path, wanted, root) ? fileDigest(root.pathTo(file.path)) : std::nullopt;
         auto const [begin, end] = wanted.urls.equal_range(digest.value_or(OdString()));
         for (auto content = begin; content != end; ++content) {
-            requireStored(root, storage, file.path, content->second);
+            requireStored(storage, file.path, content->second);
             repaired.emplace(content->second, file.path);
         }
         wanted.urls.erase(begin, end);

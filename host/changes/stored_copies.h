@@ -13,7 +13,7 @@ namespace tav {
 /// again from that file where it cannot. True when it was stored again. Reads the stored content as a whole. Throws
 /// `Failure` when the file remains the only copy: it must not be overwritten or removed then. The caller holds the lock
 /// of the repository.
-bool requireStored(common::RootPath const& root, LocalStorage& storage, OdString const& path, OdString const& url);
+bool requireStored(LocalStorage& storage, OdString const& path, OdString const& url);
 
 /// The contents at `urls` cannot be read. Stores again those that a working file has, and returns the path of that file
 /// by URL. Only files as long as one of the contents are read. Throws `Failure`. The caller holds the lock of the

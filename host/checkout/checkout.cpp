@@ -68,7 +68,7 @@ CheckedOut checkOutCommit(
         database.commits().files(database.currentCommit()), filesOf(begun, database),
         database.commits().files(destination.commit));
     TreeUpdate update = whole;
-    LocalStorage storage;
+    LocalStorage storage(root);
     checkUpdate(root, database, storage, claimedPaths(readState(root)->read()), discard, update);
     PendingCheckout move{destination.commit, destination.branch, false, begun};
     Updated const updated = carryOut(root, storage, update, start, [&] { writeJournal(move, database); });

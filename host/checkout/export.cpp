@@ -50,7 +50,7 @@ std::size_t exportFiles(common::RootPath const& root, Tree const& files, std::st
 {
     checkPaths(files);
     prepare(target);
-    LocalStorage storage;
+    LocalStorage storage(root);
     os::Batch batch(target);
     Progress progress("files", files.size());
     std::string const incoming = target + "/.tav-export";
@@ -60,7 +60,7 @@ std::size_t exportFiles(common::RootPath const& root, Tree const& files, std::st
         if (!isExported(path)) {
             continue;
         }
-        extract(root, storage, {path, url}, incoming);
+        extract(storage, {path, url}, incoming);
         if (std::error_code const error = batch.place(incoming, path.ansi_str())) {
             [[maybe_unused]] std::error_code const ignored = batch.remove(".tav-export");
             throw Failure("'" + path.ansi_str() + "' cannot be written: " + error.message() + ".", "Try again.");

@@ -52,7 +52,7 @@ bool isStored(
     auto const digest = isFile ? fileDigest(fromUtf8(file)) : std::nullopt;
     OdString const path = fromUtf8(file.substr(root.path().ansi_str().size() + 1));
     return digest && std::any_of(urls.begin(), urls.end(), [&](OdString const& url) {
-               return digestOf(url) == digest && storage.repair(root, url, path).hasValue();
+               return digestOf(url) == digest && storage.repair(url, path).hasValue();
            });
 }
 

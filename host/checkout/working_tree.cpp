@@ -264,7 +264,7 @@ Stamps extractAll(
     std::size_t number = 0;
     for (auto const& file : files) {
         std::string const target = restored.pathOf(number);
-        extract(root, storage, file, target);
+        extract(storage, file, target);
         requireDone(os::setModificationTime(target, time - number * kBetweenFiles), file.first, kNothingYet);
         Sight const sight = view.look(kRestoring + L"/" + std::to_wstring(number).c_str());
         stamps.emplace(file.first, sight.stamp.value_or(FileStamp{}));
@@ -370,12 +370,11 @@ void addExpected(Tree const& commit, TreeUpdate& update)
 
 } // namespace
 
-void extract(
-    common::RootPath const& root, LocalStorage& storage, Tree::value_type const& file, std::string const& target)
+void extract(LocalStorage& storage, Tree::value_type const& file, std::string const& target)
 {
     auto const& [path, url] = file;
-    if (auto const done = storage.extract(root, url, target); !done.hasValue()) {
-        bool const isDamaged = !storage.verify(root, url).hasValue();
+    if (auto const done = storage.extract(url, target); !done.hasValue()) {
+        bool const isDamaged = !storage.verify(url).hasValue();
         throw Failure(
             "'" + path.ansi_str() + "' cannot be brought back: " + done.error().message.ansi_str(),
             isDamaged ? "Run 'tav verify' to see what is damaged." : "Check the free space.");
@@ -414,7 +413,7 @@ void checkUpdate(
     check.run();
     Progress progress("stored versions", check.replaced().size());
     for (auto const& [path, url] : check.replaced()) {
-        requireStored(root, storage, path, url);
+        requireStored(storage, path, url);
         progress.advance();
     }
 }

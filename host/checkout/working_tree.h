@@ -65,7 +65,6 @@ Updated carryOut(
     std::function<void()> const& begin = [] {});
 
 /// Writes the content of `file` to the path `target`. Throws `Failure`, whose advice tells damage from a full disk.
-void extract(
-    common::RootPath const& root, LocalStorage& storage, Tree::value_type const& file, std::string const& target);
+void extract(LocalStorage& storage, Tree::value_type const& file, std::string const& target);
 
 } // namespace tav

@@ -105,10 +105,10 @@ Chosen chosenFiles(AddOptions const& options, FolderChanges const& changes, comm
 /// Adding a file means to keep what it has: what is as it was committed may be damaged in the storage.
 std::size_t repair(std::vector<common::VersionedFile> const& files, common::RootPath const& root)
 {
-    LocalStorage storage;
+    LocalStorage storage(root);
     std::size_t count = 0;
     for (common::VersionedFile const& file : files) {
-        count += requireStored(root, storage, file.path, file.storagePath) ? 1 : 0;
+        count += requireStored(storage, file.path, file.storagePath) ? 1 : 0;
     }
     return count;
 }

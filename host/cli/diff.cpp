@@ -119,9 +119,9 @@ std::optional<std::string> linesOf(Compared const& file, common::RootPath const&
     }
     std::string before;
     std::string after;
-    LocalStorage storage;
+    LocalStorage storage(root);
     auto const keep = [&](char const* bytes, std::size_t count) { return before.append(bytes, count), true; };
-    bool const isRead = storage.read(root, file.change.oldUrl, keep).hasValue() &&
+    bool const isRead = storage.read(file.change.oldUrl, keep).hasValue() &&
                         !os::readFile(root.pathTo(file.change.path).ansi_str(), after);
     return isRead ? lineDiff(before, after) : std::nullopt;
 }

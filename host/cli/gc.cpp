@@ -54,11 +54,11 @@ Freed removeWhatNobodyNeeds(WriteSession& session, LocalStorage& storage)
     std::string const doubt = learnWhatIsNeeded(session);
     if (!doubt.empty()) {
         printNote("Only leftovers are removed, as the server does not say what its commits need. " + doubt);
-        return valueOrFail(storage.removeLeftovers(session.root()), "Check your rights in '.tav'.");
+        return valueOrFail(storage.removeLeftovers(), "Check your rights in '.tav'.");
     }
     Contents const needed = contentsOf(session.root(), session.database());
     return valueOrFail(
-        storage.keepOnly(session.root(), setOf(needed.here), setOf(needed.elsewhere)),
+        storage.keepOnly(setOf(needed.here), setOf(needed.elsewhere)),
         "Run 'tav verify' to see whether anything is damaged.");
 }
 
@@ -68,7 +68,7 @@ void collectGarbage()
 {
     WriteSession session(openRepository(""), "gc", Recovery::attempted);
     session.database().failIfDamaged();
-    LocalStorage storage;
+    LocalStorage storage(session.root());
     Freed const freed = removeWhatNobodyNeeds(session, storage);
     RemovedFiles const files = cleanRemovedFiles(session.root(), session.database(), storage);
     print(

@@ -104,7 +104,7 @@ void restoreFiles(RestoreOptions const& options)
     Tree const base = session.database().commits().files(session.database().currentCommit());
     TreeUpdate update;
     update.writes = files;
-    LocalStorage storage;
+    LocalStorage storage(root);
     checkUpdate(
         root, session.database(), storage, stagedContents(readState(root)->read(), root),
         options.force ? Discard::everything : Discard::copies, update);

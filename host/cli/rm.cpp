@@ -143,7 +143,13 @@ void checkPath(OdString const& path, common::RootPath const& root)
 /// killed may have left some.
 class Departures {
 public:
-    explicit Departures(common::RootPath const& root) : root_(root), top_(root.path().ansi_str()), moves_(top_) {}
+    explicit Departures(common::RootPath const& root)
+        : root_(root)
+        , top_(root.path().ansi_str())
+        , storage_(root)
+        , moves_(top_)
+    {
+    }
 
     /// Takes a file away; false when it is gone. Throws `Failure` when it does not hold the content at `url`, and when
     /// it is the last copy of that. It is compared where it waits: nobody writes to it there, and all files go back to
@@ -154,7 +160,7 @@ public:
             return false;
         }
         checkPath(path, root_);
-        requireStored(root_, storage_, path, url);
+        requireStored(storage_, path, url);
         waiting_.push_back(freeName());
         std::string const& place = waiting_.back();
         moves_.move(path.ansi_str(), place);

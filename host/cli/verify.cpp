@@ -34,10 +34,10 @@ std::vector<Damage>
 damagesOf(common::RootPath const& root, CommitTables const& commits, std::vector<OdString> const& urls)
 {
     std::vector<Damage> damages;
-    LocalStorage storage;
+    LocalStorage storage(root);
     Progress progress("versions", urls.size());
     for (OdString const& url : urls) {
-        if (auto const outcome = storage.verify(root, url); !outcome.hasValue()) {
+        if (auto const outcome = storage.verify(url); !outcome.hasValue()) {
             auto const store = common::getStoragePath(root, url);
             damages.push_back(
                 {url, outcome.error().message, commits.firstFileAt(url),
@@ -92,7 +92,7 @@ Repaired repair(common::RootPath const& root, LocalDatabase const& database, std
 {
     try {
         os::FileLock const lock = lockRepository(root, "verify");
-        LocalStorage storage;
+        LocalStorage storage(root);
         Repaired repaired = repairFromFolder(root, database, storage, urlsOf(damages));
         damages = damagesOf(root, database.commits(), urlsOf(damages)); // Others may have built on what was damaged.
         return repaired;

@@ -7,12 +7,12 @@ namespace tav {
 namespace {
 
 /// What has been entered as a content of this folder has to be here. Of the others some may have come by another way.
-bool isHere(OdString const& url, common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage)
+bool isHere(OdString const& url, LocalDatabase const& database, LocalStorage& storage)
 {
     if (database.sizeOf(url)) {
         return true;
     }
-    auto const isKept = storage.contains(root, url);
+    auto const isKept = storage.contains(url);
     return !isKept.hasValue() || isKept.value(); // One that cannot be looked for is not given up.
 }
 
@@ -21,9 +21,9 @@ bool isHere(OdString const& url, common::RootPath const& root, LocalDatabase con
 Contents contentsOf(common::RootPath const& root, LocalDatabase const& database)
 {
     Contents contents;
-    LocalStorage storage;
+    LocalStorage storage(root);
     for (OdString const& url : database.commits().urls()) {
-        bool const here = isHere(url, root, database, storage);
+        bool const here = isHere(url, database, storage);
         (here ? contents.here : contents.elsewhere).push_back(url);
     }
     return contents;

@@ -63,15 +63,13 @@ std::vector<CommitNumber> without(std::vector<CommitNumber> const& some, std::ve
 }
 
 /// A content of a commit that was made elsewhere, or entered in a database that has been lost since, may be kept here.
-void enterContents(
-    common::RootPath const& root, LocalDatabase& database, LocalStorage& storage,
-    std::vector<FileRecord> const& changes)
+void enterContents(LocalDatabase& database, LocalStorage& storage, std::vector<FileRecord> const& changes)
 {
     for (FileRecord const& change : changes) {
         if (change.url.isEmpty() || database.sizeOf(change.url)) {
             continue;
         }
-        auto const size = storage.size(root, change.url);
+        auto const size = storage.size(change.url);
         if (size.hasValue()) {
             database.addContent(change.url, *digestOf(change.url), size.value());
         } else if (size.error().code != 0 && size.error().code != ENOENT) { // It may be here all the same.
@@ -83,14 +81,14 @@ void enterContents(
 /// Returns how many of the commits were unknown. Part of a `WriteTransaction` of the caller.
 std::size_t enterPage(common::RootPath const& root, LocalDatabase& database, std::vector<ChangedCommit> const& page)
 {
-    LocalStorage storage;
+    LocalStorage storage(root);
     std::size_t added = 0;
     for (ChangedCommit const& next : page) {
         if (!database.commits().find(next.commit.hash)) {
             database.commits().addChanges(next.commit, next.changes);
             ++added;
         }
-        enterContents(root, database, storage, next.changes);
+        enterContents(database, storage, next.changes);
     }
     return added;
 }

@@ -23,10 +23,10 @@ struct Candidate {
     std::size_t contents = 0; ///< of its history that are kept here
 };
 
-std::size_t contentsHere(common::RootPath const& root, LocalStorage& storage, std::vector<FileRecord> const& changes)
+std::size_t contentsHere(LocalStorage& storage, std::vector<FileRecord> const& changes)
 {
     auto const isHere = [&](FileRecord const& change) {
-        auto const kept = storage.contains(root, change.url); // An error for a file that is gone, which has no URL.
+        auto const kept = storage.contains(change.url); // An error for a file that is gone, which has no URL.
         return kept.hasValue() && kept.value();
     };
     return static_cast<std::size_t>(std::count_if(changes.begin(), changes.end(), isHere));
@@ -35,10 +35,10 @@ std::size_t contentsHere(common::RootPath const& root, LocalStorage& storage, st
 std::size_t contentsHere(common::RootPath const& root, Connection& connection)
 {
     std::size_t count = 0;
-    LocalStorage storage;
+    LocalStorage storage(root);
     forEachPageThere(connection, 0, [&](std::vector<ChangedCommit> const& page) {
         for (ChangedCommit const& commit : page) {
-            count += contentsHere(root, storage, commit.changes);
+            count += contentsHere(storage, commit.changes);
         }
     });
     return count;

@@ -61,7 +61,7 @@ OdString storeSteady(Draft& draft, LocalStorage& storage, OdString const& path)
 {
     for (int attempt = 0; attempt < kMostAttempts; ++attempt) {
         FileStamp const before = stampOf(path, draft.root);
-        auto const url = storage.store(draft.root, path);
+        auto const url = storage.store(path);
         if (stampOf(path, draft.root) != before) {
             continue;
         }
@@ -95,7 +95,7 @@ void storeAll(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& 
         }
         progress.advance();
     }
-    valueOrFail(storage.flush(draft.root), "Nothing has been committed; check the free space.");
+    valueOrFail(storage.flush(), "Nothing has been committed; check the free space.");
 }
 
 /// Reads back what the commit relies on.
@@ -110,8 +110,8 @@ void readBack(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& 
             continue;
         }
         OdString const& url = version->second;
-        valueOrFail(storage.verify(draft.root, url), "Nothing has been committed; the disk may be failing.");
-        std::uint64_t const size = valueOrFail(storage.size(draft.root, url), "Nothing has been committed.");
+        valueOrFail(storage.verify(url), "Nothing has been committed; the disk may be failing.");
+        std::uint64_t const size = valueOrFail(storage.size(url), "Nothing has been committed.");
         draft.pending.contents.push_back({url, *digestOf(url), size});
     }
 }
@@ -306,7 +306,7 @@ void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
 {
     Tree const base = draft.files;
     LocalStorage storage(
-        [&](OdString const& path) { return previousUrl(draft, base, path); },
+        draft.root, [&](OdString const& path) { return previousUrl(draft, base, path); },
         [&](OdString const& digest) { return draft.database.urlOf(digest); });
     storeAll(draft, plan, storage);
     if (draft.files == base) {

@@ -154,8 +154,9 @@ void flushFile(std::string const& path)
 
 } // namespace
 
-LocalStorage::LocalStorage(LookUp previousUrl, LookUp knownUrl, unsigned segmentLog)
-    : previousUrl_(std::move(previousUrl))
+LocalStorage::LocalStorage(common::RootPath root, LookUp previousUrl, LookUp knownUrl, unsigned segmentLog)
+    : root_(std::move(root))
+    , previousUrl_(std::move(previousUrl))
     , knownUrl_(std::move(knownUrl))
     , segmentLog_(segmentLog)
 {
@@ -166,11 +167,11 @@ LocalStorage::~LocalStorage()
     takeBack();
 }
 
-Expected<OdString> LocalStorage::store(common::RootPath const& root, OdString const& path)
+Expected<OdString> LocalStorage::store(OdString const& path)
 {
     return guarded<OdString>([&] {
         Content const content =
-            openContent(root.pathTo(path).ansi_str(), quoted(path), std::uint64_t{1} << segmentLog_);
+            openContent(root_.pathTo(path).ansi_str(), quoted(path), std::uint64_t{1} << segmentLog_);
         DigestBytes const digest = digestOf(content);
         auto const stored = batch_.urls.find(digest);
         if (stored != batch_.urls.end()) {
@@ -178,30 +179,30 @@ Expected<OdString> LocalStorage::store(common::RootPath const& root, OdString co
         }
         std::optional<StorageUrl> const known = knownPlace(digest);
         StorageUrl const url = known ? *known : newPlace(path, digest);
-        if (!known || !isReadable(root, url)) {
-            beginBatch(root);
-            url.isObject() ? keepObject(root, url, content) : keepDrawing(root, url, path, content);
+        if (!known || !isReadable(url)) {
+            beginBatch();
+            url.isObject() ? keepObject(url, content) : keepDrawing(url, path, content);
         }
         return batch_.urls[digest] = url.text();
     });
 }
 
-Expected<bool> LocalStorage::repair(common::RootPath const& root, OdString const& text, OdString const& path)
+Expected<bool> LocalStorage::repair(OdString const& text, OdString const& path)
 {
     return guarded<bool>([&] {
         StorageUrl const url = urlOf(text);
-        if (isReadable(root, url)) {
+        if (isReadable(url)) {
             return false;
         }
         Content const content =
-            openContent(root.pathTo(path).ansi_str(), quoted(path), std::uint64_t{1} << segmentLog_);
+            openContent(root_.pathTo(path).ansi_str(), quoted(path), std::uint64_t{1} << segmentLog_);
         if (digestOf(content) != url.digest) {
             throw StorageError(quoted(path) + " has another content by now.");
         }
-        beginBatch(root);
-        url.isObject() ? keepObject(root, url, content) : keepDrawing(root, url, path, content);
+        beginBatch();
+        url.isObject() ? keepObject(url, content) : keepDrawing(url, path, content);
         flushBatch();
-        read(root, text, [](std::string_view) {});
+        read(text, [](std::string_view) {});
         return true;
     });
 }
@@ -223,23 +224,23 @@ StorageUrl LocalStorage::newPlace(OdString const& path, DigestBytes const& diges
 }
 
 // Opened before anything is written: what fails on the disk from here on is seen when it is flushed.
-void LocalStorage::beginBatch(common::RootPath const& root)
+void LocalStorage::beginBatch()
 {
     if (!batch_.fileSystem.isOpen()) {
-        check(batch_.fileSystem.openFolder(tavFolder(root)), "'" + tavFolder(root) + "' cannot be opened");
+        check(batch_.fileSystem.openFolder(tavFolder(root_)), "'" + tavFolder(root_) + "' cannot be opened");
     }
 }
 
-void LocalStorage::keepObject(common::RootPath const& root, StorageUrl const& url, Content const& content)
+void LocalStorage::keepObject(StorageUrl const& url, Content const& content)
 {
-    std::string const path = pathOf(root, url);
-    makeFolders(incomingFolder(root));
-    batch_.folders.insert(objectFolder(root));
-    if (isReadable(root, url)) { // Perhaps of an interrupted operation that has not flushed the folder.
+    std::string const path = pathOf(url);
+    makeFolders(incomingFolder(root_));
+    batch_.folders.insert(objectFolder(root_));
+    if (isReadable(url)) { // Perhaps of an interrupted operation that has not flushed the folder.
         return;
     }
     bool const isNew = !exists(path);
-    std::string const incoming = incomingFolder(root) + "/" + hexOf(url.digest);
+    std::string const incoming = incomingFolder(root_) + "/" + hexOf(url.digest);
     [[maybe_unused]] std::error_code const mostlyMissing = os::removeUnflushed(incoming);
     try {
         RecordFile file = RecordFile::create(incoming, "The object " + quoted(url.text()));
@@ -258,22 +259,21 @@ StorageUrl LocalStorage::previousVersion(OdString const& path) const
 }
 
 // What was found damaged is kept whole: others may build on it, and their chains do not get longer by that.
-void LocalStorage::keepDrawing(
-    common::RootPath const& root, StorageUrl const& url, OdString const& path, Content const& content)
+void LocalStorage::keepDrawing(StorageUrl const& url, OdString const& path, Content const& content)
 {
-    std::string const file = pathOf(root, url);
+    std::string const file = pathOf(url);
     std::string const name = "The revision store '" + url.store + "'";
-    makeFolders(storeFolder(root));
-    batch_.folders.insert(storeFolder(root));
+    makeFolders(storeFolder(root_));
+    batch_.folders.insert(storeFolder(root_));
     bool const isNew = !exists(file);
     RecordFile store = isNew ? RecordFile::create(file, name) : RecordFile::openForChanging(file, name);
     batch_.storeLengths.emplace(file, store.end());
-    if (store.find(url.digest) && isReadable(root, url)) { // Of an interrupted operation; perhaps not flushed.
+    if (store.find(url.digest) && isReadable(url)) { // Of an interrupted operation; perhaps not flushed.
         return;
     }
     try {
         bool const isWhole = store.isNamed(url.digest);
-        loadBase(store, isWhole ? std::nullopt : baseIn(store, previousVersion(path).digest), tavFolder(root));
+        loadBase(store, isWhole ? std::nullopt : baseIn(store, previousVersion(path).digest), tavFolder(root_));
         store.append(content, url.digest, base_ ? &*base_ : nullptr, segmentLog_);
         if (base_ && !base_->content.isInMemory()) {
             base_.reset();
@@ -300,7 +300,7 @@ void LocalStorage::loadBase(RecordFile const& store, std::optional<std::size_t> 
     }
 }
 
-WriteOutcome LocalStorage::flush(common::RootPath const&)
+WriteOutcome LocalStorage::flush()
 {
     return guarded([&] { flushBatch(); });
 }
@@ -359,40 +359,40 @@ void LocalStorage::takeBack() noexcept
     batch_ = Batch();
 }
 
-std::string LocalStorage::pathOf(common::RootPath const& root, StorageUrl const& url) const
+std::string LocalStorage::pathOf(StorageUrl const& url) const
 {
     if (!url.isObject()) {
-        return storeFolder(root) + "/" + url.store + kStoreEnd;
+        return storeFolder(root_) + "/" + url.store + kStoreEnd;
     }
-    std::string const path = objectFolder(root) + "/" + hexOf(url.digest);
+    std::string const path = objectFolder(root_) + "/" + hexOf(url.digest);
     auto const incoming = batch_.objects.find(path);
     return incoming == batch_.objects.end() ? path : incoming->second.incoming;
 }
 
-bool LocalStorage::isKept(common::RootPath const& root, OdString const& text) const
+bool LocalStorage::isKept(OdString const& text) const
 {
     StorageUrl const url = urlOf(text);
-    std::string const path = pathOf(root, url);
+    std::string const path = pathOf(url);
     if (url.isObject() || !exists(path)) {
         return exists(path);
     }
     return RecordFile::openForReading(path, "The store of " + quoted(text)).find(url.digest).has_value();
 }
 
-bool LocalStorage::isReadable(common::RootPath const& root, StorageUrl const& url) const
+bool LocalStorage::isReadable(StorageUrl const& url) const
 {
     try {
-        read(root, url.text(), [](std::string_view) {});
+        read(url.text(), [](std::string_view) {});
         return true;
     } catch (StorageError const&) {
         return false;
     }
 }
 
-LocalStorage::Found LocalStorage::find(common::RootPath const& root, OdString const& text) const
+LocalStorage::Found LocalStorage::find(OdString const& text) const
 {
     StorageUrl const url = urlOf(text);
-    std::string const path = pathOf(root, url);
+    std::string const path = pathOf(url);
     if (!exists(path)) {
         throwMissing(text);
     }
@@ -408,17 +408,16 @@ LocalStorage::Found LocalStorage::find(common::RootPath const& root, OdString co
     throwMissing(text);
 }
 
-void LocalStorage::read(common::RootPath const& root, OdString const& url, Sink const& sink) const
+void LocalStorage::read(OdString const& url, Sink const& sink) const
 {
-    Found const found = find(root, url);
-    found.file.read(found.index, tavFolder(root), base_ ? &*base_ : nullptr, sink);
+    Found const found = find(url);
+    found.file.read(found.index, tavFolder(root_), base_ ? &*base_ : nullptr, sink);
 }
 
-WriteOutcome LocalStorage::read(
-    common::RootPath const& root, OdString const& url, std::function<bool(char const*, std::size_t)> const& sink)
+WriteOutcome LocalStorage::read(OdString const& url, std::function<bool(char const*, std::size_t)> const& sink)
 {
     return guarded([&] {
-        read(root, url, [&](std::string_view piece) {
+        read(url, [&](std::string_view piece) {
             if (!sink(piece.data(), piece.size())) {
                 throw StorageError("The content of " + quoted(url) + " was not read to its end.");
             }
@@ -426,19 +425,19 @@ WriteOutcome LocalStorage::read(
     });
 }
 
-WriteOutcome LocalStorage::verify(common::RootPath const& root, OdString const& url)
+WriteOutcome LocalStorage::verify(OdString const& url)
 {
-    return guarded([&] { read(root, url, [](std::string_view) {}); });
+    return guarded([&] { read(url, [](std::string_view) {}); });
 }
 
-void LocalStorage::extractTo(common::RootPath const& root, OdString const& url, std::string const& path) const
+void LocalStorage::extractTo(OdString const& url, std::string const& path) const
 {
-    Found const found = find(root, url);
+    Found const found = find(url);
     os::OpenFile file;
     check(file.create(path, 0666), "'" + path + "' cannot be made");
     std::uint64_t offset = 0;
     try {
-        found.file.read(found.index, tavFolder(root), nullptr, [&](std::string_view piece) {
+        found.file.read(found.index, tavFolder(root_), nullptr, [&](std::string_view piece) {
             check(file.writeAt(offset, piece), "'" + path + "' cannot be written");
             offset += piece.size();
         });
@@ -448,20 +447,20 @@ void LocalStorage::extractTo(common::RootPath const& root, OdString const& url, 
     }
 }
 
-WriteOutcome LocalStorage::extract(common::RootPath const& root, OdString const& url, std::string const& path)
+WriteOutcome LocalStorage::extract(OdString const& url, std::string const& path)
 {
-    return guarded([&] { extractTo(root, url, path); });
+    return guarded([&] { extractTo(url, path); });
 }
 
-Expected<bool> LocalStorage::contains(common::RootPath const& root, OdString const& url)
+Expected<bool> LocalStorage::contains(OdString const& url)
 {
-    return guarded<bool>([&] { return isKept(root, url); });
+    return guarded<bool>([&] { return isKept(url); });
 }
 
-Expected<std::uint64_t> LocalStorage::size(common::RootPath const& root, OdString const& url)
+Expected<std::uint64_t> LocalStorage::size(OdString const& url)
 {
     return guarded<std::uint64_t>([&] {
-        Found const found = find(root, url);
+        Found const found = find(url);
         return found.file.entries()[found.index].record.length;
     });
 }
@@ -571,20 +570,19 @@ private:
 
 } // namespace
 
-Expected<Freed> LocalStorage::keepOnly(
-    common::RootPath const& root, std::set<OdString> const& urls, std::set<OdString> const& elsewhere)
+Expected<Freed> LocalStorage::keepOnly(std::set<OdString> const& urls, std::set<OdString> const& elsewhere)
 {
     return guarded<Freed>([&] {
         flushBatch();
-        return Cleaning(root, urls, elsewhere).run();
+        return Cleaning(root_, urls, elsewhere).run();
     });
 }
 
-Expected<Freed> LocalStorage::removeLeftovers(common::RootPath const& root)
+Expected<Freed> LocalStorage::removeLeftovers()
 {
     return guarded<Freed>([&] {
         flushBatch();
-        return Cleaning(root, {}, {}).runOnLeftovers();
+        return Cleaning(root_, {}, {}).runOnLeftovers();
     });
 }
 

@@ -52,7 +52,8 @@ public:
     /// `previousUrl` gives, for a path, the URL of the version that the last commit holds of that file, under whatever
     /// path: its store is appended to. `knownUrl` gives, for a digest, the URL under which its content is kept already.
     /// Either may be empty. Only tests give a `segmentLog`: contents are worked on in pieces of 2^`segmentLog` bytes.
-    explicit LocalStorage(LookUp previousUrl = {}, LookUp knownUrl = {}, unsigned segmentLog = kSegmentLog);
+    explicit LocalStorage(
+        common::RootPath root, LookUp previousUrl = {}, LookUp knownUrl = {}, unsigned segmentLog = kSegmentLog);
     /// Takes back what was stored and not flushed.
     ~LocalStorage();
 
@@ -61,39 +62,37 @@ public:
     /// already is read, once in a batch, and stored again under its URL where it is damaged or gone. What is kept is
     /// what was read, under its own digest; a file seen to change meanwhile is an error ("has changed while it was
     /// being stored"), after which the caller tries again. An error leaves nothing of the file behind.
-    Expected<OdString> store(common::RootPath const& root, OdString const& path);
+    Expected<OdString> store(OdString const& path);
     /// Makes the content at `url` readable: where it is damaged or gone it is stored again, flushed and read back, from
     /// the file `path`, relative to the working folder, which has that content. True when it was stored again.
-    Expected<bool> repair(common::RootPath const& root, OdString const& url, OdString const& path);
+    Expected<bool> repair(OdString const& url, OdString const& path);
     /// Waits until everything stored since the last flush is safe on the disk, in one go. After an error nothing of it
     /// is kept, and its URLs are void.
-    WriteOutcome flush(common::RootPath const& root);
+    WriteOutcome flush();
 
     /// Writes the content into the new file `path`, a full path in bytes, and does not flush it. When the name is
     /// taken, nothing is touched; after any other error there is no file.
-    WriteOutcome extract(common::RootPath const& root, OdString const& url, std::string const& path);
+    WriteOutcome extract(OdString const& url, std::string const& path);
     /// Gives the content to `sink`, piece by piece. Until this returns success the content may yet turn out to be
     /// damaged. A sink that returns false gets no more; that is an error too ("was not read to its end").
-    WriteOutcome
-    read(common::RootPath const& root, OdString const& url, std::function<bool(char const*, std::size_t)> const& sink);
+    WriteOutcome read(OdString const& url, std::function<bool(char const*, std::size_t)> const& sink);
 
     /// Whether the content is kept; that it is whole, `verify` finds out. Error: no URL of this storage.
-    Expected<bool> contains(common::RootPath const& root, OdString const& url);
+    Expected<bool> contains(OdString const& url);
     /// Length of the content in bytes, without unpacking it.
-    Expected<std::uint64_t> size(common::RootPath const& root, OdString const& url);
+    Expected<std::uint64_t> size(OdString const& url);
     /// Reads the content and checks its digest.
-    WriteOutcome verify(common::RootPath const& root, OdString const& url);
+    WriteOutcome verify(OdString const& url);
 
     /// Removes everything but `urls` and the revisions that they build on, and what interrupted operations have left.
     /// A store is rewritten beside the old one, flushed, read back, and takes its place. A store in which something to
     /// be kept cannot be read stays as it is; the rest is cleaned, and then that is the error. So does a store that
     /// belongs to one of `elsewhere`, URLs of contents that need not be here; that is none. What was stored and not
     /// flushed is flushed first.
-    Expected<Freed>
-    keepOnly(common::RootPath const& root, std::set<OdString> const& urls, std::set<OdString> const& elsewhere = {});
+    Expected<Freed> keepOnly(std::set<OdString> const& urls, std::set<OdString> const& elsewhere = {});
 
     /// Removes only what interrupted operations have left. No content goes, whether a commit needs it or not.
-    Expected<Freed> removeLeftovers(common::RootPath const& root);
+    Expected<Freed> removeLeftovers();
 
 private:
     struct Object {
@@ -114,22 +113,23 @@ private:
 
     std::optional<StorageUrl> knownPlace(DigestBytes const& digest) const;
     StorageUrl newPlace(OdString const& path, DigestBytes const& digest) const;
-    void keepObject(common::RootPath const& root, StorageUrl const& url, Content const& content);
-    void keepDrawing(common::RootPath const& root, StorageUrl const& url, OdString const& path, Content const& content);
+    void keepObject(StorageUrl const& url, Content const& content);
+    void keepDrawing(StorageUrl const& url, OdString const& path, Content const& content);
     StorageUrl previousVersion(OdString const& path) const;
     void loadBase(RecordFile const& store, std::optional<std::size_t> index, std::string const& scratch);
-    void beginBatch(common::RootPath const& root);
+    void beginBatch();
     void flushBatch();
     void flushContents() const;
     void takeBack() noexcept;
 
-    std::string pathOf(common::RootPath const& root, StorageUrl const& url) const;
-    bool isKept(common::RootPath const& root, OdString const& url) const;
-    bool isReadable(common::RootPath const& root, StorageUrl const& url) const;
-    Found find(common::RootPath const& root, OdString const& url) const;
-    void read(common::RootPath const& root, OdString const& url, Sink const& sink) const;
-    void extractTo(common::RootPath const& root, OdString const& url, std::string const& path) const;
+    std::string pathOf(StorageUrl const& url) const;
+    bool isKept(OdString const& url) const;
+    bool isReadable(StorageUrl const& url) const;
+    Found find(OdString const& url) const;
+    void read(OdString const& url, Sink const& sink) const;
+    void extractTo(OdString const& url, std::string const& path) const;
 
+    common::RootPath root_;
     LookUp previousUrl_;
     LookUp knownUrl_;
     unsigned segmentLog_;

@@ -320,10 +320,10 @@ void storeWhatNobodyNeeds(Scene const& scene)
     {
         tav::LocalDatabase const database = tav::LocalDatabase::open(scene.root());
         tav::Tree const files = database.commits().files(database.currentCommit());
-        tav::LocalStorage storage([&](OdString const& path) { return files.at(path); });
-        require(storage.store(scene.root(), L"plan.dwg").hasValue(), "store a drawing");
-        require(storage.store(scene.root(), L"note.txt").hasValue(), "store a text");
-        require(storage.flush(scene.root()).hasValue(), "flush");
+        tav::LocalStorage storage(scene.root(), [&](OdString const& path) { return files.at(path); });
+        require(storage.store(L"plan.dwg").hasValue(), "store a drawing");
+        require(storage.store(L"note.txt").hasValue(), "store a text");
+        require(storage.flush().hasValue(), "flush");
     }
     scene.place().write("now/repository/.tav/restoring/0", "left");
     scene.place().write("now/repository/.tav/objects/incoming/left", "left");

@@ -18,7 +18,7 @@ protected:
         for (std::string const& url : wanted) {
             kept.insert(support::fromUtf8(url));
         }
-        auto const freed = newStorage().keepOnly(repo.root(), kept);
+        auto const freed = newStorage().keepOnly(kept);
         return freed.hasValue() ? std::to_string(freed.value().contents) + " contents, " +
                                       std::to_string(freed.value().bytes) + " bytes"
                                 : messageOf(freed);
@@ -116,8 +116,8 @@ TEST_F(Cleaning, FlushesFirst)
 {
     repo.write("file", "text");
     tav::LocalStorage storage = newStorage();
-    OdString const url = storage.store(repo.root(), L"file").value();
-    EXPECT_EQ(messageOf(storage.keepOnly(repo.root(), {url})), "success");
+    OdString const url = storage.store(L"file").value();
+    EXPECT_EQ(messageOf(storage.keepOnly({url})), "success");
     EXPECT_EQ(contentOf(url.ansi_str()), "text");
 }
 

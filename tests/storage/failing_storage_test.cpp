@@ -72,13 +72,13 @@ bool storeThree(Scene const& scene, std::vector<std::string>& urls)
 {
     tav::LocalStorage storage = scene.newStorage();
     for (wchar_t const* const name : {L"plan.dwg", L"new.dwg", L"new"}) {
-        auto const url = storage.store(scene.repo.root(), name);
+        auto const url = storage.store(name);
         if (!url.hasValue()) {
             return false;
         }
         urls.push_back(url.value().ansi_str());
     }
-    return storage.flush(scene.repo.root()).hasValue();
+    return storage.flush().hasValue();
 }
 
 void writeThree(Scene const& scene)
@@ -131,8 +131,7 @@ TEST_P(FailingStorage, ReplacesADamagedObjectOrLeavesIt)
         {
             FailingCall const failing(n, GetParam());
             tav::LocalStorage storage = scene.newStorage();
-            succeeded =
-                storage.store(scene.repo.root(), L"file").hasValue() && storage.flush(scene.repo.root()).hasValue();
+            succeeded = storage.store(L"file").hasValue() && storage.flush().hasValue();
             more = failing.hasFailed();
             name = failing.name();
         }
@@ -169,9 +168,8 @@ TEST_P(FailingStorage, ExtractsTheWholeContentOrNothing)
         std::string name;
         {
             FailingCall const failing(n, GetParam());
-            succeeded = scene.newStorage()
-                            .extract(scene.repo.root(), support::fromUtf8(scene.second), scene.repo.pathTo("copy"))
-                            .hasValue();
+            succeeded =
+                scene.newStorage().extract(support::fromUtf8(scene.second), scene.repo.pathTo("copy")).hasValue();
             more = failing.hasFailed();
             name = failing.name();
         }
@@ -189,8 +187,8 @@ TEST_P(FailingStorage, CleansWithoutLosingWhatIsKept)
         std::string name;
         {
             FailingCall const failing(n, GetParam());
-            static_cast<void>(scene.newStorage().keepOnly(
-                scene.repo.root(), {support::fromUtf8(scene.second), support::fromUtf8(scene.object)}));
+            static_cast<void>(
+                scene.newStorage().keepOnly({support::fromUtf8(scene.second), support::fromUtf8(scene.object)}));
             more = failing.hasFailed();
             name = failing.name();
         }
@@ -214,12 +212,9 @@ TEST(InterruptedStorage, GoesOnWhicheverCallIsInterrupted)
         std::vector<std::string> urls;
         FailingCall const failing(n, EINTR);
         EXPECT_TRUE(storeThree(scene, urls)) << failing.name();
-        EXPECT_TRUE(scene.newStorage()
-                        .extract(scene.repo.root(), support::fromUtf8(urls.at(0)), scene.repo.pathTo("copy"))
-                        .hasValue())
+        EXPECT_TRUE(scene.newStorage().extract(support::fromUtf8(urls.at(0)), scene.repo.pathTo("copy")).hasValue())
             << failing.name();
-        EXPECT_TRUE(scene.newStorage().keepOnly(scene.repo.root(), {support::fromUtf8(urls.at(0))}).hasValue())
-            << failing.name();
+        EXPECT_TRUE(scene.newStorage().keepOnly({support::fromUtf8(urls.at(0))}).hasValue()) << failing.name();
         more = failing.hasFailed();
     }
 }

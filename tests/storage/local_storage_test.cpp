@@ -22,7 +22,7 @@ class LocalStorage : public StorageTest {
 protected:
     std::string extract(std::string const& url, std::string const& path) const
     {
-        return messageOf(newStorage().extract(repo.root(), support::fromUtf8(url), repo.pathTo(path)));
+        return messageOf(newStorage().extract(support::fromUtf8(url), repo.pathTo(path)));
     }
 
     mode_t modeOf(std::string const& name) const
@@ -62,7 +62,7 @@ TEST_F(LocalStorage, GivesBackContentsOfAnyLength)
             for (char const* const name : {"file", "plan.dwg", "b\xff\n.dwg", "a\xfe.txt"}) {
                 std::string const url = store(name, content);
                 EXPECT_EQ(contentOf(url), content) << url;
-                EXPECT_EQ(newStorage().size(repo.root(), support::fromUtf8(url)).value(), size);
+                EXPECT_EQ(newStorage().size(support::fromUtf8(url)).value(), size);
                 EXPECT_EQ(verify(url), "success");
             }
         }
@@ -85,12 +85,12 @@ TEST_F(LocalStorage, ReadsWhatIsNotFlushedYet)
     repo.write("file", "text");
     tav::LocalStorage storage = newStorage();
     for (wchar_t const* const name : {L"plan.dwg", L"file"}) {
-        OdString const url = storage.store(repo.root(), name).value();
-        EXPECT_TRUE(storage.contains(repo.root(), url).value());
-        EXPECT_EQ(messageOf(storage.verify(repo.root(), url)), "success");
+        OdString const url = storage.store(name).value();
+        EXPECT_TRUE(storage.contains(url).value());
+        EXPECT_EQ(messageOf(storage.verify(url)), "success");
     }
-    EXPECT_TRUE(newStorage().contains(repo.root(), storage.store(repo.root(), L"plan.dwg").value()).value());
-    EXPECT_FALSE(newStorage().contains(repo.root(), storage.store(repo.root(), L"file").value()).value());
+    EXPECT_TRUE(newStorage().contains(storage.store(L"plan.dwg").value()).value());
+    EXPECT_FALSE(newStorage().contains(storage.store(L"file").value()).value());
 }
 
 TEST_F(LocalStorage, TakesBackWhatIsNotFlushed)
@@ -103,7 +103,7 @@ TEST_F(LocalStorage, TakesBackWhatIsNotFlushed)
     {
         tav::LocalStorage storage = newStorage();
         for (wchar_t const* const name : {L"old.dwg", L"new.dwg", L"file"}) {
-            EXPECT_EQ(messageOf(storage.store(repo.root(), name)), "success");
+            EXPECT_EQ(messageOf(storage.store(name)), "success");
         }
     }
     EXPECT_THAT(files(), ElementsAre(fileOf(first)));
@@ -133,9 +133,9 @@ TEST_F(LocalStorage, KeepsEqualContentOfOneBatchOnce)
     std::vector<OdString> urls;
     for (char const* const name : {"a.dwg", "b.dwg", "c"}) {
         repo.write(name, "abc");
-        urls.push_back(storage.store(repo.root(), support::fromUtf8(name)).value());
+        urls.push_back(storage.store(support::fromUtf8(name)).value());
     }
-    EXPECT_EQ(messageOf(storage.flush(repo.root())), "success");
+    EXPECT_EQ(messageOf(storage.flush()), "success");
     EXPECT_EQ(urls[0], urls[1]);
     EXPECT_EQ(urls[0], urls[2]);
     EXPECT_THAT(files(), ElementsAre(fileOf(urls[0].ansi_str())));
@@ -186,13 +186,11 @@ TEST_F(LocalStorage, RepairsAContentFromAFileThatHasItAndFromNoOther)
     for (char const* const name : {"file", "plan.dwg"}) {
         std::string const url = store(name, "abc");
         tav::LocalStorage storage = newStorage();
-        EXPECT_FALSE(storage.repair(repo.root(), support::fromUtf8(url), support::fromUtf8(name)).value());
+        EXPECT_FALSE(storage.repair(support::fromUtf8(url), support::fromUtf8(name)).value());
         repo.write(fileOf(url), "damaged");
         repo.write("other", "abd");
-        EXPECT_EQ(
-            messageOf(storage.repair(repo.root(), support::fromUtf8(url), L"other")),
-            "'other' has another content by now.");
-        EXPECT_TRUE(storage.repair(repo.root(), support::fromUtf8(url), support::fromUtf8(name)).value());
+        EXPECT_EQ(messageOf(storage.repair(support::fromUtf8(url), L"other")), "'other' has another content by now.");
+        EXPECT_TRUE(storage.repair(support::fromUtf8(url), support::fromUtf8(name)).value());
         EXPECT_EQ(contentOf(url), "abc");
     }
 }
@@ -203,8 +201,8 @@ TEST_F(LocalStorage, KeepsADamagedObjectUntilTheNewOneIsFlushed)
     repo.write(fileOf(url), "damaged");
     {
         tav::LocalStorage storage = newStorage();
-        EXPECT_EQ(messageOf(storage.store(repo.root(), L"file")), "success");
-        EXPECT_EQ(messageOf(storage.verify(repo.root(), support::fromUtf8(url))), "success");
+        EXPECT_EQ(messageOf(storage.store(L"file")), "success");
+        EXPECT_EQ(messageOf(storage.verify(support::fromUtf8(url))), "success");
     }
     EXPECT_THAT(files(), ElementsAre(fileOf(url)));
     EXPECT_EQ(repo.read(fileOf(url)), "damaged");
@@ -224,7 +222,7 @@ TEST_F(LocalStorage, ReadsAKnownContentOnceHoweverManyFilesHaveIt)
         return RealCallsAfterwards::real.openat(folder, name, flags, mode);
     };
     for (int i = 0; i < 3; ++i) {
-        EXPECT_EQ(storage.store(repo.root(), L"a.dwg").value(), support::fromUtf8(known[kAbc]));
+        EXPECT_EQ(storage.store(L"a.dwg").value(), support::fromUtf8(known[kAbc]));
     }
     EXPECT_EQ(opened, 1);
 }
@@ -260,7 +258,7 @@ TEST_F(LocalStorage, MakesANewStoreForADrawingThatWasAnObjectOrHasAStrangeUrl)
 TEST_F(LocalStorage, SaysWhyAFileCannotBeStored)
 {
     repo.makeFolder("folder.dwg");
-    auto const failure = [this](wchar_t const* name) { return messageOf(newStorage().store(repo.root(), name)); };
+    auto const failure = [this](wchar_t const* name) { return messageOf(newStorage().store(name)); };
     EXPECT_EQ(failure(L"missing"), "'missing' cannot be opened: No such file or directory.");
     EXPECT_EQ(failure(L"folder.dwg"), "'folder.dwg' cannot be opened: Is a directory.");
     EXPECT_THAT(files(), IsEmpty());
@@ -285,9 +283,9 @@ TEST_F(LocalStorage, RefusesAFileThatChangesWhileItIsStored)
                 return RealCallsAfterwards::real.pread(file, buffer, count, offset);
             };
             tav::LocalStorage storage = newStorage();
-            auto const url = storage.store(repo.root(), support::fromUtf8(name));
+            auto const url = storage.store(support::fromUtf8(name));
             os::calls() = RealCallsAfterwards::real;
-            EXPECT_EQ(messageOf(storage.flush(repo.root())), "success");
+            EXPECT_EQ(messageOf(storage.flush()), "success");
             if (!url.hasValue()) {
                 EXPECT_EQ(messageOf(url), "The file has changed while it was being stored.");
                 EXPECT_THAT(files(), IsEmpty());
@@ -309,7 +307,7 @@ TEST_F(LocalStorage, RefusesAFileThatBecomesShorterWhileItIsStored)
         EXPECT_EQ(truncate(path.c_str(), kSegment), 0);
         return RealCallsAfterwards::real.pread(file, buffer, count, offset);
     };
-    EXPECT_EQ(messageOf(newStorage().store(repo.root(), L"file")), "'file' has become shorter while it was read.");
+    EXPECT_EQ(messageOf(newStorage().store(L"file")), "'file' has become shorter while it was read.");
     EXPECT_THAT(files(), IsEmpty());
 }
 
@@ -338,7 +336,7 @@ TEST_F(LocalStorage, StopsReadingWhenTheSinkHasEnough)
 {
     std::string const url = store("file", drawing(1, 3 * kSegment));
     std::size_t total = 0;
-    auto const outcome = newStorage().read(repo.root(), support::fromUtf8(url), [&](char const*, std::size_t count) {
+    auto const outcome = newStorage().read(support::fromUtf8(url), [&](char const*, std::size_t count) {
         total += count;
         return false;
     });
@@ -354,10 +352,9 @@ TEST_F(LocalStorage, SaysWhatIsKept)
     EXPECT_FALSE(contains(other));
     EXPECT_FALSE(contains("po:" + kAbc));
     EXPECT_FALSE(contains("tf:x#" + kAbc));
-    EXPECT_EQ(messageOf(newStorage().contains(repo.root(), L"po:1")), "'po:1' is no URL of this storage.");
+    EXPECT_EQ(messageOf(newStorage().contains(L"po:1")), "'po:1' is no URL of this storage.");
     EXPECT_EQ(verify(other), "'" + other + "' is not in the storage.");
-    EXPECT_EQ(
-        messageOf(newStorage().size(repo.root(), support::fromUtf8(other))), "'" + other + "' is not in the storage.");
+    EXPECT_EQ(messageOf(newStorage().size(support::fromUtf8(other))), "'" + other + "' is not in the storage.");
 }
 
 TEST_F(LocalStorage, FlushesManyFilesAtOnceAndEachWhereThatIsNotKnown)
@@ -371,12 +368,12 @@ TEST_F(LocalStorage, FlushesManyFilesAtOnceAndEachWhereThatIsNotKnown)
         tav::LocalStorage storage = newStorage();
         for (int i = 0; i < 20; ++i) {
             repo.write("file", std::to_string(given) + " " + std::to_string(i));
-            EXPECT_EQ(messageOf(storage.store(repo.root(), L"file")), "success");
+            EXPECT_EQ(messageOf(storage.store(L"file")), "success");
         }
         RealCallsAfterwards const afterwards;
         os::calls().syncfs = [](int) { return ++flushesOfAll, errno = error, error == 0 ? 0 : -1; };
         os::calls().fsync = [](int) { return ++flushesOfOne, 0; };
-        EXPECT_EQ(messageOf(storage.flush(repo.root())), "success");
+        EXPECT_EQ(messageOf(storage.flush()), "success");
         EXPECT_EQ(flushesOfAll, 1);
         EXPECT_EQ(flushesOfOne, error == 0 ? 1 : 21); // The folder, too.
     }

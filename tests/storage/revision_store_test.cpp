@@ -123,7 +123,7 @@ TEST_F(RevisionStore, KeepsARevisionWithADamagedHeaderWhenAnAppendIsTakenBack)
         bytes[begin + 40] = static_cast<char>(bytes[begin + 40] ^ 1);
         repo.write(file, bytes);
         repo.write("plan.dwg", edited(contents[2], 9));
-        EXPECT_EQ(messageOf(newStorage().store(repo.root(), L"plan.dwg")), "success");
+        EXPECT_EQ(messageOf(newStorage().store(L"plan.dwg")), "success");
         ASSERT_TRUE(repo.has(file));
         EXPECT_EQ(repo.read(file), bytes);
         repo.write(file, whole);
@@ -237,8 +237,8 @@ TEST_F(RevisionStore, LosesTheDamagedRecordOfARevisionStoredAgainWithTheNextClea
     for (std::size_t const place : {std::size_t{40}, std::size_t{150}}) {
         damage(place);
         EXPECT_EQ(store("plan.dwg", contents[0]), urls[0]);
-        auto const freed = newStorage().keepOnly(
-            repo.root(), {support::fromUtf8(urls[0]), support::fromUtf8(urls[1]), support::fromUtf8(urls[2])});
+        auto const freed =
+            newStorage().keepOnly({support::fromUtf8(urls[0]), support::fromUtf8(urls[1]), support::fromUtf8(urls[2])});
         EXPECT_EQ(messageOf(freed), "success");
         EXPECT_EQ(repo.read(file).size(), whole.size());
         EXPECT_TRUE(recordsOf(urls[0]).isClean());

@@ -53,7 +53,7 @@ protected:
     tav::LocalStorage newStorage() const
     {
         return tav::LocalStorage(
-            [this](OdString const& path) { return lookUp(committed, path); },
+            repo.root(), [this](OdString const& path) { return lookUp(committed, path); },
             [this](OdString const& digest) { return lookUp(known, digest); }, kSegmentLog);
     }
 
@@ -62,8 +62,8 @@ protected:
     {
         repo.write(name, content);
         tav::LocalStorage storage = newStorage();
-        auto const url = storage.store(repo.root(), support::fromUtf8(name));
-        WriteOutcome const flushed = storage.flush(repo.root());
+        auto const url = storage.store(support::fromUtf8(name));
+        WriteOutcome const flushed = storage.flush();
         return url.hasValue() && flushed.hasValue() ? url.value().ansi_str() : messageOf(url) + messageOf(flushed);
     }
 
@@ -80,22 +80,18 @@ protected:
     {
         std::string content;
         tav::LocalStorage storage = newStorage();
-        WriteOutcome const outcome =
-            storage.read(repo.root(), support::fromUtf8(url), [&](char const* bytes, std::size_t count) {
-                content.append(bytes, count);
-                return true;
-            });
+        WriteOutcome const outcome = storage.read(support::fromUtf8(url), [&](char const* bytes, std::size_t count) {
+            content.append(bytes, count);
+            return true;
+        });
         return outcome.hasValue() ? content : messageOf(outcome);
     }
 
-    std::string verify(std::string const& url) const
-    {
-        return messageOf(newStorage().verify(repo.root(), support::fromUtf8(url)));
-    }
+    std::string verify(std::string const& url) const { return messageOf(newStorage().verify(support::fromUtf8(url))); }
 
     bool contains(std::string const& url) const
     {
-        auto const answer = newStorage().contains(repo.root(), support::fromUtf8(url));
+        auto const answer = newStorage().contains(support::fromUtf8(url));
         return answer.hasValue() && answer.value();
     }
 
