@@ -16,47 +16,49 @@ target_link_libraries(mu_test_headers PRIVATE GTest::gmock_main mu_warnings)
 target_precompile_headers(mu_test_headers PRIVATE <gmock/gmock.h> <gtest/gtest.h> <string> <vector>)
 mu_test_options(mu_test_headers)
 
-# mu_test(<name> SOURCES <file>... [LINK <target>...] [SLOW <pattern>...]): one test program whose tests ctest runs one
-# by one. Those that a pattern of SLOW names, as --gtest_filter takes it, have the label `slow`, all others `single`.
-# Under the sanitizers a process takes longer to start than most tests to run: there each program runs in a few shards.
+# mu_test(<name> SOURCES <file>... [LINK <target>...] [SLOW <pattern>...]): one test program. ctest runs what a pattern of
+# SLOW names, as --gtest_filter takes it, test by test with the label `slow`, and all other tests in one process: to
+# start a process takes longer than most tests.
 #
-# `ctest --preset quick` leaves out both labels. In their place it runs what is not slow of each program in one process,
-# for here too most of the time goes into starting processes.
+# Under the sanitizers a program runs in shards, so that two cores are busy to the end. Of a program that is slow as a
+# whole all shards but the first have the label: without them every eighth test is still checked.
 function(mu_test name)
     cmake_parse_arguments(TEST "" "" "SOURCES;LINK;SLOW" ${ARGN})
     add_executable(${name} ${TEST_SOURCES})
     target_link_libraries(${name} PRIVATE mu_test_support ${TEST_LINK} GTest::gmock_main mu_warnings)
     mu_test_options(${name})
     target_precompile_headers(${name} REUSE_FROM mu_test_headers)
+    list(JOIN TEST_SLOW ":" slow)
     if(MU_COMMON_SANITIZE)
-        mu_test_in_shards(${name} 4)
+        mu_test_in_shards(${name} "${slow}")
         return()
     endif()
-    list(JOIN TEST_SLOW ":" slow)
-    mu_test_one_by_one(${name} "-${slow}" 120 single)
-    if(slow)
-        mu_test_one_by_one(${name} "${slow}" 300 slow)
-    endif()
     if(NOT slow STREQUAL "*")
-        add_test(NAME quick.${name} CONFIGURATIONS quick COMMAND ${name} --gtest_brief=1 "--gtest_filter=-${slow}")
-        set_tests_properties(quick.${name} PROPERTIES TIMEOUT 120)
+        add_test(NAME ${name} COMMAND ${name} --gtest_brief=1 "--gtest_filter=-${slow}")
+        set_tests_properties(${name} PROPERTIES TIMEOUT 300)
+    endif()
+    if(slow)
+        gtest_discover_tests(${name}
+            TEST_FILTER "${slow}"
+            DISCOVERY_MODE PRE_TEST
+            NO_PRETTY_VALUES
+            PROPERTIES TIMEOUT 300 LABELS slow)
     endif()
 endfunction()
 
-function(mu_test_one_by_one name filter timeout label)
-    gtest_discover_tests(${name}
-        TEST_FILTER "${filter}"
-        DISCOVERY_MODE PRE_TEST
-        NO_PRETTY_VALUES
-        PROPERTIES TIMEOUT ${timeout} LABELS ${label})
-endfunction()
-
-function(mu_test_in_shards name shards)
+function(mu_test_in_shards name slow)
+    set(shards 4)
+    if(slow STREQUAL "*")
+        set(shards 8)
+    endif()
     math(EXPR last "${shards} - 1")
     foreach(shard RANGE ${last})
         add_test(NAME ${name}.${shard} COMMAND ${name} --gtest_brief=1)
         set_tests_properties(${name}.${shard} PROPERTIES
             TIMEOUT 600
             ENVIRONMENT "GTEST_TOTAL_SHARDS=${shards};GTEST_SHARD_INDEX=${shard}")
+        if(slow STREQUAL "*" AND shard GREATER 0)
+            set_tests_properties(${name}.${shard} PROPERTIES LABELS slow)
+        endif()
     endforeach()
 endfunction()
