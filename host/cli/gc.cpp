@@ -11,6 +11,8 @@
 #include "host/storage/local_storage.h"
 #include "host/text/plural.h"
 
+#include <algorithm>
+#include <cstddef>
 #include <set>
 #include <string>
 #include <variant>
@@ -49,17 +51,42 @@ std::string learnWhatIsNeeded(WriteSession& session)
     }
 }
 
+/// How many of the contents that were entered here the storage does not have. Then the database may be of another
+/// repository, which needs nothing of this storage.
+std::size_t countMissing(WriteSession& session, LocalStorage& storage)
+{
+    std::set<OdString> const kept = valueOrFail(storage.contents(), "Check the disk and your rights in '.tav'.");
+    std::vector<OdString> const entered = session.database().contents();
+    auto const isMissing = [&](OdString const& url) { return kept.count(url) == 0; };
+    return static_cast<std::size_t>(std::count_if(entered.begin(), entered.end(), isMissing));
+}
+
+/// Why nothing but leftovers can be removed; empty when it is known what commits need.
+std::string whyOnlyLeftovers(WriteSession& session, LocalStorage& storage)
+{
+    if (std::size_t const missing = countMissing(session, storage)) {
+        return counted(missing, "committed version") +
+               " that should be here cannot be found. Run 'tav verify' to see what is missing; if '.tav/tav.db' is of "
+               "another folder, put the right one in its place, or move it away and run 'tav init'.";
+    }
+    std::string const doubt = learnWhatIsNeeded(session);
+    return doubt.empty() ? doubt : "the server does not say what its commits need. " + doubt;
+}
+
+/// Leftovers go first: on a full disk nothing can be learned.
 Freed removeWhatNobodyNeeds(WriteSession& session, LocalStorage& storage)
 {
-    std::string const doubt = learnWhatIsNeeded(session);
-    if (!doubt.empty()) {
-        printNote("Only leftovers are removed, as the server does not say what its commits need. " + doubt);
-        return valueOrFail(storage.removeLeftovers(), "Check your rights in '.tav'.");
+    Freed const leftovers = valueOrFail(storage.removeLeftovers(), "Check your rights in '.tav'.");
+    std::string const why = whyOnlyLeftovers(session, storage);
+    if (!why.empty()) {
+        printNote("Only leftovers are removed: " + why);
+        return leftovers;
     }
     Contents const needed = contentsOf(session.root(), session.database());
-    return valueOrFail(
+    Freed const unneeded = valueOrFail(
         storage.keepOnly(setOf(needed.here), setOf(needed.elsewhere)),
         "Run 'tav verify' to see whether anything is damaged.");
+    return {leftovers.contents + unneeded.contents, leftovers.bytes + unneeded.bytes};
 }
 
 } // namespace

@@ -61,12 +61,18 @@ void enterProject(LocalDatabase const& database, std::string const& folder, std:
 }
 
 /// Makes a lost database again, and says what the user should know of it.
-std::string rebuilt(common::RootPath const& root, std::string const& folder, OdString const& server)
+std::string rebuilt(common::RootPath const& root, std::string const& folder, OdString const& named)
 {
-    Rebuilt const made = rebuildDatabase(root, fromUtf8(folder), server);
+    OdString const server = namedOrDefault(named);
+    Rebuilt const made = rebuildDatabase(root, fromUtf8(folder), {server, !named.isEmpty()});
+    if (made.unknown > 0) {
+        printNote(
+            "The server in '" + server.ansi_str() + "' does not know " + std::to_string(made.unknown) +
+            " of the versions that are here; 'tav gc' would remove them.");
+    }
     std::string const place =
         made.base == 0 ? ""
-                       : " The folder is taken to stand on commit " + std::to_string(made.base) + "; see 'tav status'.";
+                       : " The folder is assumed to be at commit " + std::to_string(made.base) + "; see 'tav status'.";
     return "Made the database again from the server, with " +
            counted(static_cast<std::size_t>(made.commits), "commit") + "." + place + "\n";
 }
@@ -86,8 +92,7 @@ void init(InitOptions const& options)
     os::FileLock lock = lockRepository(root, "init");
     makeIgnoreFile(root);
     makeState(root);
-    std::string const found =
-        LocalDatabase::isLost(root) ? rebuilt(root, folder, namedOrDefault(server)) : std::string();
+    std::string const found = LocalDatabase::isLost(root) ? rebuilt(root, folder, server) : std::string();
     LocalDatabase::make(root);
     WriteSession session(root, std::move(lock), Recovery::attempted);
     chooseServer(session.database(), server, folder, name);

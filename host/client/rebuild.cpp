@@ -11,6 +11,8 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <set>
+#include <string>
 #include <utility>
 #include <vector>
 
@@ -18,66 +20,90 @@ namespace tav {
 
 namespace {
 
+using Urls = std::set<OdString>;
+
+/// A repository of the server, and what it says of the versions that are kept here.
 struct Candidate {
     OdString repository;
-    std::size_t contents = 0; ///< of its history that are kept here
+    std::size_t known = 0; ///< versions of its files
+    std::size_t unknown = 0;
 };
 
-std::size_t contentsHere(LocalStorage& storage, std::vector<FileRecord> const& changes)
+/// Every repository begins with the same ignore rules: having those in common says nothing.
+bool isProperty(OdString const& path)
 {
-    auto const isHere = [&](FileRecord const& change) {
-        auto const kept = storage.contains(change.url); // An error for a file that is gone, which has no URL.
-        return kept.hasValue() && kept.value();
-    };
-    return static_cast<std::size_t>(std::count_if(changes.begin(), changes.end(), isHere));
+    return path.left(5) == OdString(L".tav/");
 }
 
-std::size_t contentsHere(common::RootPath const& root, Connection& connection)
+Candidate candidateOf(OdString const& server, OdString const& repository, Urls unknown)
 {
-    std::size_t count = 0;
-    LocalStorage storage(root);
+    Candidate candidate{repository};
+    Connection connection(server, repository);
     forEachPageThere(connection, 0, [&](std::vector<ChangedCommit> const& page) {
         for (ChangedCommit const& commit : page) {
-            count += contentsHere(storage, commit.changes);
+            for (FileRecord const& change : commit.changes) {
+                bool const isHere = unknown.erase(change.url) > 0;
+                candidate.known += isHere && !isProperty(change.path) ? 1 : 0;
+            }
         }
     });
-    return count;
+    candidate.unknown = unknown.size();
+    return candidate;
 }
 
-/// Of two copies of one project each has the contents, but the list of projects knows which is this one.
-bool isListed(OdString const& folder, OdString const& repository)
+/// The repository that the list of projects names for `folder`; empty when it knows none.
+OdString listedRepository(OdString const& folder)
 {
     common::ConfigData const data = readProjects();
     auto const listed = data.projects.find(folder);
-    return listed != data.projects.end() && listed->second.cloud == repository;
+    return listed == data.projects.end() ? OdString() : listed->second.cloud;
 }
 
-/// The repository of the server that most of the contents here belong to.
-OdString findRepository(common::RootPath const& root, OdString const& folder, OdString const& server)
+/// The repositories that `here` may belong to, the best first: `listed`, or, where no list knows the folder, those
+/// that have any of it.
+std::vector<Candidate> candidatesOn(OdString const& server, OdString const& listed, Urls const& here)
 {
     std::vector<Candidate> candidates;
     for (OdString const& repository : repositoriesIn(server)) {
-        Connection connection(server, repository);
-        if (std::size_t const contents = contentsHere(root, connection); contents > 0) {
-            candidates.push_back({repository, contents});
+        if (!listed.isEmpty() && repository != listed) {
+            continue;
+        }
+        Candidate const candidate = candidateOf(server, repository, here);
+        if (candidate.known > 0 || (candidate.unknown == 0 && !listed.isEmpty())) {
+            candidates.push_back(candidate);
         }
     }
+    auto const isBetter = [](Candidate const& a, Candidate const& b) { return a.unknown < b.unknown; };
+    std::stable_sort(candidates.begin(), candidates.end(), isBetter);
+    return candidates;
+}
+
+/// The repository to which all versions here belong: 'tav gc' removes those that its repository does not know. Some may
+/// be left of an interrupted command, so the word of the user counts together with the list of projects.
+Candidate findRepository(common::RootPath const& root, OdString const& folder, RebuildSource const& source)
+{
+    constexpr char const* kNameIt = "Name the folder of the right one with --server.";
+    Urls const here = valueOrFail(LocalStorage(root).contents(), "Check the disk and your rights in '.tav'.");
+    OdString const listed = listedRepository(folder);
+    std::vector<Candidate> const candidates = candidatesOn(source.server, listed, here);
+    std::string const server = "The server in '" + source.server.ansi_str() + "'";
     if (candidates.empty()) {
-        throw Failure(
-            "The server in '" + server.ansi_str() + "' has no repository to which the versions here belong.",
-            "Name the folder of the right one with --server.");
+        throw Failure(server + " has no repository to which the versions here belong.", kNameIt);
     }
-    auto const isBetter = [&](Candidate const& a, Candidate const& b) {
-        return a.contents != b.contents ? a.contents > b.contents
-                                        : isListed(folder, a.repository) && !isListed(folder, b.repository);
-    };
-    std::sort(candidates.begin(), candidates.end(), isBetter);
-    if (candidates.size() > 1 && !isBetter(candidates[0], candidates[1])) {
+    Candidate const& best = candidates.front();
+    bool const isTrusted = source.isNamed && !listed.isEmpty();
+    if (best.unknown > 0 && !isTrusted) {
         throw Failure(
-            "Several repositories of the server in '" + server.ansi_str() + "' have the versions that are here.",
+            server + " does not know " + std::to_string(best.unknown) + " of the " +
+                std::to_string(best.known + best.unknown) + " versions that are here.",
+            kNameIt);
+    }
+    if (candidates.size() > 1 && candidates[1].unknown == best.unknown) {
+        throw Failure(
+            "Several repositories of the server in '" + source.server.ansi_str() + "' have the versions that are here.",
             "Put a copy of '" + root.dbPath().ansi_str() + "' from a backup in its place.");
     }
-    return candidates.front().repository;
+    return best;
 }
 
 /// A journal would be carried out on the new file.
@@ -107,17 +133,18 @@ Rebuilt fill(common::RootPath const& root, LocalDatabase& database, OdString con
 
 } // namespace
 
-Rebuilt rebuildDatabase(common::RootPath const& root, OdString const& folder, OdString const& server)
+Rebuilt rebuildDatabase(common::RootPath const& root, OdString const& folder, RebuildSource const& source)
 {
-    OdString const repository = findRepository(root, folder, server);
+    Candidate const found = findRepository(root, folder, source);
     std::string const path = root.dbPath().ansi_str();
     std::string const newPath = path + ".new";
     removeWithJournal(newPath);
     Rebuilt rebuilt;
     {
         LocalDatabase database = LocalDatabase::makeAt(newPath);
-        database.setServer(server, repository);
+        database.setServer(source.server, found.repository);
         rebuilt = fill(root, database, readState(root)->read().head);
+        rebuilt.unknown = found.unknown;
     }
     // What the state knows of files, it knows against the commit of the lost database, which may have been another.
     changeState(root, [](common::Cache& cache) { cache.write().index.clear(); });

@@ -38,7 +38,7 @@ void failIfLost(common::RootPath const& root)
     if (LocalDatabase::isLost(root)) {
         throw Failure(
             "The database '" + root.dbPath().ansi_str() + "' is missing or empty, though versions are stored here.",
-            "Run 'tav init' to make it again from the server.");
+            "Run 'tav init', with --server FOLDER where the history is not in the default place.");
     }
 }
 
@@ -141,6 +141,16 @@ OdString LocalDatabase::committedUrlOf(OdString const& digest) const
 {
     Statement row = database_.prepare("SELECT url FROM contents WHERE digest = ?");
     return row.with(digest).next() ? row.text(0) : OdString();
+}
+
+std::vector<OdString> LocalDatabase::contents() const
+{
+    Statement rows = database_.prepare("SELECT url FROM contents ORDER BY url");
+    std::vector<OdString> urls;
+    while (rows.next()) {
+        urls.push_back(rows.text(0));
+    }
+    return urls;
 }
 
 std::optional<std::uint64_t> LocalDatabase::sizeOf(OdString const& url) const

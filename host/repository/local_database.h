@@ -8,6 +8,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <vector>
 
 namespace tav {
 
@@ -58,6 +59,8 @@ public:
     OdString urlOf(OdString const& digest) const;
     /// URL under which some commit has a content of this digest; empty when none has.
     OdString committedUrlOf(OdString const& digest) const;
+    /// The URLs of all contents that were entered, in ascending order: they are kept in this folder.
+    std::vector<OdString> contents() const;
     /// Bytes of the content at `url`.
     std::optional<std::uint64_t> sizeOf(OdString const& url) const;
     void addContent(OdString const& url, OdString const& digest, std::uint64_t size);

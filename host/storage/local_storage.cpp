@@ -78,6 +78,12 @@ std::string restoringFolder(common::RootPath const& root)
     return tavFolder(root) + "/restoring";
 }
 
+/// What messages call a revision store.
+std::string nameOfStore(std::string const& store)
+{
+    return "The revision store '" + store + "'";
+}
+
 void makeFolders(std::string const& path)
 {
     check(os::makeFolders(path, 0777), "The folder '" + path + "' cannot be made");
@@ -262,7 +268,7 @@ StorageUrl LocalStorage::previousVersion(OdString const& path) const
 void LocalStorage::keepDrawing(StorageUrl const& url, OdString const& path, Content const& content)
 {
     std::string const file = pathOf(url);
-    std::string const name = "The revision store '" + url.store + "'";
+    std::string const name = nameOfStore(url.store);
     makeFolders(storeFolder(root_));
     batch_.folders.insert(storeFolder(root_));
     bool const isNew = !exists(file);
@@ -467,6 +473,41 @@ Expected<std::uint64_t> LocalStorage::size(OdString const& url)
 
 namespace {
 
+bool endsWith(std::string_view text, std::string_view end)
+{
+    return text.size() >= end.size() && text.substr(text.size() - end.size()) == end;
+}
+
+/// The revision stores of a repository: the name of each, and its path.
+std::map<std::string, std::string> storesOf(common::RootPath const& root)
+{
+    std::map<std::string, std::string> stores;
+    for (std::string const& file : entriesOf(storeFolder(root))) {
+        std::string name = file.substr(0, file.rfind('.'));
+        if (endsWith(file, kStoreEnd) && isStoreName(name)) {
+            stores.emplace(std::move(name), storeFolder(root).append("/").append(file));
+        }
+    }
+    return stores;
+}
+
+std::set<OdString> contentsOf(common::RootPath const& root)
+{
+    std::set<OdString> urls;
+    for (std::string const& name : entriesOf(objectFolder(root))) {
+        if (auto const digest = digestFromHex(name)) {
+            urls.insert(StorageUrl{{}, *digest}.text());
+        }
+    }
+    for (auto const& [name, path] : storesOf(root)) {
+        RecordFile const store = RecordFile::openForReading(path, nameOfStore(name));
+        for (Entry const& entry : store.entries()) {
+            urls.insert(StorageUrl{name, entry.record.digest}.text());
+        }
+    }
+    return urls;
+}
+
 /// The steps of `keepOnly` on one repository.
 class Cleaning {
 public:
@@ -539,10 +580,9 @@ private:
 
     void cleanStores()
     {
-        for (std::string const& name : entriesOf(storeFolder(root_))) {
-            std::string const store = name.substr(0, name.rfind('.'));
-            if (endsWith(name, kStoreEnd) && isStoreName(store) && leftAlone_.count(store) == 0) {
-                reduce(storeFolder(root_).append("/").append(name), store);
+        for (auto const& [store, path] : storesOf(root_)) {
+            if (leftAlone_.count(store) == 0) {
+                reduce(path, store);
             }
         }
     }
@@ -550,15 +590,10 @@ private:
     void reduce(std::string const& path, std::string const& store)
     {
         try {
-            reduceStore(path, "The revision store '" + store + "'", kept_[store], tavFolder(root_), freed_);
+            reduceStore(path, nameOfStore(store), kept_[store], tavFolder(root_), freed_);
         } catch (StorageError const& error) {
             firstError_ = firstError_.empty() ? error.what : firstError_;
         }
-    }
-
-    static bool endsWith(std::string_view text, std::string_view end)
-    {
-        return text.size() >= end.size() && text.substr(text.size() - end.size()) == end;
     }
 
     common::RootPath root_;
@@ -569,6 +604,11 @@ private:
 };
 
 } // namespace
+
+Expected<std::set<OdString>> LocalStorage::contents()
+{
+    return guarded<std::set<OdString>>([&] { return contentsOf(root_); });
+}
 
 Expected<Freed> LocalStorage::keepOnly(std::set<OdString> const& urls, std::set<OdString> const& elsewhere)
 {

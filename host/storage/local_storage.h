@@ -77,6 +77,8 @@ public:
     /// damaged. A sink that returns false gets no more; that is an error too ("was not read to its end").
     WriteOutcome read(OdString const& url, std::function<bool(char const*, std::size_t)> const& sink);
 
+    /// The URLs of all contents that are kept, in ascending order, whether a commit has them or not.
+    Expected<std::set<OdString>> contents();
     /// Whether the content is kept; that it is whole, `verify` finds out. Error: no URL of this storage.
     Expected<bool> contains(OdString const& url);
     /// Length of the content in bytes, without unpacking it.

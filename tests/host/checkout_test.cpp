@@ -668,8 +668,8 @@ TEST_F(Moving, MissingDatabaseIsNotMistakenForANewRepository)
         EXPECT_EQ(
             tav({command}), failed(
                                 "tav: The database '" + repo.path() +
-                                "/.tav/tav.db' is missing or empty, though versions are stored here. Run 'tav init' to "
-                                "make it again from the server.\n"));
+                                "/.tav/tav.db' is missing or empty, though versions are stored here. Run 'tav init', "
+                                "with --server FOLDER where the history is not in the default place.\n"));
     }
     EXPECT_FALSE(repo.has(".tav/tav.db"));
 }

@@ -136,10 +136,10 @@ TEST_F(OlderServer, IsNoticedBeforeAnythingHappens)
     EXPECT_EQ(tav({"commit", "-m", "fifth"}), failed("tav: " + lacks() + kSendThem));
     EXPECT_EQ(tav({"fetch"}), failed("tav: " + lacks() + kSendThem));
     EXPECT_EQ(
-        tav({"gc"}), (Outcome{
-                         0, kNothingToGc,
-                         "tav: Only leftovers are removed, as the server does not say what its commits need. " +
-                             lacks() + kSendThem}));
+        tav({"gc"}),
+        (Outcome{
+            0, kNothingToGc,
+            "tav: Only leftovers are removed: the server does not say what its commits need. " + lacks() + kSendThem}));
     EXPECT_THAT(tav({"verify"}).err, StartsWith("tav: The server lacks 2 commits that are known here. An older copy"));
     EXPECT_THAT(tav({"server"}).out, HasSubstr("\nIt lacks 2 commits that are known here. 'tav server --send' sends"));
     EXPECT_THAT(tav({"status"}).out, HasSubstr("modified: note.txt"));
@@ -202,8 +202,8 @@ TEST_F(NoRepository, LetsEverythingGoOnThatNeedsNoServer)
     Outcome const cleaned = tav({"gc"});
     EXPECT_EQ(cleaned.out, "Removed 0 stored versions that no commit needs; 4 bytes freed.\n");
     EXPECT_THAT(
-        cleaned.err, StartsWith("tav: Only leftovers are removed, as the server does not say what its "
-                                "commits need. The server has no repository '"));
+        cleaned.err, StartsWith("tav: Only leftovers are removed: the server does not say what its commits need. "
+                                "The server has no repository '"));
     Outcome const verified = tav({"verify"});
     EXPECT_EQ(verified.code, 0);
     EXPECT_THAT(verified.err, StartsWith("tav: The history could not be compared with the server's. "));
@@ -316,11 +316,11 @@ TEST_F(LostDatabase, IsMadeAgainFromTheServer)
     EXPECT_EQ(
         tav({"status"}), failed(
                              "tav: The database '" + place.pathTo("repository/.tav/tav.db") +
-                             "' is missing or empty, though versions are stored here. Run 'tav init' to make it "
-                             "again from the server.\n"));
+                             "' is missing or empty, though versions are stored here. Run 'tav init', with --server "
+                             "FOLDER where the history is not in the default place.\n"));
     EXPECT_EQ(
         tav({"init", "--server", server()}),
-        done("Made the database again from the server, with 2 commits. The folder is taken to stand on commit 2; see "
+        done("Made the database again from the server, with 2 commits. The folder is assumed to be at commit 2; see "
              "'tav status'.\n"
              "The repository in '.' was there already; it is complete.\n"));
     EXPECT_EQ(history(), before);
@@ -360,6 +360,121 @@ TEST_F(LostDatabase, IsNotTakenFromAServerThatHasNothingOfIt)
             "' has no repository to which the versions here belong. Name the folder of the right one with "
             "--server.\n"));
     EXPECT_FALSE(place.has("repository/.tav/tav.db"));
+}
+
+/// A server in "other", whose only repository has committed the file "h.txt" of the folder "project".
+class OtherServer : public LostDatabase {
+protected:
+    OtherServer()
+    {
+        place.write("project/h.txt", "hello");
+        EXPECT_EQ(tavInProject({"init", "--server", other()}).code, 0);
+        EXPECT_EQ(tavInProject({"add", "--all"}).code, 0);
+        EXPECT_EQ(tavInProject({"commit", "-m", "another"}).code, 0);
+    }
+
+    Outcome tavInProject(Arguments const& arguments) const
+    {
+        Setting setting;
+        setting.folder = place.pathTo("project");
+        return run(setting, arguments);
+    }
+
+    std::string other() const { return place.pathTo("other"); }
+
+    std::string hasNone() const
+    {
+        return "tav: The server in '" + other() +
+               "' has no repository to which the versions here belong. Name the folder of the right one with "
+               "--server.\n";
+    }
+};
+
+TEST_F(OtherServer, IsNotTakenForTheIgnoreRulesThatAllRepositoriesHave)
+{
+    loseDatabase();
+    EXPECT_EQ(tav({"init", "--server", other()}), failed(hasNone()));
+    move("repository", "unlisted");
+    Setting setting;
+    setting.folder = place.pathTo("unlisted");
+    EXPECT_EQ(run(setting, {"init", "--server", other()}), failed(hasNone()));
+    EXPECT_FALSE(place.has("unlisted/.tav/tav.db"));
+    EXPECT_EQ(run(setting, {"init", "--server", server()}).code, 0) << "knows all that is here";
+}
+
+TEST_F(OtherServer, IsNotTakenForSomeVersionsInCommon)
+{
+    commitFile("h.txt", "hello", "the same");
+    loseDatabase();
+    move("repository", "unlisted");
+    Setting setting;
+    setting.folder = place.pathTo("unlisted");
+    EXPECT_EQ(
+        run(setting, {"init", "--server", other()}),
+        failed(
+            "tav: The server in '" + other() +
+            "' does not know 2 of the 3 versions that are here. Name the folder of the right one with --server.\n"));
+}
+
+TEST_F(OtherServer, LosesNothingToTheDatabaseOfItsFolder)
+{
+    fs::copy(
+        place.pathTo("project/.tav/tav.db"), place.pathTo("repository/.tav/tav.db"),
+        fs::copy_options::overwrite_existing);
+    EXPECT_EQ(
+        tav({"gc"}),
+        (Outcome{
+            0, kNothingToGc,
+            "tav: Only leftovers are removed: 1 committed version that should be here cannot be found. Run 'tav "
+            "verify' to see what is missing; if '.tav/tav.db' is of another folder, put the right one in its place, or "
+            "move it away and run 'tav init'.\n"}));
+}
+
+/// The server of the project was copied to "moved" after the first commits, and is used there since.
+class ServerLeftBehind : public LostDatabase {
+protected:
+    ServerLeftBehind()
+    {
+        fs::create_directories(defaultServer());
+        fs::copy(server(), place.pathTo("moved"), fs::copy_options::recursive);
+        EXPECT_EQ(tav({"server", place.pathTo("moved")}).code, 0);
+        commitFile("note.txt", "three", "third");
+        commitFile("note.txt", "four", "fourth");
+        loseDatabase();
+        fs::copy(server(), defaultServer(), fs::copy_options::recursive | fs::copy_options::overwrite_existing);
+    }
+
+    /// Other tests have the default server of the home.
+    std::string defaultServer() const { return place.pathTo("data/tav/server"); }
+
+    Outcome tavHere(Arguments const& arguments) const
+    {
+        Setting setting;
+        setting.folder = place.pathTo("repository");
+        setting.environment = {"XDG_DATA_HOME=" + place.pathTo("data")};
+        return run(setting, arguments);
+    }
+};
+
+TEST_F(ServerLeftBehind, DoesNotHideTheLaterCommits)
+{
+    EXPECT_EQ(
+        tavHere({"init"}), failed(
+                               "tav: The server in '" + defaultServer() +
+                               "' does not know 2 of the 4 versions that are here. Name the folder of the right one "
+                               "with --server.\n"));
+    EXPECT_EQ(tavHere({"init", "--server", place.pathTo("moved")}).code, 0);
+    EXPECT_EQ(hashes(), "1 first\n2 second\n3 third\n4 fourth\n");
+    EXPECT_EQ(tav({"gc"}), done(kNothingToGc));
+}
+
+TEST_F(ServerLeftBehind, IsTakenWhenItIsNamed)
+{
+    EXPECT_EQ(
+        tavHere({"init", "--server", defaultServer()}).err,
+        "tav: The server in '" + defaultServer() +
+            "' does not know 2 of the versions that are here; 'tav gc' would remove them.\n");
+    EXPECT_EQ(hashes(), "1 first\n2 second\n");
 }
 
 TEST_F(LostDatabase, IsMadeAgainAfterAnInterruption)

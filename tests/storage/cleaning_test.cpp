@@ -56,6 +56,22 @@ TEST_F(Cleaning, KeepsWhatIsNeededAndNothingElse)
     EXPECT_EQ(contentOf(kept), "kept");
 }
 
+TEST_F(Cleaning, SeesAllThatIsKept)
+{
+    commitMany();
+    urls.push_back(store("kept", "kept"));
+    urls.push_back(store("other.dwg", "other"));
+    repo.write(".tav/objects/notes", "of somebody else");
+    repo.write(".tav/tf/notes", "of somebody else");
+    std::set<OdString> all;
+    for (std::string const& url : urls) {
+        all.insert(support::fromUtf8(url));
+    }
+    auto const found = newStorage().contents();
+    ASSERT_TRUE(found.hasValue());
+    EXPECT_EQ(found.value(), all);
+}
+
 TEST_F(Cleaning, LeavesAStoreAloneThatHoldsNothingElse)
 {
     commitMany();
