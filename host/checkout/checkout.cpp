@@ -1,11 +1,15 @@
 #include "host/checkout/checkout.h"
 
+#include "host/changes/changes.h"
 #include "host/changes/index_record.h"
 #include "host/changes/staging.h"
 #include "host/repository/conflicts.h"
 #include "host/repository/working_state.h"
 
 #include <algorithm>
+#include <iterator>
+#include <set>
+#include <utility>
 
 namespace tav {
 
@@ -33,6 +37,63 @@ std::vector<Tree> filesOf(std::vector<OdString> const& commits, LocalDatabase co
         files.push_back(database.commits().files(commit));
     }
     return files;
+}
+
+/// The files of the current commit that have another content in the working folder, or are gone.
+struct Changed {
+    Tree modified;
+    Tree removed;
+};
+
+Changed changedFiles(common::RootPath const& root, LocalDatabase& database, std::uint64_t start)
+{
+    FolderMatch match = matchPaths({}, database.commits().fileList(database.currentCommit()));
+    VerifiedFileList const known = database.verifiedFiles();
+    Examination(match.committed, known, root).run();
+    dropKnown(match);
+    VerifiedFileList verified;
+    FolderChanges const changes = compare(root, std::move(match), &verified);
+    keepVerified(settledFiles(std::move(verified), start), database);
+    Changed changed;
+    for (auto const& file : changes.modified) {
+        changed.modified.emplace(file.committed.path, file.committed.storagePath);
+    }
+    for (auto const& file : changes.removed) {
+        changed.removed.emplace(file.committed.path, file.committed.storagePath);
+    }
+    return changed;
+}
+
+/// Adds to `update` the changed files that both commits have alike. What the update touches anyway stands first.
+void addChanged(Changed const& changed, TreeUpdate& update)
+{
+    for (Tree const* const files : {&changed.modified, &changed.removed}) {
+        for (auto const& file : *files) {
+            if (update.removals.count(file.first) == 0) {
+                update.writes.insert(file);
+            }
+        }
+    }
+}
+
+/// How many changed files the move leaves alone, and nobody has staged.
+std::size_t countKept(Changed const& changed, TreeUpdate const& update, std::set<OdString> const& staged)
+{
+    return static_cast<std::size_t>(
+        std::count_if(changed.modified.begin(), changed.modified.end(), [&](auto const& file) {
+            OdString const& path = file.first;
+            return update.writes.count(path) == 0 && update.removals.count(path) == 0 && staged.count(path) == 0;
+        }));
+}
+
+/// A file that is back at its first path has not been renamed.
+void dropRenamesOf(IndexUpdates const& files, common::State& state)
+{
+    for (auto rename = state.renames.begin(); rename != state.renames.end();) {
+        auto const file = files.find(rename->second);
+        bool const isBack = file != files.end() && file->second;
+        rename = isBack ? state.renames.erase(rename) : std::next(rename);
+    }
 }
 
 /// `whole` is the update before the check: also a file that was found as it shall be is no change any more. What stays
@@ -64,12 +125,18 @@ CheckedOut checkOutCommit(
 {
     requireNoConflicts(root);
     std::vector<OdString> const begun = begunCheckouts(database);
-    TreeUpdate const whole = updateBetween(
+    TreeUpdate whole = updateBetween(
         database.commits().files(database.currentCommit()), filesOf(begun, database),
         database.commits().files(destination.commit));
+    Changed const changed = changedFiles(root, database, start);
+    if (discard == Discard::everything) {
+        addChanged(changed, whole);
+    }
+    std::set<OdString> const staged = claimedPaths(readState(root)->read());
+    std::size_t const kept = countKept(changed, whole, staged);
     TreeUpdate update = whole;
     LocalStorage storage(root);
-    checkUpdate(root, database, storage, claimedPaths(readState(root)->read()), discard, update);
+    checkUpdate(root, database, storage, staged, discard, update);
     PendingCheckout move{destination.commit, destination.branch, false, begun};
     Updated const updated = carryOut(root, storage, update, start, [&] { writeJournal(move, database); });
     WriteTransaction transaction(database.database());
@@ -80,7 +147,7 @@ CheckedOut checkOutCommit(
     database.addVerified(updated.verified);
     transaction.commit();
     finishCheckout(root, database, move);
-    return {update.writes.size(), update.removals.size()};
+    return {update.writes.size(), update.removals.size(), kept};
 }
 
 void finishCheckout(common::RootPath const& root, LocalDatabase& database, PendingCheckout const& move)
@@ -88,6 +155,7 @@ void finishCheckout(common::RootPath const& root, LocalDatabase& database, Pendi
     changeState(root, [&](common::Cache& cache) {
         cache.write().head = move.branch;
         applyIndexUpdates(move.files, cache.write());
+        dropRenamesOf(move.files, cache.write());
     });
     clearJournal(database);
 }

@@ -17,13 +17,15 @@ struct Destination {
 struct CheckedOut {
     std::size_t written = 0;
     std::size_t removed = 0;
+    std::size_t kept = 0; ///< changed files that are as they were, without the staged ones
 };
 
 /// Makes the working folder stand on another commit. Changes and staged files at paths where both commits agree stay;
-/// what is staged at other paths is in the way, also a removal or renaming, unless it is what the other commit has.
-/// Throws `Failure`; before the first file is written nothing has changed then, later the same move completes it, and
-/// one to any other commit, also back to where it began, leaves nothing of it behind.
-/// The caller holds the lock of the repository since `start`.
+/// what is staged at other paths is in the way, also a removal or renaming, and whatever the files hold. With
+/// `Discard::everything` all files of the commit get its contents, also those that both commits have alike. Throws
+/// `Failure`; before the first file is written nothing has changed then, later the same move completes it, and one to
+/// any other commit, also back to where it began, leaves nothing of it behind. The caller holds the lock of the
+/// repository since `start`.
 CheckedOut checkOutCommit(
     common::RootPath const& root, LocalDatabase& database, Destination const& destination, Discard discard,
     std::uint64_t start);

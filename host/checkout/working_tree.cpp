@@ -96,8 +96,7 @@ private:
             Finding const finding = look(path, areWritten ? &url : nullptr);
             bool const isUnsaved = finding == Finding::holdsUnsaved;
             bool const isLeftover = update_.leftovers.count(path) > 0;
-            bool const isStaged = finding != Finding::isAsWanted && staged_.count(path) > 0;
-            if (isStaged || (isUnsaved && !isLeftover)) {
+            if (isStagedWork(path, finding) || (isUnsaved && !isLeftover)) {
                 inTheWay_.push_back(path.ansi_str());
             }
             if (finding == Finding::isAsWanted && areWritten) {
@@ -106,6 +105,14 @@ private:
             bool const stays = finding == Finding::isAsWanted || (isUnsaved && isLeftover);
             file = stays ? files.erase(file) : std::next(file);
         }
+    }
+
+    /// Whether the update would drop what somebody has staged: a move to another commit does so whatever the file
+    /// holds.
+    bool isStagedWork(OdString const& path, Finding finding) const
+    {
+        bool const isKept = finding == Finding::isAsWanted && discard_ != Discard::nothing;
+        return staged_.count(path) > 0 && !isKept;
     }
 
     /// Before the file is read, so that whatever happens to it from here on shows.

@@ -38,10 +38,11 @@ enum class Discard { nothing, copies, everything };
 /// Checks that an update can be carried out, before a byte is written: no path leads out of the working folder or
 /// through a link, no file takes the place of a folder that has other files, and no work is lost unless `discard` says
 /// so. Work is a file with another content than an expected one, and whatever is at the paths `staged`: being in some
-/// commit does not make a content that somebody has chosen unimportant. The files are read: what an index says of them
-/// is no reason to overwrite them. Files that are as wanted are taken out of the update. Committed contents that go can
-/// be read from `storage` afterwards: they are read there, and stored again from the files where that is needed. Throws
-/// `Failure`, which lists the files in the way.
+/// commit, or in the one that is to be written, does not make a choice unimportant. Only where `discard` is not
+/// `nothing`, and so nothing is unstaged, a staged file may be as wanted already. The files are read: what an index
+/// says of them is no reason to overwrite them. Files that are as wanted are taken out of the update. Committed
+/// contents that go can be read from `storage` afterwards: they are read there, and stored again from the files where
+/// that is needed. Throws `Failure`, which lists the files in the way.
 void checkUpdate(
     common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
     std::set<OdString> const& staged, Discard discard, TreeUpdate& update);

@@ -20,11 +20,28 @@ Discard discardOf(CheckoutOptions const& options)
     return options.force ? Discard::everything : Discard::nothing;
 }
 
+/// "(2 files written, 1 removed)"; nothing where no file had to change.
+std::string countsOf(CheckedOut const& result)
+{
+    std::string text;
+    if (result.written > 0) {
+        text = counted(result.written, "file") + " written";
+    }
+    if (result.removed > 0) {
+        text += text.empty() ? counted(result.removed, "file") : ", " + std::to_string(result.removed);
+        text += " removed";
+    }
+    return text.empty() ? text : " (" + text + ")";
+}
+
 /// `root` is where the move has ended.
 std::string described(CheckedOut const& result, common::RootPath const& root)
 {
-    std::string const text =
-        counted(result.written, "file") + " written, " + std::to_string(result.removed) + " removed.\n";
+    std::string text = countsOf(result) + ".\n";
+    if (result.kept > 0) {
+        text +=
+            counted(result.kept, "changed file") + (result.kept == 1 ? " stays as it is.\n" : " stay as they are.\n");
+    }
     std::size_t const staged = readState(root)->read().stagedFiles.size();
     return staged == 0 ? text : text + counted(staged, "staged file") + " carried along.\n";
 }
@@ -38,9 +55,7 @@ void checkOut(CheckoutOptions const& options)
     OdString const branch = readState(session.root())->read().head;
     CheckedOut const result =
         checkOutCommit(session.root(), session.database(), {commit.hash, branch}, discardOf(options), session.start());
-    print(
-        "The working folder is at commit " + std::to_string(commit.number) +
-        " now: " + described(result, session.root()));
+    print("Now at commit " + std::to_string(commit.number) + described(result, session.root()));
 }
 
 void switchBranch(CheckoutOptions const& options)
@@ -57,7 +72,7 @@ void switchBranch(CheckoutOptions const& options)
     }
     CheckedOut const result = checkOutCommit(
         session.root(), session.database(), {branch->commitHash, branch->name}, discardOf(options), session.start());
-    print("On branch " + shown(branch->name) + " now: " + described(result, session.root()));
+    print("Now on branch " + shown(branch->name) + described(result, session.root()));
 }
 
 } // namespace tav

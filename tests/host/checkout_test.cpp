@@ -134,7 +134,7 @@ protected:
 
 TEST_F(Moving, CheckoutMakesTheFolderWhatItWas)
 {
-    EXPECT_EQ(tav({"checkout", "1"}), done("The working folder is at commit 1 now: 2 files written, 1 removed.\n"));
+    EXPECT_EQ(tav({"checkout", "1"}), done("Now at commit 1 (2 files written, 1 removed).\n"));
     EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "sub/", "sub/b.txt"));
     EXPECT_EQ(repo.read("a.dwg"), "one");
     EXPECT_EQ(
@@ -204,8 +204,54 @@ TEST_F(Moving, CheckoutKeepsAStagedVersionOfAnotherCommit)
     EXPECT_EQ(tav({"checkout", "2"}), failed(wouldBeLost("  a.dwg\n")));
     EXPECT_EQ(repo.read("a.dwg"), "one");
     EXPECT_EQ(status(), before);
-    EXPECT_EQ(tav({"checkout", "1"}).code, 0); // That is the version that was chosen.
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  a.dwg\n"))) << "which has that version";
+    EXPECT_EQ(status(), before);
+    EXPECT_EQ(tav({"checkout", "1", "--force"}).code, 0);
     EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Moving, CheckoutKeepsAStagedRemovalThatTheOtherCommitHasToo)
+{
+    repo.write("new.txt", "three");
+    commitAll("the third");
+    tav({"rm", "new.txt"});
+    std::string const before = status();
+    EXPECT_EQ(tav({"checkout", "2"}), failed(wouldBeLost("  new.txt\n")));
+    EXPECT_EQ(status(), before);
+}
+
+TEST_F(Moving, CheckoutKeepsAStagedNewFileThatTheOtherCommitHasToo)
+{
+    repo.write("sub/b.txt", "one");
+    tav({"add", "sub/b.txt"});
+    std::string const before = status();
+    EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  sub/b.txt\n")));
+    EXPECT_EQ(status(), before);
+    EXPECT_EQ(repo.read("sub/b.txt"), "one");
+}
+
+TEST_F(Moving, CheckoutOfTheCurrentCommitSaysThatChangesStay)
+{
+    repo.write("a.dwg", "changed");
+    EXPECT_EQ(tav({"checkout", "2"}), done("Now at commit 2.\n1 changed file stays as it is.\n"));
+    EXPECT_EQ(repo.read("a.dwg"), "changed");
+    tav({"add", "a.dwg"});
+    EXPECT_EQ(tav({"checkout", "2"}), done("Now at commit 2.\n1 staged file carried along.\n"));
+}
+
+TEST_F(Moving, ForcedCheckoutOfTheCurrentCommitBringsBackItsFiles)
+{
+    repo.write("a.dwg", "changed");
+    tav({"mv", "c.dwg", "d.dwg"});
+    tav({"unstage", "a.dwg"});
+    EXPECT_EQ(
+        tav({"checkout", "2", "--force"}), done("Now at commit 2 (2 files written).\n1 staged file carried along.\n"));
+    EXPECT_EQ(repo.read("a.dwg"), "two");
+    EXPECT_EQ(repo.read("c.dwg"), "two");
+    EXPECT_THAT(status(), HasSubstr("new:      d.dwg")) << "no renaming any more";
+    repo.write("a.dwg", "changed");
+    EXPECT_EQ(tav({"switch", "master", "--force"}).code, 0);
+    EXPECT_EQ(repo.read("a.dwg"), "two");
 }
 
 TEST_F(Moving, CheckoutKeepsARestoredVersionOfAnotherCommit)
@@ -250,9 +296,7 @@ TEST_F(Moving, SwitchCarriesStagedFilesAlongAndSaysSo)
     tav({"branch", "sketch"});
     tav({"restore", "a.dwg", "--from", "1"});
     tav({"add", "a.dwg"});
-    EXPECT_EQ(
-        tav({"switch", "sketch"}),
-        done("On branch sketch now: 0 files written, 0 removed.\n1 staged file carried along.\n"));
+    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file carried along.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "one");
     EXPECT_EQ(tav({"switch", "master"}).code, 0);
     EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
@@ -261,7 +305,7 @@ TEST_F(Moving, SwitchCarriesStagedFilesAlongAndSaysSo)
 TEST_F(Moving, CheckoutTakesAFileThatHoldsTheNewContentAsItIs)
 {
     repo.write("a.dwg", "one");
-    EXPECT_EQ(tav({"checkout", "1"}), done("The working folder is at commit 1 now: 1 file written, 1 removed.\n"));
+    EXPECT_EQ(tav({"checkout", "1"}), done("Now at commit 1 (1 file written, 1 removed).\n"));
     EXPECT_EQ(status(), kClean);
 }
 
@@ -310,9 +354,7 @@ TEST_F(Moving, CommitWantsTheEndOfTheBranch)
         failed("tav: You are at an earlier commit, not at the end of the branch 'master'. Run 'tav branch NAME' and "
                "'tav switch NAME' to go on from here, or 'tav switch master' to go back to its end.\n"));
     EXPECT_EQ(tav({"branch", "sketch"}), done("Made the branch 'sketch' at commit 1.\n"));
-    EXPECT_EQ(
-        tav({"switch", "sketch"}),
-        done("On branch sketch now: 0 files written, 0 removed.\n1 staged file carried along.\n"));
+    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file carried along.\n"));
     EXPECT_EQ(tav({"commit", "-m", "another way"}).code, 0);
     EXPECT_EQ(tav({"branch"}), done("  master  (commit 2)\n* sketch  (commit 3)\n"));
     EXPECT_EQ(tav({"switch", "master"}).code, 0);

@@ -100,7 +100,7 @@ TEST_P(EarlierVersion, GoesOn)
     place_.write("repository/plan.dwg", "drawn anew");
     EXPECT_EQ(tav({"add", "plan.dwg"}).code, 0);
     EXPECT_EQ(tav({"commit", "-m", "goes on", "--author", "ann@studio"}).code, 0);
-    EXPECT_EQ(tav({"switch", "annex"}), done("On branch annex now: 5 files written, 1 removed.\n"));
+    EXPECT_EQ(tav({"switch", "annex"}), done("Now on branch annex (5 files written, 1 removed).\n"));
     EXPECT_THAT(tav({"show", "2"}).out, testing::HasSubstr("renamed:  old/draft.dwg -> new/section.dwg"));
     EXPECT_EQ(tav({"gc"}), done("Removed 0 stored versions that no commit needs; 0 bytes freed.\n"));
     EXPECT_EQ(tav({"verify"}).code, 0);
