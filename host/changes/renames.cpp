@@ -1,6 +1,7 @@
 #include "host/changes/renames.h"
 
 #include "host/changes/digest.h"
+#include "host/changes/folder_view.h"
 #include "host/changes/staging.h"
 #include "host/history/tracked_path.h"
 #include "host/storage/local_storage.h"
@@ -8,6 +9,7 @@
 #include <algorithm>
 #include <filesystem>
 #include <set>
+#include <string>
 
 namespace tav {
 
@@ -101,6 +103,27 @@ Renames findRenames(
         }
     }
     return renames;
+}
+
+std::set<OdString>
+formerPathsOfMoves(Renames const& renames, LocalDatabase const& database, common::RootPath const& root)
+{
+    std::map<std::string, std::uint64_t> inodes;
+    if (!renames.empty()) {
+        for (VerifiedFile const& file : database.verifiedFiles()) {
+            inodes.emplace(file.path, file.stamp.inode);
+        }
+    }
+    Paths moved;
+    FolderView view(root);
+    for (auto const& [path, previous] : renames) {
+        auto const inode = inodes.find(previous.ansi_str());
+        auto const stamp = view.look(path.ansi_str()).stamp;
+        if (stamp && inode != inodes.end() && stamp->inode == inode->second) {
+            moved.insert(previous);
+        }
+    }
+    return moved;
 }
 
 } // namespace tav

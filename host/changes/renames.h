@@ -7,6 +7,7 @@
 #include "common/mu_common_state.h"
 
 #include <map>
+#include <set>
 
 namespace tav {
 
@@ -19,5 +20,10 @@ using Renames = std::map<OdString, OdString>;
 Renames findRenames(
     common::RepoChanges const& changes, common::State const& state, LocalDatabase const& database,
     common::RootPath const& root);
+
+/// The former paths of those of `renames` that are known to be moves: a file keeps its inode when it moves, and a copy
+/// has another one. Who has copies of files has not removed the files yet.
+std::set<OdString>
+formerPathsOfMoves(Renames const& renames, LocalDatabase const& database, common::RootPath const& root);
 
 } // namespace tav

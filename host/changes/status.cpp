@@ -138,6 +138,19 @@ void enterRenames(Renames const& renames, Paths& left, Status& status)
     }
 }
 
+/// The commit asks for the user's word when too much is missing, files with copies included.
+void enterDoubts(Renames const& renames, Paths const& moved, common::RootPath const& root, Status& status)
+{
+    std::vector<OdString> missing = status.removed;
+    for (auto const& [path, previous] : renames) {
+        if (moved.count(previous) == 0) {
+            missing.push_back(previous);
+        }
+    }
+    status.isRemovalDoubtful = mayBeMistake(missing, root);
+    status.isRenameDoubtful = status.isRemovalDoubtful && missing.size() > status.removed.size();
+}
+
 } // namespace
 
 Status statusOf(common::RootPath const& root, bool withIgnored)
@@ -153,7 +166,8 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     dropKnown(match);
     FolderChanges changes = compare(root, std::move(match));
     Paths left = claimedPaths(state); // They are accounted for when they are missing.
-    enterRenames(findRenames(changes, state, database, root), left, status);
+    Renames const renames = findRenames(changes, state, database, root);
+    enterRenames(renames, left, status);
     Paths named = stagedPaths(state);
     for (auto const& [path, previous] : status.renamed) {
         named.insert(path);
@@ -163,7 +177,7 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     status.modified = takeSorted(changes.modified, named, workingPath);
     status.untracked = takeSorted(changes.untracked, named, workingPath);
     status.removed = takeSorted(changes.removed, left, committedPath);
-    status.isRemovalDoubtful = mayBeMistake(status.removed, root);
+    enterDoubts(renames, formerPathsOfMoves(renames, database, root), root, status);
     auto const pathOf = [](auto& file) -> OdString& { return file.path; };
     status.unreachable = takeSorted(changes.unreachable, left, pathOf);
     if (withIgnored) {

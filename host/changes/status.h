@@ -30,6 +30,7 @@ struct Status {
     std::vector<OdString> modified;    ///< not staged
     std::vector<OdString> untracked;   ///< not staged
     Renames renamed;                   ///< not staged; the next commit takes that without staging
+    bool isRenameDoubtful = false;     ///< as `isRemovalDoubtful`: some may be copies of missing files
     std::vector<OdString> removed;     ///< gone from the working folder; the next commit takes that without staging
     bool isRemovalDoubtful = false;    ///< the next commit takes `removed` only when it is told to
     std::vector<OdString> unreachable; ///< committed files in folders that links have replaced

@@ -134,12 +134,16 @@ void printStaged(std::vector<StagedEntry> const& entries)
     print("\n");
 }
 
-void printRenamed(Renames const& renames)
+void printRenamed(Renames const& renames, bool isDoubtful)
 {
     if (renames.empty()) {
         return;
     }
-    print("Renamed:\n  (the next commit takes these without staging)\n");
+    print("Renamed:\n");
+    print(
+        isDoubtful ? "  (some may be copies of missing files; use 'tav commit --all-removed' to take these, or "
+                     "'--without-removed' to keep the files in the repository)\n"
+                   : "  (the next commit takes these without staging)\n");
     for (auto const& [path, previous] : renames) {
         print("        " + coloured(Colour::red, "renamed:  " + shown(previous) + " -> " + shown(path)) + "\n");
     }
@@ -159,7 +163,7 @@ void printForPeople(Status const& status)
     printStaged(status.staged);
     printGroup(
         "Modified, not staged:", "use 'tav add NAME' to stage a file", "modified: ", Colour::red, status.modified);
-    printRenamed(status.renamed);
+    printRenamed(status.renamed, status.isRenameDoubtful);
     printGroup(
         "Removed:",
         status.isRemovalDoubtful

@@ -342,9 +342,9 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     Draft draft{root, database, start, database.commits().files(database.currentCommit()), {}, {}};
     FolderChanges const changes = compareWithBase(draft);
     failIfBehindLink(state, root);
-    std::vector<PlannedFile> plan =
-        planCommit(state, changes, findRenames(changes, state, database, root), draft.files, root);
-    planMissing(plan, state, order.missing, root);
+    Renames const renames = findRenames(changes, state, database, root);
+    std::vector<PlannedFile> plan = planCommit(state, changes, renames, draft.files, root);
+    planMissing(plan, state, formerPathsOfMoves(renames, database, root), order.missing, root);
     if (plan.empty()) {
         if (auto const last = lastCommitIfOf(order, database)) {
             return {*last, false};

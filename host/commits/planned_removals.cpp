@@ -1,6 +1,7 @@
 #include "host/commits/planned_removals.h"
 
 #include "host/changes/missing_files.h"
+#include "host/changes/staging.h"
 #include "host/errors/failure.h"
 
 #include <algorithm>
@@ -12,39 +13,48 @@ namespace {
 
 using Paths = std::set<OdString>;
 
-/// Paths that are removed on purpose: with 'tav rm', or by a renaming.
-Paths pathsLeft(std::vector<PlannedFile> const& plan, common::State const& state)
+/// Paths that are removed on purpose: with 'tav rm', or by moving the file.
+Paths pathsLeft(common::State const& state, Paths left)
 {
-    Paths left;
     for (common::StagedFile const& file : state.stagedFiles) {
         if (file.change == common::FileChange::removed) {
             left.insert(file.path);
         }
     }
-    for (PlannedFile const& file : plan) {
-        left.insert(file.previousPath);
-    }
+    left.merge(formerPaths(state));
     return left;
+}
+
+/// Leaves the files `kept` in the repository. A copy of one of them is no renamed file; nobody may have staged it.
+void keep(Paths const& kept, Paths const& staged, std::vector<PlannedFile>& plan)
+{
+    auto const isLeftOut = [&](PlannedFile const& file) {
+        bool const isRemoval = file.change == common::FileChange::removed && kept.count(file.path) > 0;
+        return isRemoval || (kept.count(file.previousPath) > 0 && staged.count(file.path) == 0);
+    };
+    plan.erase(std::remove_if(plan.begin(), plan.end(), isLeftOut), plan.end());
+    for (PlannedFile& file : plan) {
+        if (kept.count(file.previousPath) > 0) {
+            file.previousPath = OdString::kEmpty;
+        }
+    }
 }
 
 } // namespace
 
 void planMissing(
-    std::vector<PlannedFile>& plan, common::State const& state, Missing missing, common::RootPath const& root)
+    std::vector<PlannedFile>& plan, common::State const& state, std::set<OdString> const& moved, Missing missing,
+    common::RootPath const& root)
 {
-    Paths const left = pathsLeft(plan, state);
-    auto const isMissing = [&](PlannedFile const& file) {
-        return file.change == common::FileChange::removed && left.count(file.path) == 0;
-    };
-    if (missing == Missing::areKept) {
-        plan.erase(std::remove_if(plan.begin(), plan.end(), isMissing), plan.end());
-        return;
-    }
+    Paths const left = pathsLeft(state, moved);
     std::vector<OdString> paths;
     for (PlannedFile const& file : plan) {
-        if (isMissing(file)) {
+        if (file.change == common::FileChange::removed && left.count(file.path) == 0) {
             paths.push_back(file.path);
         }
+    }
+    if (missing == Missing::areKept) {
+        return keep({paths.begin(), paths.end()}, stagedPaths(state), plan);
     }
     if (missing == Missing::areRemoved && mayBeMistake(paths, root)) {
         Failure failure(

@@ -3,6 +3,7 @@
 
 #include "host/commits/commit_plan.h"
 
+#include <set>
 #include <vector>
 
 namespace tav {
@@ -14,9 +15,11 @@ enum class Missing {
     areKept        ///< the commit has them as the one before
 };
 
-/// Takes the missing files out of `plan`, or leaves them in. Throws `Failure`, which lists them, when that takes the
-/// user's word.
+/// Takes the missing files out of `plan`, or leaves them in. Files whose copies have been found are missing too, unless
+/// they are among `moved`, the former paths of files that were moved by hand; when they are taken out, their copies are
+/// no renamed files. Throws `Failure`, which lists the missing files, when that takes the user's word.
 void planMissing(
-    std::vector<PlannedFile>& plan, common::State const& state, Missing missing, common::RootPath const& root);
+    std::vector<PlannedFile>& plan, common::State const& state, std::set<OdString> const& moved, Missing missing,
+    common::RootPath const& root);
 
 } // namespace tav

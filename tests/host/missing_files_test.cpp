@@ -167,9 +167,42 @@ TEST_F(MissingFiles, AreNotThoseThatTavRemoved)
 
 TEST_F(MissingFiles, AreNotThoseThatHaveNewNames)
 {
+    EXPECT_EQ(tav({"add", "--all"}), done("Nothing new to stage.\n")) << "which notes the inodes";
     fs::rename(repo.pathTo("survey"), repo.pathTo("site"));
+    EXPECT_THAT(status(), HasSubstr("Renamed:\n  (the next commit takes these without staging)\n"));
     EXPECT_EQ(commit({"--without-removed"}).code, 0);
     EXPECT_EQ(values({"show"}, "previous"), (std::vector<std::string>{"survey/north.dwg", "survey/south.dwg"}));
+}
+
+class MissingFilesWithCopies : public MissingFiles {
+protected:
+    /// As if the folder had been a drive.
+    MissingFilesWithCopies()
+    {
+        fs::copy(repo.pathTo("survey"), repo.pathTo("copy"));
+        lose("survey");
+        repo.makeFolder("survey");
+        repo.write("notes.txt", "second");
+        tav({"add", "notes.txt"});
+    }
+};
+
+TEST_F(MissingFilesWithCopies, TakeTheUsersWord)
+{
+    EXPECT_EQ(commit(), refused("  survey/ (2 files)\n"));
+    EXPECT_THAT(
+        status(), HasSubstr("Renamed:\n  (some may be copies of missing files; use 'tav commit --all-removed' to take "
+                            "these, or '--without-removed' to keep the files in the repository)\n"));
+    EXPECT_EQ(commit({"--all-removed"}).code, 0);
+    EXPECT_EQ(values({"show"}, "previous"), (std::vector<std::string>{"survey/north.dwg", "survey/south.dwg"}));
+}
+
+TEST_F(MissingFilesWithCopies, StayInTheRepositoryOnRequest)
+{
+    tav({"add", "copy/north.dwg"});
+    EXPECT_EQ(commit({"--without-removed"}).code, 0);
+    EXPECT_EQ(changes(), (std::vector<std::string>{"copy/north.dwg", "notes.txt"}));
+    EXPECT_EQ(values({"show"}, "previous"), std::vector<std::string>());
 }
 
 TEST_F(MissingFiles, AreEitherRemovedOrKept)
