@@ -63,6 +63,22 @@ struct DiffOptions {
 };
 void showDifferences(DiffOptions const& options);
 
+struct PreviewOptions {
+    std::string name; ///< "NAME" or "NAME@COMMIT"
+    std::string file; ///< to write; empty: shown in the terminal
+    bool json = false;
+};
+void showPreview(PreviewOptions const& options);
+
+struct CompareOptions {
+    std::string name;
+    std::string before = "HEAD"; ///< a commit
+    std::string after;           ///< a commit; empty: the working folder
+    std::string file;            ///< to write; empty: shown in the terminal
+    bool json = false;
+};
+void compareDrawing(CompareOptions const& options);
+
 struct RestoreOptions {
     std::vector<std::string> names;
     std::string commit; ///< empty: where the user is

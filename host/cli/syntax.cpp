@@ -138,6 +138,31 @@ void addDiff(CLI::App& app)
     command->callback([options] { showDifferences(*options); });
 }
 
+void addPreview(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("preview", "Show the preview picture of a drawing");
+    auto const options = std::make_shared<PreviewOptions>();
+    command->add_option("NAME", options->name, "Path of a drawing; 'plan.dwg@3' for the one of commit 3")->required();
+    CLI::Option* const file =
+        command->add_option("-o,--output", options->file, "Write the picture to this PNG file")->type_name("FILE");
+    command->add_flag("--json", options->json, "Print a document for programs")->needs(file);
+    command->callback([options] { showPreview(*options); });
+}
+
+void addCompare(CLI::App& app)
+{
+    CLI::App* const command =
+        app.add_subcommand("compare", "Show two versions of a drawing as pictures, and what differs");
+    auto const options = std::make_shared<CompareOptions>();
+    command->add_option("NAME", options->name, "Path of a drawing")->required();
+    command->add_option("BEFORE", options->before, "The commit of the first version; by default where you are");
+    command->add_option("AFTER", options->after, "The commit of the second version; by default the working folder");
+    CLI::Option* const file =
+        command->add_option("-o,--output", options->file, "Write the picture to this PNG file")->type_name("FILE");
+    command->add_flag("--json", options->json, "Print a document for programs")->needs(file);
+    command->callback([options] { compareDrawing(*options); });
+}
+
 void addRestore(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("restore", "Bring files back as a commit has them");
@@ -243,6 +268,8 @@ void addCommands(CLI::App& app)
     addLog(app);
     addShow(app);
     addDiff(app);
+    addPreview(app);
+    addCompare(app);
     addRestore(app);
     addCheckout(app);
     addSwitch(app);

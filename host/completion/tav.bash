@@ -66,6 +66,7 @@ _tav_options() { # COMMAND
         add | unstage) printf '%s\n' --all ;;
         commit) printf '%s\n' -m --message --author --all-removed --without-removed ;;
         log) printf '%s\n' -n --count --json ;;
+        preview | compare) printf '%s\n' -o --output --json ;;
         restore) printf '%s\n' --from --force ;;
         checkout | switch) printf '%s\n' --force ;;
         server) printf '%s\n' --send ;;
@@ -80,6 +81,7 @@ _tav_options() { # COMMAND
 _tav_value() { # COMMAND OPTION
     case $1:$2 in
         :-C | init:--server) _tav_offer_files -d ;;
+        preview:-o | preview:--output | compare:-o | compare:--output) _tav_offer_files -f ;;
         restore:--from) _tav_offer < <(_tav_references branch tag) ;;
         commit:-m | commit:--message | commit:--author | log:-n | log:--count | ignore:--add) ;;
         *) return 1 ;;
@@ -95,15 +97,15 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
             _tav_offer_files -f
             _tav_offer < <(_tav_paths modified removed)
             ;;
-        mv:[12] | rm:*) _tav_offer_files -f ;;
+        mv:[12] | rm:* | preview:1 | compare:1) _tav_offer_files -f ;;
         init:1 | server:1 | files:1 | export:2) _tav_offer_files -d ;;
         switch:1) _tav_offer < <(_tav_references branch) ;;
-        log:1 | show:1 | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
+        log:1 | show:1 | compare:[23] | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
     esac
 }
 
 _tav() {
-    local commands='init status add unstage mv rm commit log show diff restore checkout switch branch tag fetch server
+    local commands='init status add unstage mv rm commit log show diff preview compare restore checkout switch branch tag fetch server
         files ignore projects verify gc export'
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
     local command='' folder='' number=1 word i
@@ -115,6 +117,7 @@ _tav() {
             :-*) ;;
             :*) command=$word ;;
             commit:-m | commit:--message | commit:--author | log:-n | log:--count) ((++i)) ;;
+            preview:-o | preview:--output | compare:-o | compare:--output) ((++i)) ;;
             ignore:--add | restore:--from | init:--server) ((++i)) ;;
             *:-*) ;;
             *) ((++number)) ;;

@@ -1,6 +1,6 @@
 # Completion of tav for fish: commands, options, files, branches and tags.
 
-set -l commands init status add unstage mv rm commit log show diff restore checkout switch branch tag fetch server \
+set -l commands init status add unstage mv rm commit log show diff preview compare restore checkout switch branch tag fetch server \
     files ignore projects verify gc export
 
 # Runs tav on the repository that the line names with -C, for what it knows.
@@ -71,6 +71,8 @@ __tav_command commit 'Keep what is staged, removed and renamed as a new commit' 
 __tav_command log 'Show the history, newest first' $commands
 __tav_command show 'Show a commit and what it changed' $commands
 __tav_command diff 'Show what is different from the last commit, in detail' $commands
+__tav_command preview 'Show the preview picture of a drawing' $commands
+__tav_command compare 'Show two versions of a drawing as pictures, and what differs' $commands
 __tav_command restore 'Bring files back as a commit has them' $commands
 __tav_command checkout 'Make the working folder what it was at a commit' $commands
 __tav_command switch 'Go on with the work on another branch' $commands
@@ -107,6 +109,13 @@ complete -c tav -n '__fish_seen_subcommand_from show' -l json -d 'Print a docume
 complete -c tav -n '__fish_seen_subcommand_from show' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from diff' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from diff' -a '(__tav_paths modified untracked removed staged renamed)'
+complete -c tav -n '__fish_seen_subcommand_from preview' -s o -l output -r -F -d 'Write the picture to this PNG file'
+complete -c tav -n '__fish_seen_subcommand_from preview' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from preview' -F
+complete -c tav -n '__fish_seen_subcommand_from compare' -s o -l output -r -F -d 'Write the picture to this PNG file'
+complete -c tav -n '__fish_seen_subcommand_from compare' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from compare' -F
+complete -c tav -n '__fish_seen_subcommand_from compare' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from restore' -l from -x -a '(__tav_references branch tag)' -d 'The commit to take them from'
 complete -c tav -n '__fish_seen_subcommand_from restore' -l force -d 'Overwrite uncommitted changes'
 complete -c tav -n '__fish_seen_subcommand_from restore' -F -a '(__tav_paths modified removed)'

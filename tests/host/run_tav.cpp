@@ -65,6 +65,7 @@ void take(Setting const& setting, int out, int err)
     require(setenv("HOME", home().c_str(), 1) == 0, "setenv");
     require(setenv("XDG_DATA_HOME", (home() + "/data").c_str(), 1) == 0, "setenv");
     require(setenv("XDG_CONFIG_HOME", (home() + "/config").c_str(), 1) == 0, "setenv");
+    require(setenv("XDG_CACHE_HOME", (home() + "/cache").c_str(), 1) == 0, "setenv");
     for (std::string const& variable : setting.environment) {
         std::size_t const end = variable.find('=');
         require(setenv(variable.substr(0, end).c_str(), variable.substr(end + 1).c_str(), 1) == 0, "setenv");

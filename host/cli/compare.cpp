@@ -1,0 +1,59 @@
+#include "host/cli/commands.h"
+#include "host/cli/drawing_version.h"
+#include "host/cli/output.h"
+#include "host/errors/failure.h"
+#include "host/pictures/comparison.h"
+#include "host/repository/open.h"
+#include "host/text/utf8.h"
+
+#include <string>
+
+namespace tav {
+
+namespace {
+
+kutils::json::Object documentOf(Comparison const& comparison, DrawingVersion const& after, std::string const& file)
+{
+    kutils::json::Object document;
+    document[L"path"] = jsonText(after.path);
+    document[L"file"] = jsonText(fromUtf8(file));
+    document[L"removed"] = comparison.removed;
+    document[L"added"] = comparison.added;
+    document[L"recolored"] = comparison.recolored;
+    return document;
+}
+
+std::string summary(Comparison const& comparison)
+{
+    if (comparison.removed + comparison.added + comparison.recolored == 0) {
+        return "The pictures are alike; the drawings may differ in what the pictures do not show.\n";
+    }
+    return "Pixels that differ: " + std::to_string(comparison.removed) + " removed, " +
+           std::to_string(comparison.added) + " added, " + std::to_string(comparison.recolored) + " recolored.\n";
+}
+
+} // namespace
+
+void compareDrawing(CompareOptions const& options)
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    DrawingVersion const before = drawingVersion(root, database, options.name, options.before);
+    DrawingVersion const after = drawingVersion(root, database, options.name, options.after);
+    Comparison const comparison = compare(before.picture, after.picture);
+    if (options.file.empty()) {
+        showPicture(comparison.picture);
+    } else {
+        writePicture(comparison.picture, options.file);
+    }
+    if (options.json) {
+        printJson(documentOf(comparison, after, options.file));
+        return;
+    }
+    print(before.label + " and " + after.label + ". " + summary(comparison));
+    if (!options.file.empty()) {
+        print("Wrote the comparison to '" + shown(fromUtf8(options.file)) + "'.\n");
+    }
+}
+
+} // namespace tav
