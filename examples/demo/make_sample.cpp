@@ -1,5 +1,8 @@
 // Makes the project that the demo shows: drawings, notes, prints, and what drawing editors leave behind.
-// The same bytes every time. Usage: make_sample FOLDER, which must not exist yet.
+// The same bytes every time.
+//
+//     make_sample FOLDER            the project; the folder must not exist yet
+//     make_sample --plan N FILE     version N of a drawing whose preview picture shows a floor plan
 
 #include <algorithm>
 #include <array>
@@ -136,12 +139,80 @@ void makeLeftovers(Sample& sample)
     }
 }
 
+void appendNumber(std::string& bytes, std::uint32_t value)
+{
+    for (unsigned shift = 0; shift < 32; shift += 8) {
+        bytes += static_cast<char>(value >> shift & 0xFFU);
+    }
+}
+
+constexpr std::uint32_t kPlanWidth = 180;
+constexpr std::uint32_t kPlanHeight = 120;
+
+/// Three rooms. With each version the wall between two of them moves, and from the second on there is a door.
+bool isWall(std::uint32_t x, std::uint32_t y, std::uint32_t version)
+{
+    std::uint32_t const wall = 70 + 10 * version;
+    bool const isInside = x >= 10 && x < kPlanWidth - 10 && y >= 10 && y < kPlanHeight - 10;
+    bool const isOuter = x < 13 || x >= kPlanWidth - 13 || y < 13 || y >= kPlanHeight - 13;
+    bool const isInner = (x >= wall && x < wall + 3) || (x > wall && y >= 60 && y < 63);
+    bool const isDoor = version > 1 && x >= wall && x < wall + 3 && y >= 80 && y < 95;
+    return isInside && (isOuter || (isInner && !isDoor));
+}
+
+/// A bitmap of 8 bits for each pixel without file header, as editors keep it in drawings.
+std::string planPicture(std::uint32_t version)
+{
+    std::string bitmap;
+    for (std::uint32_t const field :
+         {std::uint32_t{40}, kPlanWidth, kPlanHeight, 0x00080001U, 0U, 0U, 0U, 0U, 2U, 0U}) {
+        appendNumber(bitmap, field);
+    }
+    bitmap.append({'\xFF', '\xFF', '\xFF', 0, '\x30', '\x20', '\x20', 0}); // the two colors
+    for (std::uint32_t y = 0; y < kPlanHeight; ++y) {
+        for (std::uint32_t x = 0; x < kPlanWidth; ++x) {
+            bitmap += static_cast<char>(isWall(x, y, version));
+        }
+    }
+    return bitmap;
+}
+
+/// The beginning of a drawing, up to the end of its preview picture.
+std::string planDrawing(std::uint32_t version)
+{
+    constexpr std::string_view kMark = "\x1F\x25\x6D\x07\xD4\x36\x28\x28\x9D\x57\xCA\x3F\x9D\x44\x10\x2B";
+    constexpr std::uint32_t kPreviewAt = 64;
+    constexpr std::uint32_t kPictureAt = kPreviewAt + 16 + 4 + 1 + 9;
+    std::string const picture = planPicture(version);
+    auto const length = static_cast<std::uint32_t>(picture.size());
+    std::string drawing = "AC1015";
+    drawing.resize(13);
+    appendNumber(drawing, kPreviewAt);
+    drawing.resize(kPreviewAt);
+    drawing += kMark;
+    appendNumber(drawing, 1 + 9 + length);
+    drawing.append({1, 2}); // one entry, a bitmap
+    appendNumber(drawing, kPictureAt);
+    appendNumber(drawing, length);
+    return drawing + picture;
+}
+
+void makePlan(std::string const& version, fs::path const& path)
+{
+    Sample sample(path.parent_path().empty() ? "." : path.parent_path());
+    sample.write(path.filename(), planDrawing(static_cast<std::uint32_t>(std::stoul(version))), 300 * kKiB);
+}
+
 } // namespace
 
 int main(int argc, char** argv)
 try {
+    if (argc == 4 && std::string_view(argv[1]) == "--plan") {
+        makePlan(argv[2], argv[3]);
+        return 0;
+    }
     if (argc != 2 || fs::exists(argv[1])) {
-        std::fprintf(stderr, "usage: make_sample FOLDER, which must not exist yet\n");
+        std::fprintf(stderr, "usage: make_sample FOLDER, which must not exist yet, or make_sample --plan N FILE\n");
         return 2;
     }
     Sample sample(argv[1]);
