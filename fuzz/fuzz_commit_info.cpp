@@ -73,7 +73,7 @@ void read(unsigned kind, OdString const& document)
     case 0: return check(tav::readCommitInfo(document));
     case 1: return check(tav::readReferences(document));
     case 2: return require(tav::readLastNumber(document) >= 0);
-    default: return require(!tav::readRepositoryName(document).isEmpty());
+    default: return require(!tav::readNewRepository(document).name.isEmpty());
     }
 }
 

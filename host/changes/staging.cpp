@@ -135,11 +135,13 @@ std::size_t unstage(std::vector<common::StagedFile> const& files, common::State&
     return dropStaged(paths, state);
 }
 
-void applyIndexUpdates(IndexUpdates const& files, common::State& state)
+void applyIndexUpdates(IndexUpdates const& files, common::State& state, std::set<OdString> const& left)
 {
     std::vector<common::StagedFile> committed;
     for (auto const& [path, record] : files) {
-        committed.emplace_back(path, common::FileChange::modified);
+        if (left.count(path) == 0) {
+            committed.emplace_back(path, common::FileChange::modified);
+        }
         if (record) {
             state.index.insert_or_assign(path, *record);
         } else {
@@ -147,6 +149,16 @@ void applyIndexUpdates(IndexUpdates const& files, common::State& state)
         }
     }
     unstage(committed, state);
+    for (common::StagedFile& file : state.stagedFiles) {
+        auto const update = files.find(file.path);
+        if (update == files.end()) {
+            continue;
+        }
+        state.renames.erase(file.path);
+        if (file.change != common::FileChange::removed) {
+            file.change = update->second ? common::FileChange::modified : common::FileChange::added;
+        }
+    }
 }
 
 void stageMoves(std::vector<Move> const& moves, common::State& state)

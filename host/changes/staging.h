@@ -33,8 +33,10 @@ std::set<OdString> claimedPaths(common::State const& state);
 /// Takes `files` out of the staged ones, with what was noted of their renames. Returns how many were staged.
 std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state);
 
-/// Enters the index records of files that are as the current commit has them, and takes them out of the staged ones.
-void applyIndexUpdates(IndexUpdates const& files, common::State& state);
+/// Enters the index records of files that are as the current commit has them, and takes them out of the staged ones. Of
+/// `left`, files that somebody has changed since, only the renames go: what is staged there was not committed.
+void applyIndexUpdates(
+    IndexUpdates const& files, common::State& state, std::set<OdString> const& left = std::set<OdString>());
 
 /// A file of the repository that has a new path.
 struct Move {

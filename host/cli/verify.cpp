@@ -64,12 +64,12 @@ std::optional<Failure> differenceFromServer(LocalDatabase const& database)
     }
     if (comparison.unknownThere > 0) {
         return Failure(
-            "The server lacks " + counted(comparison.unknownThere, "commit") + " that are known here.",
+            "The server lacks " + countedThatAre(comparison.unknownThere, "commit") + " known here.",
             "An older copy of it may have been put back: run 'tav server --send' to send them again.");
     }
     if (comparison.unknownHere > 0) {
         return Failure(
-            "The server has " + counted(comparison.unknownHere, "commit") + " that are not known here.",
+            "The server has " + countedThatAre(comparison.unknownHere, "commit") + " not known here.",
             "Run 'tav fetch' to learn them.");
     }
     return std::nullopt;

@@ -79,9 +79,12 @@ std::unique_ptr<Server> connect(OdString const& folder, EmbeddedServer::Missing 
     return server;
 }
 
-OdString makeRepository(OdString const& folder, std::string const& name)
+OdString makeRepository(OdString const& folder, std::string const& name, OdString const& id)
 {
     kutils::json::Object object;
+    if (!id.isEmpty()) {
+        object[L"id"] = jsonText(id);
+    }
     object[L"name"] = jsonText(withoutControls(fromUtf8(name)));
     OdString const answer = valueOrFail(
         connect(folder, EmbeddedServer::Missing::isMade)->request(L"init", compactText(std::move(object))),

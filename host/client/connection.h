@@ -24,8 +24,9 @@ void failIfInside(OdString const& server, std::string const& workingFolder);
 /// speaks another version than this program.
 std::unique_ptr<Server> connect(OdString const& folder, EmbeddedServer::Missing missing);
 
-/// Makes a repository on the server in `folder`, which is made when it is missing, and returns its identifier.
-OdString makeRepository(OdString const& folder, std::string const& name);
+/// Makes a repository on the server in `folder`, which is made when it is missing, and returns its identifier. That is
+/// `id`, unless it is empty: copies of a project find each other by it, whatever server they come from.
+OdString makeRepository(OdString const& folder, std::string const& name, OdString const& id = OdString());
 
 /// The identifiers of all repositories of the server in `folder`.
 std::vector<OdString> repositoriesIn(OdString const& folder);

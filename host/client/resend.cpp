@@ -55,11 +55,28 @@ void sendReferences(CommitTables const& tables, Connection& connection)
     }
 }
 
+/// Those of the references `before` that no longer lead to their commits.
+std::vector<common::Reference> givenUp(std::vector<common::Reference> const& before, CommitTables const& tables)
+{
+    std::vector<common::Reference> gone;
+    for (common::Reference const& reference : before) {
+        auto const now = tables.reference(reference.name);
+        bool const isSame = now && now->type == reference.type && now->commitHash == reference.commitHash;
+        bool const isFollowed = now && now->type == common::EType::branch && reference.type == now->type &&
+                                tables.isBefore(reference.commitHash, now->commitHash);
+        if (!isSame && !isFollowed) {
+            gone.push_back(reference);
+        }
+    }
+    return gone;
+}
+
 } // namespace
 
-std::size_t sendAgain(common::RootPath const& root, LocalDatabase& database, Connection& connection)
+Sent sendAgain(common::RootPath const& root, LocalDatabase& database, Connection& connection)
 {
     CommitTables const& tables = database.commits();
+    std::vector<common::Reference> const before = tables.references();
     std::vector<OdString> const missing = missingThere(database, connection);
     Progress progress("commits", missing.size());
     for (OdString const& hash : missing) {
@@ -72,7 +89,7 @@ std::size_t sendAgain(common::RootPath const& root, LocalDatabase& database, Con
     } else {
         fetchHistory(root, database, connection, Compared::everything);
     }
-    return missing.size();
+    return {missing.size(), givenUp(before, tables)};
 }
 
 } // namespace tav

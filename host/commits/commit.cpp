@@ -161,8 +161,11 @@ sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& dat
         if (isElsewhere || !isOnServer(commit.commit.hash, connection)) {
             clearJournal(database);
         }
-        failure.next += isElsewhere ? " What was to be committed is staged as before."
-                                    : " With 'tav branch NAME' and 'tav switch NAME' you have a branch of your own.";
+        if (isElsewhere) {
+            failure.next += " What was to be committed is staged as before.";
+        } else if (failure.code == static_cast<std::int32_t>(ServerError::hasMovedOn)) {
+            failure.next += " With 'tav branch NAME' and 'tav switch NAME' you have a branch of your own.";
+        }
         throw;
     }
     auto const numbers = valueOrFail(common::deserializeCommitNumbers(answer.get_array()), kAskOwner);
@@ -315,6 +318,30 @@ void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
     readBack(draft, plan, storage);
 }
 
+/// Whether what is staged is what the commit has taken, whose index record is `record`; none for a removal.
+bool isAsCommitted(common::StagedFile const& staged, std::optional<common::IndexData> const& record, FolderView& view)
+{
+    if (staged.change == common::FileChange::removed) {
+        return !record;
+    }
+    auto const stamp = view.look(staged.path.ansi_str()).stamp;
+    return !stamp || (record && record->lastChecked == static_cast<std::uint64_t>(stamp->modified));
+}
+
+/// The staged files that are not what was committed any more: a commit may wait for its server for days.
+std::set<OdString> changedSince(IndexUpdates const& files, common::State const& state, common::RootPath const& root)
+{
+    std::set<OdString> changed;
+    FolderView view(root);
+    for (common::StagedFile const& staged : state.stagedFiles) {
+        auto const file = files.find(staged.path);
+        if (file != files.end() && !isAsCommitted(staged, file->second, view)) {
+            changed.insert(staged.path);
+        }
+    }
+    return changed;
+}
+
 CommitRecord
 finish(common::RootPath const& root, LocalDatabase& database, PendingCommit const& pending, NewCommit commit)
 {
@@ -324,7 +351,10 @@ finish(common::RootPath const& root, LocalDatabase& database, PendingCommit cons
         fetchHistory(root, database, connection, Compared::everything);
     }
     enter(commit, pending, database);
-    changeState(root, [&](common::Cache& cache) { applyIndexUpdates(pending.files, cache.write()); });
+    changeState(root, [&](common::Cache& cache) {
+        std::set<OdString> const left = changedSince(pending.files, cache.read(), root);
+        applyIndexUpdates(pending.files, cache.write(), left);
+    });
     clearJournal(database);
     return commit.commit;
 }

@@ -241,7 +241,7 @@ std::vector<CommitNumber> readNumbers(OdString const& document)
     return numbers;
 }
 
-OdString readRepositoryName(OdString const& document)
+NewRepository readNewRepository(OdString const& document)
 {
     kutils::json::Value const value = parsed(document);
     Part const whole(value);
@@ -250,7 +250,11 @@ OdString readRepositoryName(OdString const& document)
     if (auto const fault = whyNotName(name)) {
         part.refuse(*fault);
     }
-    return name;
+    auto const id = whole.optionalMember(L"id");
+    if (id && !isRepositoryId(id->text())) {
+        id->refuse("must be an identifier of 32 lower-case hexadecimal digits");
+    }
+    return {std::move(name), id ? id->text() : OdString()};
 }
 
 } // namespace tav

@@ -46,7 +46,12 @@ std::int64_t readLastNumber(OdString const& document);
 /// The pairs of a commit-numbers document, in their order.
 std::vector<CommitNumber> readNumbers(OdString const& document);
 
-/// The name in the document that asks for a new repository.
-OdString readRepositoryName(OdString const& document);
+/// A repository that a client asks for.
+struct NewRepository {
+    OdString name;
+    OdString id; ///< empty when the server shall choose one
+};
+
+NewRepository readNewRepository(OdString const& document);
 
 } // namespace tav

@@ -11,19 +11,30 @@ namespace tav {
 namespace {
 
 constexpr std::size_t kHashLength = 64;
+constexpr std::size_t kIdLength = 32;
 constexpr std::size_t kMostParents = 2;
 
-bool isLowerHex(wchar_t c)
+bool isLowerHexDigit(wchar_t c)
 {
     return (c >= L'0' && c <= L'9') || (c >= L'a' && c <= L'f');
+}
+
+bool isLowerHex(OdString const& text, std::size_t length)
+{
+    wchar_t const* const begin = text.c_str();
+    return text.getLength() == length && std::all_of(begin, begin + length, isLowerHexDigit);
 }
 
 } // namespace
 
 bool isHash(OdString const& hash)
 {
-    wchar_t const* const begin = hash.c_str();
-    return hash.getLength() == kHashLength && std::all_of(begin, begin + kHashLength, isLowerHex);
+    return isLowerHex(hash, kHashLength);
+}
+
+bool isRepositoryId(OdString const& id)
+{
+    return isLowerHex(id, kIdLength);
 }
 
 bool isContentUrl(OdString const& url)

@@ -12,6 +12,9 @@ namespace tav {
 /// Whether `hash` is the name of a commit or content: 64 lower-case hexadecimal digits.
 bool isHash(OdString const& hash);
 
+/// Whether `id` can be the identifier of a repository: 32 lower-case hexadecimal digits.
+bool isRepositoryId(OdString const& id);
+
 /// Whether `url` names a content that a client can store and find: it has one of the two forms of `parseUrl`.
 bool isContentUrl(OdString const& url);
 

@@ -14,7 +14,8 @@ enum class ServerError : std::int32_t {
     other = 0,
     noServer = 1001,     ///< the place where it was is empty; it may come back
     noRepository = 1002, ///< it is there, and does not have the repository
-    isBehind = 1003      ///< it lacks commits that the client knows; the client finds that out
+    isBehind = 1003,     ///< it lacks commits that the client knows; the client finds that out
+    hasMovedOn = 1004    ///< it has commits on the branch that the new one does not follow
 };
 
 /// A server, wherever it is. docs/formats/server-protocol.md lists its requests and their documents; nothing else

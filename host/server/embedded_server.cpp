@@ -105,7 +105,9 @@ void requireParents(CommitTables const& tables, CommitRecord const& commit)
         }
     }
     if (commit.parents.empty() && tables.lastNumber() != 0) {
-        throw Failure("The repository has commits already; one without a parent would not follow them.", kFetchFirst);
+        throw withCode(
+            Failure("The repository has commits already; one without a parent would not follow them.", kFetchFirst),
+            ServerError::hasMovedOn);
     }
 }
 
@@ -136,8 +138,10 @@ void requireForward(CommitTables const& tables, common::Reference const& there, 
         throw Failure("The tag " + quoted(wanted.name) + " names another commit already.", "Choose another name.");
     }
     if (!tables.isBefore(there.commitHash, wanted.commitHash)) {
-        throw Failure(
-            "The branch " + quoted(wanted.name) + " has commits that the new one does not follow.", kFetchFirst);
+        throw withCode(
+            Failure(
+                "The branch " + quoted(wanted.name) + " has commits that the new one does not follow.", kFetchFirst),
+            ServerError::hasMovedOn);
     }
 }
 
@@ -153,7 +157,9 @@ void requireExpected(std::optional<common::Reference> const& there, ReferenceCha
     if (change.expected->isEmpty()) {
         throw Failure("There is a " + name + " already.", "Choose another name.");
     }
-    throw Failure("The " + name + " names another commit by now.", "Fetch what others have done, and try again.");
+    throw withCode(
+        Failure("The " + name + " names another commit by now.", "Fetch what others have done, and try again."),
+        ServerError::hasMovedOn);
 }
 
 void setReference(CommitTables& tables, ReferenceChange const& change, Force force)
@@ -196,13 +202,22 @@ OdString answerVersion(Request const&)
     return compactText(version);
 }
 
+void requireFree(Database const& database, OdString const& id)
+{
+    Statement row = database.prepare("SELECT 1 FROM repositories WHERE id = ?");
+    if (row.with(id).next()) {
+        throw Failure("The server has a repository " + quoted(id) + " already.", kNothingChanged);
+    }
+}
+
 OdString answerInit(Request const& request)
 {
-    OdString const name = readRepositoryName(request.document);
+    NewRepository const wanted = readNewRepository(request.document);
     WriteTransaction transaction(request.database);
-    Statement addRepository =
-        request.database.prepare("INSERT INTO repositories(id, name) VALUES (lower(hex(randomblob(16))), ?)");
-    addRepository.with(name).run();
+    requireFree(request.database, wanted.id);
+    Statement addRepository = request.database.prepare(
+        "INSERT INTO repositories(id, name) VALUES (coalesce(nullif(?, ''), lower(hex(randomblob(16)))), ?)");
+    addRepository.with(wanted.id).with(wanted.name).run();
     Statement row = request.database.prepare("SELECT id FROM repositories WHERE key = last_insert_rowid()");
     Object answer;
     answer[L"id"] = jsonText(row.next() ? row.text(0) : OdString());

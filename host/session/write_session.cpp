@@ -6,7 +6,10 @@
 #include "host/errors/failure.h"
 #include "host/repository/journal.h"
 
+#include <cstdio>
+#include <string>
 #include <utility>
+#include <variant>
 
 namespace tav {
 
@@ -24,20 +27,31 @@ WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Reco
     if (recovery == Recovery::skipped) {
         return;
     }
+    bool isCommit = false;
     try {
-        recover();
+        PendingOperation const pending = readJournal(database_);
+        isCommit = std::holds_alternative<PendingCommit>(pending);
+        recover(pending);
     } catch (Failure const&) {
         if (recovery == Recovery::required) {
             throw;
         }
+        if (isCommit && database_.journal().isEmpty()) {
+            std::fputs(
+                "tav: A commit that was interrupted has been given up, as the server refuses it. What it was to take "
+                "is staged as before.\n",
+                stderr);
+        }
     }
 }
 
-void WriteSession::recover()
+void WriteSession::recover(PendingOperation const& pending)
 {
-    PendingOperation const pending = readJournal(database_);
     if (auto const* const commit = std::get_if<PendingCommit>(&pending)) {
         recoveredCommit_ = finishCommit(root_, database_, *commit);
+        std::string const name =
+            std::to_string(recoveredCommit_->number) + " (" + recoveredCommit_->hash.left(12).ansi_str() + ")";
+        std::fputs(("tav: Completed commit " + name + ", which was interrupted.\n").c_str(), stderr);
     }
     // Before all its files are written, only the user can say whether they are still wanted.
     auto const* const checkout = std::get_if<PendingCheckout>(&pending);

@@ -1,6 +1,7 @@
 /// The session that every command which changes a repository runs in.
 #pragma once
 
+#include "host/repository/journal.h"
 #include "host/repository/local_database.h"
 #include "host/repository/lock.h"
 
@@ -37,7 +38,7 @@ public:
     void failIfBetweenCommits() const;
 
 private:
-    void recover();
+    void recover(PendingOperation const& pending);
 
     common::RootPath root_;
     os::FileLock lock_;

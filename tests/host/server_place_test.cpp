@@ -6,6 +6,7 @@
 #include <gmock/gmock.h>
 
 #include <filesystem>
+#include <sys/stat.h>
 
 namespace host_tests {
 namespace {
@@ -182,6 +183,54 @@ TEST_F(OlderServer, GetsItUnderNewNumbersWhereOthersHaveCommitted)
     EXPECT_EQ(run(setting, {"fetch"}).code, 0);
 }
 
+TEST_F(ServerPlace, KeepsItsIdentifierOnAnotherServer)
+{
+    std::string const shown = tav({"server"}).out;
+    std::string const id = shown.substr(shown.find(" as the repository "), 52);
+    EXPECT_EQ(tav({"server", place.pathTo("wrong"), "--send"}).code, 0);
+    EXPECT_THAT(tav({"server"}).out, HasSubstr(id));
+    EXPECT_EQ(
+        tav({"server", server(), "--send"}), done("Sent 0 commits.\nThe history is kept in '" + server() + "' now.\n"));
+    EXPECT_THAT(tav({"server"}).out, HasSubstr(id));
+}
+
+TEST_F(ServerPlace, IsFoundAgainUnderAnotherIdentifier)
+{
+    std::string const shown = tav({"server"}).out;
+    tav::Database(place.pathTo("repository/.tav/tav.db"))
+        .run("UPDATE settings SET value = '5f0c1d2e3b4a59687766554433221100' WHERE key = 'repository'");
+    EXPECT_EQ(tav({"server", "--send"}).out.substr(0, 16), "Sent 0 commits.\n");
+    EXPECT_EQ(tav({"server"}).out, shown);
+}
+
+TEST_F(ServerPlace, SaysWhichCommitsNoNameLeadsToWhenOthersHaveMovedTheBranch)
+{
+    fs::copy(server(), place.pathTo("copy"), fs::copy_options::recursive);
+    fs::copy(place.pathTo("repository"), place.pathTo("theirs"), fs::copy_options::recursive);
+    commitFile("note.txt", "ours", "third");
+    Setting theirs;
+    theirs.folder = place.pathTo("theirs");
+    ASSERT_EQ(run(theirs, {"server", place.pathTo("copy")}).code, 0);
+    place.write("theirs/note.txt", "theirs");
+    ASSERT_EQ(run(theirs, {"add", "note.txt"}).code, 0);
+    ASSERT_EQ(run(theirs, {"commit", "-m", "theirs"}).code, 0);
+    EXPECT_EQ(
+        tav({"server", place.pathTo("copy"), "--send"}).err,
+        "tav: The server's 'master' does not follow yours. Yours ends at commit 4; run 'tav branch NAME 4' to keep "
+        "it.\n");
+    EXPECT_EQ(hashes(), "1 first\n2 second\n3 theirs\n4 third\n");
+    EXPECT_EQ(tav({"branch", "mine", "4"}).code, 0);
+}
+
+TEST_F(ServerPlace, IsNotTakenForMovedOnWhenItFails)
+{
+    tav::Database(place.pathTo("server/server.db"))
+        .run("CREATE TRIGGER full BEFORE INSERT ON commits BEGIN SELECT RAISE(ABORT, 'the disk is full'); END");
+    place.write("repository/note.txt", "three");
+    EXPECT_EQ(tav({"add", "--all"}).code, 0);
+    EXPECT_THAT(tav({"commit", "-m", "third"}).err, testing::Not(HasSubstr("branch of your own")));
+}
+
 class NoRepository : public ServerPlace {
 protected:
     NoRepository()
@@ -273,7 +322,11 @@ private:
         }
         std::string const hash = one("SELECT hash FROM commits WHERE number = 3");
         std::string const parent = one("SELECT hash FROM commits WHERE number = 2");
-        return R"({"contents":[],"files":[],"document":"{\"commits\":[{\"annotation\":{\"author\":\"ann@studio\",)"
+        struct stat status;
+        EXPECT_EQ(stat(place.pathTo("repository/note.txt").c_str(), &status), 0);
+        std::string const time = std::to_string(status.st_mtim.tv_sec * 1'000'000'000 + status.st_mtim.tv_nsec);
+        return R"({"contents":[],"files":[{"path":"note.txt","modified":false,"time":)" + time +
+               R"(}],"document":"{\"commits\":[{\"annotation\":{\"author\":\"ann@studio\",)"
                R"(\"date\":\"2024-03-05T14:07:09Z\",\"message\":\"third\"},\"files\":[)" +
                files + R"(],\"hash\":\")" + hash + R"(\",\"parentsHashes\":[\")" + parent +
                R"(\"]}],\"references\":[{\"commitHash\":\")" + hash +
@@ -302,6 +355,35 @@ TEST_F(WaitingCommit, IsTakenBackWhereTheServerHasNoSuchRepository)
     EXPECT_THAT(tav({"status"}).out, HasSubstr("modified: note.txt"));
     EXPECT_EQ(tav({"server", "--send"}).code, 0);
     EXPECT_EQ(tav({"commit", "-m", "third", "--author", "ann@studio"}).out.substr(0, 13), "Made commit 3");
+}
+
+TEST_F(WaitingCommit, LeavesWhatWasStagedMeanwhile)
+{
+    place.write("repository/note.txt", "four");
+    place.write("repository/new.txt", "new");
+    move("server", "away");
+    EXPECT_EQ(tav({"add", "--all"}), done("Staged 1 file.\n"));
+    move("away", "server");
+    EXPECT_THAT(
+        tav({"fetch"}).err, testing::MatchesRegex("tav: Completed commit 3 \\([0-9a-f]+\\), which was interrupted.\n"));
+    EXPECT_THAT(tav({"status"}).out, HasSubstr("        new:      new.txt\n        modified: note.txt\n\n"));
+    EXPECT_THAT(tav({"status"}).out, testing::Not(HasSubstr("not staged")));
+}
+
+TEST_F(WaitingCommit, LeavesNothingStagedThatItHas)
+{
+    EXPECT_EQ(tav({"fetch"}).code, 0);
+    EXPECT_THAT(tav({"status"}).out, HasSubstr("Nothing has changed since the last commit."));
+}
+
+TEST_F(WaitingCommit, IsSaidToBeGivenUpWhenTheServerRefusesIt)
+{
+    tav::Database(place.pathTo("server/server.db"))
+        .run("DELETE FROM refs; DELETE FROM changes; DELETE FROM parents; DELETE FROM commits;"
+             "DELETE FROM repositories;");
+    EXPECT_THAT(
+        tav({"gc"}).err, StartsWith("tav: A commit that was interrupted has been given up, as the server refuses it. "
+                                    "What it was to take is staged as before.\n"));
 }
 
 class LostDatabase : public ServerPlace {

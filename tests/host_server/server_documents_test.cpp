@@ -111,7 +111,9 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"InitWithNumber", "init", R"({"name":1})", "'name' must be of type string, not int."},
         Row{"InitWithEmptyName", "init", R"({"name":""})", "'name' is empty."},
         Row{"InitWithLineEnd", "init", R"({"name":"a\nb"})", "'name' holds a control character."},
-        Row{"InitWithBlank", "init", R"({"name":"a "})", "'name' begins or ends with a blank."}),
+        Row{"InitWithBlank", "init", R"({"name":"a "})", "'name' begins or ends with a blank."},
+        Row{"InitWithShortId", "init", R"({"name":"a","id":"5f"})",
+            "'id' must be an identifier of 32 lower-case hexadecimal digits."}),
     support::rowName);
 
 class ServerRequestOfHostileText : public server::ServerTest {};
