@@ -78,6 +78,7 @@ void requireOwnFiles(common::RootPath const& root)
         failIfLink(root.pathTo(name).ansi_str(), "folder");
     }
     failIfLink(root.statePath().ansi_str(), "file");
+    failIfLink(root.pathTo(L".tav/properties/ignore").ansi_str(), "file");
     for (wchar_t const* const end : {L"", L"-journal", L"-shm", L"-wal"}) { // A database in use has files beside it.
         std::string const file = (root.dbPath() + end).ansi_str();
         failIfLink(file, "file");

@@ -136,13 +136,17 @@ TEST_F(Ignore, FailsForAFileThatCannotBeUsed)
     EXPECT_EQ(repo.read(".tav/properties/ignore"), "^a$\n(\n");
 }
 
-TEST_F(Ignore, KeepsALinkToAFileOfRules)
+TEST_F(Ignore, WritesThroughNoLink)
 {
     repo.write("shared rules", "^a$\n");
     repo.makeFolder(".tav/properties");
     repo.makeLink(".tav/properties/ignore", repo.pathTo("shared rules"));
-    EXPECT_EQ(tav({"ignore", "--add", "^b$"}), done("Names that match '^b$' are ignored from now on.\n"));
-    EXPECT_EQ(repo.read("shared rules"), "^a$\n^b$");
+    EXPECT_EQ(
+        tav({"ignore", "--add", "^b$"}), failed(
+                                             "tav: '" + repo.pathTo(".tav/properties/ignore") +
+                                             "' is a link, and may lead to another repository. Put the file itself in "
+                                             "its place.\n"));
+    EXPECT_EQ(repo.read("shared rules"), "^a$\n");
 }
 
 TEST_F(Ignore, CountsBothOfTwoRulesAddedAtTheSameTime)

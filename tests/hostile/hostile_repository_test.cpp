@@ -272,7 +272,8 @@ TEST_P(LinkInAFilesPlace, IsFollowedByNoCommand)
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Files, LinkInAFilesPlace, testing::Values("tav.state", "tav.db", "tav.db-journal", "tav.db-shm", "tav.db-wal"));
+    Files, LinkInAFilesPlace,
+    testing::Values("tav.state", "tav.db", "tav.db-journal", "tav.db-shm", "tav.db-wal", "properties/ignore"));
 
 /// Takes the right to write away from everybody, in `folder` and below.
 void makeReadOnly(std::string const& folder)
