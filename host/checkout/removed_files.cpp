@@ -2,7 +2,7 @@
 
 #include "host/changes/digest.h"
 #include "host/errors/failure.h"
-#include "host/storage/cleaning.h"
+#include "host/storage/files.h"
 #include "host/storage/storage_error.h"
 #include "host/text/utf8.h"
 

@@ -1,104 +1,109 @@
 #include "host/storage/cleaning.h"
 
+#include "host/storage/files.h"
+#include "host/storage/inventory.h"
+#include "host/storage/reduced_store.h"
 #include "host/storage/storage_error.h"
 
 #include "platform/os/os_files.h"
+#include "platform/os/os_open_file.h"
 
-#include <algorithm>
-#include <cerrno>
 #include <sys/stat.h>
 
 namespace tav {
 
 namespace {
 
-std::size_t indexOf(RecordFile const& store, DigestBytes const& digest, std::string const& name)
+/// Removes a file that holds `contents` contents.
+Freed removeFile(std::string const& path, std::size_t contents)
 {
-    std::optional<std::size_t> const index = store.find(digest);
-    if (!index) {
-        throw StorageError(name + " lacks a revision that is to be kept.");
-    }
-    return *index;
+    struct statx status;
+    check(os::examine(path, status), "'" + path + "' cannot be examined");
+    check(os::removeUnflushed(path), "'" + path + "' cannot be removed");
+    return {contents, status.stx_size};
 }
 
-std::set<std::size_t> neededOf(RecordFile const& store, std::set<DigestBytes> const& digests, std::string const& name)
+Freed removeAllIn(std::string const& folder)
 {
-    std::set<std::size_t> needed;
-    for (DigestBytes const& digest : digests) {
-        std::vector<std::size_t> const chain = store.chainOf(indexOf(store, digest, name));
-        needed.insert(chain.begin(), chain.end());
+    Freed freed;
+    for (std::string const& name : entriesOf(folder)) {
+        freed += removeFile(std::string(folder).append("/").append(name), 0);
     }
-    return needed;
+    return freed;
 }
 
-void writeReduced(
-    RecordFile const& old, std::set<std::size_t> const& needed, std::string const& path, std::string const& name)
+Freed cleanObjects(StorageLayout const& layout, std::set<DigestBytes> const& needed)
 {
-    RecordFile reduced = RecordFile::create(path, "The new form of " + name);
-    for (std::size_t const index : needed) {
-        reduced.appendFrom(old, index);
+    Freed freed;
+    for (DigestBytes const& digest : objectsIn(layout)) {
+        if (needed.count(digest) == 0) {
+            freed += removeFile(layout.fileOf({{}, digest}), 1);
+        }
     }
-    reduced.flush();
+    return freed;
 }
 
-void readBack(
-    std::string const& path, std::string const& name, std::set<DigestBytes> const& digests, std::string const& scratch)
+/// Cleans the stores one by one. One that cannot be cleaned stays as it is; returns why, of the first such store.
+std::optional<StorageError> cleanStores(StorageLayout const& layout, Needed const& needed, Freed& freed)
 {
-    RecordFile const reduced = RecordFile::openForReading(path, name);
-    for (DigestBytes const& digest : digests) {
-        reduced.read(indexOf(reduced, digest, name), scratch, nullptr, [](std::string_view) {});
+    std::optional<StorageError> firstError;
+    for (auto const& [store, path] : storesIn(layout)) {
+        if (needed.storesLeftAlone.count(store) > 0) {
+            continue;
+        }
+        try {
+            freed += reduceStore(path, nameOfStore(store), needed.revisionsIn(store), layout.scratchFolder());
+        } catch (StorageError const& error) {
+            firstError = firstError ? firstError : error;
+        }
+    }
+    return firstError;
+}
+
+void flushFolders(StorageLayout const& layout)
+{
+    for (std::string const& folder : {layout.objectFolder(), layout.storeFolder()}) {
+        if (exists(folder)) {
+            flushFolder(folder);
+        }
     }
 }
 
 } // namespace
 
-std::vector<std::string> entriesOf(std::string const& folder)
+void Needed::add(StorageUrl const& url)
 {
-    std::vector<std::string> names;
-    os::FolderReader const reader = os::openFolder(folder);
-    if (!reader && errno != ENOENT) {
-        check({errno, std::generic_category()}, "'" + folder + "' cannot be read");
-    }
-    while (dirent const* const entry = reader ? readdir(reader.get()) : nullptr) {
-        names.emplace_back(entry->d_name);
-    }
-    std::sort(names.begin(), names.end());
-    return names;
+    (url.isObject() ? objects : revisions[url.store]).insert(url.digest);
 }
 
-void removeCounted(std::string const& path, std::size_t contents, Freed& freed)
+std::set<DigestBytes> Needed::revisionsIn(std::string const& store) const
 {
-    struct statx status;
-    check(os::examine(path, status), "'" + path + "' cannot be examined");
-    check(os::removeUnflushed(path), "'" + path + "' cannot be removed");
-    freed.contents += contents;
-    freed.bytes += status.stx_size;
+    auto const found = revisions.find(store);
+    return found == revisions.end() ? std::set<DigestBytes>() : found->second;
 }
 
-void reduceStore(
-    std::string const& path, std::string const& name, std::set<DigestBytes> const& digests, std::string const& scratch,
-    Freed& freed)
+Freed removeUnneeded(StorageLayout const& layout, Needed const& needed)
 {
-    RecordFile const old = RecordFile::openForChanging(path, name);
-    std::set<std::size_t> const needed = neededOf(old, digests, name);
-    std::size_t const dropped = old.entries().size() - needed.size();
-    if (needed.empty()) {
-        return removeCounted(path, dropped, freed);
+    Freed freed = removeLeftovers(layout);
+    freed += cleanObjects(layout, needed.objects);
+    std::optional<StorageError> const error = cleanStores(layout, needed, freed);
+    flushFolders(layout);
+    if (error) {
+        throw StorageError(*error);
     }
-    if (dropped == 0 && old.isClean()) {
-        return;
+    return freed;
+}
+
+Freed removeLeftovers(StorageLayout const& layout)
+{
+    Freed freed = removeAllIn(layout.incomingFolder());
+    freed += removeAllIn(layout.restoringFolder());
+    for (std::string const& name : entriesOf(layout.storeFolder())) {
+        if (StorageLayout::isNewForm(name)) {
+            freed += removeFile(layout.storeFolder() + "/" + name, 0);
+        }
     }
-    std::string const newPath = path + ".new";
-    try {
-        writeReduced(old, needed, newPath, name);
-        readBack(newPath, name, digests, scratch);
-        check(os::replaceFileBy(path, newPath), name + " cannot be replaced");
-    } catch (...) {
-        [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(newPath);
-        throw;
-    }
-    freed.contents += dropped;
-    freed.bytes += old.length() - RecordFile::openForReading(path, name).length();
+    return freed;
 }
 
 } // namespace tav

@@ -1,26 +1,34 @@
-/// Removing what nobody needs from the files of the storage.
+/// Removing what nobody needs from the storage.
 #pragma once
 
-#include "host/storage/local_storage.h"
+#include "host/storage/freed.h"
 #include "host/storage/record.h"
+#include "host/storage/storage_layout.h"
+#include "host/storage/storage_url.h"
 
+#include <map>
 #include <set>
 #include <string>
-#include <vector>
 
 namespace tav {
 
-/// Names of the entries of `folder` in ascending order; none when it is missing. Throws `StorageError`.
-std::vector<std::string> entriesOf(std::string const& folder);
+/// What a cleaning leaves.
+struct Needed {
+    /// Adds the content at `url`.
+    void add(StorageUrl const& url);
+    std::set<DigestBytes> revisionsIn(std::string const& store) const;
 
-/// Removes the file `path` and counts it in `freed`, as `contents` contents. Throws `StorageError`.
-void removeCounted(std::string const& path, std::size_t contents, Freed& freed);
+    std::set<DigestBytes> objects;
+    std::map<std::string, std::set<DigestBytes>> revisions; ///< by store
+    std::set<std::string> storesLeftAlone;                  ///< with all they hold
+};
 
-/// Leaves of the revision store `path`, NAME `name`, the revisions `digests` and those they build on, nothing else;
-/// counts what went in `freed`. The new store is made as `path` with ".new" behind. Throws `StorageError`, with the
-/// store as it was, when one of them cannot be read.
-void reduceStore(
-    std::string const& path, std::string const& name, std::set<DigestBytes> const& digests, std::string const& scratch,
-    Freed& freed);
+/// Removes everything but what is `needed` and the revisions that it builds on, and what interrupted operations have
+/// left. Throws `StorageError`: at once when a folder cannot be read or a file not removed; in the end, of the first
+/// such store, when stores stay as they are because something needed in them cannot be read.
+Freed removeUnneeded(StorageLayout const& layout, Needed const& needed);
+
+/// Removes only what interrupted operations have left. Throws `StorageError`.
+Freed removeLeftovers(StorageLayout const& layout);
 
 } // namespace tav

@@ -7,10 +7,17 @@
 /// URLs are "tf:NAME#DIGEST" and "po:DIGEST" (host/storage/storage_url.h): a URL names the same content in every
 /// repository. Equal content is kept once, so a drawing may get the URL of an object, and the reverse.
 ///
-/// An object works on one repository, on one thread at a time. What changes the storage is for who holds the lock of
-/// the repository; reading needs none. All errors are sentences in English that name what they speak of. No content
-/// ends the process: lack of memory is an error too. The code of an error is the system's, as in `errno`, and 0 where a
-/// content is missing or damaged.
+/// Storing goes in batches, and nothing of a batch counts before it is flushed:
+///
+///     LocalStorage storage(root, previousUrl, knownUrl);
+///     auto const plan = storage.store(L"plan.dwg"); // its URL, for this object only
+///     auto const note = storage.store(L"note.txt");
+///     storage.flush();                              // now for everybody; without it both are taken back
+///     storage.verify(plan.value());                 // reads back what a commit is about to rely on
+///
+/// One thread at a time. What changes the storage is for who holds the lock of the repository; reading needs none. All
+/// errors are sentences in English that name what they speak of. No content ends the process: lack of memory is an
+/// error too. The code of an error is the system's, as in `errno`, and 0 where a content is missing or damaged.
 ///
 /// Memory: files up to 64 MiB are held whole, with their base, a spare for unpacking it and the result, so a file of n
 /// MiB needs about four times n. Beyond that, work goes by segments of 64 MiB, whatever the length. No operation uses
@@ -20,28 +27,21 @@
 #include "common/mu_common_expected.h"
 #include "common/mu_common_repo_prop.h"
 
-#include "host/storage/record_file.h"
+#include "host/storage/batch.h"
+#include "host/storage/content_reader.h"
+#include "host/storage/content_writer.h"
+#include "host/storage/freed.h"
+#include "host/storage/storage_layout.h"
 #include "host/storage/storage_url.h"
-
-#include "platform/os/os_open_file.h"
 
 #include <cstddef>
 #include <cstdint>
 #include <functional>
-#include <map>
 #include <optional>
 #include <set>
 #include <string>
-#include <string_view>
-#include <vector>
 
 namespace tav {
-
-/// What a cleaning of the storage has removed.
-struct Freed {
-    std::size_t contents = 0; ///< objects and revisions
-    std::uint64_t bytes = 0;
-};
 
 /// See above.
 class LocalStorage {
@@ -49,13 +49,17 @@ public:
     /// Answers with a URL, or an empty text when there is none.
     using LookUp = std::function<OdString(OdString const&)>;
 
+    /// The storage of the repository `root`.
+    ///
     /// `previousUrl` gives, for a path, the URL of the version that the last commit holds of that file, under whatever
     /// path: its store is appended to. `knownUrl` gives, for a digest, the URL under which its content is kept already.
     /// Either may be empty. Only tests give a `segmentLog`: contents are worked on in pieces of 2^`segmentLog` bytes.
     explicit LocalStorage(
         common::RootPath root, LookUp previousUrl = {}, LookUp knownUrl = {}, unsigned segmentLog = kSegmentLog);
+    LocalStorage(LocalStorage const&) = delete;
+    LocalStorage& operator=(LocalStorage const&) = delete;
     /// Takes back what was stored and not flushed.
-    ~LocalStorage();
+    ~LocalStorage() = default;
 
     /// Keeps the content of `path`, which is relative to the working folder. The URL may be handed on once `flush` has
     /// succeeded; this object reads the content at once. A repetition gives the same URL. A content that is kept
@@ -63,80 +67,51 @@ public:
     /// what was read, under its own digest; a file seen to change meanwhile is an error ("has changed while it was
     /// being stored"), after which the caller tries again. An error leaves nothing of the file behind.
     Expected<OdString> store(OdString const& path);
-    /// Makes the content at `url` readable: where it is damaged or gone it is stored again, flushed and read back, from
-    /// the file `path`, relative to the working folder, which has that content. True when it was stored again.
-    Expected<bool> repair(OdString const& url, OdString const& path);
     /// Waits until everything stored since the last flush is safe on the disk, in one go. After an error nothing of it
     /// is kept, and its URLs are void.
     WriteOutcome flush();
-
-    /// Writes the content into the new file `path`, a full path in bytes, and does not flush it. When the name is
-    /// taken, nothing is touched; after any other error there is no file.
-    WriteOutcome extract(OdString const& url, std::string const& path);
-    /// Gives the content to `sink`, piece by piece. Until this returns success the content may yet turn out to be
-    /// damaged. A sink that returns false gets no more; that is an error too ("was not read to its end").
-    WriteOutcome read(OdString const& url, std::function<bool(char const*, std::size_t)> const& sink);
+    /// Makes the content at `url` readable: where it is damaged or gone it is stored again, flushed and read back, from
+    /// the file `path`, relative to the working folder, which has that content. True when it was stored again.
+    Expected<bool> repair(OdString const& url, OdString const& path);
 
     /// The URLs of all contents that are kept, in ascending order, whether a commit has them or not.
-    Expected<std::set<OdString>> contents();
-    /// Whether the content is kept; that it is whole, `verify` finds out. Error: no URL of this storage.
-    Expected<bool> contains(OdString const& url);
+    Expected<std::set<OdString>> contents() const;
+    /// Whether the content is kept; that it is whole, `verify` finds out. Error: not a URL of this storage.
+    Expected<bool> contains(OdString const& url) const;
     /// Length of the content in bytes, without unpacking it.
-    Expected<std::uint64_t> size(OdString const& url);
+    Expected<std::uint64_t> size(OdString const& url) const;
+    /// Gives the content to `sink`, piece by piece. Until this returns success the content may yet turn out to be
+    /// damaged. A sink that returns false gets no more; that is an error too ("was not read to its end").
+    WriteOutcome read(OdString const& url, std::function<bool(char const*, std::size_t)> const& sink) const;
     /// Reads the content and checks its digest.
-    WriteOutcome verify(OdString const& url);
+    WriteOutcome verify(OdString const& url) const;
+    /// Writes the content into the new file `path`, a full path in bytes, and does not flush it. When the name is
+    /// taken, nothing is touched; after any other error there is no file.
+    WriteOutcome extract(OdString const& url, std::string const& path) const;
 
     /// Removes everything but `urls` and the revisions that they build on, and what interrupted operations have left.
     /// A store is rewritten beside the old one, flushed, read back, and takes its place. A store in which something to
-    /// be kept cannot be read stays as it is; the rest is cleaned, and then that is the error. So does a store that
-    /// belongs to one of `elsewhere`, URLs of contents that need not be here; that is none. What was stored and not
-    /// flushed is flushed first.
+    /// be kept cannot be read stays as it is; the rest is cleaned, and then that is the error. A store that belongs to
+    /// one of `elsewhere`, URLs of contents that need not be here, stays as well, and that is no error. What was stored
+    /// and not flushed is flushed first.
     Expected<Freed> keepOnly(std::set<OdString> const& urls, std::set<OdString> const& elsewhere = {});
-
     /// Removes only what interrupted operations have left. No content goes, whether a commit needs it or not.
     Expected<Freed> removeLeftovers();
 
 private:
-    struct Object {
-        std::string incoming; // path meanwhile
-        bool isNew = true;    // else it replaces a damaged one
-    };
-    struct Batch { // since the last flush
-        std::map<DigestBytes, OdString> urls;
-        std::map<std::string, Object> objects;             // by final path
-        std::map<std::string, std::uint64_t> storeLengths; // before the first append
-        std::set<std::string> folders;
-        os::OpenFile fileSystem;
-    };
-    struct Found {
-        RecordFile file;
-        std::size_t index;
-    };
-
+    Content open(OdString const& path) const;
     std::optional<StorageUrl> knownPlace(DigestBytes const& digest) const;
     StorageUrl newPlace(OdString const& path, DigestBytes const& digest) const;
-    void keepObject(StorageUrl const& url, Content const& content);
-    void keepDrawing(StorageUrl const& url, OdString const& path, Content const& content);
     StorageUrl previousVersion(OdString const& path) const;
-    void loadBase(RecordFile const& store, std::optional<std::size_t> index, std::string const& scratch);
-    void beginBatch();
-    void flushBatch();
-    void flushContents() const;
-    void takeBack() noexcept;
-
-    std::string pathOf(StorageUrl const& url) const;
-    bool isKept(OdString const& url) const;
-    bool isReadable(StorageUrl const& url) const;
-    Found find(OdString const& url) const;
-    void read(OdString const& url, Sink const& sink) const;
-    void extractTo(OdString const& url, std::string const& path) const;
 
     common::RootPath root_;
     LookUp previousUrl_;
     LookUp knownUrl_;
     unsigned segmentLog_;
+    StorageLayout layout_;
     Batch batch_;
-    std::optional<KnownContent> base_; // of the drawing stored last: whoever verifies that one needs it again
+    ContentReader reader_;
+    ContentWriter writer_;
 };
 
 } // namespace tav

@@ -1,0 +1,24 @@
+/// What the storage holds.
+#pragma once
+
+#include "host/storage/record.h"
+#include "host/storage/storage_layout.h"
+
+#include "platform/sdk/OdString.h"
+
+#include <map>
+#include <set>
+#include <string>
+
+namespace tav {
+
+/// The revision stores: the name of each, and its path. Throws `StorageError`.
+std::map<std::string, std::string> storesIn(StorageLayout const& layout);
+
+/// The digests of all objects. Throws `StorageError`.
+std::set<DigestBytes> objectsIn(StorageLayout const& layout);
+
+/// The URLs of all contents. Throws `StorageError`.
+std::set<OdString> contentsIn(StorageLayout const& layout);
+
+} // namespace tav
