@@ -28,8 +28,8 @@ class VerifiedFinder {
 public:
     explicit VerifiedFinder(VerifiedFileList const& files) : files_(files), next_(files.begin()) {}
 
-    /// Whether the file `path`, which has the stamp `stamp`, has a content of this digest.
-    bool isKnown(std::string const& path, FileStamp const& stamp, std::string_view digest)
+    /// Whether the file `path`, which has the stamp `stamp`, has the content at `url`.
+    bool isKnown(std::string const& path, FileStamp const& stamp, std::string_view url)
     {
         if (!isNext(path)) {
             auto const isBefore = [](VerifiedFile const& file, std::string const& other) { return file.path < other; };
@@ -39,7 +39,7 @@ public:
             return false;
         }
         VerifiedFile const& file = *next_++;
-        return file.stamp == stamp && file.digest == digest;
+        return file.stamp == stamp && file.digest == digestOf(url);
     }
 
 private:
@@ -110,7 +110,7 @@ void Examination::run()
             CommittedFile& file = files_[i];
             std::string const path = file.path.ansi_str();
             file.sight = view.look(path);
-            file.isKnown = file.sight.stamp && finder.isKnown(path, *file.sight.stamp, digestIn(file.url));
+            file.isKnown = file.sight.stamp && finder.isKnown(path, *file.sight.stamp, file.url);
         }
     }
 }
@@ -123,7 +123,7 @@ FolderChanges compare(common::RootPath const& root, FolderMatch match, VerifiedF
         OdString url = fromUtf8(file.url);
         bool const isUnchanged = file.isKnown || (isThere && !hasOtherContent(file.path, url, root));
         if (isUnchanged && !file.isKnown && verified && isStill(file, root)) {
-            verified->push_back({file.path.ansi_str(), std::string(digestIn(file.url)), *file.sight.stamp});
+            verified->push_back({file.path.ansi_str(), *digestOf(std::string_view(file.url)), *file.sight.stamp});
         }
         common::VersionedFile version{std::move(file.path), std::move(url)};
         if (isUnchanged) {

@@ -9,7 +9,7 @@
 
 namespace tav {
 
-std::optional<OdString> fileDigest(OdString const& path)
+std::optional<Digest> fileDigest(OdString const& path)
 {
     ut::File file;
     if (!file.open(path, ut::File::kRead)) {
@@ -27,7 +27,7 @@ std::optional<OdString> fileDigest(OdString const& path)
     if (total < length) {
         return std::nullopt;
     }
-    return digest.finish();
+    return finish(digest);
 }
 
 } // namespace tav

@@ -17,7 +17,7 @@ namespace {
 
 using Sizes = std::set<std::uintmax_t>;
 using Paths = std::set<OdString>;
-using PathsByDigest = std::multimap<OdString, OdString>;
+using PathsByDigest = std::multimap<Digest, OdString>;
 
 /// Removed files that nobody told of.
 std::vector<common::VersionedFile>
@@ -51,8 +51,8 @@ PathsByDigest digestsOf(std::vector<common::VersionedFile> const& removals)
 {
     PathsByDigest paths;
     for (common::VersionedFile const& file : removals) {
-        if (auto digest = digestOf(file.storagePath)) {
-            paths.emplace(std::move(*digest), file.path);
+        if (auto const digest = digestOf(file.storagePath)) {
+            paths.emplace(*digest, file.path);
         }
     }
     return paths;

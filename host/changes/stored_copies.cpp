@@ -15,7 +15,7 @@ namespace {
 
 /// What to look for in the working folder.
 struct Wanted {
-    std::multimap<OdString, OdString> urls; ///< by digest
+    std::multimap<Digest, OdString> urls; ///< by digest
     std::set<std::uintmax_t> sizes;
     bool isAnySize = false; ///< the length of one of them is not known
 };
@@ -67,7 +67,10 @@ std::map<OdString, OdString> repairFromFolder(
             break;
         }
         auto const digest = isCandidate(file.path, wanted, root) ? fileDigest(root.pathTo(file.path)) : std::nullopt;
-        auto const [begin, end] = wanted.urls.equal_range(digest.value_or(OdString()));
+        if (!digest) {
+            continue;
+        }
+        auto const [begin, end] = wanted.urls.equal_range(*digest);
         for (auto content = begin; content != end; ++content) {
             requireStored(storage, file.path, content->second);
             repaired.emplace(content->second, file.path);

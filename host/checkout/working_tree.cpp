@@ -155,7 +155,7 @@ private:
     }
 
     /// The URL of a content that may be replaced at `path`; empty when it may not.
-    OdString urlOf(OdString const& path, OdString const& digest) const
+    OdString urlOf(OdString const& path, Digest const& digest) const
     {
         auto const [begin, end] = update_.expected.equal_range(path);
         auto const isIt = [&](auto const& file) { return digestOf(file.second) == digest; };
@@ -341,7 +341,7 @@ verifiedFiles(common::RootPath const& root, TreeUpdate const& update, Stamps con
             bool const isWanted = stamp && (own != written.end() ? isWritten(*stamp, own->second)
                                                                  : isAsChecked(*stamp, update.marks.at(path)));
             if (isWanted) {
-                verified.push_back({path.ansi_str(), std::string(digestIn(url.ansi_str())), *stamp});
+                verified.push_back({path.ansi_str(), *digestOf(url), *stamp});
             }
         }
     }

@@ -27,7 +27,7 @@ namespace {
 /// A content on one side of a difference.
 struct Side {
     std::optional<std::uint64_t> size;
-    std::optional<OdString> sha256;
+    std::optional<Digest> sha256;
 };
 
 struct Compared {
@@ -87,7 +87,7 @@ void addSide(Side const& side, wchar_t const* size, wchar_t const* digest, kutil
         object[size] = *side.size;
     }
     if (side.sha256) {
-        object[digest] = jsonText(*side.sha256);
+        object[digest] = jsonText(fromUtf8(hexOf(*side.sha256)));
     }
 }
 
@@ -142,10 +142,10 @@ void printForPeople(Compared const& file, common::RootPath const& root)
         changeLine(file.change.change, file.change.path, file.change.previousPath) +
         (sizes.empty() ? "" : " (" + sizes + ")") + "\n");
     if (file.before.sha256 && file.before.sha256 != file.after.sha256) {
-        print("    old  " + file.before.sha256->ansi_str() + "\n");
+        print("    old  " + hexOf(*file.before.sha256) + "\n");
     }
     if (file.after.sha256 && file.before.sha256 != file.after.sha256) {
-        print("    new  " + file.after.sha256->ansi_str() + "\n");
+        print("    new  " + hexOf(*file.after.sha256) + "\n");
     }
     if (auto const lines = linesOf(file, root)) {
         printLines(*lines);

@@ -79,15 +79,16 @@ PictureCache cache()
 DrawingPicture storedPicture(common::RootPath const& root, OdString const& url, std::string const& label)
 {
     PictureCache const kept = cache();
-    std::string const digest(digestIn(url.ansi_str()));
-    if (auto const png = kept.find(digest); png && !png->empty()) {
+    auto const digest = digestOf(url);
+    std::string const name = digest ? hexOf(*digest) : std::string();
+    if (auto const png = kept.find(name); png && !png->empty()) {
         if (auto image = decodePng(*png, kMostPixels)) {
             return {std::move(image), ""};
         }
     }
     DrawingPicture found = pictureIn(contentOf(root, url, label));
     if (found.image) {
-        kept.keep(digest, encodePng(*found.image));
+        kept.keep(name, encodePng(*found.image));
     }
     return found;
 }

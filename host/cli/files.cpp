@@ -5,6 +5,7 @@
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
 #include "host/terminal/progress.h"
+#include "host/text/utf8.h"
 
 #include <unistd.h>
 
@@ -18,7 +19,7 @@ namespace {
 
 struct Listed {
     OdString path;
-    std::optional<OdString> digest;
+    std::optional<Digest> digest;
 };
 
 /// Digests the files in order. One that cannot be read is reported and left without a digest.
@@ -35,7 +36,7 @@ std::vector<Listed> digestAll(common::RootPath const& root, std::vector<common::
 
 /// The form of sha256sum, so that it can check the list: a name with a line end or a backslash is escaped, and its line
 /// begins with a backslash.
-std::string digestLine(OdString const& digest, OdString const& path)
+std::string digestLine(Digest const& digest, OdString const& path)
 {
     std::string name;
     for (char const c : path.ansi_str()) {
@@ -43,7 +44,7 @@ std::string digestLine(OdString const& digest, OdString const& path)
     }
     bool const isEscaped = name.size() != path.ansi_str().size();
     bool const isTerminal = isatty(STDOUT_FILENO) == 1;
-    return (isEscaped ? "\\" : "") + digest.ansi_str() + "  " + (isTerminal ? shown(path) : name) + "\n";
+    return (isEscaped ? "\\" : "") + hexOf(digest) + "  " + (isTerminal ? shown(path) : name) + "\n";
 }
 
 kutils::json::Value documentOf(std::vector<Listed> const& list, bool hash)
@@ -53,7 +54,7 @@ kutils::json::Value documentOf(std::vector<Listed> const& list, bool hash)
         kutils::json::Object object;
         object[L"path"] = jsonText(file.path);
         if (hash) {
-            object[L"sha256"] = file.digest ? jsonText(*file.digest) : kutils::json::Value();
+            object[L"sha256"] = file.digest ? jsonText(fromUtf8(hexOf(*file.digest))) : kutils::json::Value();
         }
         array.emplace_back(std::move(object));
     }

@@ -25,7 +25,7 @@ void addVersion(
         object[size] = *bytes;
     }
     if (auto const sha256 = digestOf(url)) {
-        object[digest] = jsonText(*sha256);
+        object[digest] = jsonText(fromUtf8(hexOf(*sha256)));
     }
 }
 

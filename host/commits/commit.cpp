@@ -67,7 +67,7 @@ OdString storeSteady(Draft& draft, LocalStorage& storage, OdString const& path)
         }
         draft.pending.files[path] = indexRecord(static_cast<std::uint64_t>(before.modified), draft.start);
         OdString const stored = valueOrFail(url, "Nothing has been committed; mend that and run the command again.");
-        draft.verified.push_back({path.ansi_str(), std::string(digestIn(stored.ansi_str())), before});
+        draft.verified.push_back({path.ansi_str(), *digestOf(stored), before});
         return stored;
     }
     throw Failure(
@@ -310,7 +310,7 @@ void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
     Tree const base = draft.files;
     LocalStorage storage(
         draft.root, [&](OdString const& path) { return previousUrl(draft, base, path); },
-        [&](OdString const& digest) { return draft.database.urlOf(digest); });
+        [&](Digest const& digest) { return draft.database.urlOf(digest); });
     storeAll(draft, plan, storage);
     if (draft.files == base) {
         throw Failure("What is staged is as it was committed.", "Run 'tav unstage --all' to clear it.");

@@ -4,6 +4,7 @@
 #include "host/repository/lock.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
+#include "host/text/utf8.h"
 
 #include "common/mu_common_json.h"
 #include "json/json_reader.h"
@@ -58,7 +59,7 @@ Object documentOf(PendingCommit const& pending)
     for (NewContent const& content : pending.contents) {
         Object object;
         object[L"url"] = jsonText(content.url);
-        object[L"digest"] = jsonText(content.digest);
+        object[L"digest"] = jsonText(fromUtf8(hexOf(content.digest)));
         object[L"size"] = content.size;
         contents.emplace_back(std::move(object));
     }
@@ -91,7 +92,8 @@ PendingCommit commitOf(Object const& document)
     for (Value const& element : common::getArrayValue(document, L"contents", L"")) {
         Object const& content = element.get_object();
         pending.contents.push_back(
-            {textOf(content, L"url"), textOf(content, L"digest"), common::getUInt64Value(content, L"size", L"")});
+            {textOf(content, L"url"), digestFromHex(textOf(content, L"digest").ansi_str()).value(),
+             common::getUInt64Value(content, L"size", L"")});
     }
     pending.files = filesOf(document);
     return pending;

@@ -18,7 +18,7 @@ namespace tav {
 /// A content that a commit brings.
 struct NewContent {
     OdString url;
-    OdString digest;
+    Digest digest{};
     std::uint64_t size = 0;
 };
 

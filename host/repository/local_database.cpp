@@ -131,16 +131,16 @@ void LocalDatabase::setServer(OdString const& folder, OdString const& repository
     transaction.commit();
 }
 
-OdString LocalDatabase::urlOf(OdString const& digest) const
+OdString LocalDatabase::urlOf(Digest const& digest) const
 {
     Statement row = database_.prepare("SELECT url FROM contents WHERE digest = ? AND url LIKE 'tf:%' ORDER BY url");
-    return row.with(digest).next() ? row.text(0) : OdString();
+    return row.with(std::string_view(hexOf(digest))).next() ? row.text(0) : OdString();
 }
 
-OdString LocalDatabase::committedUrlOf(OdString const& digest) const
+OdString LocalDatabase::committedUrlOf(Digest const& digest) const
 {
     Statement row = database_.prepare("SELECT url FROM contents WHERE digest = ?");
-    return row.with(digest).next() ? row.text(0) : OdString();
+    return row.with(std::string_view(hexOf(digest))).next() ? row.text(0) : OdString();
 }
 
 std::vector<OdString> LocalDatabase::contents() const
@@ -159,10 +159,10 @@ std::optional<std::uint64_t> LocalDatabase::sizeOf(OdString const& url) const
     return row.with(url).next() ? std::optional(static_cast<std::uint64_t>(row.integer(0))) : std::nullopt;
 }
 
-void LocalDatabase::addContent(OdString const& url, OdString const& digest, std::uint64_t size)
+void LocalDatabase::addContent(OdString const& url, Digest const& digest, std::uint64_t size)
 {
     Statement row = database_.prepare("INSERT OR REPLACE INTO contents VALUES (?, ?, ?)");
-    row.with(url).with(digest).with(static_cast<std::int64_t>(size)).run();
+    row.with(url).with(std::string_view(hexOf(digest))).with(static_cast<std::int64_t>(size)).run();
 }
 
 OdString LocalDatabase::value(char const* key) const

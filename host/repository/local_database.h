@@ -56,14 +56,14 @@ public:
     void setJournal(OdString const& document) { setValue("unfinished", document); }
 
     /// URL of a content of this digest that is kept in a revision store; empty when none is known.
-    OdString urlOf(OdString const& digest) const;
+    OdString urlOf(Digest const& digest) const;
     /// URL under which some commit has a content of this digest; empty when none has.
-    OdString committedUrlOf(OdString const& digest) const;
+    OdString committedUrlOf(Digest const& digest) const;
     /// The URLs of all contents that were entered, in ascending order: they are kept in this folder.
     std::vector<OdString> contents() const;
     /// Bytes of the content at `url`.
     std::optional<std::uint64_t> sizeOf(OdString const& url) const;
-    void addContent(OdString const& url, OdString const& digest, std::uint64_t size);
+    void addContent(OdString const& url, Digest const& digest, std::uint64_t size);
 
 private:
     enum class Use { reading, changing };

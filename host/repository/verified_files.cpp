@@ -31,7 +31,9 @@ VerifiedFileList VerifiedFiles::all() const
         FileStamp const stamp{
             static_cast<std::uint64_t>(row.integer(2)), static_cast<std::uint64_t>(row.integer(3)), row.integer(4),
             row.integer(5)};
-        files.push_back({std::string(row.bytes(0)), std::string(row.bytes(1)), stamp});
+        if (auto const digest = digestFromHex(row.bytes(1))) { // What is not a digest says nothing of the file.
+            files.push_back({std::string(row.bytes(0)), *digest, stamp});
+        }
     }
     return files;
 }
@@ -40,7 +42,7 @@ void VerifiedFiles::put(VerifiedFileList const& files)
 {
     Statement row = database_->prepare("INSERT OR REPLACE INTO verified_files VALUES (?, ?, ?, ?, ?, ?)");
     for (VerifiedFile const& file : files) {
-        row.with(std::string_view(file.path)).with(std::string_view(file.digest));
+        row.with(std::string_view(file.path)).with(std::string_view(hexOf(file.digest)));
         row.with(static_cast<std::int64_t>(file.stamp.size)).with(static_cast<std::int64_t>(file.stamp.inode));
         row.with(file.stamp.changed).with(file.stamp.modified).run();
     }

@@ -6,6 +6,7 @@
 
 #include "host/database/sqlite.h"
 #include "host/repository/file_stamp.h"
+#include "host/text/digest.h"
 
 #include <string>
 #include <vector>
@@ -13,8 +14,8 @@
 namespace tav {
 
 struct VerifiedFile {
-    std::string path;   ///< in bytes, as the digest: none of them is ever shown
-    std::string digest; ///< in lower-case hexadecimal digits
+    std::string path; ///< in bytes: it is never shown
+    Digest digest{};
     FileStamp stamp;
 };
 

@@ -39,7 +39,7 @@ void Batch::addFolder(std::string const& path)
     notes_.folders.insert(path);
 }
 
-void Batch::addUrl(DigestBytes const& digest, OdString const& url)
+void Batch::addUrl(Digest const& digest, OdString const& url)
 {
     notes_.urls[digest] = url;
 }
@@ -50,7 +50,7 @@ std::string const& Batch::readableFile(std::string const& path) const
     return object == notes_.objects.end() ? path : object->second.incoming;
 }
 
-std::optional<OdString> Batch::urlOf(DigestBytes const& digest) const
+std::optional<OdString> Batch::urlOf(Digest const& digest) const
 {
     auto const stored = notes_.urls.find(digest);
     return stored == notes_.urls.end() ? std::nullopt : std::optional(stored->second);

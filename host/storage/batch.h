@@ -1,7 +1,7 @@
 /// What was stored since the last flush: all of it becomes safe on the disk, or all of it goes again.
 #pragma once
 
-#include "host/storage/record.h"
+#include "host/text/digest.h"
 
 #include "platform/os/os_open_file.h"
 
@@ -40,12 +40,12 @@ public:
     /// Notes that entries of the folder `path` have to be flushed.
     void addFolder(std::string const& path);
     /// Notes that `url` names the content `digest`.
-    void addUrl(DigestBytes const& digest, OdString const& url);
+    void addUrl(Digest const& digest, OdString const& url);
 
     /// Where the object or store `path` can be read: an object that is not flushed is elsewhere.
     std::string const& readableFile(std::string const& path) const;
     /// The URL that was noted for the content `digest`.
-    std::optional<OdString> urlOf(DigestBytes const& digest) const;
+    std::optional<OdString> urlOf(Digest const& digest) const;
 
     /// Waits until all of it is safe, in one go, and gives objects their names. The batch is empty then. After an error
     /// all of it has been taken back.
@@ -59,7 +59,7 @@ private:
         bool replaces = false;
     };
     struct Notes {
-        std::map<DigestBytes, OdString> urls;
+        std::map<Digest, OdString> urls;
         std::map<std::string, Object> objects;             // by final path
         std::map<std::string, std::uint64_t> storeLengths; // before the first append
         std::set<std::string> folders;

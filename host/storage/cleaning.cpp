@@ -32,10 +32,10 @@ Freed removeAllIn(std::string const& folder)
     return freed;
 }
 
-Freed cleanObjects(StorageLayout const& layout, std::set<DigestBytes> const& needed)
+Freed cleanObjects(StorageLayout const& layout, std::set<Digest> const& needed)
 {
     Freed freed;
-    for (DigestBytes const& digest : objectsIn(layout)) {
+    for (Digest const& digest : objectsIn(layout)) {
         if (needed.count(digest) == 0) {
             freed += removeFile(layout.fileOf({{}, digest}), 1);
         }
@@ -76,10 +76,10 @@ void Needed::add(StorageUrl const& url)
     (url.isObject() ? objects : revisions[url.store]).insert(url.digest);
 }
 
-std::set<DigestBytes> Needed::revisionsIn(std::string const& store) const
+std::set<Digest> Needed::revisionsIn(std::string const& store) const
 {
     auto const found = revisions.find(store);
-    return found == revisions.end() ? std::set<DigestBytes>() : found->second;
+    return found == revisions.end() ? std::set<Digest>() : found->second;
 }
 
 Freed removeUnneeded(StorageLayout const& layout, Needed const& needed)

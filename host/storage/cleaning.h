@@ -2,9 +2,9 @@
 #pragma once
 
 #include "host/storage/freed.h"
-#include "host/storage/record.h"
 #include "host/storage/storage_layout.h"
 #include "host/storage/storage_url.h"
+#include "host/text/digest.h"
 
 #include <map>
 #include <set>
@@ -16,11 +16,11 @@ namespace tav {
 struct Needed {
     /// Adds the content at `url`.
     void add(StorageUrl const& url);
-    std::set<DigestBytes> revisionsIn(std::string const& store) const;
+    std::set<Digest> revisionsIn(std::string const& store) const;
 
-    std::set<DigestBytes> objects;
-    std::map<std::string, std::set<DigestBytes>> revisions; ///< by store
-    std::set<std::string> storesLeftAlone;                  ///< with all they hold
+    std::set<Digest> objects;
+    std::map<std::string, std::set<Digest>> revisions; ///< by store
+    std::set<std::string> storesLeftAlone;             ///< with all they hold
 };
 
 /// Removes everything but what is `needed` and the revisions that it builds on, and what interrupted operations have

@@ -12,7 +12,7 @@ namespace {
 
 /// The record that a new revision builds on: the previous one, or, where its chain is full, the whole one that the
 /// chain begins with.
-std::optional<std::size_t> baseIn(RecordFile const& store, DigestBytes const& previous)
+std::optional<std::size_t> baseIn(RecordFile const& store, Digest const& previous)
 {
     if (store.entries().empty()) {
         return std::nullopt;
@@ -26,7 +26,7 @@ std::optional<std::size_t> baseIn(RecordFile const& store, DigestBytes const& pr
 
 } // namespace
 
-void ContentWriter::write(StorageUrl const& url, Content const& content, DigestBytes const& previous)
+void ContentWriter::write(StorageUrl const& url, Content const& content, Digest const& previous)
 {
     batch_.watch(layout_.scratchFolder());
     url.isObject() ? writeObject(url, content) : writeRevision(url, content, previous);
@@ -53,7 +53,7 @@ void ContentWriter::writeObject(StorageUrl const& url, Content const& content)
     }
 }
 
-void ContentWriter::writeRevision(StorageUrl const& url, Content const& content, DigestBytes const& previous)
+void ContentWriter::writeRevision(StorageUrl const& url, Content const& content, Digest const& previous)
 {
     std::string const file = layout_.fileOf(url);
     std::string const name = nameOfStore(url.store);
@@ -77,8 +77,7 @@ void ContentWriter::writeRevision(StorageUrl const& url, Content const& content,
 }
 
 // What was found damaged is kept whole: others may build on it, and their chains do not get longer by that.
-void ContentWriter::append(
-    StorageUrl const& url, Content const& content, DigestBytes const& previous, RecordFile& store)
+void ContentWriter::append(StorageUrl const& url, Content const& content, Digest const& previous, RecordFile& store)
 {
     reader_.setBase(std::nullopt); // The next one needs its memory.
     if (!store.isNamed(url.digest)) {
@@ -91,7 +90,7 @@ void ContentWriter::append(
 }
 
 /// None where it cannot be read: nothing is built on a damaged content.
-std::optional<KnownContent> ContentWriter::loadBase(RecordFile const& store, DigestBytes const& previous) const
+std::optional<KnownContent> ContentWriter::loadBase(RecordFile const& store, Digest const& previous) const
 {
     try {
         std::optional<std::size_t> const index = baseIn(store, previous);

@@ -27,13 +27,13 @@ public:
     /// Writes `content` to `url` unless it can be read there. A revision builds on the one with the digest `previous`
     /// of its store, or else on the newest, where that makes it smaller. The reader holds that base then: whoever reads
     /// the revision back needs it again.
-    void write(StorageUrl const& url, Content const& content, DigestBytes const& previous);
+    void write(StorageUrl const& url, Content const& content, Digest const& previous);
 
 private:
     void writeObject(StorageUrl const& url, Content const& content);
-    void writeRevision(StorageUrl const& url, Content const& content, DigestBytes const& previous);
-    void append(StorageUrl const& url, Content const& content, DigestBytes const& previous, RecordFile& store);
-    std::optional<KnownContent> loadBase(RecordFile const& store, DigestBytes const& previous) const;
+    void writeRevision(StorageUrl const& url, Content const& content, Digest const& previous);
+    void append(StorageUrl const& url, Content const& content, Digest const& previous, RecordFile& store);
+    std::optional<KnownContent> loadBase(RecordFile const& store, Digest const& previous) const;
 
     StorageLayout const& layout_;
     Batch& batch_;

@@ -2,6 +2,8 @@
 
 #include "host/storage/storage_error.h"
 
+#include "common/mu_common_versions.h"
+
 #include <algorithm>
 #include <cstring>
 #include <memory>
@@ -13,24 +15,25 @@ namespace tav {
 namespace {
 
 constexpr int kLevel = 3;
-constexpr int kSmallestWindowLog = 10;    // that zstd takes
-constexpr std::size_t kClearlySmall = 16; // part of a segment
-constexpr std::size_t kDescriptor = 4;    // of a frame; it has the one bit that unpacking does not look at
+constexpr int kSmallestWindowLog = 10;    // that zstd accepts
+constexpr std::size_t kClearlySmall = 16; // a frame of at most this fraction of its segment
+constexpr std::size_t kDescriptor = 4;    // offset of the frame header descriptor; zstd ignores one of its bits
 constexpr unsigned kUnusedBit = 0x10;
 constexpr std::uint64_t kPiece = std::uint64_t{1} << 20;
 
 using Compressor = std::unique_ptr<ZSTD_CCtx, std::size_t (*)(ZSTD_CCtx*)>;
 using Decompressor = std::unique_ptr<ZSTD_DCtx, std::size_t (*)(ZSTD_DCtx*)>;
 
-/// The piece of a content that is segment `index`.
+/// A part of a content.
 struct Range {
     std::uint64_t offset;
     std::size_t count;
 };
 
-Range segmentOf(std::uint64_t length, std::uint64_t segmentLength, std::uint64_t offset)
+/// The part at `offset` of a content of `length` bytes that is worked on in parts of `partLength` bytes.
+Range partAt(std::uint64_t offset, std::uint64_t length, std::uint64_t partLength)
 {
-    return {offset, static_cast<std::size_t>(std::min(segmentLength, length - offset))};
+    return {offset, static_cast<std::size_t>(std::min(partLength, length - offset))};
 }
 
 /// What the segment at `offset` may refer to: the same place of the base and half a segment's length around it.
@@ -66,7 +69,7 @@ int windowLogFor(std::size_t length)
 void requireWorked(std::size_t result)
 {
     if (ZSTD_isError(result) != 0) {
-        throw std::bad_alloc(); // Room for the result is there, so only memory can lack.
+        throw std::bad_alloc(); // There is room for the result, so only memory can be short.
     }
 }
 
@@ -210,26 +213,20 @@ private:
 
 } // namespace
 
-DigestBytes finish(common::ContentDigest& digest)
-{
-    return digestFromHex(digest.finish().ansi_str()).value_or(DigestBytes{});
-}
-
-DigestBytes digestOf(Content const& content)
+Digest digestOf(Content const& content)
 {
     std::uint64_t const pieceLength = content.isInMemory() ? content.length() : kPiece;
     common::ContentDigest digest;
     Buffer buffer;
     for (std::uint64_t offset = 0; offset < content.length(); offset += pieceLength) {
-        std::string_view const piece =
-            content.at(offset, segmentOf(content.length(), pieceLength, offset).count, buffer);
+        std::string_view const piece = content.at(offset, partAt(offset, content.length(), pieceLength).count, buffer);
         digest.update(piece.data(), piece.size());
     }
     return finish(digest);
 }
 
 Compressed
-compress(Content const& content, DigestBytes const& digest, Content const* base, unsigned segmentLog, Sink const& sink)
+compress(Content const& content, Digest const& digest, Content const* base, unsigned segmentLog, Sink const& sink)
 {
     std::uint64_t const segmentLength = std::uint64_t{1} << segmentLog;
     SegmentCompressor compressor;
@@ -238,7 +235,7 @@ compress(Content const& content, DigestBytes const& digest, Content const* base,
     Buffer prefixBuffer;
     Compressed result;
     for (std::uint64_t offset = 0; offset < content.length(); offset += segmentLength) {
-        Range const range = segmentOf(content.length(), segmentLength, offset);
+        Range const range = partAt(offset, content.length(), segmentLength);
         std::string_view const segment = content.at(range.offset, range.count, segmentBuffer);
         bool usesPrefix = false;
         std::string_view const frame =
@@ -264,7 +261,7 @@ void decompress(
     SegmentDecompressor decompressor;
     Buffer prefixBuffer;
     for (std::uint64_t offset = 0; offset < record.length; offset += record.segmentLength()) {
-        std::size_t const length = segmentOf(record.length, record.segmentLength(), offset).count;
+        std::size_t const length = partAt(offset, record.length, record.segmentLength()).count;
         std::string_view const frame = reader.next(length);
         std::string_view const prefix = prefixFor(offset, record.segmentLength(), base, prefixBuffer);
         char* const bytes = segment.reserve(length);

@@ -8,8 +8,6 @@
 #include "host/storage/content.h"
 #include "host/storage/record.h"
 
-#include "common/mu_common_versions.h"
-
 #include "platform/os/os_open_file.h"
 
 #include <cstddef>
@@ -31,19 +29,16 @@ struct Compressed {
 
 /// Compresses `content` in segments of 2^`segmentLog` bytes, on `base` unless it is null; `sink` gets the frames.
 /// Of the two forms of a segment, with the base and without, the smaller is taken; the second is not tried when the
-/// first has at most a sixteenth of the segment's length, since no more than that could be won.
-/// Throws `StorageError` when the bytes that were compressed do not have the digest `digest`, which only a file that
-/// changes meanwhile brings about (contents in memory are not looked at again), and what `sink` throws.
+/// first has at most a sixteenth of the segment's length, since no more than that could be saved.
+/// Throws `StorageError` when the bytes that were compressed do not have the digest `digest`, which happens only when a
+/// file changes meanwhile (contents in memory are not digested again), and what `sink` throws.
 Compressed
-compress(Content const& content, DigestBytes const& digest, Content const* base, unsigned segmentLog, Sink const& sink);
+compress(Content const& content, Digest const& digest, Content const* base, unsigned segmentLog, Sink const& sink);
 
 /// The digest of `content`.
-DigestBytes digestOf(Content const& content);
+Digest digestOf(Content const& content);
 
-/// The digest of what was added to `digest`, which takes no more.
-DigestBytes finish(common::ContentDigest& digest);
-
-/// Where the frames of a record stand.
+/// Where the frames of a record are.
 struct Frames {
     os::OpenFile const& file;
     std::uint64_t offset; ///< of the first

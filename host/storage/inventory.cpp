@@ -18,9 +18,9 @@ std::map<std::string, std::string> storesIn(StorageLayout const& layout)
     return stores;
 }
 
-std::set<DigestBytes> objectsIn(StorageLayout const& layout)
+std::set<Digest> objectsIn(StorageLayout const& layout)
 {
-    std::set<DigestBytes> objects;
+    std::set<Digest> objects;
     for (std::string const& file : entriesOf(layout.objectFolder())) {
         if (auto const digest = digestFromHex(file)) {
             objects.insert(*digest);
@@ -32,7 +32,7 @@ std::set<DigestBytes> objectsIn(StorageLayout const& layout)
 std::set<OdString> contentsIn(StorageLayout const& layout)
 {
     std::set<OdString> urls;
-    for (DigestBytes const& digest : objectsIn(layout)) {
+    for (Digest const& digest : objectsIn(layout)) {
         urls.insert(StorageUrl{{}, digest}.text());
     }
     for (auto const& [name, path] : storesIn(layout)) {

@@ -1,8 +1,8 @@
 /// What the storage holds.
 #pragma once
 
-#include "host/storage/record.h"
 #include "host/storage/storage_layout.h"
+#include "host/text/digest.h"
 
 #include "platform/sdk/OdString.h"
 
@@ -16,7 +16,7 @@ namespace tav {
 std::map<std::string, std::string> storesIn(StorageLayout const& layout);
 
 /// The digests of all objects. Throws `StorageError`.
-std::set<DigestBytes> objectsIn(StorageLayout const& layout);
+std::set<Digest> objectsIn(StorageLayout const& layout);
 
 /// The URLs of all contents. Throws `StorageError`.
 std::set<OdString> contentsIn(StorageLayout const& layout);

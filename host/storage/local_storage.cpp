@@ -75,7 +75,7 @@ Content openContent(std::string const& path, std::string const& name, std::uint6
 
 } // namespace
 
-LocalStorage::LocalStorage(common::RootPath root, LookUp previousUrl, LookUp knownUrl, unsigned segmentLog)
+LocalStorage::LocalStorage(common::RootPath root, UrlOfPath previousUrl, UrlOfDigest knownUrl, unsigned segmentLog)
     : root_(std::move(root))
     , previousUrl_(std::move(previousUrl))
     , knownUrl_(std::move(knownUrl))
@@ -90,7 +90,7 @@ Expected<OdString> LocalStorage::store(OdString const& path)
 {
     return guarded<OdString>([&] {
         Content const content = open(path);
-        DigestBytes const digest = digestOf(content);
+        Digest const digest = digestOf(content);
         if (auto const stored = batch_.urlOf(digest)) {
             return *stored;
         }
@@ -133,13 +133,13 @@ Content LocalStorage::open(OdString const& path) const
 }
 
 // Where it should be: what is damaged or gone there is stored again for all commits that name it.
-std::optional<StorageUrl> LocalStorage::knownPlace(DigestBytes const& digest) const
+std::optional<StorageUrl> LocalStorage::knownPlace(Digest const& digest) const
 {
-    std::optional<StorageUrl> url = knownUrl_ ? parseUrl(knownUrl_(fromUtf8(hexOf(digest)))) : std::nullopt;
+    std::optional<StorageUrl> url = knownUrl_ ? parseUrl(knownUrl_(digest)) : std::nullopt;
     return url && url->digest == digest ? url : std::nullopt;
 }
 
-StorageUrl LocalStorage::newPlace(OdString const& path, DigestBytes const& digest) const
+StorageUrl LocalStorage::newPlace(OdString const& path, Digest const& digest) const
 {
     if (common::fileToType(path) != common::StorageType::Tf) {
         return {{}, digest};

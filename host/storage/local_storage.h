@@ -46,8 +46,9 @@ namespace tav {
 /// See above.
 class LocalStorage {
 public:
-    /// Answers with a URL, or an empty text when there is none.
-    using LookUp = std::function<OdString(OdString const&)>;
+    /// Both answer with a URL, or an empty text when there is none.
+    using UrlOfPath = std::function<OdString(OdString const& path)>;
+    using UrlOfDigest = std::function<OdString(Digest const& digest)>;
 
     /// The storage of the repository `root`.
     ///
@@ -55,7 +56,8 @@ public:
     /// path: its store is appended to. `knownUrl` gives, for a digest, the URL under which its content is kept already.
     /// Either may be empty. Only tests give a `segmentLog`: contents are worked on in pieces of 2^`segmentLog` bytes.
     explicit LocalStorage(
-        common::RootPath root, LookUp previousUrl = {}, LookUp knownUrl = {}, unsigned segmentLog = kSegmentLog);
+        common::RootPath root, UrlOfPath previousUrl = {}, UrlOfDigest knownUrl = {},
+        unsigned segmentLog = kSegmentLog);
     LocalStorage(LocalStorage const&) = delete;
     LocalStorage& operator=(LocalStorage const&) = delete;
     /// Takes back what was stored and not flushed.
@@ -100,13 +102,13 @@ public:
 
 private:
     Content open(OdString const& path) const;
-    std::optional<StorageUrl> knownPlace(DigestBytes const& digest) const;
-    StorageUrl newPlace(OdString const& path, DigestBytes const& digest) const;
+    std::optional<StorageUrl> knownPlace(Digest const& digest) const;
+    StorageUrl newPlace(OdString const& path, Digest const& digest) const;
     StorageUrl previousVersion(OdString const& path) const;
 
     common::RootPath root_;
-    LookUp previousUrl_;
-    LookUp knownUrl_;
+    UrlOfPath previousUrl_;
+    UrlOfDigest knownUrl_;
     unsigned segmentLog_;
     StorageLayout layout_;
     Batch batch_;

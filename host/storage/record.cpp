@@ -12,7 +12,6 @@ namespace {
 constexpr std::string_view kMark("\x54\x2a\x4d\x18\x60\0\0\0tavrev1", 15);
 constexpr std::size_t kCheckLength = 8;
 constexpr std::size_t kCheckedLength = kHeaderLength - kCheckLength;
-constexpr std::string_view kDigits = "0123456789abcdef";
 
 void append(std::string& bytes, std::uint64_t number)
 {
@@ -21,7 +20,7 @@ void append(std::string& bytes, std::uint64_t number)
     }
 }
 
-void append(std::string& bytes, DigestBytes const& digest)
+void append(std::string& bytes, Digest const& digest)
 {
     bytes.append(digest.begin(), digest.end());
 }
@@ -35,9 +34,9 @@ std::uint64_t numberAt(std::string_view bytes, std::size_t place)
     return number;
 }
 
-DigestBytes digestAt(std::string_view bytes, std::size_t place)
+Digest digestAt(std::string_view bytes, std::size_t place)
 {
-    DigestBytes digest;
+    Digest digest;
     std::copy_n(bytes.begin() + static_cast<std::ptrdiff_t>(place), digest.size(), digest.begin());
     return digest;
 }
@@ -45,7 +44,7 @@ DigestBytes digestAt(std::string_view bytes, std::size_t place)
 std::string checkOf(std::string_view bytes)
 {
     std::string const hex = generateSha(bytes.data(), static_cast<int>(bytes.size())).ansi_str();
-    DigestBytes const digest = digestFromHex(hex).value_or(DigestBytes{});
+    Digest const digest = digestFromHex(hex).value_or(Digest{});
     return {digest.begin(), digest.begin() + kCheckLength};
 }
 
@@ -56,28 +55,6 @@ bool canBeTrue(Record const& record)
 }
 
 } // namespace
-
-std::string hexOf(DigestBytes const& digest)
-{
-    std::string hex;
-    for (unsigned char const byte : digest) {
-        hex += kDigits[byte >> 4U];
-        hex += kDigits[byte & 15U];
-    }
-    return hex;
-}
-
-std::optional<DigestBytes> digestFromHex(std::string_view hex)
-{
-    DigestBytes digest{};
-    if (hex.size() != 2 * digest.size() || hex.find_first_not_of(kDigits) != std::string_view::npos) {
-        return std::nullopt;
-    }
-    for (std::size_t i = 0; i < digest.size(); ++i) {
-        digest[i] = static_cast<unsigned char>(kDigits.find(hex[2 * i]) << 4U | kDigits.find(hex[2 * i + 1]));
-    }
-    return digest;
-}
 
 std::string_view headerMark()
 {

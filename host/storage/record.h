@@ -1,7 +1,8 @@
 /// Records, the one form in which contents are kept: a header and zstd frames (docs/formats/storage.md).
 #pragma once
 
-#include <array>
+#include "host/text/digest.h"
+
 #include <cstddef>
 #include <cstdint>
 #include <optional>
@@ -10,28 +11,19 @@
 
 namespace tav {
 
-/// A SHA-256 digest.
-using DigestBytes = std::array<unsigned char, 32>;
-
-/// 64 lower-case hexadecimal digits.
-std::string hexOf(DigestBytes const& digest);
-
-/// The digest that `hex` writes; none when it is anything but 64 lower-case hexadecimal digits.
-std::optional<DigestBytes> digestFromHex(std::string_view hex);
-
 /// Contents are compressed in segments of 2^26 bytes; each becomes one frame. Smaller ones are for tests.
 inline constexpr unsigned kSegmentLog = 26;
 inline constexpr unsigned kSmallestSegmentLog = 12;
 
 /// What the header of a record says.
 struct Record {
-    DigestBytes digest{};           ///< of the content
-    DigestBytes base{};             ///< of the content that the frames build on; all zeros: on none
+    Digest digest{};                ///< of the content
+    Digest base{};                  ///< of the content that the frames build on; all zeros: on none
     std::uint64_t length = 0;       ///< of the content
     std::uint64_t framesLength = 0; ///< of all frames together
     unsigned segmentLog = kSegmentLog;
 
-    bool isWhole() const { return base == DigestBytes{}; }
+    bool isWhole() const { return base == Digest{}; }
     std::uint64_t segmentLength() const { return std::uint64_t{1} << segmentLog; }
 };
 

@@ -2,6 +2,8 @@
 
 #include "host/storage/storage_error.h"
 
+#include "common/mu_common_versions.h"
+
 #include <algorithm>
 #include <array>
 #include <string_view>
@@ -64,8 +66,8 @@ void RecordFile::list()
     end_ = isTorn(offset) ? offset : length_;
 }
 
-// A killed append leaves zeros for the header and frames behind, a power failure perhaps nothing but zeros. A damaged
-// header is neither, and whoever damaged it may not have touched the content.
+// A killed append leaves zeros in place of the header, followed by frames; a power failure may leave nothing but zeros.
+// A damaged header is neither, and the content after it may be whole.
 bool RecordFile::isTorn(std::uint64_t offset) const
 {
     std::array<char, kHeaderLength + kFrameMark.size()> bytes;
@@ -128,7 +130,7 @@ std::optional<Entry> RecordFile::nextEntry(std::uint64_t offset) const
         if (done < piece.size() || done < kHeaderLength) {
             return std::nullopt;
         }
-        offset += done - headerMark().size() + 1; // A mark may lie across the border.
+        offset += done - headerMark().size() + 1; // A mark may cross the border.
     }
     return std::nullopt;
 }
@@ -145,7 +147,7 @@ bool RecordFile::isClean() const
     return offset == length_;
 }
 
-std::optional<std::size_t> RecordFile::find(DigestBytes const& digest) const
+std::optional<std::size_t> RecordFile::find(Digest const& digest) const
 {
     for (std::size_t index = entries_.size(); index-- > 0;) {
         if (entries_[index].record.digest == digest) {
@@ -155,7 +157,7 @@ std::optional<std::size_t> RecordFile::find(DigestBytes const& digest) const
     return std::nullopt;
 }
 
-bool RecordFile::isNamed(DigestBytes const& digest) const
+bool RecordFile::isNamed(Digest const& digest) const
 {
     return std::any_of(entries_.begin(), entries_.end(), [&](Entry const& entry) {
         return entry.record.digest == digest || entry.record.base == digest;
@@ -200,7 +202,7 @@ Content RecordFile::unpack(std::size_t index, Content const* base, std::string c
     return {std::move(file), record.length, "A temporary file"};
 }
 
-// The memory of one content of the chain serves for the next but one: fresh pages cost as much as unpacking into them.
+// The memory of one content of the chain is used again for the next but one: fresh pages cost as much as unpacking.
 std::optional<Content> RecordFile::loadBase(std::size_t index, std::string const& scratch, Buffer& spare) const
 {
     std::vector<std::size_t> const chain = chainOf(index);
@@ -213,7 +215,7 @@ std::optional<Content> RecordFile::loadBase(std::size_t index, std::string const
     return base;
 }
 
-void RecordFile::requireDigest(std::size_t index, DigestBytes const& digest) const
+void RecordFile::requireDigest(std::size_t index, Digest const& digest) const
 {
     if (digest != entries_[index].record.digest) {
         throw StorageError(name_ + " is damaged.");
@@ -252,9 +254,9 @@ void RecordFile::write(std::uint64_t offset, std::string_view bytes) const
     check(file_.writeAt(offset, bytes), name_ + " cannot be written");
 }
 
-// The header last: until it is there, what follows it is no record.
+// The header last: without it, the frames are not a record.
 Record RecordFile::writeRecord(
-    Content const& content, DigestBytes const& digest, KnownContent const* base, unsigned segmentLog) const
+    Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog) const
 {
     std::uint64_t offset = end() + kHeaderLength;
     Content const* const baseContent = base != nullptr ? &base->content : nullptr;
@@ -263,8 +265,7 @@ Record RecordFile::writeRecord(
         offset += frame.size();
     });
     Record const record{
-        digest, compressed.usesBase ? base->digest : DigestBytes{}, content.length(), compressed.framesLength,
-        segmentLog};
+        digest, compressed.usesBase ? base->digest : Digest{}, content.length(), compressed.framesLength, segmentLog};
     write(end(), headerOf(record));
     return record;
 }
@@ -287,8 +288,7 @@ void RecordFile::appendRecord(Write const& write)
     }
 }
 
-void RecordFile::append(
-    Content const& content, DigestBytes const& digest, KnownContent const* base, unsigned segmentLog)
+void RecordFile::append(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog)
 {
     appendRecord([&] { return writeRecord(content, digest, base, segmentLog); });
 }

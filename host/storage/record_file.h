@@ -15,9 +15,9 @@
 
 namespace tav {
 
-/// Deltas on deltas are read back one after the other; this many at most lead from a whole content to another one.
+/// A delta may build on another one. At most this many lead from a whole content to any other.
 inline constexpr std::size_t kLongestChain = 32;
-/// The same for contents longer than a segment, whose every step goes through a file.
+/// The same for contents longer than a segment: each step on the way goes through a file.
 inline constexpr std::size_t kLongestLargeChain = 8;
 
 /// A record and its place in the file.
@@ -31,12 +31,12 @@ struct Entry {
 
 /// A content that was read and checked, kept for another use.
 struct KnownContent {
-    DigestBytes digest{};
+    Digest digest{};
     Content content;
 };
 
-/// An open file of records, and the list of them. Everything throws `StorageError`. One thread at a time; appending
-/// is for who holds the repository's lock, reading is not disturbed by it.
+/// An open file of records, and the list of them. Everything throws `StorageError`. One thread at a time. Only the
+/// holder of the repository's lock may append; readers need no lock, and an append does not disturb them.
 ///
 /// Damage is stepped over: where a header does not hold, the next one that does is looked for. What follows the last
 /// record is not seen by readers. The next append takes its place where it is a torn tail, left by an append that never
@@ -59,16 +59,16 @@ public:
     bool isClean() const;
 
     /// The newest record of the content `digest`: its index.
-    std::optional<std::size_t> find(DigestBytes const& digest) const;
+    std::optional<std::size_t> find(Digest const& digest) const;
     /// Whether there is a record of the content `digest`, or one that builds on it.
-    bool isNamed(DigestBytes const& digest) const;
+    bool isNamed(Digest const& digest) const;
     /// The records that lead to the content of record `index`, the whole one first, that record last: of each base the
     /// newest. Throws when one is missing or there are too many.
     std::vector<std::size_t> chainOf(std::size_t index) const;
 
-    /// Gives `sink` the content of record `index`, and throws if it was not the right one: only who has seen this
-    /// return may believe what `sink` got. Large contents on the way lie in files without names in `scratch`. Where the
-    /// record builds on `known`, if that is not null, its base is not read.
+    /// Gives `sink` the content of record `index`, and throws if it was not the right one: nothing that `sink` got may
+    /// be trusted before this has returned. Large contents on the way are in files without names in `scratch`. Where
+    /// the record builds on `known`, if that is not null, its base is not read.
     void read(std::size_t index, std::string const& scratch, KnownContent const* known, Sink const& sink) const;
     /// The content of record `index`, checked.
     Content load(std::size_t index, std::string const& scratch) const;
@@ -76,8 +76,8 @@ public:
     /// Appends `content`, on `base` where that is not null and makes it smaller; `base` is a content of this file. A
     /// failure leaves the file as it was, as far as the disk lets it. Throws when the content turns out to be another
     /// than `digest`.
-    void append(Content const& content, DigestBytes const& digest, KnownContent const* base, unsigned segmentLog);
-    /// Appends the record `index` of `other` as it stands.
+    void append(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog);
+    /// Appends the record `index` of `other` unchanged.
     void appendFrom(RecordFile const& other, std::size_t index);
     /// Waits until the file is safe on the disk.
     void flush() const;
@@ -94,10 +94,10 @@ private:
     std::optional<Content> loadBase(std::size_t index, std::string const& scratch, Buffer& spare) const;
     Content unpack(std::size_t index, Content const* base, std::string const& scratch, Buffer memory) const;
     void unpack(std::size_t index, Content const* base, Buffer& memory, Sink const& sink) const;
-    void requireDigest(std::size_t index, DigestBytes const& digest) const;
+    void requireDigest(std::size_t index, Digest const& digest) const;
     void write(std::uint64_t offset, std::string_view bytes) const;
     Record
-    writeRecord(Content const& content, DigestBytes const& digest, KnownContent const* base, unsigned segmentLog) const;
+    writeRecord(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog) const;
     template <class Write>
     void appendRecord(Write const& write);
 

@@ -11,7 +11,7 @@ namespace tav {
 
 namespace {
 
-std::size_t indexOf(RecordFile const& store, DigestBytes const& digest, std::string const& name)
+std::size_t indexOf(RecordFile const& store, Digest const& digest, std::string const& name)
 {
     std::optional<std::size_t> const index = store.find(digest);
     if (!index) {
@@ -20,10 +20,10 @@ std::size_t indexOf(RecordFile const& store, DigestBytes const& digest, std::str
     return *index;
 }
 
-std::set<std::size_t> neededOf(RecordFile const& store, std::set<DigestBytes> const& digests, std::string const& name)
+std::set<std::size_t> neededOf(RecordFile const& store, std::set<Digest> const& digests, std::string const& name)
 {
     std::set<std::size_t> needed;
-    for (DigestBytes const& digest : digests) {
+    for (Digest const& digest : digests) {
         std::vector<std::size_t> const chain = store.chainOf(indexOf(store, digest, name));
         needed.insert(chain.begin(), chain.end());
     }
@@ -41,10 +41,10 @@ void writeReduced(
 }
 
 void readBack(
-    std::string const& path, std::string const& name, std::set<DigestBytes> const& digests, std::string const& scratch)
+    std::string const& path, std::string const& name, std::set<Digest> const& digests, std::string const& scratch)
 {
     RecordFile const reduced = RecordFile::openForReading(path, name);
-    for (DigestBytes const& digest : digests) {
+    for (Digest const& digest : digests) {
         reduced.read(indexOf(reduced, digest, name), scratch, nullptr, [](std::string_view) {});
     }
 }
@@ -52,7 +52,7 @@ void readBack(
 } // namespace
 
 Freed reduceStore(
-    std::string const& path, std::string const& name, std::set<DigestBytes> const& digests, std::string const& scratch)
+    std::string const& path, std::string const& name, std::set<Digest> const& digests, std::string const& scratch)
 {
     RecordFile const old = RecordFile::openForChanging(path, name);
     std::set<std::size_t> const needed = neededOf(old, digests, name);

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "host/storage/freed.h"
-#include "host/storage/record.h"
+#include "host/text/digest.h"
 
 #include <set>
 #include <string>
@@ -16,6 +16,6 @@ namespace tav {
 /// is not touched. Throws `StorageError`, with the store as it was, when one of `digests` cannot be read. Large
 /// contents on the way are in files without names in `scratch`.
 Freed reduceStore(
-    std::string const& path, std::string const& name, std::set<DigestBytes> const& digests, std::string const& scratch);
+    std::string const& path, std::string const& name, std::set<Digest> const& digests, std::string const& scratch);
 
 } // namespace tav

@@ -29,7 +29,7 @@ std::string StorageLayout::fileOf(StorageUrl const& url) const
                           : storeFolder_ + "/" + url.store + std::string(kStoreEnd);
 }
 
-std::string StorageLayout::incomingFileOf(DigestBytes const& digest) const
+std::string StorageLayout::incomingFileOf(Digest const& digest) const
 {
     return incomingFolder_ + "/" + hexOf(digest);
 }
@@ -39,8 +39,8 @@ std::optional<std::string> StorageLayout::storeIn(std::string_view name)
     if (!endsWith(name, kStoreEnd)) {
         return std::nullopt;
     }
-    std::string store(name.substr(0, name.size() - kStoreEnd.size()));
-    return isStoreName(store) ? std::optional(std::move(store)) : std::nullopt;
+    std::string_view const store = name.substr(0, name.size() - kStoreEnd.size());
+    return isStoreName(store) ? std::optional<std::string>(store) : std::nullopt;
 }
 
 bool StorageLayout::isNewForm(std::string_view name)

@@ -1,8 +1,8 @@
 /// Where the storage keeps its files (docs/formats/storage.md).
 #pragma once
 
-#include "host/storage/record.h"
 #include "host/storage/storage_url.h"
+#include "host/text/digest.h"
 
 #include "common/mu_common_repo_prop.h"
 
@@ -29,7 +29,7 @@ public:
     /// The file that has the content at `url`: a revision store or an object.
     std::string fileOf(StorageUrl const& url) const;
     /// The file of an object until it is flushed.
-    std::string incomingFileOf(DigestBytes const& digest) const;
+    std::string incomingFileOf(Digest const& digest) const;
 
     /// The NAME of the revision store in the file `name` of `storeFolder`; none when it is another file.
     static std::optional<std::string> storeIn(std::string_view name);

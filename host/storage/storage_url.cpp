@@ -13,7 +13,6 @@ constexpr std::string_view kStore = "tf:";
 constexpr std::string_view kObject = "po:";
 constexpr std::size_t kLongestName = 100;
 constexpr std::size_t kLongestStem = 40;
-constexpr std::size_t kDigits = 64;      // of a digest
 constexpr std::size_t kDistinction = 16; // digits of the digest in a name
 
 bool isLegible(char c)
@@ -21,10 +20,30 @@ bool isLegible(char c)
     return (c >= '0' && c <= '9') || (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z') || c == '-' || c == '_';
 }
 
-std::optional<StorageUrl> urlOf(std::string_view store, std::string_view hex)
+/// A URL taken apart; both parts are in its text.
+struct Parts {
+    std::string_view store;
+    Digest digest;
+};
+
+std::optional<Parts> partsOf(std::string_view store, std::string_view hex)
 {
-    std::optional<DigestBytes> const digest = digestFromHex(hex);
-    return digest ? std::optional<StorageUrl>({std::string(store), *digest}) : std::nullopt;
+    std::optional<Digest> const digest = digestFromHex(hex);
+    return digest ? std::optional<Parts>({store, *digest}) : std::nullopt;
+}
+
+std::optional<Parts> partsOf(std::string_view url)
+{
+    std::string_view const rest = url.substr(std::min(url.size(), kStore.size()));
+    if (url.substr(0, kObject.size()) == kObject) {
+        return partsOf({}, rest);
+    }
+    std::size_t const hash = rest.find('#');
+    if (url.substr(0, kStore.size()) != kStore || hash == std::string_view::npos ||
+        !isStoreName(rest.substr(0, hash))) {
+        return std::nullopt;
+    }
+    return partsOf(rest.substr(0, hash), rest.substr(hash + 1));
 }
 
 std::string stemOf(std::string_view path)
@@ -48,7 +67,7 @@ OdString StorageUrl::text() const
     return OdString((text + hexOf(digest)).c_str(), CP_UTF_8);
 }
 
-bool isStoreName(std::string const& name)
+bool isStoreName(std::string_view name)
 {
     if (name.empty() || name.size() > kLongestName || name.front() == '.') {
         return false;
@@ -64,30 +83,22 @@ bool isStoreName(std::string const& name)
 std::optional<StorageUrl> parseUrl(OdString const& url)
 {
     std::string const text = url.ansi_str();
-    std::string_view const rest = std::string_view(text).substr(std::min(text.size(), kStore.size()));
-    if (text.compare(0, kObject.size(), kObject) == 0) {
-        return urlOf({}, rest);
-    }
-    std::size_t const hash = rest.find('#');
-    if (text.compare(0, kStore.size(), kStore) != 0 || hash == std::string_view::npos ||
-        !isStoreName(std::string(rest.substr(0, hash)))) {
-        return std::nullopt;
-    }
-    return urlOf(rest.substr(0, hash), rest.substr(hash + 1));
+    std::optional<Parts> const parts = partsOf(text);
+    return parts ? std::optional<StorageUrl>({std::string(parts->store), parts->digest}) : std::nullopt;
 }
 
-std::optional<OdString> digestOf(OdString const& url)
+std::optional<Digest> digestOf(OdString const& url)
 {
-    std::optional<StorageUrl> const parsed = parseUrl(url);
-    return parsed ? std::optional<OdString>(OdString(hexOf(parsed->digest).c_str(), CP_UTF_8)) : std::nullopt;
+    return digestOf(std::string_view(url.ansi_str()));
 }
 
-std::string_view digestIn(std::string_view url)
+std::optional<Digest> digestOf(std::string_view url)
 {
-    return url.substr(url.size() - std::min(url.size(), kDigits));
+    std::optional<Parts> const parts = partsOf(url);
+    return parts ? std::optional(parts->digest) : std::nullopt;
 }
 
-std::string newStoreName(OdString const& path, DigestBytes const& digest)
+std::string newStoreName(OdString const& path, Digest const& digest)
 {
     std::string const bytes = path.ansi_str();
     std::string const subject = bytes + '\0' + hexOf(digest);

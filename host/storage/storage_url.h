@@ -1,7 +1,7 @@
 /// The URLs of this storage: "tf:NAME#DIGEST" and "po:DIGEST" (docs/formats/storage.md).
 #pragma once
 
-#include "host/storage/record.h"
+#include "host/text/digest.h"
 
 #include "platform/sdk/OdString.h"
 
@@ -14,7 +14,7 @@ namespace tav {
 /// What a URL says.
 struct StorageUrl {
     std::string store; ///< name of the revision store; empty for an object
-    DigestBytes digest{};
+    Digest digest{};
 
     bool isObject() const { return store.empty(); }
     OdString text() const;
@@ -25,18 +25,16 @@ struct StorageUrl {
 /// safe as the name of a file, whoever sent the URL.
 std::optional<StorageUrl> parseUrl(OdString const& url);
 
-/// The SHA-256 digest, in lower-case hexadecimal digits, of the content that `url` names; none when `url` is not of
-/// this storage (`parseUrl`).
-std::optional<OdString> digestOf(OdString const& url);
-
-/// The part of `url`, in bytes, where a URL has its digest. What is there is not checked.
-std::string_view digestIn(std::string_view url);
+/// The digest of the content that `url` names; none when `url` is not of this storage (`parseUrl`). The second takes
+/// the URL in bytes.
+std::optional<Digest> digestOf(OdString const& url);
+std::optional<Digest> digestOf(std::string_view url);
 
 /// Whether `name` can be a NAME.
-bool isStoreName(std::string const& name);
+bool isStoreName(std::string_view name);
 
 /// A NAME for the store of the drawing `path`, a path in the repository, whose first content is `digest`: what is
 /// legible of its stem, and a digest of both, so that storing it again after an interruption gives the same.
-std::string newStoreName(OdString const& path, DigestBytes const& digest);
+std::string newStoreName(OdString const& path, Digest const& digest);
 
 } // namespace tav

@@ -14,7 +14,7 @@ namespace tav {
 
 void PrintTo(VerifiedFile const& file, std::ostream* stream)
 {
-    *stream << file.path << ' ' << file.digest << ' ' << file.stamp.size << ' ' << file.stamp.inode << ' '
+    *stream << file.path << ' ' << tav::hexOf(file.digest) << ' ' << file.stamp.size << ' ' << file.stamp.inode << ' '
             << file.stamp.changed << ' ' << file.stamp.modified;
 }
 
@@ -46,7 +46,7 @@ protected:
 
     static tav::VerifiedFile verified(std::string const& path)
     {
-        return {path, "d1ge5t", {5'000'000'000, ~std::uint64_t{0}, 1'700'000'000'000'000'001, -1}};
+        return {path, {0xd1, 0xce}, {5'000'000'000, ~std::uint64_t{0}, 1'700'000'000'000'000'001, -1}};
     }
 
     support::TempRepository const repo;
@@ -86,11 +86,19 @@ TEST_F(LocalDatabase, KeepsTheLastRecordOfAVerifiedFile)
 {
     tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
     tav::VerifiedFile later = verified("b.dwg");
-    later.digest = "0ther";
+    later.digest.fill(0xee);
     later.stamp.changed = 7;
     database.addVerified({verified("a.dwg"), verified("b.dwg")});
     database.addVerified({later});
     EXPECT_THAT(database.verifiedFiles(), ElementsAre(verified("a.dwg"), later));
+}
+
+TEST_F(LocalDatabase, LeavesOutAVerifiedFileWhoseDigestIsDamaged)
+{
+    tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
+    database.addVerified({verified("a.dwg"), verified("b.dwg")});
+    database.database().run("UPDATE verified_files SET digest = 'd1ge5t' WHERE path = 'a.dwg'");
+    EXPECT_THAT(database.verifiedFiles(), ElementsAre(verified("b.dwg")));
 }
 
 TEST_F(LocalDatabase, ListsVerifiedFilesInTheOrderOfBytesWhateverTheyAre)

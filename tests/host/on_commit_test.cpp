@@ -26,7 +26,7 @@ protected:
             repo.write(name, content);
             OdString const digest = generateSha(content.data(), static_cast<int>(content.size()));
             files_.push_back({tav::fromUtf8(name), L"po:" + digest, OdString()});
-            database.addContent(L"po:" + digest, digest, content.size());
+            database.addContent(L"po:" + digest, *tav::digestFromHex(digest.ansi_str()), content.size());
         }
         ++number_;
         OdString const hash = OdString().format(L"%064d", number_);
@@ -153,7 +153,7 @@ TEST_F(StatusOnCommit, DoesNotReadAFileThatIsKnown)
     tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
     std::string const url = database.commits().fileList(database.currentCommit()).front().url;
     database.addVerified(
-        {{"a.dwg", std::string(tav::digestIn(url)), *tav::FolderView(repo.root()).look(L"a.dwg").stamp}});
+        {{"a.dwg", *tav::digestOf(std::string_view(url)), *tav::FolderView(repo.root()).look(L"a.dwg").stamp}});
     EXPECT_EQ(status(), "Nothing has changed since the last commit.\n");
 }
 

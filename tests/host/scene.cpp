@@ -120,8 +120,7 @@ std::string falseRecords(common::RootPath const& root)
     tav::FolderView view(root);
     for (tav::VerifiedFile const& file : tav::LocalDatabase::open(root).verifiedFiles()) {
         bool const isBelieved = view.look(file.path).stamp == file.stamp;
-        if (isBelieved &&
-            tav::fileDigest(root.pathTo(tav::fromUtf8(file.path))) != OdString(file.digest.c_str(), CP_UTF_8)) {
+        if (isBelieved && tav::fileDigest(root.pathTo(tav::fromUtf8(file.path))) != file.digest) {
             names += "wrongly believed: " + file.path + "\n";
         }
     }

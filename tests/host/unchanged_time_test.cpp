@@ -123,7 +123,7 @@ protected:
         tav::FolderView view(repo.root());
         for (tav::VerifiedFile const& file : tav::LocalDatabase::open(repo.root()).verifiedFiles()) {
             if (view.look(file.path).stamp == file.stamp) {
-                digests[file.path] = file.digest;
+                digests[file.path] = tav::hexOf(file.digest);
             }
         }
         return digests;

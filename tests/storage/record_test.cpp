@@ -71,12 +71,18 @@ TEST(RecordHeader, IsRefusedWithNumbersThatCannotBeTrue)
 
 TEST(DigestFromHex, TakesLowerCaseDigitsOnly)
 {
-    std::string const hex(64, 'a');
+    std::string const hex = "0123456789abcdeffedcba98765432100123456789abcdeffedcba9876543210";
     ASSERT_TRUE(tav::digestFromHex(hex).has_value());
     EXPECT_EQ(tav::hexOf(*tav::digestFromHex(hex)), hex);
     EXPECT_FALSE(tav::digestFromHex(hex.substr(1)).has_value());
     EXPECT_FALSE(tav::digestFromHex(hex + "a").has_value());
-    EXPECT_FALSE(tav::digestFromHex(std::string(64, 'A')).has_value());
+    for (std::size_t place = 0; place < hex.size(); ++place) {
+        for (char const c : {'A', 'g', '/', ':', '\0', '\xff'}) {
+            std::string other = hex;
+            other[place] = c;
+            EXPECT_FALSE(tav::digestFromHex(other).has_value()) << other;
+        }
+    }
 }
 
 } // namespace

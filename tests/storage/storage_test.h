@@ -54,7 +54,8 @@ protected:
     {
         return tav::LocalStorage(
             repo.root(), [this](OdString const& path) { return lookUp(committed, path); },
-            [this](OdString const& digest) { return lookUp(known, digest); }, kSegmentLog);
+            [this](tav::Digest const& digest) { return lookUp(known, support::fromUtf8(tav::hexOf(digest))); },
+            kSegmentLog);
     }
 
     /// Stores and flushes `content` as the file `name`. The URL, or the message.

@@ -10,8 +10,8 @@ std::string const kHex = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff
 
 TEST(StorageUrl, NamesTheDigestOfItsContent)
 {
-    EXPECT_EQ(tav::digestOf(support::fromUtf8("po:" + kHex)), support::fromUtf8(kHex));
-    EXPECT_EQ(tav::digestOf(support::fromUtf8("tf:Plan_1-0a.b#" + kHex)), support::fromUtf8(kHex));
+    EXPECT_EQ(tav::digestOf(support::fromUtf8("po:" + kHex)), tav::digestFromHex(kHex));
+    EXPECT_EQ(tav::digestOf(support::fromUtf8("tf:Plan_1-0a.b#" + kHex)), tav::digestFromHex(kHex));
 }
 
 TEST(StorageUrl, IsRefusedInAnyOtherForm)
@@ -73,7 +73,7 @@ TEST(NewStoreName, IsLegibleAndSafe)
 
 TEST(NewStoreName, DependsOnPathAndContentOnly)
 {
-    tav::DigestBytes const other{1};
+    tav::Digest const other{1};
     EXPECT_EQ(tav::newStoreName(L"a/plan.dwg", {}), tav::newStoreName(L"a/plan.dwg", {}));
     EXPECT_NE(tav::newStoreName(L"a/plan.dwg", {}), tav::newStoreName(L"b/plan.dwg", {}));
     EXPECT_NE(tav::newStoreName(L"a/plan.dwg", {}), tav::newStoreName(L"a/plan.dwg", other));
