@@ -31,6 +31,8 @@ Subcommands:
   log                         Show the history, newest first
   show                        Show a commit and what it changed
   diff                        Show what is different from the last commit, in detail
+  preview                     Show the preview picture of a drawing
+  compare                     Show two versions of a drawing as pictures, and what differs
   restore                     Bring files back as a commit has them
   checkout                    Make the working folder what it was at a commit
   switch                      Go on with the work on another branch
