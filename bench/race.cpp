@@ -105,7 +105,7 @@ std::vector<int> Table::sizes(int usual) const
     return {quick_ ? usual / 100 : usual};
 }
 
-void Table::race(WriteSession const& session, Runner const& ours, std::vector<Peer> const& peers) const
+void Table::race(Work const& work, Runner const& ours, std::vector<Peer> const& peers) const
 {
     addRunner(ours);
     for (Peer const& peer : peers) {
@@ -122,7 +122,7 @@ void Table::race(WriteSession const& session, Runner const& ours, std::vector<Pe
 }
 
 void printRow(
-    WriteSession const& session, std::string const& ours, std::string const& peerName, std::string const& peer,
+    Work const& work, std::string const& ours, std::string const& peerName, std::string const& peer,
     std::optional<double> target, double ratio)
 {
     std::printf(

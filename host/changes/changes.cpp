@@ -87,12 +87,12 @@ FolderMatch matchPaths(std::vector<common::File> scanned, FileList committed)
     FolderMatch match;
     match.committed.reserve(committed.size());
     auto file = scanned.begin();
-    for (auto& [path, url] : committed) {
-        for (; file != scanned.end() && file->path < path; ++file) {
+    for (ListedFile& listed : committed) {
+        for (; file != scanned.end() && file->path < listed.path; ++file) {
             match.untracked.push_back(std::move(*file));
         }
-        bool const isScanned = file != scanned.end() && file->path == path;
-        match.committed.push_back({std::move(path), std::move(url)});
+        bool const isScanned = file != scanned.end() && file->path == listed.path;
+        match.committed.push_back({std::move(listed.path), std::move(listed.url)});
         file += isScanned ? 1 : 0;
     }
     std::move(file, scanned.end(), std::back_inserter(match.untracked));

@@ -22,4 +22,9 @@ struct CommittedChange {
 /// In the order of paths. A renamed file is one change.
 std::vector<CommittedChange> committedChanges(CommitTables const& commits, CommitRecord const& commit);
 
+/// What is different in the commit `to` from the commit `from`, in the order of paths. Where `from` is on the line of
+/// first parents of `to`, renames in between are followed.
+std::vector<CommittedChange>
+changesBetween(CommitTables const& commits, CommitRecord const& from, CommitRecord const& to);
+
 } // namespace tav

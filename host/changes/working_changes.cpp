@@ -48,11 +48,12 @@ void joinRenamed(Renames const& renames, ByPath& all)
 
 } // namespace
 
-std::vector<WorkingChange> workingChanges(common::RootPath const& root, LocalDatabase const& database)
+std::vector<WorkingChange>
+workingChanges(common::RootPath const& root, LocalDatabase const& database, OdString const& commit)
 {
     auto const cache = readState(root);
-    FolderChanges const changes = compare(
-        root, matchFolder(root, database.commits().fileList(database.currentCommit()), database.verifiedFiles()));
+    FolderChanges const changes =
+        compare(root, matchFolder(root, database.commits().fileList(commit), database.verifiedFiles()));
     ByPath all = plainChanges(changes);
     joinRenamed(cache->read().renames, all);
     joinRenamed(findRenames(changes, cache->read(), database, root), all);

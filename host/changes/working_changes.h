@@ -16,7 +16,9 @@ struct WorkingChange {
     OdString oldUrl;       ///< of the committed content; empty for a new file
 };
 
-/// In the order of paths. A renamed file, one that 'tav mv' has staged included, is one change.
-std::vector<WorkingChange> workingChanges(common::RootPath const& root, LocalDatabase const& database);
+/// Against the commit of that hash, in the order of paths. A renamed file, one that 'tav mv' has staged included, is
+/// one change.
+std::vector<WorkingChange>
+workingChanges(common::RootPath const& root, LocalDatabase const& database, OdString const& commit);
 
 } // namespace tav

@@ -13,6 +13,7 @@
 #include <clocale>
 #include <csignal>
 #include <exception>
+#include <optional>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -38,8 +39,8 @@ std::string chosenCommand(CLI::App const& app)
     return chosen.empty() ? "tav" : "tav " + chosen.front()->get_name();
 }
 
-// CLI11 takes an argument like "[old]" or "[a,b]" apart as a list of names. A mark in front keeps it whole until its
-// option takes it over.
+// CLI11 takes an argument like "[old]" or "[a,b]" apart as a list of names, and forgets "--" where a command has a name
+// already. A mark in front keeps an argument whole, and a name, until its option takes it over.
 constexpr char kMark = '\x01';
 
 std::string marked(std::string const& argument)
@@ -63,12 +64,19 @@ void takeMarksOff(CLI::App& command)
 }
 
 /// In reverse order, which the parser wants.
-std::vector<std::string> markedArguments(int argc, char** argv)
+std::vector<std::string> markedArguments(std::vector<std::string> const& words)
 {
     std::vector<std::string> arguments;
-    for (int i = argc - 1; i > 0; --i) {
-        arguments.push_back(marked(argv[i]));
+    bool isBehindDashes = false;
+    for (std::size_t i = 1; i < words.size(); ++i) {
+        std::string const& argument = words[i];
+        if (argument == "--" && !isBehindDashes) {
+            isBehindDashes = true;
+        } else {
+            arguments.push_back(isBehindDashes ? kMark + argument : marked(argument));
+        }
     }
+    std::reverse(arguments.begin(), arguments.end());
     return arguments;
 }
 
@@ -82,10 +90,10 @@ std::string complaint(CLI::App const& app, CLI::ParseError const& error)
 }
 
 /// Runs the command, or prints the help that was asked for.
-void parse(CLI::App& app, int argc, char** argv)
+void parse(CLI::App& app, std::vector<std::string> const& words)
 {
     try {
-        app.parse(markedArguments(argc, argv));
+        app.parse(markedArguments(words));
     } catch (CLI::Success const& wish) {
         std::ostringstream help;
         app.exit(wish, help, help);
@@ -100,7 +108,13 @@ void enterFolder(std::string const& folder)
     }
 }
 
-void prepareSyntax(CLI::App& app)
+std::optional<std::size_t> wordsBehindDashes(std::vector<std::string> const& words)
+{
+    auto const dashes = std::find(words.begin(), words.end(), "--");
+    return dashes == words.end() ? std::nullopt : std::optional(static_cast<std::size_t>(words.end() - dashes) - 1);
+}
+
+void prepareSyntax(CLI::App& app, std::optional<std::size_t> behindDashes)
 {
     app.require_subcommand(1);
     app.set_help_flag("-h,--help", "Show this help and do nothing else");
@@ -108,18 +122,28 @@ void prepareSyntax(CLI::App& app)
     app.add_option_function<std::string>("-C", enterFolder, "Work as if started in FOLDER")
         ->type_name("FOLDER")
         ->trigger_on_parse();
-    addCommands(app);
+    addCommands(app, behindDashes);
     takeMarksOff(app);
     for (CLI::App* const command : app.get_subcommands({})) {
         takeMarksOff(*command);
     }
 }
 
-int runCommand(CLI::App& app, int argc, char** argv)
+/// "tav help log" is the same as "tav log --help".
+std::vector<std::string> withHelpBehind(std::vector<std::string> words)
+{
+    if (words.size() > 1 && words[1] == "help") {
+        words.erase(words.begin() + 1);
+        words.emplace_back("--help");
+    }
+    return words;
+}
+
+int runCommand(CLI::App& app, std::vector<std::string> const& words)
 {
     try {
-        prepareSyntax(app);
-        parse(app, argc, argv);
+        prepareSyntax(app, wordsBehindDashes(words));
+        parse(app, words);
         if (!flushOutput()) {
             throw Failure("The output could not be written.", "Check the disk or the program that reads it.");
         }
@@ -149,7 +173,7 @@ int run(int argc, char** argv)
 {
     prepareProcess();
     CLI::App app("Keeps the versions of a folder of drawings.", "tav");
-    return runCommand(app, argc, argv);
+    return runCommand(app, withHelpBehind(std::vector<std::string>(argv, argv + argc)));
 }
 
 } // namespace tav

@@ -2,6 +2,8 @@
 /// `Failure`.
 #pragma once
 
+#include "host/cli/arguments.h"
+
 #include <cstddef>
 #include <optional>
 #include <string>
@@ -17,6 +19,7 @@ void init(InitOptions const& options);
 
 struct StatusOptions {
     bool ignored = false;
+    bool isShort = false;
     bool json = false;
 };
 void showStatus(StatusOptions const& options);
@@ -45,8 +48,13 @@ struct CommitOptions {
 void makeCommit(CommitOptions const& options);
 
 struct LogOptions {
-    std::string start;
+    WordList arguments; ///< the commit to begin with, and names
+    std::string since;
+    std::string until;
+    std::string author;    ///< a part of the name; empty: all
     std::size_t count = 0; ///< 0: all
+    bool all = false;      ///< the history of all branches and tags
+    bool oneline = false;
     bool json = false;
 };
 void showLog(LogOptions const& options);
@@ -57,8 +65,13 @@ struct ShowOptions {
 };
 void showCommit(ShowOptions const& options);
 
+/// "COMMIT:NAME"
+void printFile(std::string const& typed);
+
 struct DiffOptions {
-    std::vector<std::string> names; ///< none: all
+    WordList arguments; ///< up to two commits, and names; no name: all files
+    bool stat = false;
+    bool text = false;
     bool json = false;
 };
 void showDifferences(DiffOptions const& options);
@@ -103,7 +116,9 @@ void tag(ReferenceOptions const& options);
 
 struct FilesOptions {
     std::string folder; ///< empty: the repository that the user is in
+    std::string commit; ///< whose files are listed; empty: those of the working folder
     bool hash = false;
+    bool isLong = false; ///< with the last commit of each file, of the current commit if none is named
     bool json = false;
 };
 void listFiles(FilesOptions const& options);

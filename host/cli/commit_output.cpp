@@ -1,27 +1,38 @@
 #include "host/cli/commit_output.h"
 
 #include "host/cli/output.h"
+#include "host/text/utf8.h"
 
 #include "platform/sdk/OdTimeStamp.h"
+#include "platform/ut/text.h"
 
 #include <array>
 #include <cstdio>
 
 namespace tav {
 
-kutils::json::Object documentOf(CommitRecord const& commit)
+namespace {
+
+std::string formatted(std::int64_t seconds, wchar_t const* form)
 {
     OdTimeStamp time;
-    time.setPackedValue(commit.date);
-    OdString date;
-    time.strftime(L"%Y-%m-%dT%H:%M:%SZ", date);
+    time.setPackedValue(seconds);
+    OdString text;
+    time.strftime(form, text);
+    return text.ansi_str();
+}
+
+} // namespace
+
+kutils::json::Object documentOf(CommitRecord const& commit)
+{
     kutils::json::Array parents;
     for (OdString const& parent : commit.parents) {
         parents.push_back(jsonText(parent));
     }
     kutils::json::Object document;
     document[L"author"] = jsonText(commit.author);
-    document[L"date"] = jsonText(date);
+    document[L"date"] = jsonText(fromUtf8(dateMember(commit.date)));
     document[L"hash"] = jsonText(commit.hash);
     document[L"message"] = jsonText(commit.message);
     document[L"number"] = commit.number;
@@ -29,13 +40,20 @@ kutils::json::Object documentOf(CommitRecord const& commit)
     return document;
 }
 
+OdString authorName(CommitRecord const& commit)
+{
+    OdArray<OdString> const parts = ut::splitByChar(commit.author, L'@', false);
+    return parts.isEmpty() ? OdString() : parts.first();
+}
+
+std::string dateMember(std::int64_t seconds)
+{
+    return formatted(seconds, L"%Y-%m-%dT%H:%M:%SZ");
+}
+
 std::string dateText(std::int64_t seconds)
 {
-    OdTimeStamp time;
-    time.setPackedValue(seconds);
-    OdString text;
-    time.strftime(L"%Y-%m-%d %H:%M:%S UTC", text);
-    return text.ansi_str();
+    return formatted(seconds, L"%Y-%m-%d %H:%M:%S UTC");
 }
 
 std::string sizeText(std::uint64_t bytes)

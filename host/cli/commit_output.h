@@ -15,6 +15,11 @@ namespace tav {
 /// The members of a commit in documents: "author", "date", "hash", "message", "number", "parents".
 kutils::json::Object documentOf(CommitRecord const& commit);
 
+/// The author without the machine: what comes before the first '@'.
+OdString authorName(CommitRecord const& commit);
+
+/// "2024-03-05T14:07:09Z", as in documents.
+std::string dateMember(std::int64_t seconds);
 /// "2024-03-05 14:07:09 UTC"
 std::string dateText(std::int64_t seconds);
 /// "17 bytes", "20.3 MB"

@@ -1,13 +1,13 @@
 #include "host/changes/changes.h"
 #include "host/changes/digest.h"
 #include "host/cli/commands.h"
+#include "host/cli/committed_files.h"
 #include "host/cli/output.h"
+#include "host/commits/commit_names.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
 #include "host/terminal/progress.h"
 #include "host/text/utf8.h"
-
-#include <unistd.h>
 
 #include <optional>
 #include <string>
@@ -32,19 +32,6 @@ std::vector<Listed> digestAll(common::RootPath const& root, std::vector<common::
         progress.advance();
     }
     return list;
-}
-
-/// The form of sha256sum, so that it can check the list: a name with a line end or a backslash is escaped, and its line
-/// begins with a backslash.
-std::string digestLine(Digest const& digest, OdString const& path)
-{
-    std::string name;
-    for (char const c : path.ansi_str()) {
-        name += c == '\\' ? "\\\\" : c == '\n' ? "\\n" : c == '\r' ? "\\r" : std::string(1, c);
-    }
-    bool const isEscaped = name.size() != path.ansi_str().size();
-    bool const isTerminal = isatty(STDOUT_FILENO) == 1;
-    return (isEscaped ? "\\" : "") + hexOf(digest) + "  " + (isTerminal ? shown(path) : name) + "\n";
 }
 
 kutils::json::Value documentOf(std::vector<Listed> const& list, bool hash)
@@ -84,7 +71,18 @@ void failForUnread(std::vector<Listed> const& list)
     if (unread > 0) {
         throw Failure(
             std::to_string(unread) + " of " + std::to_string(list.size()) + " files could not be read.",
-            "Mend that and run the command again.");
+            "Correct that and run the command again.");
+    }
+}
+
+void listCommittedFiles(FilesOptions const& options, common::RootPath const& root)
+{
+    LocalDatabase database = LocalDatabase::open(root);
+    CommitRecord const commit = findCommit(database, options.commit);
+    if (options.isLong) {
+        printLastChanges(database, commit, options.json);
+    } else {
+        printCommittedFiles(database, commit, options.hash, options.json);
     }
 }
 
@@ -93,6 +91,10 @@ void failForUnread(std::vector<Listed> const& list)
 void listFiles(FilesOptions const& options)
 {
     common::RootPath const root = openRepository(options.folder);
+    if (options.isLong || !options.commit.empty()) {
+        listCommittedFiles(options, root);
+        return;
+    }
     std::vector<common::File> const files = scan(root);
     std::vector<Listed> list;
     if (options.hash) {

@@ -1,15 +1,19 @@
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
-#include "host/commits/commit_names.h"
+#include "host/errors/failure.h"
+#include "host/history/ancestry.h"
+#include "host/history/file_history.h"
 #include "host/repository/journal.h"
+#include "host/repository/names.h"
 #include "host/repository/open.h"
+#include "host/storage/storage_url.h"
+#include "host/text/dates.h"
 #include "host/text/utf8.h"
 
-#include "common/mu_common_history.h"
-
-#include "platform/ut/text.h"
-
+#include <algorithm>
+#include <ctime>
+#include <limits>
 #include <map>
 #include <string>
 
@@ -17,57 +21,223 @@ namespace tav {
 
 namespace {
 
-OdString titleOf(CommitRecord const& commit)
-{
-    std::string const message = commit.message.ansi_str();
-    return fromUtf8(message.substr(0, message.find('\n')));
-}
+/// A commit, and what it did to the files that were named.
+struct Entry {
+    CommitRecord commit;
+    std::vector<FileEvent> files;
+};
 
-/// What the library shows of an entry, put together here: its texts are of Qt, which keeps no bytes that are not UTF-8.
-std::string infoOf(CommitRecord const& commit)
-{
-    OdTimeStamp date;
-    date.setPackedValue(commit.date);
-    std::string const age = common::HistoryItem(date, {}, {}, {}, 0).getInfo().toStdString();
-    OdArray<OdString> const author = ut::splitByChar(commit.author, L'@', false);
-    return author.isEmpty() ? age : shown(author.first()) + " \u2981 " + age;
-}
-
-using Names = std::multimap<OdString, std::string>;
+using Names = std::multimap<OdString, OdString>;
 
 /// The branches and tags at each commit.
 Names namesByHash(LocalDatabase const& database)
 {
     Names names;
     for (common::Reference const& reference : database.commits().references()) {
-        names.emplace(reference.commitHash, shown(reference.name));
+        names.emplace(reference.commitHash, reference.name);
     }
     return names;
+}
+
+std::vector<std::int64_t>
+startsOf(LogOptions const& options, LocalDatabase const& database, std::vector<CommitRecord> const& named)
+{
+    CommitTables const& commits = database.commits();
+    std::vector<CommitRecord> starts = named;
+    if (starts.empty() || options.all) {
+        if (auto current = commits.find(database.currentCommit())) {
+            starts.push_back(std::move(*current));
+        }
+    }
+    if (options.all) {
+        for (common::Reference const& reference : commits.references()) {
+            starts.push_back(*commits.find(reference.commitHash));
+        }
+    }
+    std::vector<std::int64_t> numbers;
+    for (CommitRecord const& start : starts) {
+        numbers.push_back(start.number);
+    }
+    return numbers;
+}
+
+/// The one file of the newest commit that `name` matches the end of.
+OdString
+pathMatching(std::string const& name, CommitTables const& commits, std::int64_t start, common::RootPath const& root)
+{
+    std::vector<common::StagedFile> files;
+    if (auto const commit = commits.find(start)) {
+        for (ListedFile const& file : commits.fileList(commit->hash)) {
+            files.emplace_back(file.path, common::FileChange::added);
+        }
+    }
+    std::vector<common::StagedFile> const found = NameFinder(files, root).find(name);
+    if (found.size() != 1) {
+        throw Failure("No commit has a file '" + name + "'.", "Run 'tav files' to see the names.");
+    }
+    return found.front().path;
+}
+
+std::vector<OdString> pathsOf(
+    std::vector<std::string> const& names, CommitTables const& commits, std::vector<std::int64_t> const& starts,
+    common::RootPath const& root)
+{
+    std::vector<OdString> paths;
+    for (std::string const& name : names) {
+        OdString const path = pathInRepository(root, name);
+        bool const isKnown = path.isEmpty() || commits.hasPath(path.ansi_str());
+        paths.push_back(isKnown ? path : pathMatching(name, commits, starts.empty() ? 0 : starts.front(), root));
+    }
+    return paths;
+}
+
+std::vector<Entry> entriesOf(std::vector<FileHistoryEntry> history, CommitTables const& commits)
+{
+    std::vector<std::int64_t> numbers;
+    for (FileHistoryEntry const& entry : history) {
+        numbers.push_back(entry.commit);
+    }
+    std::vector<CommitRecord> records = commits.find(numbers);
+    std::vector<Entry> entries;
+    for (std::size_t i = 0; i < records.size(); ++i) {
+        entries.push_back({std::move(records[i]), std::move(history[i].events)});
+    }
+    return entries;
+}
+
+std::vector<FileHistoryEntry> wholeHistory(CommitTables const& commits, std::vector<std::int64_t> const& starts)
+{
+    std::vector<FileHistoryEntry> history;
+    for (std::int64_t const number : Ancestry(commits).past(starts)) {
+        history.push_back({number, {}});
+    }
+    return history;
+}
+
+TimeSpan spanOf(std::string const& typed, char const* option)
+{
+    if (typed.empty()) {
+        return {std::numeric_limits<std::int64_t>::min(), std::numeric_limits<std::int64_t>::max()};
+    }
+    if (auto const span = parseDate(typed, std::time(nullptr))) {
+        return *span;
+    }
+    throw Failure(
+        std::string(option) + " '" + typed + "' is not a date.",
+        "Type one as '2024-03-05', 'yesterday' or '3 days ago'.");
+}
+
+/// Leaves out what the options do not ask for. Dates need not ascend, so each commit is looked at.
+void filter(LogOptions const& options, std::vector<Entry>& entries)
+{
+    std::int64_t const since = spanOf(options.since, "--since").first;
+    std::int64_t const until = spanOf(options.until, "--until").last;
+    auto const isUnwanted = [&](Entry const& entry) {
+        return entry.commit.date < since || entry.commit.date > until ||
+               entry.commit.author.ansi_str().find(options.author) == std::string::npos;
+    };
+    entries.erase(std::remove_if(entries.begin(), entries.end(), isUnwanted), entries.end());
+    if (options.count > 0 && entries.size() > options.count) {
+        entries.resize(options.count);
+    }
+}
+
+bool hasFilter(LogOptions const& options)
+{
+    return !options.since.empty() || !options.until.empty() || !options.author.empty();
+}
+
+std::vector<Entry> findEntries(LogOptions const& options, common::RootPath const& root, LocalDatabase const& database)
+{
+    CommitTables const& commits = database.commits();
+    CommitsAndNames const arguments = split(options.arguments, database, 1);
+    std::vector<std::int64_t> const starts = startsOf(options, database, arguments.commits);
+    std::vector<FileHistoryEntry> history =
+        arguments.names.empty() ? wholeHistory(commits, starts)
+                                : fileHistory(commits, starts, pathsOf(arguments.names, commits, starts, root));
+    if (!hasFilter(options) && options.count > 0 && history.size() > options.count) {
+        history.resize(options.count); // The rest need not be read.
+    }
+    std::vector<Entry> entries = entriesOf(std::move(history), commits);
+    filter(options, entries);
+    return entries;
+}
+
+kutils::json::Object documentOf(FileEvent const& file, LocalDatabase const& database)
+{
+    kutils::json::Object object;
+    object[L"path"] = jsonText(file.path);
+    object[L"change"] = jsonText(valueOrFail(common::toString(file.change), ""));
+    if (!file.previousPath.isEmpty()) {
+        object[L"previous"] = jsonText(file.previousPath);
+    }
+    if (auto const bytes = database.sizeOf(file.url)) {
+        object[L"size"] = *bytes;
+    }
+    if (auto const sha256 = digestOf(file.url)) {
+        object[L"sha256"] = jsonText(fromUtf8(hexOf(*sha256)));
+    }
+    return object;
+}
+
+void printDocument(std::vector<Entry> const& entries, Names const& names, LocalDatabase const& database)
+{
+    kutils::json::Array array;
+    for (Entry const& entry : entries) {
+        kutils::json::Object object = documentOf(entry.commit);
+        kutils::json::Array references;
+        for (auto [name, end] = names.equal_range(entry.commit.hash); name != end; ++name) {
+            references.push_back(jsonText(name->second));
+        }
+        object[L"refs"] = std::move(references);
+        kutils::json::Array files;
+        for (FileEvent const& file : entry.files) {
+            files.emplace_back(documentOf(file, database));
+        }
+        if (!files.empty()) {
+            object[L"files"] = std::move(files);
+        }
+        array.emplace_back(std::move(object));
+    }
+    printJson(std::move(array));
 }
 
 std::string namesAt(OdString const& hash, Names const& names)
 {
     std::string list;
     for (auto [name, end] = names.equal_range(hash); name != end; ++name) {
-        list += (list.empty() ? "  (" : ", ") + name->second;
+        list += (list.empty() ? "  (" : ", ") + shown(name->second);
     }
     return list.empty() ? list : list + ")";
 }
 
-std::string linesOf(CommitRecord const& commit, Names const& names)
+/// The number, and the first line of the message.
+std::string titleLine(CommitRecord const& commit, Names const& names)
 {
-    std::string const number = std::to_string(commit.number);
-    std::string const indent(number.size() + 2, ' ');
-    return number + "  " + shown(titleOf(commit)) + namesAt(commit.hash, names) + "\n" + indent + infoOf(commit) + "\n";
+    std::string const message = commit.message.ansi_str();
+    OdString const title = fromUtf8(message.substr(0, message.find('\n')));
+    return std::to_string(commit.number) + "  " + shown(title) + namesAt(commit.hash, names) + "\n";
 }
 
-void printDocument(std::vector<CommitRecord> const& commits)
+std::string lines(Entry const& entry, Names const& names, std::int64_t now)
 {
-    kutils::json::Array array;
-    for (CommitRecord const& commit : commits) {
-        array.emplace_back(documentOf(commit));
+    std::string const indent(std::to_string(entry.commit.number).size() + 2, ' ');
+    OdString const author = authorName(entry.commit);
+    std::string text = titleLine(entry.commit, names) + indent;
+    text += author.isEmpty() ? "" : shown(author) + " \u2981 ";
+    text += shownDate(entry.commit.date, now) + "\n";
+    for (FileEvent const& file : entry.files) {
+        text += indent + changeLine(file.change, file.path, file.previousPath) + "\n";
     }
-    printJson(std::move(array));
+    return text;
+}
+
+void printForPeople(std::vector<Entry> const& entries, Names const& names, bool oneline)
+{
+    std::int64_t const now = std::time(nullptr);
+    for (Entry const& entry : entries) {
+        print(oneline ? titleLine(entry.commit, names) : lines(entry, names, now));
+    }
 }
 
 } // namespace
@@ -79,20 +249,13 @@ void showLog(LogOptions const& options)
     if (std::string const notice = pendingNotice(root, database); !notice.empty()) {
         printNote(notice);
     }
-    std::vector<CommitRecord> commits = database.commits().history(
-        options.start.empty() ? database.currentCommit() : findCommit(database, options.start).hash);
-    if (options.count > 0 && commits.size() > options.count) {
-        commits.resize(options.count);
-    }
+    std::vector<Entry> const entries = findEntries(options, root, database);
     if (options.json) {
-        printDocument(commits);
+        printDocument(entries, namesByHash(database), database);
         return;
     }
-    Names const names = namesByHash(database);
-    for (CommitRecord const& commit : commits) {
-        print(linesOf(commit, names));
-    }
-    if (commits.empty()) {
+    printForPeople(entries, namesByHash(database), options.oneline);
+    if (database.commits().lastNumber() == 0) {
         print("There is no commit yet.\n");
     }
 }

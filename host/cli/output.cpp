@@ -7,6 +7,7 @@
 
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <cstdlib>
 #include <string_view>
@@ -14,12 +15,6 @@
 namespace tav {
 
 namespace {
-
-bool isTerminal()
-{
-    static bool const is = isatty(STDOUT_FILENO) == 1;
-    return is;
-}
 
 /// A byte of a name that is not valid UTF-8. A terminal of another character set may take it for a control character.
 bool isStrayByte(wchar_t c)
@@ -39,6 +34,10 @@ bool cannotBeSeenInALine(wchar_t c)
 
 std::string escaped(OdString const& text, bool (*mustBe)(wchar_t))
 {
+    wchar_t const* const begin = text.c_str();
+    if (std::none_of(begin, begin + text.getLength(), mustBe)) {
+        return text.ansi_str(); // Most names are so, and there may be 200,000 of them.
+    }
     OdString result;
     for (std::size_t i = 0; i < text.getLength(); ++i) {
         wchar_t const c = text.getAt(i);
@@ -72,6 +71,12 @@ std::string asSentence(std::string const& text)
 }
 
 } // namespace
+
+bool isTerminal()
+{
+    static bool const is = isatty(STDOUT_FILENO) == 1;
+    return is;
+}
 
 void print(std::string const& text)
 {
@@ -115,6 +120,17 @@ std::string shown(OdString const& name)
 std::string shownLine(OdString const& line)
 {
     return isTerminal() ? escaped(line, cannotBeSeenInALine) : line.ansi_str();
+}
+
+std::string digestLine(Digest const& digest, OdString const& path)
+{
+    std::string const bytes = path.ansi_str();
+    std::string name;
+    for (char const c : bytes) {
+        name += c == '\\' ? "\\\\" : c == '\n' ? "\\n" : c == '\r' ? "\\r" : std::string(1, c);
+    }
+    bool const isEscaped = name.size() != bytes.size();
+    return (isEscaped ? "\\" : "") + hexOf(digest) + "  " + (isTerminal() ? shown(path) : name) + "\n";
 }
 
 std::string coloured(Colour colour, std::string text)

@@ -1,6 +1,7 @@
 /// What commands print: names, documents and errors.
 #pragma once
 
+#include "host/text/digest.h"
 #include "host/text/json_text.h"
 
 #include "platform/sdk/OdString.h"
@@ -10,6 +11,8 @@
 
 namespace tav {
 
+/// Whether people see what is printed.
+bool isTerminal();
 /// Prints `text`, in UTF-8, as it stands.
 void print(std::string const& text);
 /// Prints a document for programs, with a line feed after it.
@@ -29,6 +32,10 @@ bool flushOutput();
 std::string shown(OdString const& name);
 /// A line of a message or of a file: on a terminal with the same escapes, tabs excepted; elsewhere as it stands.
 std::string shownLine(OdString const& line);
+
+/// A line in the form of sha256sum, so that it can check the list: a name with a line end or a backslash is escaped,
+/// and its line begins with a backslash.
+std::string digestLine(Digest const& digest, OdString const& path);
 
 enum class Colour { none, red, green };
 

@@ -1,5 +1,6 @@
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
+#include "host/cli/content_output.h"
 #include "host/cli/output.h"
 #include "host/commits/commit_names.h"
 #include "host/errors/failure.h"
@@ -88,11 +89,24 @@ void printForPeople(
     }
 }
 
+/// Whole names of branches and tags come first: they may hold a colon.
+std::optional<FileOfCommit>
+fileToShow(ShowOptions const& options, LocalDatabase const& database, common::RootPath const& root)
+{
+    bool const isCommit = options.json || findCommitIfAny(database, options.commit);
+    return isCommit ? std::nullopt : findFileOfCommit(options.commit, database, root);
+}
+
 } // namespace
 
 void showCommit(ShowOptions const& options)
 {
-    LocalDatabase const database = LocalDatabase::open(openRepository(""));
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    if (auto const file = fileToShow(options, database, root)) {
+        printContent(*file, root);
+        return;
+    }
     CommitRecord const commit = findCommit(database, options.commit);
     std::vector<CommittedChange> const changes = committedChanges(database.commits(), commit);
     if (!options.json) {

@@ -52,7 +52,7 @@ kutils::json::Array documentOf(std::vector<StagedEntry> const& entries)
     for (StagedEntry const& entry : entries) {
         kutils::json::Object object;
         object[L"path"] = jsonText(entry.path);
-        object[L"change"] = jsonText(valueOrFail(common::toString(entry.change), "Mend '.tav/tav.state'."));
+        object[L"change"] = jsonText(valueOrFail(common::toString(entry.change), "Correct '.tav/tav.state'."));
         object[L"missing"] = entry.isMissing;
         if (!entry.previousPath.isEmpty()) {
             object[L"previous"] = jsonText(entry.previousPath);
@@ -180,6 +180,43 @@ void printForPeople(Status const& status)
     }
 }
 
+void printShort(std::string const& letters, OdString const& path, OdString const& previous = OdString())
+{
+    print(letters + " " + (previous.isEmpty() ? "" : shown(previous) + " -> ") + shown(path) + "\n");
+}
+
+std::string stagedLetters(StagedEntry const& entry)
+{
+    char const change = !entry.previousPath.isEmpty()                  ? 'R'
+                        : entry.change == common::FileChange::added    ? 'A'
+                        : entry.change == common::FileChange::modified ? 'M'
+                                                                       : 'D';
+    return std::string(1, change) + (entry.isMissing ? 'D' : ' ');
+}
+
+/// Two letters and a path in a line, as git does: what is staged, and what is different from that in the folder.
+void printShort(Status const& status)
+{
+    for (StagedEntry const& entry : status.staged) {
+        printShort(stagedLetters(entry), entry.path, entry.previousPath);
+    }
+    for (OdString const& path : status.modified) {
+        printShort(" M", path);
+    }
+    for (OdString const& path : status.removed) {
+        printShort(" D", path);
+    }
+    for (auto const& [path, previous] : status.renamed) {
+        printShort(" R", path, previous);
+    }
+    for (OdString const& path : status.untracked) {
+        printShort("??", path);
+    }
+    for (OdString const& path : status.ignored) {
+        printShort("!!", path);
+    }
+}
+
 } // namespace
 
 void showStatus(StatusOptions const& options)
@@ -190,6 +227,8 @@ void showStatus(StatusOptions const& options)
     }
     if (options.json) {
         printDocument(status, options.ignored);
+    } else if (options.isShort) {
+        printShort(status);
     } else {
         printForPeople(status);
     }

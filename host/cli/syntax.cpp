@@ -5,6 +5,7 @@
 #include <CLI/CLI.hpp>
 
 #include <memory>
+#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -17,6 +18,12 @@ namespace {
 void addJson(CLI::App& command, bool& json)
 {
     command.add_flag("--json", json, "Print a document for programs");
+}
+
+/// The examples of a command, below its help.
+void addExamples(CLI::App& command, char const* examples)
+{
+    command.footer(std::string("Examples:\n") + examples);
 }
 
 void addInit(CLI::App& app)
@@ -35,8 +42,10 @@ void addInit(CLI::App& app)
 void addStatus(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("status", "Show what has changed and what is staged");
+    command->alias("st");
     auto const options = std::make_shared<StatusOptions>();
     command->add_flag("--ignored", options->ignored, "Show the files that the ignore rules keep out, too");
+    command->add_flag("-s,--short", options->isShort, "Show two letters and the path of each file, as git does");
     addJson(*command, options->json);
     command->callback([options] { showStatus(*options); });
 }
@@ -92,6 +101,7 @@ void addRm(CLI::App& app)
 void addCommit(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("commit", "Keep what is staged, removed and renamed as a new commit");
+    command->alias("ci");
     auto const options = std::make_shared<CommitOptions>();
     command->add_option("-m,--message", options->message, "What has changed, and why")->required();
     command->add_option("--author", options->author, "Who made it; by default your name and machine");
@@ -105,36 +115,77 @@ void addCommit(CLI::App& app)
     command->callback([options] { makeCommit(*options); });
 }
 
-void addLog(CLI::App& app)
+void addLog(CLI::App& app, std::optional<std::size_t> behindDashes)
 {
     CLI::App* const command = app.add_subcommand("log", "Show the history, newest first");
     auto const options = std::make_shared<LogOptions>();
+    options->arguments.names = behindDashes;
     command->add_option(
-        "COMMIT", options->start, "Number, hash, branch or tag to begin with; by default where you are");
-    command->add_option("-n,--count", options->count, "Show so many commits at most")
+        "NAME", options->arguments.words,
+        "The commit to begin with, by default where you are, and then files or folders whose history is shown");
+    command->add_option("-n,--count", options->count, "Show so many commits at most; -5 is the same as -n 5")
         ->type_name("COUNT")
         ->check(CLI::PositiveNumber);
+    command->add_option("--since", options->since, "Show commits of this date and later")->type_name("DATE");
+    command->add_option("--until", options->until, "Show commits of this date and earlier")->type_name("DATE");
+    command->add_option("--author", options->author, "Show commits of authors with this in their name")
+        ->type_name("TEXT");
+    command->add_flag("--all", options->all, "Show the history of all branches and tags");
+    command->add_flag("--oneline", options->oneline, "Show one line for each commit");
     addJson(*command, options->json);
-    command->callback([options] { showLog(*options); });
+    addExamples(
+        *command, "  tav log plans/roof.dwg                 all versions of a drawing, through renames\n"
+                  "  tav log -3 master                      the last three commits of a branch\n"
+                  "  tav log --since '2 weeks ago' plans    what has changed in a folder");
+    command->callback([options] {
+        if (auto const count = takeCount(options->arguments)) {
+            options->count = *count;
+        }
+        showLog(*options);
+    });
 }
 
 void addShow(CLI::App& app)
 {
-    CLI::App* const command = app.add_subcommand("show", "Show a commit and what it changed");
+    CLI::App* const command = app.add_subcommand("show", "Show a commit and what it changed, or a file of it");
     auto const options = std::make_shared<ShowOptions>();
     command->add_option(
         "COMMIT", options->commit,
-        "Number, hash, branch or tag, HEAD~2 or master@{yesterday}; by default where you are");
+        "Number, hash, branch or tag, HEAD~2 or master@{yesterday}; by default where you are. COMMIT:NAME is the "
+        "content of a file");
     addJson(*command, options->json);
+    addExamples(
+        *command, "  tav show @~1              the commit before\n"
+                  "  tav show 12:notes.txt     a file as commit 12 has it");
     command->callback([options] { showCommit(*options); });
 }
 
-void addDiff(CLI::App& app)
+void addCat(CLI::App& app)
 {
-    CLI::App* const command = app.add_subcommand("diff", "Show what is different from the last commit, in detail");
+    CLI::App* const command = app.add_subcommand("cat", "Print a file as a commit has it");
+    auto const name = std::make_shared<std::string>();
+    command->add_option("COMMIT:NAME", *name, "A commit, by default where you are, and the path of a file")->required();
+    addExamples(*command, "  tav cat 12:plans/roof.dwg >old-roof.dwg");
+    command->callback([name] { printFile(*name); });
+}
+
+void addDiff(CLI::App& app, std::optional<std::size_t> behindDashes)
+{
+    CLI::App* const command =
+        app.add_subcommand("diff", "Show what is different from the last commit, or between commits");
     auto const options = std::make_shared<DiffOptions>();
-    command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path; by default all");
+    options->arguments.names = behindDashes;
+    command->add_option(
+        "NAME", options->arguments.words,
+        "A commit to compare the working folder with, or two to compare; and paths of files or folders, or the end of "
+        "a path, by default all");
+    CLI::Option* const stat = command->add_flag("--stat", options->stat, "Show a line for each file and the total");
+    command->add_flag("--text", options->text, "Show the lines of texts however many there are")->excludes(stat);
     addJson(*command, options->json);
+    addExamples(
+        *command, "  tav diff                      what you have changed\n"
+                  "  tav diff tender master        what is different between a tag and a branch\n"
+                  "  tav diff @~2 -- notes.txt     what has changed in a file since the second commit before");
     command->callback([options] { showDifferences(*options); });
 }
 
@@ -188,6 +239,7 @@ std::shared_ptr<CheckoutOptions> addCheckoutOptions(CLI::App& command, char cons
 void addCheckout(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("checkout", "Make the working folder what it was at a commit");
+    command->alias("co");
     auto const options = addCheckoutOptions(*command, "COMMIT", "Number, hash, branch or tag");
     command->callback([options] { checkOut(*options); });
 }
@@ -222,8 +274,16 @@ void addFiles(CLI::App& app)
     CLI::App* const command = app.add_subcommand("files", "List the files that the repository keeps");
     auto const options = std::make_shared<FilesOptions>();
     command->add_option("FOLDER", options->folder, "The folder of a repository; by default the one you are in");
-    command->add_flag("--hash", options->hash, "Show the SHA-256 digest of each file, in the form of sha256sum");
+    CLI::Option* const hash =
+        command->add_flag("--hash", options->hash, "Show the SHA-256 digest of each file, in the form of sha256sum");
+    command->add_flag("--long", options->isLong, "Show the last commit of each file, its date and its author")
+        ->excludes(hash);
+    command->add_option("--at", options->commit, "List the files of a commit; --long does so with the current one")
+        ->type_name("COMMIT");
     addJson(*command, options->json);
+    addExamples(
+        *command, "  tav files --long            who changed each file last, and when\n"
+                  "  tav files --at master~10    the files of an earlier commit");
     command->callback([options] { listFiles(*options); });
 }
 
@@ -256,7 +316,7 @@ void addExport(CLI::App& app)
 
 } // namespace
 
-void addCommands(CLI::App& app)
+void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
 {
     addInit(app);
     addStatus(app);
@@ -265,9 +325,10 @@ void addCommands(CLI::App& app)
     addMv(app);
     addRm(app);
     addCommit(app);
-    addLog(app);
+    addLog(app, behindDashes);
     addShow(app);
-    addDiff(app);
+    addCat(app);
+    addDiff(app, behindDashes);
     addPreview(app);
     addCompare(app);
     addRestore(app);

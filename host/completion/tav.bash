@@ -62,17 +62,18 @@ _tav_offer_paths() { # LIST...
 _tav_options() { # COMMAND
     case $1 in
         init) printf '%s\n' --server ;;
-        status) printf '%s\n' --ignored --json ;;
+        status) printf '%s\n' --ignored -s --short --json ;;
         add | unstage) printf '%s\n' --all ;;
         commit) printf '%s\n' -m --message --author --all-removed --without-removed ;;
-        log) printf '%s\n' -n --count --json ;;
+        log) printf '%s\n' -n --count --since --until --author --all --oneline --json ;;
         preview | compare) printf '%s\n' -o --output --json ;;
         restore) printf '%s\n' --from --force ;;
         checkout | switch) printf '%s\n' --force ;;
         server) printf '%s\n' --send ;;
-        files) printf '%s\n' --hash --json ;;
+        files) printf '%s\n' --hash --long --at --json ;;
         ignore) printf '%s\n' --add --json ;;
-        show | diff | branch | tag | projects | verify) printf '%s\n' --json ;;
+        diff) printf '%s\n' --stat --text --json ;;
+        show | branch | tag | projects | verify) printf '%s\n' --json ;;
     esac
     printf '%s\n' -h --help
 }
@@ -82,8 +83,10 @@ _tav_value() { # COMMAND OPTION
     case $1:$2 in
         :-C | init:--server) _tav_offer_files -d ;;
         preview:-o | preview:--output | compare:-o | compare:--output) _tav_offer_files -f ;;
-        restore:--from) _tav_offer < <(_tav_references branch tag) ;;
+        restore:--from | files:--at) _tav_offer < <(_tav_references branch tag) ;;
         commit:-m | commit:--message | commit:--author | log:-n | log:--count | ignore:--add) ;;
+        log:--since | log:--until) _tav_offer_words today yesterday ;;
+        log:--author) ;;
         *) return 1 ;;
     esac
 }
@@ -92,7 +95,10 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
     case $1:$2 in
         add:*) _tav_offer_paths modified untracked ;;
         unstage:*) _tav_offer_paths staged ;;
-        diff:*) _tav_offer_paths modified untracked removed staged renamed ;;
+        diff:*)
+            _tav_offer_paths modified untracked removed staged renamed
+            _tav_offer < <(_tav_references branch tag)
+            ;;
         restore:*)
             _tav_offer_files -f
             _tav_offer < <(_tav_paths modified removed)
@@ -100,12 +106,16 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
         mv:[12] | rm:* | preview:1 | compare:1) _tav_offer_files -f ;;
         init:1 | server:1 | files:1 | export:2) _tav_offer_files -d ;;
         switch:1) _tav_offer < <(_tav_references branch) ;;
-        log:1 | show:1 | compare:[23] | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
+        log:*)
+            _tav_offer_files -f
+            (($2 > 1)) || _tav_offer < <(_tav_references branch tag)
+            ;;
+        show:1 | cat:1 | compare:[23] | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
     esac
 }
 
 _tav() {
-    local commands='init status add unstage mv rm commit log show diff preview compare restore checkout switch branch tag fetch server
+    local commands='init status add unstage mv rm commit log show cat diff preview compare restore checkout switch branch tag fetch server
         files ignore projects verify gc export'
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
     local command='' folder='' number=1 word i
@@ -118,7 +128,8 @@ _tav() {
             :*) command=$word ;;
             commit:-m | commit:--message | commit:--author | log:-n | log:--count) ((++i)) ;;
             preview:-o | preview:--output | compare:-o | compare:--output) ((++i)) ;;
-            ignore:--add | restore:--from | init:--server) ((++i)) ;;
+            log:--since | log:--until | log:--author) ((++i)) ;;
+            ignore:--add | restore:--from | files:--at | init:--server) ((++i)) ;;
             *:-*) ;;
             *) ((++number)) ;;
         esac

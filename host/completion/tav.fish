@@ -1,6 +1,6 @@
 # Completion of tav for fish: commands, options, files, branches and tags.
 
-set -l commands init status add unstage mv rm commit log show diff preview compare restore checkout switch branch tag fetch server \
+set -l commands init status add unstage mv rm commit log show cat diff preview compare restore checkout switch branch tag fetch server \
     files ignore projects verify gc export
 
 # Runs tav on the repository that the line names with -C, for what it knows.
@@ -69,8 +69,9 @@ __tav_command mv 'Rename a file or folder, and stage that' $commands
 __tav_command rm 'Remove committed files, and stage that' $commands
 __tav_command commit 'Keep what is staged, removed and renamed as a new commit' $commands
 __tav_command log 'Show the history, newest first' $commands
-__tav_command show 'Show a commit and what it changed' $commands
-__tav_command diff 'Show what is different from the last commit, in detail' $commands
+__tav_command show 'Show a commit and what it changed, or a file of it' $commands
+__tav_command cat 'Print a file as a commit has it' $commands
+__tav_command diff 'Show what is different from the last commit, or between commits' $commands
 __tav_command preview 'Show the preview picture of a drawing' $commands
 __tav_command compare 'Show two versions of a drawing as pictures, and what differs' $commands
 __tav_command restore 'Bring files back as a commit has them' $commands
@@ -91,6 +92,7 @@ functions -e __tav_command
 complete -c tav -n '__fish_seen_subcommand_from init' -l server -x -a '(__fish_complete_directories)' -d 'Where the history is kept'
 complete -c tav -n '__fish_seen_subcommand_from init' -a '(__fish_complete_directories)'
 complete -c tav -n '__fish_seen_subcommand_from status' -l ignored -d 'Show the files that the ignore rules keep out, too'
+complete -c tav -n '__fish_seen_subcommand_from status' -s s -l short -d 'Show two letters and the path of each file'
 complete -c tav -n '__fish_seen_subcommand_from status' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from add' -l all -d 'Stage every changed and new file'
 complete -c tav -n '__fish_seen_subcommand_from add' -a '(__tav_paths modified untracked)'
@@ -103,10 +105,19 @@ complete -c tav -n '__fish_seen_subcommand_from commit' -l author -x -d 'Who mad
 complete -c tav -n '__fish_seen_subcommand_from commit' -l all-removed -d 'Remove files that are gone even when many are'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l without-removed -d 'Keep files that are gone in the repository'
 complete -c tav -n '__fish_seen_subcommand_from log' -s n -l count -x -d 'Show so many commits at most'
+complete -c tav -n '__fish_seen_subcommand_from log' -l since -x -d 'Show commits of this date and later'
+complete -c tav -n '__fish_seen_subcommand_from log' -l until -x -d 'Show commits of this date and earlier'
+complete -c tav -n '__fish_seen_subcommand_from log' -l author -x -d 'Show commits of authors with this in their name'
+complete -c tav -n '__fish_seen_subcommand_from log' -l all -d 'Show the history of all branches and tags'
+complete -c tav -n '__fish_seen_subcommand_from log' -l oneline -d 'Show one line for each commit'
 complete -c tav -n '__fish_seen_subcommand_from log' -l json -d 'Print a document for programs'
-complete -c tav -n '__fish_seen_subcommand_from log' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from log' -F -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from show' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from show' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from cat' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from diff' -l stat -d 'Show a line for each file and the total'
+complete -c tav -n '__fish_seen_subcommand_from diff' -l text -d 'Show the lines of texts however many there are'
+complete -c tav -n '__fish_seen_subcommand_from diff' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from diff' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from diff' -a '(__tav_paths modified untracked removed staged renamed)'
 complete -c tav -n '__fish_seen_subcommand_from preview' -s o -l output -r -F -d 'Write the picture to this PNG file'
@@ -130,6 +141,8 @@ complete -c tav -n '__fish_seen_subcommand_from tag; and __tav_arguments 1 tag' 
 complete -c tav -n '__fish_seen_subcommand_from server' -l send -d 'Send the commits that are known here and not there'
 complete -c tav -n '__fish_seen_subcommand_from server' -a '(__fish_complete_directories)'
 complete -c tav -n '__fish_seen_subcommand_from files' -l hash -d 'Show the SHA-256 digest of each file'
+complete -c tav -n '__fish_seen_subcommand_from files' -l long -d 'Show the last commit of each file'
+complete -c tav -n '__fish_seen_subcommand_from files' -l at -x -a '(__tav_references branch tag)' -d 'List the files of a commit'
 complete -c tav -n '__fish_seen_subcommand_from files' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from files' -a '(__fish_complete_directories)'
 complete -c tav -n '__fish_seen_subcommand_from ignore' -l add -x -d 'A regular expression for names'

@@ -50,6 +50,8 @@ CREATE TABLE refs (
 ) WITHOUT ROWID;
 )";
 
+std::string const kChangeColumns = "SELECT number, path, url, previous_path FROM changes WHERE repository = ? ";
+
 constexpr char const* kCommitColumns = "SELECT number, hash, author, message, date FROM commits ";
 
 /// What turns the files of the parent into `files`.
@@ -139,6 +141,11 @@ void CommitTables::create(Database& database)
     database.run(kTables);
 }
 
+void CommitTables::createIndex(Database& database)
+{
+    database.run("CREATE INDEX changes_by_path ON changes (repository, path, number)");
+}
+
 void CommitTables::add(CommitRecord const& commit, std::vector<FileRecord> const& files)
 {
     addChanges(commit, changesBetween(commit.parents.empty() ? Tree() : this->files(commit.parents.front()), files));
@@ -183,6 +190,21 @@ std::optional<CommitRecord> CommitTables::find(std::int64_t number) const
     rows.with(repository_).with(number);
     std::vector<CommitRecord> found = readAll(std::move(rows));
     return found.empty() ? std::nullopt : std::optional(std::move(found.front()));
+}
+
+std::vector<CommitRecord> CommitTables::find(std::vector<std::int64_t> const& numbers) const
+{
+    ReadTransaction const transaction(*database_); // One lock for all of them.
+    Statement row = database_->prepare((std::string(kCommitColumns) + "WHERE repository = ? AND number = ?").c_str());
+    Statement parents = prepareParents();
+    std::vector<CommitRecord> commits;
+    for (std::int64_t const number : numbers) {
+        row.with(repository_).with(number);
+        while (row.next()) {
+            commits.push_back(commitOf(row, parents));
+        }
+    }
+    return commits;
 }
 
 std::vector<CommitRecord> CommitTables::withPrefix(OdString const& prefix) const
@@ -325,6 +347,70 @@ std::vector<OdString> CommitTables::urls() const
     return urls;
 }
 
+std::unordered_map<std::int64_t, std::vector<std::int64_t>> CommitTables::parents() const
+{
+    Statement rows =
+        database_->prepare("SELECT number, parent FROM parents WHERE repository = ? ORDER BY number, position");
+    rows.with(repository_);
+    std::unordered_map<std::int64_t, std::vector<std::int64_t>> parents;
+    while (rows.next()) {
+        parents[rows.integer(0)].push_back(rows.integer(1));
+    }
+    return parents;
+}
+
+bool CommitTables::hasPath(std::string const& path) const
+{
+    Statement file = database_->prepare("SELECT 1 FROM changes WHERE repository = ? AND path = ? LIMIT 1");
+    Statement below =
+        database_->prepare("SELECT 1 FROM changes WHERE repository = ? AND path > ? AND path < ? LIMIT 1");
+    std::string const first = path + "/";
+    std::string const end = path + "0"; // The character behind the slash.
+    return file.with(repository_).with(std::string_view(path)).next() ||
+           below.with(repository_).with(std::string_view(first)).with(std::string_view(end)).next();
+}
+
+std::vector<PathChange> CommitTables::changesOf(std::string const& path) const
+{
+    // Asked for `path = ?`, SQLite reads the whole table in its own order instead of the index: 150 ms for 400,000
+    // changes.
+    Statement rows = database_->prepare((kChangeColumns + "AND path >= ? AND path <= ? ORDER BY path, number").c_str());
+    rows.with(repository_).with(std::string_view(path)).with(std::string_view(path));
+    return readChanges(rows);
+}
+
+std::vector<PathChange> CommitTables::changesBelow(std::string const& folder) const
+{
+    if (folder.empty()) {
+        Statement rows = database_->prepare((kChangeColumns + "ORDER BY path, number").c_str());
+        rows.with(repository_);
+        return readChanges(rows);
+    }
+    std::string end = folder; // The first text behind all that begin so.
+    ++end.back();
+    Statement rows = database_->prepare((kChangeColumns + "AND path >= ? AND path < ? ORDER BY path, number").c_str());
+    rows.with(repository_).with(std::string_view(folder)).with(std::string_view(end));
+    return readChanges(rows);
+}
+
+std::vector<PathChange> CommitTables::readChanges(Statement& rows) const
+{
+    std::vector<PathChange> changes;
+    while (rows.next()) {
+        auto const text = [&](int column) { return std::string(rows.bytes(column)); };
+        changes.push_back({rows.integer(0), text(1), text(2), text(3)});
+    }
+    return changes;
+}
+
+std::optional<PathChange> CommitTables::renameFrom(std::int64_t commit, std::string const& path) const
+{
+    Statement rows = database_->prepare((kChangeColumns + "AND number = ? AND previous_path = ? LIMIT 1").c_str());
+    rows.with(repository_).with(commit).with(std::string_view(path));
+    std::vector<PathChange> found = readChanges(rows);
+    return found.empty() ? std::nullopt : std::optional(std::move(found.front()));
+}
+
 FileVersion CommitTables::firstFileAt(OdString const& url) const
 {
     Statement row =
@@ -370,26 +456,30 @@ std::int64_t CommitTables::numberOf(OdString const& hash) const
     return row.integer(0);
 }
 
-std::vector<OdString> CommitTables::parentsOf(std::int64_t number) const
+Statement CommitTables::prepareParents() const
 {
-    Statement rows = database_->prepare(R"(
+    return database_->prepare(R"(
         SELECT hash FROM parents JOIN commits
         ON commits.repository = parents.repository AND commits.number = parents.parent
         WHERE parents.repository = ? AND parents.number = ? ORDER BY position)");
-    rows.with(repository_).with(number);
-    std::vector<OdString> parents;
-    while (rows.next()) {
-        parents.push_back(rows.text(0));
+}
+
+CommitRecord CommitTables::commitOf(Statement const& row, Statement& parents) const
+{
+    CommitRecord commit{row.integer(0), row.text(1), row.text(2), row.text(3), row.integer(4), {}};
+    parents.with(repository_).with(commit.number);
+    while (parents.next()) {
+        commit.parents.push_back(parents.text(0));
     }
-    return parents;
+    return commit;
 }
 
 std::vector<CommitRecord> CommitTables::readAll(Statement rows) const
 {
+    Statement parents = prepareParents();
     std::vector<CommitRecord> commits;
     while (rows.next()) {
-        commits.push_back(
-            {rows.integer(0), rows.text(1), rows.text(2), rows.text(3), rows.integer(4), parentsOf(rows.integer(0))});
+        commits.push_back(commitOf(rows, parents));
     }
     return commits;
 }

@@ -13,6 +13,7 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <unordered_map>
 #include <vector>
 
 namespace tav {
@@ -39,6 +40,14 @@ struct FileRecord {
     OdString previousPath; ///< of a file that the commit renamed, else empty
 };
 
+/// The same beside the commit, for whole histories of a path.
+struct PathChange {
+    std::int64_t commit = 0;  ///< number
+    std::string path;         ///< as bytes, and so are the others: most of them are only compared
+    std::string url;          ///< empty when the commit has no such file any more
+    std::string previousPath; ///< of a file that the commit renamed, else empty
+};
+
 /// A file of a commit.
 struct FileVersion {
     OdString path;
@@ -63,6 +72,8 @@ public:
 
     /// Makes the tables in a new database.
     static void create(Database& database);
+    /// Makes the index that the histories of files are read with. Without it they are slow.
+    static void createIndex(Database& database);
 
     /// Adds a commit whose whole content is `files`; its parents must be there. Part of a `WriteTransaction` of the
     /// caller.
@@ -74,6 +85,8 @@ public:
 
     std::optional<CommitRecord> find(OdString const& hash) const;
     std::optional<CommitRecord> find(std::int64_t number) const;
+    /// The same for all of `numbers` that there are, in this order.
+    std::vector<CommitRecord> find(std::vector<std::int64_t> const& numbers) const;
     /// The commits whose hash begins with `prefix`, two at most.
     std::vector<CommitRecord> withPrefix(OdString const& prefix) const;
     /// All commits with a number above `number`, in ascending order.
@@ -86,6 +99,18 @@ public:
     std::int64_t lastWithoutGap() const;
     /// All commits from the number `first` on, in ascending order.
     std::vector<CommitNumber> numbersFrom(std::int64_t first) const;
+
+    /// The numbers of the parents of each commit that has some, in their order.
+    std::unordered_map<std::int64_t, std::vector<std::int64_t>> parents() const;
+
+    /// Whether any commit has, or has had, a file or folder `path`.
+    bool hasPath(std::string const& path) const;
+    /// What commits did to the file `path`, in ascending order of commits.
+    std::vector<PathChange> changesOf(std::string const& path) const;
+    /// The same for all files whose path begins with `folder`, the commits of each in ascending order.
+    std::vector<PathChange> changesBelow(std::string const& folder) const;
+    /// What a commit made of the file `path` that it renamed; none when it did not.
+    std::optional<PathChange> renameFrom(std::int64_t commit, std::string const& path) const;
 
     /// The files of a commit; none for an empty `hash`, which stands for what is before the first commit.
     FileList fileList(OdString const& hash) const;
@@ -107,9 +132,12 @@ public:
 
 private:
     std::int64_t numberOf(OdString const& hash) const;
-    std::vector<OdString> parentsOf(std::int64_t number) const;
+    std::vector<PathChange> readChanges(Statement& rows) const;
     /// Numbers of the commit and its first parents, the oldest first.
     std::vector<std::int64_t> line(OdString const& hash) const;
+    Statement prepareParents() const;
+    /// Of the row that a statement stands on.
+    CommitRecord commitOf(Statement const& row, Statement& parents) const;
     std::vector<CommitRecord> readAll(Statement statement) const;
 
     Database* database_;

@@ -1,6 +1,7 @@
 #include "host/repository/local_database.h"
 
 #include "host/errors/failure.h"
+#include "host/history/last_changes.h"
 #include "host/text/utf8.h"
 
 #include "platform/ut/Dir.h"
@@ -28,7 +29,7 @@ void makeFirstTables(Database& database)
 
 /// Each makes the next version out of the one before; a new file is version 0. Steps are added and never changed: files
 /// that earlier versions of tav made have to pass them all.
-constexpr std::array kSteps = {makeFirstTables, VerifiedFiles::create};
+constexpr std::array kSteps = {makeFirstTables, VerifiedFiles::create, CommitTables::createIndex, LastChanges::create};
 
 constexpr std::int64_t kVersion = kSteps.size();
 constexpr std::int64_t kFirstWithVerifiedFiles = 2;

@@ -1,5 +1,7 @@
 #include "host/text/dates.h"
 
+#include "host/text/plural.h"
+
 #include <array>
 #include <cstddef>
 #include <cstdlib>
@@ -99,7 +101,46 @@ std::optional<TimeSpan> timeAgo(std::string const& typed, std::int64_t now)
     return std::nullopt;
 }
 
+std::string age(std::int64_t seconds)
+{
+    constexpr std::int64_t kMinute = 60;
+    constexpr std::int64_t kHour = 60 * kMinute;
+    constexpr std::int64_t kDay = 24 * kHour;
+    auto const ago = [&](std::int64_t unit, char const* name) {
+        return counted(static_cast<std::size_t>(seconds / unit), name) + " ago";
+    };
+    if (seconds < kMinute) {
+        return "less than a minute ago";
+    }
+    if (seconds < kHour) {
+        return ago(kMinute, "minute");
+    }
+    if (seconds < kDay) {
+        return ago(kHour, "hour");
+    }
+    if (seconds < 14 * kDay) {
+        return ago(kDay, "day");
+    }
+    if (seconds < 60 * kDay) {
+        return ago(7 * kDay, "week");
+    }
+    return seconds < 730 * kDay ? ago(30 * kDay, "month") : ago(365 * kDay, "year");
+}
+
 } // namespace
+
+std::string localDate(std::int64_t date)
+{
+    std::tm const parts = localTime(date);
+    std::array<char, 64> text{};
+    std::strftime(text.data(), text.size(), "%Y-%m-%d %H:%M", &parts);
+    return text.data();
+}
+
+std::string shownDate(std::int64_t date, std::int64_t now)
+{
+    return date > now ? localDate(date) : age(now - date) + " (" + localDate(date) + ")";
+}
 
 std::optional<TimeSpan> parseDate(std::string const& typed, std::int64_t now)
 {

@@ -17,4 +17,9 @@ struct TimeSpan {
 /// "today", "yesterday", "3 days ago", with minutes, hours, days, weeks, months or years before `now`.
 std::optional<TimeSpan> parseDate(std::string const& typed, std::int64_t now);
 
+/// "2024-03-05 14:07", in local time.
+std::string localDate(std::int64_t date);
+/// "3 days ago (2024-03-05 14:07)", in local time; a date behind `now` alone.
+std::string shownDate(std::int64_t date, std::int64_t now);
+
 } // namespace tav

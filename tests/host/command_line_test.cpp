@@ -22,19 +22,20 @@ Options:
 
 Subcommands:
   init                        Make a folder of drawings a repository, or complete one
-  status                      Show what has changed and what is staged
+  status, st                  Show what has changed and what is staged
   add                         Stage changed and new files for the next commit
   unstage                     Take files out of the next commit; they stay as they are
   mv                          Rename a file or folder, and stage that
   rm                          Remove committed files, and stage that
-  commit                      Keep what is staged, removed and renamed as a new commit
+  commit, ci                  Keep what is staged, removed and renamed as a new commit
   log                         Show the history, newest first
-  show                        Show a commit and what it changed
-  diff                        Show what is different from the last commit, in detail
+  show                        Show a commit and what it changed, or a file of it
+  cat                         Print a file as a commit has it
+  diff                        Show what is different from the last commit, or between commits
   preview                     Show the preview picture of a drawing
   compare                     Show two versions of a drawing as pictures, and what differs
   restore                     Bring files back as a commit has them
-  checkout                    Make the working folder what it was at a commit
+  checkout, co                Make the working folder what it was at a commit
   switch                      Go on with the work on another branch
   branch                      List the branches, or make one
   tag                         List the tags, or make one
@@ -67,6 +68,7 @@ Usage: tav status [OPTIONS]
 Options:
   -h,--help                   Show this help and do nothing else
   --ignored                   Show the files that the ignore rules keep out, too
+  -s,--short                  Show two letters and the path of each file, as git does
   --json                      Print a document for programs
 
 )";
@@ -128,9 +130,14 @@ Positionals:
 
 Options:
   -h,--help                   Show this help and do nothing else
-  --hash                      Show the SHA-256 digest of each file, in the form of sha256sum
+  --hash Excludes: --long     Show the SHA-256 digest of each file, in the form of sha256sum
+  --long Excludes: --hash     Show the last commit of each file, its date and its author
+  --at COMMIT                 List the files of a commit; --long does so with the current one
   --json                      Print a document for programs
 
+Examples:
+  tav files --long            who changed each file last, and when
+  tav files --at master~10    the files of an earlier commit
 )";
 
 constexpr char const* kIgnoreHelp = R"(Show the rules for names to ignore, or add one
@@ -158,7 +165,8 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(
         HelpRow{"Main", {"--help"}, kMainHelp}, HelpRow{"MainShort", {"-h"}, kMainHelp},
         HelpRow{"Init", {"init", "--help"}, kInitHelp}, HelpRow{"InitShort", {"init", "-h"}, kInitHelp},
-        HelpRow{"BeforeTheCommand", {"-h", "init"}, kInitHelp},
+        HelpRow{"HelpAlone", {"help"}, kMainHelp}, HelpRow{"HelpOfACommand", {"help", "init"}, kInitHelp},
+        HelpRow{"HelpOfAnAlias", {"help", "st"}, kStatusHelp}, HelpRow{"BeforeTheCommand", {"-h", "init"}, kInitHelp},
         HelpRow{"BesideNames", {"add", "x", "--help"}, kAddHelp}, HelpRow{"Status", {"status", "--help"}, kStatusHelp},
         HelpRow{"Add", {"add", "--help"}, kAddHelp}, HelpRow{"Unstage", {"unstage", "--help"}, kUnstageHelp},
         HelpRow{"Mv", {"mv", "--help"}, kMvHelp}, HelpRow{"Rm", {"rm", "--help"}, kRmHelp},
@@ -309,6 +317,16 @@ TEST_F(CommandLine, TakesNamesInBracketsWhole)
     EXPECT_EQ(tav({"init", "[d]"}), done("Made a repository in '[d]'.\n"));
     EXPECT_EQ(tav({"-C", "[d]", "files"}), done(".tav/properties/ignore\n"));
     EXPECT_EQ(tav({"files", "[d]"}), done(".tav/properties/ignore\n"));
+}
+
+TEST_F(CommandLine, TakesWordsBehindDashesForNames)
+{
+    repo.add({"a.dwg", "--all", "-b", "план.dwg"});
+    EXPECT_EQ(tav({"add", "a.dwg", "--", "--all", "-b"}), done("Staged 3 files.\n"));
+    EXPECT_EQ(tav({"unstage", "--", "--all"}), done("Took 1 file out of the next commit.\n"));
+    EXPECT_EQ(
+        tav({"add", "--", "--"}),
+        failed("tav: No changed file matches '--'. Run 'tav status --ignored' to see what there is.\n"));
 }
 
 TEST_F(CommandLine, TakesNamesThatBeginWithAControlCharacterWhole)

@@ -249,9 +249,9 @@ TEST_F(Commit, KeepsBytesThatAreNotUtf8InTheLog)
     repo.write("a.dwg", "one");
     tav({"add", "a.dwg"});
     ASSERT_EQ(tav({"commit", "-m", "caf\xE9", "--author", "Andr\xE9@studio"}).code, 0);
-    EXPECT_EQ(
-        tav({"log"}), done("1  caf\xE9  (master)\n"
-                           "   Andr\xE9 \xE2\xA6\x81 less than a minute ago\n"));
+    EXPECT_THAT(
+        tav({"log"}).out, testing::StartsWith("1  caf\xE9  (master)\n"
+                                              "   Andr\xE9 \xE2\xA6\x81 less than a minute ago ("));
 }
 
 TEST_F(Commit, RefusesAnEmptyMessage)

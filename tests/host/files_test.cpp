@@ -1,6 +1,10 @@
-#include "tests/host/tav_test.h"
+#include "tests/host/history_test.h"
 
 #include "common/mu_common_versions.h"
+
+#include <gmock/gmock.h>
+
+#include <regex>
 
 namespace host_tests {
 namespace {
@@ -215,6 +219,56 @@ TEST_F(Files, MakesNothing)
     std::vector<std::string> const before = repo.list();
     tav({"files", "--hash"});
     EXPECT_EQ(repo.list(), before);
+}
+
+class CommittedFiles : public HistoryTest {
+protected:
+    CommittedFiles()
+    {
+        repo.write("план.dwg", "1");
+        repo.write("図面/屋根.dwg", "1");
+        commitAll("First");
+        repo.write("図面/屋根.dwg", "abc");
+        EXPECT_EQ(tav({"add", "."}).code, 0);
+        EXPECT_EQ(tav({"commit", "-m", "Second", "--author", "Борис@studio"}).code, 0);
+        repo.write("図面/屋根.dwg", "not committed");
+        repo.write("new.dwg", "not committed");
+    }
+
+    /// What it prints, with the same date everywhere.
+    std::string lines(Arguments const& arguments) const
+    {
+        return std::regex_replace(tav(arguments).out, std::regex("\\d{4}-\\d\\d-\\d\\d \\d\\d:\\d\\d"), "DATE");
+    }
+};
+
+TEST_F(CommittedFiles, AreListedWithTheCommitThatChangedThemLast)
+{
+    EXPECT_EQ(
+        lines({"files", "--long"}), "1  DATE  ann    .tav/properties/ignore\n"
+                                    "1  DATE  ann    план.dwg\n"
+                                    "2  DATE  Борис  図面/屋根.dwg\n");
+    EXPECT_THAT(values({"files", "--long"}, "commit"), testing::ElementsAre("1", "1", "2"));
+    EXPECT_THAT(
+        values({"files", "--long"}, "author"), testing::ElementsAre("ann@studio", "ann@studio", "Борис@studio"));
+    EXPECT_EQ(values({"files", "--long"}, "hash").at(2), values({"show", "2"}, "hash").at(0));
+}
+
+TEST_F(CommittedFiles, AreThoseOfTheCommitThatIsNamed)
+{
+    EXPECT_EQ(tav({"files", "--at", "1"}), done(".tav/properties/ignore\nплан.dwg\n図面/屋根.dwg\n"));
+    EXPECT_THAT(values({"files", "--long", "--at", "1"}, "commit"), testing::ElementsAre("1", "1", "1"));
+    EXPECT_THAT(values({"files", "--hash", "--at", "@"}, "sha256"), testing::Contains(kDigestOfAbc));
+    EXPECT_EQ(
+        tav({"files", "--at", "7"}),
+        failed("tav: There is no commit, branch or tag '7'. Run 'tav log' or 'tav branch' to see them.\n"));
+}
+
+TEST_F(CommittedFiles, ShowTheCommitThatRenamedThem)
+{
+    EXPECT_EQ(tav({"mv", "план.dwg", "plan.dwg"}).code, 0);
+    EXPECT_EQ(tav({"commit", "-m", "Third"}).code, 0);
+    EXPECT_THAT(values({"files", "--long"}, "commit"), testing::ElementsAre("1", "3", "2"));
 }
 
 } // namespace

@@ -30,7 +30,7 @@ protected:
     /// All values of the member `key` in the documents that a command prints, in their order.
     std::vector<std::string> values(Arguments arguments, std::string const& key) const
     {
-        arguments.push_back("--json");
+        arguments.insert(arguments.begin() + 1, "--json"); // Not at the end, where "--" makes names of all.
         std::string const text = tav(arguments).out;
         std::regex const member("\"" + key + "\" : \"?([^\",\n]*)");
         std::vector<std::string> found;

@@ -113,6 +113,19 @@ New, not staged:
 )"));
 }
 
+TEST_F(StatusOnCommit, ShowsTwoLettersForEachFile)
+{
+    commit({"m.dwg", "план.dwg", "屋根.dwg", "s.dwg"});
+    repo.write("m.dwg", "changed");
+    repo.write("s.dwg", "changed");
+    tav({"add", "s.dwg"});
+    tav({"mv", "屋根.dwg", "b.dwg"});
+    remove("план.dwg");
+    repo.add({"new.dwg"});
+    EXPECT_EQ(tav({"status", "-s"}), done("R  屋根.dwg -> b.dwg\nM  s.dwg\n M m.dwg\n D план.dwg\n?? new.dwg\n"));
+    EXPECT_EQ(tav({"st", "--short"}), tav({"status", "-s"}));
+}
+
 TEST_F(StatusOnCommit, ShowsARenamedFileOnce)
 {
     commit({"a.dwg"});
