@@ -10,12 +10,15 @@
 #include "platform/os/os_files.h"
 
 #include <filesystem>
+#include <vector>
 
 namespace tav {
 
 namespace {
 
 namespace fs = std::filesystem;
+
+constexpr char const* kIncoming = "/.tav-export";
 
 void prepare(std::string const& target)
 {
@@ -44,33 +47,55 @@ void checkPaths(Tree const& files)
     }
 }
 
+/// A folder that was empty before is empty again.
+void takeBack(std::vector<OdString> const& written, std::string const& target)
+{
+    std::error_code ignored;
+    fs::remove(target + kIncoming, ignored);
+    for (OdString const& path : written) {
+        fs::path place = fs::path(target) / path.ansi_str();
+        fs::remove(place, ignored);
+        while ((place = place.parent_path()) != target && fs::remove(place, ignored)) { // Fails for one that has files.
+        }
+    }
+}
+
+void exportTo(
+    std::string const& target, common::RootPath const& root, Tree const& files, std::vector<OdString>& written)
+{
+    LocalStorage storage(root);
+    os::Batch batch(target);
+    Progress progress("files", files.size());
+    for (auto const& [path, url] : files) {
+        progress.advance();
+        if (!isExported(path)) {
+            continue;
+        }
+        extract(storage, {path, url}, target + kIncoming);
+        written.push_back(path);
+        if (std::error_code const error = batch.place(target + kIncoming, path.ansi_str())) {
+            throw Failure("'" + path.ansi_str() + "' cannot be written: " + error.message() + ".", "Try again.");
+        }
+    }
+    if (std::error_code const error = batch.flush()) {
+        throw Failure("'" + target + "' cannot be flushed: " + error.message() + ".", "Check the disk.");
+    }
+}
+
 } // namespace
 
 std::size_t exportFiles(common::RootPath const& root, Tree const& files, std::string const& target)
 {
     checkPaths(files);
     prepare(target);
-    LocalStorage storage(root);
-    os::Batch batch(target);
-    Progress progress("files", files.size());
-    std::string const incoming = target + "/.tav-export";
-    std::size_t count = 0;
-    for (auto const& [path, url] : files) {
-        progress.advance();
-        if (!isExported(path)) {
-            continue;
-        }
-        extract(storage, {path, url}, incoming);
-        if (std::error_code const error = batch.place(incoming, path.ansi_str())) {
-            [[maybe_unused]] std::error_code const ignored = batch.remove(".tav-export");
-            throw Failure("'" + path.ansi_str() + "' cannot be written: " + error.message() + ".", "Try again.");
-        }
-        ++count;
+    std::vector<OdString> written;
+    try {
+        exportTo(target, root, files, written);
+    } catch (...) {
+        takeBack(written, target);
+        throw;
     }
-    if (std::error_code const error = batch.flush()) {
-        throw Failure("'" + target + "' cannot be flushed: " + error.message() + ".", "Check the disk.");
-    }
-    return count;
+    return written.size();
 }
 
 } // namespace tav

@@ -23,8 +23,8 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr char const* kAgain = "What has been written is whole; mend that and run the command again.";
-constexpr char const* kNothingYet = "Nothing has been written; mend that and run the command again.";
+constexpr char const* kAgain = "What has been written is whole; correct that and run the command again.";
+constexpr char const* kNothingYet = "Nothing has been written; correct that and run the command again.";
 constexpr std::uint64_t kBetweenFiles = 1000; ///< ns; the finest step that all file systems with fractions know
 
 /// The part of `path` that is there to be looked at: a file may stand where a folder was, or is to be.
@@ -135,7 +135,7 @@ private:
         }
         if (type != fs::file_type::regular) {
             throw Failure(
-                "'" + path.ansi_str() + "' is no ordinary file.", "Nothing has been written; move it away first.");
+                "'" + path.ansi_str() + "' is not a regular file.", "Nothing has been written; move it away first.");
         }
         auto const digest = fileDigest(root_.pathTo(path));
         if (!digest && discard_ != Discard::everything) {
@@ -178,7 +178,7 @@ private:
             bool const isFolder = entry->symlink_status(error).type() == fs::file_type::directory;
             if (!isFolder && update_.removals.count(fromUtf8(name)) == 0) {
                 throw Failure(
-                    "'" + name + "' lies in a folder whose place a file of the commit takes.",
+                    "'" + name + "' is in a folder that a file of the commit replaces.",
                     "Nothing has been written; move it away first.");
             }
         }

@@ -13,7 +13,7 @@ namespace tav {
 
 struct InitOptions {
     std::string folder = ".";
-    std::string server; ///< empty: where it was, or in the folder for data
+    std::optional<std::string> server; ///< none: where it was, or in the folder for data
 };
 void init(InitOptions const& options);
 

@@ -29,7 +29,10 @@ std::string absolute(std::string const& folder)
 /// The folder that the user named; empty when there is none.
 OdString namedServer(InitOptions const& options)
 {
-    return options.server.empty() ? OdString() : namedServerFolder(options.server);
+    if (options.server && options.server->empty()) {
+        throw Failure("The name after --server is empty.", "Name the folder of the server.");
+    }
+    return options.server ? namedServerFolder(*options.server) : OdString();
 }
 
 OdString namedOrDefault(OdString const& server)
@@ -92,6 +95,7 @@ void init(InitOptions const& options)
     os::FileLock lock = lockRepository(root, "init");
     makeIgnoreFile(root);
     makeState(root);
+    readState(root); // One that was there already may be damaged.
     std::string const found = LocalDatabase::isLost(root) ? rebuilt(root, folder, server) : std::string();
     LocalDatabase::make(root);
     WriteSession session(root, std::move(lock), Recovery::attempted);

@@ -160,7 +160,8 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     OdString const to = targetOf(from, typedTo, root);
     std::vector<Move> const moves = movesOf(from, to, scan(root));
     if (moves.empty()) {
-        throw Failure("'" + typedFrom + "' is no file or folder of the repository.", "Run 'tav files' to see those.");
+        throw Failure(
+            "'" + typedFrom + "' is not a file or folder of the repository.", "Run 'tav files' to see those.");
     }
     if (isInTav(from)) {
         throw Failure("'" + typedFrom + "' belongs to the repository itself.", "It has to stay where it is.");

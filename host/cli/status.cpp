@@ -103,7 +103,7 @@ void printConflicts(std::vector<common::ConflictInfo> const& conflicts)
     for (common::ConflictInfo const& conflict : conflicts) {
         paths.push_back(conflict.path);
     }
-    printGroup("Drawings in conflict:", "the other versions lie in '.tav/conflict'", "", Colour::red, paths);
+    printGroup("Drawings in conflict:", "the other versions are in '.tav/conflict'", "", Colour::red, paths);
 }
 
 std::string lineOf(StagedEntry const& entry)

@@ -55,7 +55,7 @@ void failIfInside(OdString const& server, std::string const& workingFolder)
     auto const isHidden = [](std::filesystem::path const& part) { return part != "." && part.string().front() == '.'; };
     if (std::none_of(relative.begin(), relative.end(), isHidden)) {
         throw Failure(
-            "'" + server.ansi_str() + "' lies in the working folder.", "Name a folder outside of it for the server.");
+            "'" + server.ansi_str() + "' is inside the working folder.", "Name a folder outside of it for the server.");
     }
 }
 

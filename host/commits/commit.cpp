@@ -66,7 +66,7 @@ OdString storeSteady(Draft& draft, LocalStorage& storage, OdString const& path)
             continue;
         }
         draft.pending.files[path] = indexRecord(static_cast<std::uint64_t>(before.modified), draft.start);
-        OdString const stored = valueOrFail(url, "Nothing has been committed; mend that and run the command again.");
+        OdString const stored = valueOrFail(url, "Nothing has been committed; correct that and run the command again.");
         draft.verified.push_back({path.ansi_str(), *digestOf(stored), before});
         return stored;
     }

@@ -47,7 +47,7 @@ void planStaged(common::State const& state, Tree const& base, common::RootPath c
             file.change != common::FileChange::removed && !ut::FileName::fileExists(root.pathTo(file.path));
         if (isGone && isSomethingElse(file.path, root)) {
             throw Failure(
-                "'" + file.path.ansi_str() + "' is staged, but it is no ordinary file any more.",
+                "'" + file.path.ansi_str() + "' is staged, but it is not a regular file any more.",
                 "Move what is there away, or run 'tav unstage' for it.");
         }
         if (isGone && base.count(file.path) == 0) {
@@ -96,7 +96,7 @@ void failForNothing(common::RepoChanges const& changes, common::RootPath const& 
     if (!hasChanges && !staged.hasValue()) {
         throw Failure(staged.error(), "Change something first.");
     }
-    throw Failure("Nothing is staged.", "Use 'tav add NAME' or 'tav add --all' to stage what the commit shall take.");
+    throw Failure("Nothing is staged.", "Use 'tav add NAME' or 'tav add --all' to stage what to commit.");
 }
 
 } // namespace tav

@@ -246,7 +246,7 @@ std::optional<std::string> linkOnTheWay(std::string const& root, OdString const&
     case os::Obstacle::Kind::none: return std::nullopt;
     case os::Obstacle::Kind::link:
         return quoted(way) + " is a symbolic link, which may lead out of the working folder.";
-    case os::Obstacle::Kind::notFolder: return quoted(way) + " is no folder.";
+    case os::Obstacle::Kind::notFolder: return quoted(way) + " is not a folder.";
     case os::Obstacle::Kind::unknown: break;
     }
     return quoted(way) + " cannot be examined: " + obstacle.error.message() + ".";

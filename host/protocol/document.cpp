@@ -27,7 +27,7 @@ Value parsed(OdString const& text)
 {
     Value value;
     if (!kutils::json::read_string(value, text)) {
-        throw Failure("The document is no JSON.", kNothingChanged);
+        throw Failure("The document is not valid JSON.", kNothingChanged);
     }
     return value;
 }

@@ -27,7 +27,7 @@ void checkRule(OdString const& rule)
         common::RepoIgnore::compile(rule);
     } catch (std::regex_error const&) {
         throw Failure(
-            "'" + rule.ansi_str() + "' is no regular expression that can be used.",
+            "'" + rule.ansi_str() + "' is not a valid regular expression.",
             "Rules match whole names: write '^.*\\.tmp$' for all names that end in '.tmp'.");
     }
 }
@@ -89,8 +89,7 @@ std::vector<OdString> ignoreRules(common::RootPath const& root)
         return common::RepoIgnore(root).rules();
     } catch (std::regex_error const&) {
         throw Failure(
-            "The ignore file '" + pathOf(root).ansi_str() +
-                "' has a rule that is no regular expression that can be used.",
+            "The ignore file '" + pathOf(root).ansi_str() + "' has a rule that is not a valid regular expression.",
             "Mend or remove it there.");
     }
 }

@@ -23,7 +23,7 @@ fs::path normalized(fs::path const& path)
 Failure noExpression(std::string const& name)
 {
     return Failure(
-        "No file is named '" + name + "', and it is no expression that can be used.",
+        "No file is named '" + name + "', and it is not a valid expression.",
         "Type the path of a file as 'tav status' shows it.");
 }
 

@@ -15,7 +15,7 @@ namespace tav {
 OdString pathInRepository(common::RootPath const& root, std::string const& typed);
 
 /// The path of the first unchanged file that `name` matches as an expression; empty when there is none.
-/// Throws `Failure` when it is no expression that can be used.
+/// Throws `Failure` when it is not a valid expression.
 OdString findUnchanged(std::string const& name, common::RepoChanges const& changes, common::RootPath const& root);
 
 /// Finds, among the files that a command can work on, the ones that a typed name means: the file of exactly that path;

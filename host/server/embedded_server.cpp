@@ -380,7 +380,7 @@ Database& EmbeddedServer::openDatabase()
     }
     if (missing_ == Missing::isAnError && !ut::FileName::fileExists(fromUtf8(folder_ + "/server.db"))) {
         throw withCode(
-            Failure("There is no server in '" + folder_ + "'.", "Bring it back; it may lie on a drive that is off."),
+            Failure("The server folder '" + folder_ + "' is missing.", "Connect its drive or move the folder back."),
             ServerError::noServer);
     }
     if (auto const error = os::makeFolders(folder_, kFolderPermissions)) {

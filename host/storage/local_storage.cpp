@@ -48,7 +48,7 @@ StorageUrl urlOf(OdString const& text)
 {
     std::optional<StorageUrl> const url = parseUrl(text);
     if (!url) {
-        throw StorageError(quoted(text) + " is no URL of this storage.");
+        throw StorageError(quoted(text) + " is not a URL of this storage.");
     }
     return *url;
 }

@@ -254,7 +254,7 @@ TEST_F(Add, FailsForANameThatIsNeitherAFileNorAnExpression)
             tav({"add", name}),
             failed(
                 "tav: No file is named '" + name +
-                "', and it is no expression that can be used. Type the path of a file as 'tav status' shows it.\n"));
+                "', and it is not a valid expression. Type the path of a file as 'tav status' shows it.\n"));
     }
     EXPECT_EQ(state(), kFreshState);
 }
@@ -399,7 +399,7 @@ TEST_F(Unstage, ChangesNothingWhenOneOfItsNamesIsBad)
         failed("tav: No staged file matches 'c.dwg'. Run 'tav status' to see what is staged.\n"));
     EXPECT_EQ(tav({"unstage", "a.dwg", "/x"}), outside("/x", repo.path()));
     EXPECT_EQ(
-        tav({"unstage", "a.dwg", "("}), failed("tav: No file is named '(', and it is no expression that can be used. "
+        tav({"unstage", "a.dwg", "("}), failed("tav: No file is named '(', and it is not a valid expression. "
                                                "Type the path of a file as 'tav status' "
                                                "shows it.\n"));
     EXPECT_EQ(

@@ -496,7 +496,7 @@ TEST_F(Moving, CheckoutPutsNoFileInThePlaceOfAFolderWithOtherFiles)
     repo.write("plan/inner/.notes", "mine");
     for (Arguments const& arguments : {Arguments{"checkout", "4"}, {"checkout", "4", "--force"}}) {
         EXPECT_EQ(
-            tav(arguments), failed("tav: 'plan/inner/.notes' lies in a folder whose place a file of the commit takes. "
+            tav(arguments), failed("tav: 'plan/inner/.notes' is in a folder that a file of the commit replaces. "
                                    "Nothing has been written; move it away first.\n"));
         EXPECT_EQ(repo.read("plan/x.dwg"), "in a folder");
     }
@@ -725,10 +725,10 @@ TEST_F(Moving, MissingServerIsNotMadeAgain)
     other.write("a.dwg", "one");
     tavIn(other.path(), {"add", "a.dwg"});
     EXPECT_EQ(
-        tavIn(other.path(), {"commit", "-m", "drawn"}),
-        failed(
-            "tav: There is no server in '" + server +
-            "'. Bring it back; it may lie on a drive that is off. If it has a new place, run 'tav server FOLDER'.\n"));
+        tavIn(other.path(), {"commit", "-m", "drawn"}), failed(
+                                                            "tav: The server folder '" + server +
+                                                            "' is missing. Connect its drive or move the folder back. "
+                                                            "If it has a new place, run 'tav server FOLDER'.\n"));
     EXPECT_FALSE(place.has("server"));
 }
 

@@ -147,7 +147,7 @@ TEST_F(Commit, SaysThatThereIsNothingToCommit)
     repo.write("a.dwg", "one");
     EXPECT_EQ(
         tav({"commit", "-m", "again"}),
-        failed("tav: Nothing is staged. Use 'tav add NAME' or 'tav add --all' to stage what the commit shall take.\n"));
+        failed("tav: Nothing is staged. Use 'tav add NAME' or 'tav add --all' to stage what to commit.\n"));
 }
 
 TEST_F(Commit, MakesNoSecondCommitWhenItsOrderIsRepeated)
@@ -424,7 +424,7 @@ TEST_F(Commit, RefusesAServerInTheWorkingFolder)
         tavIn(other.path(), {"init", "--server", "server"}),
         failed(
             "tav: '" + other.pathTo("server") +
-            "' lies in the working folder. Name a folder outside of it for the server.\n"));
+            "' is inside the working folder. Name a folder outside of it for the server.\n"));
     EXPECT_FALSE(other.has("server"));
     EXPECT_THAT(tavIn(other.path(), {"init", "--server", "."}).err, testing::HasSubstr("lies in the working folder"));
     EXPECT_EQ(tavIn(other.path(), {"init", "--server", ".server"}).code, 0);

@@ -193,7 +193,7 @@ TEST_F(WithoutRights, MovesTheFileBackWhenTheStateCannotBeWritten)
         asOrdinaryUser({"mv", "a.dwg", "b.dwg"}),
         text(failed(
             "tav: Error writing to file '" + repo.pathTo(".tav/tav.state") +
-            "'. The old state still stands; check the free space and your rights, and try again.\n")));
+            "'. The old state is unchanged; check the free space and your rights, and try again.\n")));
     EXPECT_EQ(repo.read("a.dwg"), "drawing");
     EXPECT_FALSE(repo.has("b.dwg"));
     EXPECT_EQ(state(), kFreshState);

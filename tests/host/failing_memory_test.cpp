@@ -92,7 +92,7 @@ protected:
             SCOPED_TRACE("request " + std::to_string(n) + ": " + testing::PrintToString(outcome));
             EXPECT_TRUE(isDue(outcome));
             Outcome const repeated = scene_.verifyAndRepeat(command_);
-            EXPECT_TRUE(repeated.code == 0 && repeated.err.empty()) << testing::PrintToString(repeated);
+            EXPECT_TRUE(isDone(repeated)) << testing::PrintToString(repeated);
             EXPECT_EQ(difference(after_, scene_.situation()), "");
         }
         tell(failures);

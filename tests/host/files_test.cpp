@@ -210,7 +210,7 @@ TEST_F(Files, FailsForAnIgnoreFileThatCannotBeUsed)
 {
     repo.ignore("[");
     EXPECT_EQ(
-        tav({"files"}), failed("tav: The ignore file has a rule that is no regular expression that can be used. "
+        tav({"files"}), failed("tav: The ignore file has a rule that is not a valid regular expression. "
                                "Mend '.tav/properties/ignore'.\n"));
 }
 

@@ -7,7 +7,7 @@ namespace {
 using Ignore = TavTest;
 
 constexpr char const* kNoExpression =
-    " is no regular expression that can be used. Rules match whole names: write '^.*\\.tmp$' for all names that end in "
+    " is not a valid regular expression. Rules match whole names: write '^.*\\.tmp$' for all names that end in "
     "'.tmp'.\n";
 
 TEST_F(Ignore, ShowsTheDefaultRulesWhereThereIsNoFileOfThem)
@@ -128,9 +128,8 @@ INSTANTIATE_TEST_SUITE_P(
 TEST_F(Ignore, FailsForAFileThatCannotBeUsed)
 {
     repo.ignore("^a$\n(\n");
-    std::string const message =
-        "tav: The ignore file '" + repo.pathTo(".tav/properties/ignore") +
-        "' has a rule that is no regular expression that can be used. Mend or remove it there.\n";
+    std::string const message = "tav: The ignore file '" + repo.pathTo(".tav/properties/ignore") +
+                                "' has a rule that is not a valid regular expression. Mend or remove it there.\n";
     EXPECT_EQ(tav({"ignore"}), failed(message));
     EXPECT_EQ(tav({"ignore", "--add", "^b$"}), failed(message));
     EXPECT_EQ(repo.read(".tav/properties/ignore"), "^a$\n(\n");

@@ -155,7 +155,7 @@ TEST_F(MissingFiles, AloneMakeNoCommitWhenTheyStay)
     lose("plan-1.dwg");
     EXPECT_EQ(
         commit({"--without-removed"}),
-        failed("tav: Nothing is staged. Use 'tav add NAME' or 'tav add --all' to stage what the commit shall take.\n"));
+        failed("tav: Nothing is staged. Use 'tav add NAME' or 'tav add --all' to stage what to commit.\n"));
 }
 
 TEST_F(MissingFiles, AreNotThoseThatTavRemoved)

@@ -258,7 +258,7 @@ TEST_F(Mv, FailsForWhatIsNotOfTheRepository)
     repo.makeLink("link", "plans");
     for (std::string const name : {"nothing", "x.bak", ".hidden", "empty", "link", "."}) {
         expectRefusal(
-            {name, "b.dwg"}, "'" + name + "' is no file or folder of the repository. Run 'tav files' to see those.");
+            {name, "b.dwg"}, "'" + name + "' is not a file or folder of the repository. Run 'tav files' to see those.");
     }
 }
 

@@ -156,7 +156,7 @@ TEST_F(NameFinder, ListsWhatAnExpressionMatchesThatMatchesSeveral)
 TEST_F(NameFinder, RefusesWhatIsNeitherAPathNorAnExpression)
 {
     EXPECT_EQ(
-        failureOf([&] { finder().find("a (1"); }), "No file is named 'a (1', and it is no expression that can be used. "
+        failureOf([&] { finder().find("a (1"); }), "No file is named 'a (1', and it is not a valid expression. "
                                                    "Type the path of a file as 'tav status' shows "
                                                    "it.");
 }
@@ -182,7 +182,7 @@ TEST(FindUnchanged, FindsTheFirstThatTheNameMatches)
     EXPECT_EQ(tav::findUnchanged("cellar", changes, root).ansi_str(), "");
     EXPECT_EQ(
         failureOf([&] { tav::findUnchanged("(", changes, root); }),
-        "No file is named '(', and it is no expression that can be used. Type the path of a file as 'tav status' shows "
+        "No file is named '(', and it is not a valid expression. Type the path of a file as 'tav status' shows "
         "it.");
 }
 

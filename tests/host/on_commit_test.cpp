@@ -391,7 +391,7 @@ TEST_F(Rm, FailsForNamesOfNoCommittedFile)
         failed("tav: '/x' is not located in the current repository. Name a file below '" + repo.path() + "'.\n"));
     EXPECT_EQ(tav({"rm", ""}), failed("tav: An empty name names no file. Type '.' for the folder that you are in.\n"));
     EXPECT_EQ(
-        tav({"rm", "("}), failed("tav: No file is named '(', and it is no expression that can be used. Type the path "
+        tav({"rm", "("}), failed("tav: No file is named '(', and it is not a valid expression. Type the path "
                                  "of a file as 'tav status' "
                                  "shows it.\n"));
     EXPECT_TRUE(repo.has("plans/a.dwg"));

@@ -304,11 +304,11 @@ void changeFiles(Scene const& scene)
     require(scene.tav({"add", "--all"}).code == 0, "stage");
 }
 
-/// A file that is as the other commit has it is no change there.
-void stageWhatIsWanted(Scene const& scene)
+/// What is staged where the two commits agree is carried along.
+void stageNewFile(Scene const& scene)
 {
-    scene.write("note.txt", "first");
-    require(scene.tav({"add", "note.txt"}).code == 0, "stage");
+    scene.write("carried.txt", "along");
+    require(scene.tav({"add", "carried.txt"}).code == 0, "stage");
 }
 
 /// What a commit that was interrupted leaves in the storage, and what killed commands leave beside it.
@@ -385,12 +385,17 @@ std::vector<SceneRow> const& historyRows()
     return rows;
 }
 
+bool isDone(Outcome const& outcome)
+{
+    return outcome.code == 0 && (outcome.err.empty() || outcome.err.rfind("tav: Completed commit ", 0) == 0);
+}
+
 std::vector<SceneRow> const& sceneRows()
 {
     static std::vector<SceneRow> const rows = {
         {"Commit", {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"}, changeFiles},
         {"Restore", {"restore", "plan.dwg", "note.txt", "old/gone.dwg", "--from", "1"}, [](Scene const&) {}},
-        {"Checkout", {"checkout", "1"}, stageWhatIsWanted},
+        {"Checkout", {"checkout", "1"}, stageNewFile},
         {"Gc", {"gc"}, storeWhatNobodyNeeds}};
     return rows;
 }

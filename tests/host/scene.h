@@ -79,6 +79,9 @@ std::string difference(std::string const& before, std::string const& after);
 /// do, and nothing else.
 std::string faultOfFailure(Outcome const& outcome);
 
+/// Whether a command that was repeated has succeeded. It may say that it has completed what was interrupted.
+bool isDone(Outcome const& outcome);
+
 /// The commands whose failures and crashes are tested: each writes, replaces and removes something.
 std::vector<SceneRow> const& sceneRows();
 

@@ -84,8 +84,8 @@ TEST_F(ServerPlace, FollowsAMovedServer)
     move("server", "moved");
     EXPECT_EQ(
         tav({"fetch"}), failed(
-                            "tav: There is no server in '" + server() +
-                            "'. Bring it back; it may lie on a drive that is off. If it has a new place, run 'tav "
+                            "tav: The server folder '" + server() +
+                            "' is missing. Connect its drive or move the folder back. If it has a new place, run 'tav "
                             "server FOLDER'.\n"));
     EXPECT_EQ(tav({"server", "../moved"}), done("The history is kept in '" + place.pathTo("moved") + "' now.\n"));
     commitFile("note.txt", "more", "third");
@@ -106,7 +106,7 @@ TEST_F(ServerPlace, IsNoServerWithAnotherHistory)
                          "The folder of the server is '" + place.pathTo("strange") +
                          "'. Run 'tav server FOLDER' with the one that has it, or add --send to make it "
                          "there.\n"));
-    EXPECT_THAT(tav({"server", place.pathTo("nowhere")}).err, StartsWith("tav: There is no server in "));
+    EXPECT_THAT(tav({"server", place.pathTo("nowhere")}).err, StartsWith("tav: The server folder '"));
     EXPECT_THAT(tav({"server", "https://tav.example.org"}).err, HasSubstr(" is a URL"));
     EXPECT_THAT(tav({"server", "."}).err, HasSubstr("lies in the working folder"));
     EXPECT_THAT(tav({"server"}).out, StartsWith("The history is kept in '" + server() + "'"));
@@ -271,7 +271,7 @@ TEST_F(ServerPlace, IsMadeAnewWhereTheServerIsLost)
 {
     std::string const before = history();
     fs::remove_all(server());
-    EXPECT_THAT(tav({"server", "--send"}).err, StartsWith("tav: There is no server in "));
+    EXPECT_THAT(tav({"server", "--send"}).err, StartsWith("tav: The server folder '"));
     EXPECT_FALSE(place.has("server"));
     EXPECT_EQ(
         tav({"server", place.pathTo("new"), "--send"}),

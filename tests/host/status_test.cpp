@@ -97,7 +97,7 @@ TEST_F(StatusOfEverything, IsShownInGroupsWithHints)
     EXPECT_EQ(tav({"status"}), done(R"(On branch north wing
 
 Drawings in conflict:
-  (the other versions lie in '.tav/conflict')
+  (the other versions are in '.tav/conflict')
         plans/ground.dwg
         roof.dwg
 
@@ -201,7 +201,7 @@ TEST_F(StatusOfEverything, IsColouredOnATerminal)
         tavOnTerminal({"status", "--ignored"}), done("On branch north wing\n"
                                                      "\n"
                                                      "Drawings in conflict:\n"
-                                                     "  (the other versions lie in '.tav/conflict')\n"
+                                                     "  (the other versions are in '.tav/conflict')\n"
                                                      "        \x1b[31mplans/ground.dwg\x1b[m\n"
                                                      "        \x1b[31mroof.dwg\x1b[m\n"
                                                      "\n"
@@ -365,8 +365,10 @@ TEST_P(BrokenState, IsToldAndLeftAsItIs)
 {
     repo.add({"a.dwg"});
     repo.write(".tav/tav.state", GetParam().state);
-    std::string const message =
-        std::string("tav: ") + GetParam().message + " Run 'tav init' if '.tav/tav.state' is missing; mend it if not.\n";
+    std::string const message = std::string("tav: ") + GetParam().message +
+                                " '.tav/tav.state' is damaged: move it away and run 'tav init'; only staging and the "
+                                "current branch are lost.\n";
+    EXPECT_EQ(tav({"init"}), failed(message));
     EXPECT_EQ(tav({"status"}), failed(message));
     EXPECT_EQ(tav({"add", "a.dwg"}), failed(message));
     EXPECT_EQ(tav({"unstage", "a.dwg"}), failed(message));
@@ -390,8 +392,8 @@ TEST_F(Status, FailsWithoutAState)
 {
     support::TempRepository const bare;
     bare.add({"a.dwg"});
-    std::string const message = "tav: No state file found at " + bare.pathTo(".tav/tav.state") +
-                                ". Run 'tav init' if '.tav/tav.state' is missing; mend it if not.\n";
+    std::string const message =
+        "tav: No state file found at " + bare.pathTo(".tav/tav.state") + ". Run 'tav init' to make it.\n";
     EXPECT_EQ(tavIn(bare.path(), {"status"}), failed(message));
     EXPECT_EQ(tavIn(bare.path(), {"mv", "a.dwg", "b.dwg"}), failed(message));
     EXPECT_TRUE(bare.has("a.dwg"));
@@ -402,7 +404,7 @@ TEST_F(Status, FailsForAnIgnoreFileThatCannotBeUsed)
 {
     repo.add({"a.dwg"});
     repo.ignore("^a$\n(\n");
-    Outcome const broken = failed("tav: The ignore file has a rule that is no regular expression that can be used. "
+    Outcome const broken = failed("tav: The ignore file has a rule that is not a valid regular expression. "
                                   "Mend '.tav/properties/ignore'.\n");
     EXPECT_EQ(tav({"status"}), broken);
     EXPECT_EQ(tav({"status", "--ignored"}), broken);

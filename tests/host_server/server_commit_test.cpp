@@ -211,7 +211,7 @@ INSTANTIATE_TEST_SUITE_P(
     Shape, ServerCommitRefusal,
     testing::Values(
         Row{"NoJson", "{", "", "The document must be of type object, not string."},
-        Row{"NoJsonAtAll", "{\"commits\"", "#", "The document is no JSON."},
+        Row{"NoJsonAtAll", "{\"commits\"", "#", "The document is not valid JSON."},
         Row{"NoCommits", "\"commits\"", "\"c\"", "The document lacks the member 'commits'."},
         Row{"NoAnnotation", "\"annotation\"", "\"c\"", "'commits[0]' lacks the member 'annotation'."},
         Row{"NoAuthor", "\"author\"", "\"c\"", "'commits[0].annotation' lacks the member 'author'."},

@@ -105,7 +105,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NoRepository", "fetch", "[]", "The request 'fetch' must name a repository."},
         Row{"EmptyRepository", "commit ", "{}", "The request 'commit' must name a repository."},
         Row{"NeedlessRepository", "init <id>", "{}", "The request 'init' concerns no repository."},
-        Row{"InitOfNoJson", "init", "", "The document is no JSON."},
+        Row{"InitOfNoJson", "init", "", "The document is not valid JSON."},
         Row{"InitOfAnArray", "init", "[]", "The document must be of type object, not array."},
         Row{"InitWithoutName", "init", "{}", "The document lacks the member 'name'."},
         Row{"InitWithNumber", "init", R"({"name":1})", "'name' must be of type string, not int."},
@@ -138,7 +138,7 @@ TEST_F(ServerRequestOfHostileText, CutOffAnywhereIsAnError)
     for (std::size_t length = 0; length < whole.size(); ++length) {
         ASSERT_EQ(
             ask("commit <id>", whole.substr(0, length)),
-            "error: The document is no JSON. Nothing has changed on the server.")
+            "error: The document is not valid JSON. Nothing has changed on the server.")
             << "cut at " << length;
     }
 }

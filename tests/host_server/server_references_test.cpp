@@ -103,7 +103,7 @@ TEST_F(ServerReferences, AreCheckedLikeThoseOfACommit)
     EXPECT_EQ(
         move(R"([{"commitHash":"<b>","expected":"b","name":"new","refType":"tag"}])"),
         "error: '[0].expected' must be a hash of 64 lower-case hexadecimal digits. Nothing has changed on the server.");
-    EXPECT_EQ(move(""), "error: The document is no JSON. Nothing has changed on the server.");
+    EXPECT_EQ(move(""), "error: The document is not valid JSON. Nothing has changed on the server.");
 }
 
 } // namespace

@@ -272,7 +272,7 @@ TEST(LinkOnTheWay, IsAFileWhereAFolderShouldBe)
 {
     support::TempFolder const folder;
     folder.write("a/b", "");
-    EXPECT_EQ(obstacle(folder, L"a/b/c/d"), "'a/b' is no folder.");
+    EXPECT_EQ(obstacle(folder, L"a/b/c/d"), "'a/b' is not a folder.");
 }
 
 TEST(LinkOnTheWay, LetsTheWorkingFolderItselfBeALink)

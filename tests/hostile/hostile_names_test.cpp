@@ -275,7 +275,7 @@ TEST_F(HardLink, OfARevisionStoreStopsCommits)
         failed(
             "tav: The revision store '" + name +
             "' has another name, and what is written would show there too: put a copy in its place. Nothing has been "
-            "committed; mend that and run the command again.\n"));
+            "committed; correct that and run the command again.\n"));
     EXPECT_EQ(elsewhere.read("other"), before);
     std::filesystem::remove(elsewhere.pathTo("other"));
     EXPECT_EQ(commitAll("second").code, 0);

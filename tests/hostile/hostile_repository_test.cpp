@@ -146,13 +146,13 @@ TEST_F(OddRepository, WithAPipeAmongItsFilesIsNotHeldUp)
     EXPECT_EQ(tav({"add", "a.dwg"}).code, 0);
     EXPECT_EQ(
         tav({"restore", "a.dwg", "--force"}),
-        failed("tav: 'a.dwg' is no ordinary file. Nothing has been written; move it away first.\n"));
+        failed("tav: 'a.dwg' is not a regular file. Nothing has been written; move it away first.\n"));
 }
 
 TEST_F(OddRepository, CommitsNoRemovalWhereSomethingElseHasThePlaceOfAFile)
 {
     std::string const complaint =
-        "tav: 'a.dwg' is staged, but it is no ordinary file any more. Move what is there away, "
+        "tav: 'a.dwg' is staged, but it is not a regular file any more. Move what is there away, "
         "or run 'tav unstage' for it.\n";
     putPipe("a.dwg");
     EXPECT_EQ(tav({"add", "a.dwg"}).code, 0);

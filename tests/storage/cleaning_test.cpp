@@ -124,7 +124,7 @@ TEST_F(Cleaning, LeavesAStoreAsItIsInWhichSomethingToKeepIsDamaged)
 TEST_F(Cleaning, RefusesAUrlThatIsNone)
 {
     std::string const url = store("plan.dwg", "abc");
-    EXPECT_EQ(keepOnly({url, "tf:x"}), "'tf:x' is no URL of this storage.");
+    EXPECT_EQ(keepOnly({url, "tf:x"}), "'tf:x' is not a URL of this storage.");
     EXPECT_TRUE(contains(url));
 }
 

@@ -352,7 +352,7 @@ TEST_F(LocalStorage, SaysWhatIsKept)
     EXPECT_FALSE(contains(other));
     EXPECT_FALSE(contains("po:" + kAbc));
     EXPECT_FALSE(contains("tf:x#" + kAbc));
-    EXPECT_EQ(messageOf(newStorage().contains(L"po:1")), "'po:1' is no URL of this storage.");
+    EXPECT_EQ(messageOf(newStorage().contains(L"po:1")), "'po:1' is not a URL of this storage.");
     EXPECT_EQ(verify(other), "'" + other + "' is not in the storage.");
     EXPECT_EQ(messageOf(newStorage().size(support::fromUtf8(other))), "'" + other + "' is not in the storage.");
 }
