@@ -16,7 +16,7 @@ std::string defaultServerFolder();
 /// The folder of a server that the user names, as an absolute path. Throws `Failure` for a URL.
 OdString namedServerFolder(std::string const& typed);
 
-/// Throws `Failure` when the folder `server` lies in the working folder and is not hidden: it would be versioned, and
+/// Throws `Failure` when the folder `server` is inside the working folder and is not hidden: it would be versioned, and
 /// going back to an earlier commit would take the server back too.
 void failIfInside(OdString const& server, std::string const& workingFolder);
 

@@ -349,8 +349,9 @@ std::vector<OdString> CommitTables::urls() const
 
 std::unordered_map<std::int64_t, std::vector<std::int64_t>> CommitTables::parents() const
 {
-    Statement rows =
-        database_->prepare("SELECT number, parent FROM parents WHERE repository = ? ORDER BY number, position");
+    // A parent has a lower number. In a database from a stranger it may not, and a walk along a circle would never end.
+    Statement rows = database_->prepare(
+        "SELECT number, parent FROM parents WHERE repository = ? AND parent < number ORDER BY number, position");
     rows.with(repository_);
     std::unordered_map<std::int64_t, std::vector<std::int64_t>> parents;
     while (rows.next()) {

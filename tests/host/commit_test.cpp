@@ -426,7 +426,7 @@ TEST_F(Commit, RefusesAServerInTheWorkingFolder)
             "tav: '" + other.pathTo("server") +
             "' is inside the working folder. Name a folder outside of it for the server.\n"));
     EXPECT_FALSE(other.has("server"));
-    EXPECT_THAT(tavIn(other.path(), {"init", "--server", "."}).err, testing::HasSubstr("lies in the working folder"));
+    EXPECT_THAT(tavIn(other.path(), {"init", "--server", "."}).err, testing::HasSubstr("is inside the working folder"));
     EXPECT_EQ(tavIn(other.path(), {"init", "--server", ".server"}).code, 0);
 }
 

@@ -222,7 +222,7 @@ TEST_F(WithoutRights, ReportsEveryFileThatCannotBeDigested)
     chmod(repo.pathTo(".tav/properties/ignore").c_str(), 0444);
     std::string const errors = "tav: 'a.dwg' cannot be read. Check your rights to it.\n"
                                "tav: 'b\\xFF .dwg' cannot be read. Check your rights to it.\n"
-                               "tav: 2 of 4 files could not be read. Mend that and run the command again.\n";
+                               "tav: 2 of 4 files could not be read. Correct that and run the command again.\n";
     std::string const answer = asOrdinaryUser({"files", "--hash"});
     EXPECT_EQ(answer.substr(answer.find("--- err ---\n")), "--- err ---\n" + errors + "---");
     EXPECT_NE(
@@ -247,7 +247,7 @@ TEST_F(WithoutRights, LeavesTheDigestOutOfADocumentWhereAFileCannotBeRead)
 ]
 )",
              "tav: 'a.dwg' cannot be read. Check your rights to it.\n"
-             "tav: 1 of 1 files could not be read. Mend that and run the "
+             "tav: 1 of 1 files could not be read. Correct that and run the "
              "command again.\n"}));
 }
 

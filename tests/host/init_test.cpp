@@ -67,7 +67,10 @@ TEST_F(Init, LeavesWhatIsThereAsItIs)
 TEST_F(Init, LeavesABrokenStateToItsOwner)
 {
     place.write(".tav/tav.state", "broken");
-    EXPECT_EQ(tav({"init"}), done("The repository in '.' was there already; it is complete.\n"));
+    EXPECT_EQ(
+        tav({"init"}),
+        failed("tav: Unable to parse json, please check if syntax is valid. '.tav/tav.state' is damaged: move it away "
+               "and run 'tav init'; only staging and the current branch are lost.\n"));
     EXPECT_EQ(place.read(".tav/tav.state"), "broken");
 }
 

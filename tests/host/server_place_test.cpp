@@ -108,7 +108,7 @@ TEST_F(ServerPlace, IsNoServerWithAnotherHistory)
                          "there.\n"));
     EXPECT_THAT(tav({"server", place.pathTo("nowhere")}).err, StartsWith("tav: The server folder '"));
     EXPECT_THAT(tav({"server", "https://tav.example.org"}).err, HasSubstr(" is a URL"));
-    EXPECT_THAT(tav({"server", "."}).err, HasSubstr("lies in the working folder"));
+    EXPECT_THAT(tav({"server", "."}).err, HasSubstr("is inside the working folder"));
     EXPECT_THAT(tav({"server"}).out, StartsWith("The history is kept in '" + server() + "'"));
 }
 
