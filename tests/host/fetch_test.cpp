@@ -4,9 +4,9 @@
 #include "tests/host/history_test.h"
 
 #include <gmock/gmock.h>
-#include <regex>
 
 #include <filesystem>
+#include <regex>
 
 namespace host_tests {
 namespace {
