@@ -66,8 +66,8 @@ void release(void* memory) noexcept
 
 // A request that no machine can meet fails as it does without the address sanitizer, which would end the process
 // instead.
-extern "C" char const*
-__asan_default_options() // NOLINT(bugprone-reserved-identifier): the sanitizer asks for this name
+// NOLINTNEXTLINE(bugprone-reserved-identifier): the sanitizer, a shared library, asks for this name.
+extern "C" __attribute__((visibility("default"))) char const* __asan_default_options()
 {
     return "allocator_may_return_null=1";
 }
