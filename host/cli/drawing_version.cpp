@@ -15,8 +15,10 @@
 #include "common/mu_common_repo_files.h"
 #include "platform/os/os_files.h"
 
+#include <array>
 #include <cstdint>
 #include <cstdlib>
+#include <filesystem>
 #include <string_view>
 #include <unistd.h>
 #include <utility>
@@ -41,9 +43,19 @@ Image pictureOrFail(DrawingPicture found, std::string const& label)
     return std::move(*found.image);
 }
 
+void failIfTooLong(std::uint64_t length, std::string const& label)
+{
+    if (length > kLongestDrawing) {
+        throw Failure("'" + label + "' is longer than 512 MB.", "Its picture is not looked for.");
+    }
+}
+
 std::string contentInFolder(common::RootPath const& root, OdString const& path)
 {
     std::string const file = root.pathTo(path).ansi_str();
+    std::error_code unknown;
+    std::uintmax_t const length = std::filesystem::file_size(file, unknown);
+    failIfTooLong(unknown ? 0 : length, shown(path));
     std::string content;
     if (std::error_code const error = os::readFile(file, content)) {
         throw Failure("'" + shown(path) + "' cannot be read: " + error.message() + ".", "Check the name.");
@@ -55,9 +67,7 @@ std::string contentOf(common::RootPath const& root, OdString const& url, std::st
 {
     LocalStorage storage(root);
     auto const length = storage.size(url);
-    if (length.hasValue() && length.value() > kLongestDrawing) {
-        throw Failure("'" + label + "' is longer than 512 MB.", "Its picture is not looked for.");
-    }
+    failIfTooLong(length.hasValue() ? length.value() : 0, label);
     std::string content;
     valueOrFail(
         storage.read(
@@ -112,6 +122,19 @@ fileOf(Tree const& files, std::string const& typed, CommitRecord const& commit, 
     return *files.find(found.front().path);
 }
 
+/// Whether nothing, an empty file or a PNG file has this name. What cannot be read may be a drawing.
+bool mayBeReplaced(std::string const& file)
+{
+    os::Handle handle;
+    if (std::error_code const error = os::openForReading(file, handle)) {
+        return error == std::errc::no_such_file_or_directory;
+    }
+    std::array<char, kPngSignature.size()> beginning{};
+    std::size_t count = 0;
+    std::error_code const error = os::readBytes(handle, beginning.data(), beginning.size(), count);
+    return !error && (count == 0 || std::string_view(beginning.data(), count) == kPngSignature);
+}
+
 } // namespace
 
 DrawingVersion drawingVersion(
@@ -130,9 +153,7 @@ DrawingVersion drawingVersion(
 
 void writePicture(Image const& image, std::string const& file)
 {
-    std::string old;
-    bool const isThere = !os::readFile(file, old);
-    if (isThere && !old.empty() && old.compare(0, kPngSignature.size(), kPngSignature) != 0) {
+    if (!mayBeReplaced(file)) {
         throw Failure("'" + file + "' is there already, and is not a PNG file.", "Name another file with -o.");
     }
     std::string const png = encodePng(image);

@@ -21,7 +21,7 @@ struct DrawingVersion {
 DrawingVersion drawingVersion(
     common::RootPath const& root, LocalDatabase const& database, std::string const& typed, std::string const& commit);
 
-/// Writes `image` as a PNG file. Throws `Failure`; a file that is no PNG is not overwritten.
+/// Writes `image` as a PNG file. Throws `Failure`; a file that is not a PNG file is not overwritten.
 void writePicture(Image const& image, std::string const& file);
 
 /// Shows `image` where the terminal can; otherwise throws `Failure` with the advice to write a file.

@@ -93,6 +93,32 @@ TEST_F(PreviewTest, OverwritesNoDrawing)
     EXPECT_EQ(repo.read("plan.dwg"), before);
 }
 
+TEST_F(PreviewTest, OverwritesNoFileThatBeginsLikeAPicture)
+{
+    std::string const almost = "\x89PNG\r\n and what else it holds";
+    repo.write("notes.txt", almost);
+    EXPECT_EQ(
+        tav({"preview", "plan.dwg", "-o", "notes.txt"}),
+        failed("tav: 'notes.txt' is there already, and is not a PNG file. Name another file with -o.\n"));
+    EXPECT_EQ(repo.read("notes.txt"), almost);
+}
+
+TEST_F(PreviewTest, OverwritesNothingThatCannotBeRead)
+{
+    repo.makeFolder("folder");
+    EXPECT_EQ(
+        tav({"preview", "plan.dwg", "-o", "folder"}),
+        failed("tav: 'folder' is there already, and is not a PNG file. Name another file with -o.\n"));
+}
+
+TEST_F(PreviewTest, RefusesADrawingThatIsTooLongToBeHeld)
+{
+    std::filesystem::resize_file(repo.pathTo("plan.dwg"), (std::uintmax_t{1} << 29) + 1);
+    EXPECT_EQ(
+        tav({"preview", "plan.dwg", "-o", "out.png"}),
+        failed("tav: 'plan.dwg' is longer than 512 MB. Its picture is not looked for.\n"));
+}
+
 TEST_F(PreviewTest, SaysWhyThereIsNoPicture)
 {
     repo.write("notes.txt", "no drawing");
