@@ -65,7 +65,7 @@ std::vector<common::File> scan(common::RootPath const& root)
         return valueOrFail(common::collectRepoFiles(root), "Check the path of the repository.");
     } catch (std::regex_error const&) {
         throw Failure(
-            "The ignore file has a rule that is not a valid regular expression.", "Mend '.tav/properties/ignore'.");
+            "The ignore file has a rule that is not a valid regular expression.", "Correct '.tav/properties/ignore'.");
     }
 }
 

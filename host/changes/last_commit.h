@@ -1,4 +1,4 @@
-/// The commit that the working folder stands on.
+/// The commit that the working folder is at.
 #pragma once
 
 #include "host/history/commit_tables.h"

@@ -65,7 +65,7 @@ stagedEntries(common::State const& state, FolderMatch const& match, common::Root
 
 /// What the database knows.
 struct History {
-    OdString base; ///< hash of the commit that the working folder stands on
+    OdString base; ///< hash of the commit that the working folder is at
     std::int64_t number = 0;
     FileList files; ///< of that commit
     VerifiedFileList known;

@@ -22,7 +22,7 @@ struct StagedEntry {
 /// Every list is in ascending order of paths.
 struct Status {
     OdString branch;
-    std::int64_t commit = 0;    ///< number of the commit that the working folder stands on; 0 before the first
+    std::int64_t commit = 0;    ///< number of the commit that the working folder is at; 0 before the first
     bool isAtEnd = true;        ///< whether that is where the branch ends
     std::string unfinishedWork; ///< what an interrupted command has left, in a sentence
     std::vector<common::ConflictInfo> conflicts;

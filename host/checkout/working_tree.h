@@ -40,7 +40,7 @@ enum class Discard { nothing, copies, everything };
 /// so. Work is a file with another content than an expected one, and whatever is at the paths `staged`: being in some
 /// commit, or in the one that is to be written, does not make a choice unimportant. Only where `discard` is not
 /// `nothing`, and so nothing is unstaged, a staged file may be as wanted already. The files are read: what an index
-/// says of them is no reason to overwrite them. Files that are as wanted are taken out of the update. Committed
+/// says of them does not justify overwriting them. Files that are as wanted are taken out of the update. Committed
 /// contents that go can be read from `storage` afterwards: they are read there, and stored again from the files where
 /// that is needed. Throws `Failure`, which lists the files in the way.
 void checkUpdate(

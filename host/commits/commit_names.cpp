@@ -74,7 +74,7 @@ std::optional<CommitRecord> findByDate(LocalDatabase const& database, std::strin
     while (commit && commit->date > span->last) {
         commit = firstParent(commits, *commit);
         if (!commit) {
-            throw Failure("There was no commit at '" + date + "' yet.", kSeeLog);
+            throw Failure("No commit had been made by '" + date + "'.", kSeeLog);
         }
     }
     return commit;

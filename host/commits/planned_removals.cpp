@@ -25,7 +25,8 @@ Paths pathsLeft(common::State const& state, Paths left)
     return left;
 }
 
-/// Leaves the files `kept` in the repository. A copy of one of them is no renamed file; nobody may have staged it.
+/// Leaves the files `kept` in the repository. A copy of one of them is not a renamed file, and nobody need have staged
+/// it.
 void keep(Paths const& kept, Paths const& staged, std::vector<PlannedFile>& plan)
 {
     auto const isLeftOut = [&](PlannedFile const& file) {

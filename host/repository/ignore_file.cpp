@@ -90,7 +90,7 @@ std::vector<OdString> ignoreRules(common::RootPath const& root)
     } catch (std::regex_error const&) {
         throw Failure(
             "The ignore file '" + pathOf(root).ansi_str() + "' has a rule that is not a valid regular expression.",
-            "Mend or remove it there.");
+            "Correct or remove it there.");
     }
 }
 

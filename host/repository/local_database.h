@@ -47,7 +47,7 @@ public:
     OdString repositoryId() const { return value("repository"); }
     void setServer(OdString const& folder, OdString const& repositoryId);
 
-    /// Hash of the commit that the working folder stands on; empty before the first commit.
+    /// Hash of the commit that the working folder is at; empty before the first commit.
     OdString currentCommit() const { return value("base"); }
     void setCurrentCommit(OdString const& hash) { setValue("base", hash); }
 

@@ -370,7 +370,7 @@ TEST_F(Compare, FailsForRulesThatCannotBeUsed)
         FAIL() << "no failure";
     } catch (tav::Failure const& failure) {
         EXPECT_EQ(failure.what, "The ignore file has a rule that is not a valid regular expression.");
-        EXPECT_EQ(failure.next, "Mend '.tav/properties/ignore'.");
+        EXPECT_EQ(failure.next, "Correct '.tav/properties/ignore'.");
     }
 }
 

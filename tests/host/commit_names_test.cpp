@@ -98,7 +98,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"Date", "master@{2024-03-04 13:00Z}", "4"}, Row{"DateOnTheLineOfFirstParents", "@{2024-03-03 13:00Z}", "2"},
         Row{"DateOfABranch", "черновик@{2024-03-05}", "3"}, Row{"DateAndStep", "@{2024-03-04 13:00Z}~1", "2"},
         Row{"DateOfNoBranch", "plan@{2024-03-05}", "none"},
-        Row{"DateBeforeTheFirst", "@{2020-01-01}", "There was no commit at '2020-01-01' yet."},
+        Row{"DateBeforeTheFirst", "@{2020-01-01}", "No commit had been made by '2020-01-01'."},
         Row{"NoDate", "@{soon}", "'soon' is not a date."}),
     support::rowName);
 

@@ -211,7 +211,7 @@ TEST_F(Files, FailsForAnIgnoreFileThatCannotBeUsed)
     repo.ignore("[");
     EXPECT_EQ(
         tav({"files"}), failed("tav: The ignore file has a rule that is not a valid regular expression. "
-                               "Mend '.tav/properties/ignore'.\n"));
+                               "Correct '.tav/properties/ignore'.\n"));
 }
 
 TEST_F(Files, MakesNothing)

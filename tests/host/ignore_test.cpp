@@ -129,7 +129,7 @@ TEST_F(Ignore, FailsForAFileThatCannotBeUsed)
 {
     repo.ignore("^a$\n(\n");
     std::string const message = "tav: The ignore file '" + repo.pathTo(".tav/properties/ignore") +
-                                "' has a rule that is not a valid regular expression. Mend or remove it there.\n";
+                                "' has a rule that is not a valid regular expression. Correct or remove it there.\n";
     EXPECT_EQ(tav({"ignore"}), failed(message));
     EXPECT_EQ(tav({"ignore", "--add", "^b$"}), failed(message));
     EXPECT_EQ(repo.read(".tav/properties/ignore"), "^a$\n(\n");

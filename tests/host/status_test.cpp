@@ -405,7 +405,7 @@ TEST_F(Status, FailsForAnIgnoreFileThatCannotBeUsed)
     repo.add({"a.dwg"});
     repo.ignore("^a$\n(\n");
     Outcome const broken = failed("tav: The ignore file has a rule that is not a valid regular expression. "
-                                  "Mend '.tav/properties/ignore'.\n");
+                                  "Correct '.tav/properties/ignore'.\n");
     EXPECT_EQ(tav({"status"}), broken);
     EXPECT_EQ(tav({"status", "--ignored"}), broken);
     EXPECT_EQ(tav({"add", "a.dwg"}), broken);
