@@ -137,6 +137,16 @@ struct ServerOptions {
 };
 void server(ServerOptions const& options);
 
+struct ConfigOptions {
+    std::optional<std::string> key; ///< none: all are listed
+    std::optional<std::string> value;
+    bool user = false;       ///< in the file of the user; new values go there unless the repository is named
+    bool repository = false; ///< in the file of the repository
+    bool unset = false;
+    bool json = false;
+};
+void config(ConfigOptions const& options);
+
 void listProjects(bool json);
 void verifyAll(bool json);
 void collectGarbage();

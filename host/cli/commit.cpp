@@ -1,11 +1,12 @@
 #include "host/commits/commit.h"
 #include "host/cli/commands.h"
+#include "host/cli/current_settings.h"
 #include "host/cli/output.h"
+#include "host/cli/terminal.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
 #include "host/session/write_session.h"
 #include "host/text/utf8.h"
-#include "host/user/user_folders.h"
 
 #include <string>
 
@@ -19,6 +20,27 @@ void checkText(std::string const& text, char const* what)
     if (isBlank) {
         throw Failure(std::string("The ") + what + " is empty.", "Say in a few words what has changed, and who did.");
     }
+}
+
+/// The first commit of a user is the time to learn the name; it is asked for once.
+std::string askForName(std::string const& usual)
+{
+    auto const answer = ask("Your name for commits [" + usual + "]:");
+    if (!answer) {
+        return usual;
+    }
+    std::string const name = answer->empty() ? usual : *answer;
+    saveSetting("user.name", name, Origin::user);
+    return name;
+}
+
+std::string authorOf(CommitOptions const& options)
+{
+    if (!options.author.empty()) {
+        return options.author;
+    }
+    SettingEntry const name = currentSettings().effective("user.name");
+    return name.origin == Origin::standard && canAsk() ? askForName(name.value) : name.value;
 }
 
 void printCommit(CommitRecord const& commit, char const* verb)
@@ -46,12 +68,11 @@ bool isRepeated(CommitOrder const& order, WriteSession const& session)
 
 void makeCommit(CommitOptions const& options)
 {
-    CommitOrder const order{
-        fromUtf8(options.author.empty() ? userName() : options.author), fromUtf8(options.message),
-        missingFilesOf(options)};
+    common::RootPath const root = openRepository("");
     checkText(options.message, "message");
+    CommitOrder const order{fromUtf8(authorOf(options)), fromUtf8(options.message), missingFilesOf(options)};
     checkText(order.author.ansi_str(), "author");
-    WriteSession session(openRepository(""), "commit");
+    WriteSession session(root, "commit");
     session.failIfBetweenCommits();
     if (isRepeated(order, session)) {
         printCommit(*session.recoveredCommit(), "Completed");

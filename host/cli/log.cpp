@@ -1,5 +1,6 @@
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
+#include "host/cli/current_settings.h"
 #include "host/cli/output.h"
 #include "host/errors/failure.h"
 #include "host/history/ancestry.h"
@@ -219,13 +220,19 @@ std::string titleLine(CommitRecord const& commit, Names const& names)
     return std::to_string(commit.number) + "  " + shown(title) + namesAt(commit.hash, names) + "\n";
 }
 
-std::string lines(Entry const& entry, Names const& names, std::int64_t now)
+DateForm dateForm()
+{
+    std::string const form = currentSettings().value("log.date");
+    return form == "relative" ? DateForm::relative : form == "absolute" ? DateForm::absolute : DateForm::both;
+}
+
+std::string lines(Entry const& entry, Names const& names, std::int64_t now, DateForm form)
 {
     std::string const indent(std::to_string(entry.commit.number).size() + 2, ' ');
     OdString const author = authorName(entry.commit);
     std::string text = titleLine(entry.commit, names) + indent;
     text += author.isEmpty() ? "" : shown(author) + " \u2981 ";
-    text += shownDate(entry.commit.date, now) + "\n";
+    text += shownDate(entry.commit.date, now, form) + "\n";
     for (FileEvent const& file : entry.files) {
         text += indent + changeLine(file.change, file.path, file.previousPath) + "\n";
     }
@@ -235,8 +242,9 @@ std::string lines(Entry const& entry, Names const& names, std::int64_t now)
 void printForPeople(std::vector<Entry> const& entries, Names const& names, bool oneline)
 {
     std::int64_t const now = std::time(nullptr);
+    DateForm const form = dateForm();
     for (Entry const& entry : entries) {
-        print(oneline ? titleLine(entry.commit, names) : lines(entry, names, now));
+        print(oneline ? titleLine(entry.commit, names) : lines(entry, names, now, form));
     }
 }
 

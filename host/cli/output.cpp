@@ -5,8 +5,6 @@
 
 #include "json/json_writer.h"
 
-#include <unistd.h>
-
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -71,12 +69,6 @@ std::string asSentence(std::string const& text)
 }
 
 } // namespace
-
-bool isTerminal()
-{
-    static bool const is = isatty(STDOUT_FILENO) == 1;
-    return is;
-}
 
 void print(std::string const& text)
 {

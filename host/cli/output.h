@@ -1,6 +1,7 @@
 /// What commands print: names, documents and errors.
 #pragma once
 
+#include "host/cli/terminal.h"
 #include "host/text/digest.h"
 #include "host/text/json_text.h"
 
@@ -11,8 +12,6 @@
 
 namespace tav {
 
-/// Whether people see what is printed.
-bool isTerminal();
 /// Prints `text`, in UTF-8, as it stands.
 void print(std::string const& text);
 /// Prints a document for programs, with a line feed after it.

@@ -298,6 +298,24 @@ void addIgnore(CLI::App& app)
     command->callback([options] { ignore(*options); });
 }
 
+void addConfig(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("config", "Show or change settings");
+    auto const options = std::make_shared<ConfigOptions>();
+    CLI::Option* const key = command->add_option("KEY", options->key, "Name of a setting; without it, all are listed");
+    CLI::Option* const value = command->add_option("VALUE", options->value, "Its new value")->needs(key);
+    command->add_flag("--list", "List the settings in effect, and where they come from")->excludes(key);
+    command->add_flag("--unset", options->unset, "Remove a setting")->needs(key)->excludes(value);
+    CLI::Option* const user = command->add_flag("--user", options->user, "For all your repositories, the default");
+    command->add_flag("--repository", options->repository, "For this repository only")->excludes(user);
+    command->add_flag("--json", options->json, "Print a document for programs")->excludes(value);
+    addExamples(
+        *command, "  tav config user.name 'Ann Miller'\n"
+                  "  tav config --repository log.date absolute\n"
+                  "  tav config --list");
+    command->callback([options] { config(*options); });
+}
+
 void addOnlyJson(CLI::App& command, void (*run)(bool json))
 {
     auto const json = std::make_shared<bool>(false);
@@ -340,6 +358,7 @@ void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
     addServer(app);
     addFiles(app);
     addIgnore(app);
+    addConfig(app);
     addOnlyJson(*app.add_subcommand("projects", "List the repositories that you have made"), listProjects);
     addOnlyJson(*app.add_subcommand("verify", "Read every stored version and check it against its digest"), verifyAll);
     app.add_subcommand("gc", "Remove what no commit needs from the storage")->callback(collectGarbage);

@@ -72,6 +72,7 @@ _tav_options() { # COMMAND
         server) printf '%s\n' --send ;;
         files) printf '%s\n' --hash --long --at --json ;;
         ignore) printf '%s\n' --add --json ;;
+        config) printf '%s\n' --list --unset --user --repository --json ;;
         diff) printf '%s\n' --stat --text --json ;;
         show | branch | tag | projects | verify) printf '%s\n' --json ;;
     esac
@@ -105,6 +106,7 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
             ;;
         mv:[12] | rm:* | preview:1 | compare:1) _tav_offer_files -f ;;
         init:1 | server:1 | files:1 | export:2) _tav_offer_files -d ;;
+        config:1) _tav_offer < <(_tav_ask config --json | _tav_texts key) ;;
         switch:1) _tav_offer < <(_tav_references branch) ;;
         log:*)
             _tav_offer_files -f
@@ -116,7 +118,7 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
 
 _tav() {
     local commands='init status add unstage mv rm commit log show cat diff preview compare restore checkout switch branch tag fetch server
-        files ignore projects verify gc export'
+        files ignore config projects verify gc export'
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
     local command='' folder='' number=1 word i
     COMPREPLY=()

@@ -1,7 +1,7 @@
 # Completion of tav for fish: commands, options, files, branches and tags.
 
 set -l commands init status add unstage mv rm commit log show cat diff preview compare restore checkout switch branch tag fetch server \
-    files ignore projects verify gc export
+    files ignore config projects verify gc export
 
 # Runs tav on the repository that the line names with -C, for what it knows.
 function __tav_ask
@@ -83,6 +83,7 @@ __tav_command fetch 'Learn the commits, branches and tags that the server has' $
 __tav_command server 'Show where the history is kept, or name its new place' $commands
 __tav_command files 'List the files that the repository keeps' $commands
 __tav_command ignore 'Show the rules for names to ignore, or add one' $commands
+__tav_command config 'Show or change settings' $commands
 __tav_command projects 'List the repositories that you have made' $commands
 __tav_command verify 'Read every stored version and check it against its digest' $commands
 __tav_command gc 'Remove what no commit needs from the storage' $commands
@@ -147,6 +148,12 @@ complete -c tav -n '__fish_seen_subcommand_from files' -l json -d 'Print a docum
 complete -c tav -n '__fish_seen_subcommand_from files' -a '(__fish_complete_directories)'
 complete -c tav -n '__fish_seen_subcommand_from ignore' -l add -x -d 'A regular expression for names'
 complete -c tav -n '__fish_seen_subcommand_from ignore' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from config' -l list -d 'List the settings in effect'
+complete -c tav -n '__fish_seen_subcommand_from config' -l unset -d 'Remove a setting'
+complete -c tav -n '__fish_seen_subcommand_from config' -l user -d 'For all your repositories'
+complete -c tav -n '__fish_seen_subcommand_from config' -l repository -d 'For this repository only'
+complete -c tav -n '__fish_seen_subcommand_from config' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from config; and __tav_arguments 0 config' -a 'color editor log.date open.program pager user.name'
 complete -c tav -n '__fish_seen_subcommand_from projects' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from verify' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from export; and __tav_arguments 0 export' -a '(__tav_references branch tag)'

@@ -23,21 +23,25 @@ fs::path currentFolder()
     return current;
 }
 
-common::RootPath findRepository(std::string const& folder)
+/// The repository whose working folder is `start`, or a folder above it.
+std::optional<common::RootPath> enclosingRepository(fs::path const& start)
 {
-    if (!folder.empty()) {
-        return valueOrFail(common::RootPath::get(fromUtf8(folder), false), kHowToInit);
-    }
-    fs::path const start = currentFolder();
     for (fs::path place = start;; place = place.parent_path()) {
         auto const found = common::RootPath::get(fromUtf8(place.string()), false);
         if (found.hasValue()) {
             return found.value();
         }
         if (place == place.parent_path()) {
-            return valueOrFail(common::RootPath::get(fromUtf8(start.string()), false), kHowToInit);
+            return std::nullopt;
         }
     }
+}
+
+common::RootPath findRepository(std::string const& folder)
+{
+    fs::path const start = folder.empty() ? currentFolder() : fs::path(folder);
+    auto const found = folder.empty() ? enclosingRepository(start) : std::nullopt;
+    return found ? *found : valueOrFail(common::RootPath::get(fromUtf8(start.string()), false), kHowToInit);
 }
 
 void failIfLink(std::string const& path, std::string const& kind)
@@ -70,6 +74,15 @@ common::RootPath openRepository(std::string const& folder)
     return root;
 }
 
+std::optional<common::RootPath> repositoryHere()
+{
+    auto found = enclosingRepository(currentFolder());
+    if (found) {
+        requireOwnFiles(*found);
+    }
+    return found;
+}
+
 void requireOwnFiles(common::RootPath const& root)
 {
     for (wchar_t const* const name :
@@ -78,6 +91,7 @@ void requireOwnFiles(common::RootPath const& root)
         failIfLink(root.pathTo(name).ansi_str(), "folder");
     }
     failIfLink(root.statePath().ansi_str(), "file");
+    failIfLink(root.pathTo(L".tav/config").ansi_str(), "file");
     failIfLink(root.pathTo(L".tav/properties/ignore").ansi_str(), "file");
     for (wchar_t const* const end : {L"", L"-journal", L"-shm", L"-wal"}) { // A database in use has files beside it.
         std::string const file = (root.dbPath() + end).ansi_str();

@@ -3,6 +3,7 @@
 
 #include "common/mu_common_repo_prop.h"
 
+#include <optional>
 #include <string>
 
 namespace tav {
@@ -12,9 +13,12 @@ namespace tav {
 /// Throws `Failure` when there is none, and as `requireOwnFiles` does.
 common::RootPath openRepository(std::string const& folder);
 
-/// Throws `Failure` when ".tav", a folder in it, its state or its database is a link: commands write and remove there,
-/// and what a link leads to may be another repository's, or not even a repository. Also when the database has another
-/// name: it is changed in place, by readers too when they find a change that was interrupted.
+/// The one that the current folder lies in; none where there is no repository.
+std::optional<common::RootPath> repositoryHere();
+
+/// Throws `Failure` when ".tav", a folder in it, its state, its settings or its database is a link: commands write and
+/// remove there, and what a link leads to may be another repository's, or not even a repository. Also when the database
+/// has another name: it is changed in place, by readers too when they find a change that was interrupted.
 void requireOwnFiles(common::RootPath const& root);
 
 } // namespace tav

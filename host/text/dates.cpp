@@ -137,9 +137,12 @@ std::string localDate(std::int64_t date)
     return text.data();
 }
 
-std::string shownDate(std::int64_t date, std::int64_t now)
+std::string shownDate(std::int64_t date, std::int64_t now, DateForm form)
 {
-    return date > now ? localDate(date) : age(now - date) + " (" + localDate(date) + ")";
+    if (date > now || form == DateForm::absolute) {
+        return localDate(date);
+    }
+    return form == DateForm::relative ? age(now - date) : age(now - date) + " (" + localDate(date) + ")";
 }
 
 std::optional<TimeSpan> parseDate(std::string const& typed, std::int64_t now)

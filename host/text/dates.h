@@ -19,7 +19,10 @@ std::optional<TimeSpan> parseDate(std::string const& typed, std::int64_t now);
 
 /// "2024-03-05 14:07", in local time.
 std::string localDate(std::int64_t date);
-/// "3 days ago (2024-03-05 14:07)", in local time; a date behind `now` alone.
-std::string shownDate(std::int64_t date, std::int64_t now);
+
+enum class DateForm { both, relative, absolute };
+
+/// "3 days ago (2024-03-05 14:07)", in local time, or one of the two; a date behind `now` is absolute.
+std::string shownDate(std::int64_t date, std::int64_t now, DateForm form = DateForm::both);
 
 } // namespace tav

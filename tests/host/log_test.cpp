@@ -140,6 +140,15 @@ TEST_F(Log, ShowsCommitsBetweenDates)
         failed("tav: --since 'soon' is not a date. Type one as '2024-03-05', 'yesterday' or '3 days ago'.\n"));
 }
 
+TEST_F(Log, ShowsDatesAsTheSettingSays)
+{
+    repo.write(".tav/config", R"({"log.date":"relative"})");
+    EXPECT_EQ(tav({"log", "-1"}), done("5  Removes the roof  (master)\n   ann \u2981 less than a minute ago\n"));
+    repo.write(".tav/config", R"({"log.date":"absolute"})");
+    EXPECT_TRUE(
+        std::regex_search(tav({"log", "-1"}).out, std::regex("\n   ann \u2981 \\d{4}-\\d\\d-\\d\\d \\d\\d:\\d\\d\n$")));
+}
+
 TEST_F(Log, ShowsOneLineForEachCommit)
 {
     EXPECT_EQ(tav({"log", "--oneline", "-2"}), done("5  Removes the roof  (master)\n4  Renames the roof\n"));

@@ -55,9 +55,9 @@ void moveTo(int file, int number)
     require(dup2(file, number) == number, "dup2");
 }
 
-void take(Setting const& setting, int out, int err)
+void take(Setting const& setting, int in, int out, int err)
 {
-    moveTo(open("/dev/null", O_RDONLY | O_CLOEXEC), STDIN_FILENO);
+    moveTo(in != -1 ? in : open("/dev/null", O_RDONLY | O_CLOEXEC), STDIN_FILENO);
     moveTo(setting.outFile.empty() ? out : open(setting.outFile.c_str(), O_WRONLY | O_CLOEXEC), STDOUT_FILENO);
     moveTo(err, STDERR_FILENO);
     require(setting.folder.empty() || chdir(setting.folder.c_str()) == 0, "chdir");
@@ -160,24 +160,36 @@ Process::~Process()
     }
     close(out_);
     close(err_);
+    if (in_ != -1) {
+        close(in_);
+    }
 }
 
 void Process::start(Setting const& setting, std::function<int()> const& body)
 {
     Channel const out = setting.isOnTerminal ? makeTerminal() : makePipe();
     Channel const err = setting.isOnTerminal ? makeTerminal() : makePipe();
+    Channel const in = setting.input.empty() ? Channel() : makeTerminal();
+    if (in.reader != -1) { // The end that a person sits at.
+        auto const length = static_cast<ssize_t>(setting.input.size());
+        require(write(in.reader, setting.input.data(), setting.input.size()) == length, "write");
+    }
     std::fflush(nullptr);
     home(); // Made here, so that the child does not take it away.
     child_ = fork();
     require(child_ != -1, "fork");
     if (child_ == 0) {
-        take(setting, out.writer, err.writer);
+        take(setting, in.writer, out.writer, err.writer);
         int const code = body();
         std::fflush(nullptr);
         _exit(code);
     }
     close(out.writer);
     close(err.writer);
+    in_ = in.reader;
+    if (in.writer != -1) {
+        close(in.writer);
+    }
     out_ = out.reader;
     err_ = err.reader;
 }

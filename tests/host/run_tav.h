@@ -35,6 +35,7 @@ struct Setting {
     std::string folder = "/";             ///< the current folder
     std::vector<std::string> environment; ///< added to the test's own, as "NAME=value"
     bool isOnTerminal = false;            ///< both streams are terminals; else both are pipes
+    std::string input;                    ///< what is typed on the terminal, if there is one; else there is no input
     std::string outFile;                  ///< where standard output goes instead, such as "/dev/full"
     std::string program = TAV_PROGRAM;
 };
@@ -62,6 +63,7 @@ private:
     bool reap(int options);
 
     pid_t child_ = -1;
+    int in_ = -1;
     int out_ = -1;
     int err_ = -1;
     int status_ = 0;
