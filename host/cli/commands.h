@@ -40,8 +40,10 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo);
 void removeFiles(std::vector<std::string> const& names);
 
 struct CommitOptions {
-    std::string message;
-    std::string author; ///< empty: the user on this machine
+    std::optional<std::string> message;
+    std::string messageFile;    ///< "-" for standard input; without both the message is written in an editor
+    bool takesModified = false; ///< changed files without staging
+    std::string author;         ///< empty: the user on this machine
     bool allRemoved = false;
     bool withoutRemoved = false;
 };

@@ -1,14 +1,19 @@
 #include "host/commits/commit.h"
+#include "host/changes/status.h"
 #include "host/cli/commands.h"
+#include "host/cli/commit_message.h"
 #include "host/cli/current_settings.h"
 #include "host/cli/output.h"
+#include "host/cli/status_lines.h"
 #include "host/cli/terminal.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
 #include "host/session/write_session.h"
 #include "host/text/utf8.h"
 
+#include <optional>
 #include <string>
+#include <vector>
 
 namespace tav {
 
@@ -57,6 +62,43 @@ Missing missingFilesOf(CommitOptions const& options)
                                     : Missing::areRemoved;
 }
 
+std::vector<std::string> changesOf(Status const& status, bool takesModified)
+{
+    std::vector<std::string> lines;
+    auto const add = [&](char const* label, std::vector<OdString> const& paths) {
+        for (OdString const& path : paths) {
+            lines.push_back(label + shown(path));
+        }
+    };
+    for (StagedEntry const& entry : status.staged) {
+        lines.push_back(lineOf(entry));
+    }
+    add("modified: ", takesModified ? status.modified : std::vector<OdString>());
+    for (auto const& [path, previous] : status.renamed) {
+        lines.push_back("renamed:  " + shown(previous) + " -> " + shown(path));
+    }
+    add("removed:  ", status.removed);
+    return lines;
+}
+
+/// None where there is nothing to commit: then nobody needs to write.
+std::optional<std::string> messageOf(CommitOptions const& options, common::RootPath const& root)
+{
+    if (options.message) {
+        return options.message;
+    }
+    if (!options.messageFile.empty()) {
+        return readMessage(options.messageFile);
+    }
+    std::vector<std::string> const changes = changesOf(statusOf(root, false), options.takesModified);
+    return changes.empty() ? std::nullopt : std::optional(editMessage(root, changes));
+}
+
+bool isEdited(CommitOptions const& options)
+{
+    return !options.message && options.messageFile.empty();
+}
+
 /// Whether the order is the one that was interrupted: repeating it makes no second commit.
 bool isRepeated(CommitOrder const& order, WriteSession const& session)
 {
@@ -64,14 +106,8 @@ bool isRepeated(CommitOrder const& order, WriteSession const& session)
            session.recoveredCommit()->author == order.author;
 }
 
-} // namespace
-
-void makeCommit(CommitOptions const& options)
+void carryOut(CommitOrder const& order, common::RootPath const& root)
 {
-    common::RootPath const root = openRepository("");
-    checkText(options.message, "message");
-    CommitOrder const order{fromUtf8(authorOf(options)), fromUtf8(options.message), missingFilesOf(options)};
-    checkText(order.author.ansi_str(), "author");
     WriteSession session(root, "commit");
     session.failIfBetweenCommits();
     if (isRepeated(order, session)) {
@@ -80,6 +116,31 @@ void makeCommit(CommitOptions const& options)
     }
     Committed const committed = commit(session.root(), session.database(), order, session.start());
     printCommit(committed.commit, committed.isNew ? "Made" : "Nothing has changed since");
+}
+
+} // namespace
+
+void makeCommit(CommitOptions const& options)
+{
+    common::RootPath const root = openRepository("");
+    auto const message = messageOf(options, root);
+    if (message) {
+        checkText(*message, "message");
+    }
+    CommitOrder const order{
+        fromUtf8(authorOf(options)), fromUtf8(message.value_or("")), missingFilesOf(options), options.takesModified};
+    checkText(order.author.ansi_str(), "author");
+    try {
+        carryOut(order, root);
+    } catch (Failure& failure) {
+        if (message && isEdited(options)) {
+            failure.details.push_back("Your message is kept: tav commit -F '" + messagePath(root) + "'");
+        }
+        throw;
+    }
+    if (isEdited(options)) {
+        removeMessage(root);
+    }
 }
 
 } // namespace tav

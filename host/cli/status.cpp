@@ -1,6 +1,7 @@
 #include "host/changes/status.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/status_lines.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
 
@@ -104,22 +105,6 @@ void printConflicts(std::vector<common::ConflictInfo> const& conflicts)
         paths.push_back(conflict.path);
     }
     printGroup("Drawings in conflict:", "the other versions are in '.tav/conflict'", "", Colour::red, paths);
-}
-
-std::string lineOf(StagedEntry const& entry)
-{
-    if (entry.isMissing) {
-        return "gone:     " + shown(entry.path);
-    }
-    if (!entry.previousPath.isEmpty()) {
-        return "renamed:  " + shown(entry.previousPath) + " -> " + shown(entry.path);
-    }
-    switch (entry.change) {
-    case common::FileChange::added: return "new:      " + shown(entry.path);
-    case common::FileChange::modified: return "modified: " + shown(entry.path);
-    case common::FileChange::removed: return "removed:  " + shown(entry.path);
-    }
-    return shown(entry.path);
 }
 
 void printStaged(std::vector<StagedEntry> const& entries)

@@ -1,6 +1,7 @@
 #include "host/cli/syntax.h"
 
 #include "host/cli/commands.h"
+#include "host/cli/commit_message.h"
 
 #include <CLI/CLI.hpp>
 
@@ -103,7 +104,11 @@ void addCommit(CLI::App& app)
     CLI::App* const command = app.add_subcommand("commit", "Keep what is staged, removed and renamed as a new commit");
     command->alias("ci");
     auto const options = std::make_shared<CommitOptions>();
-    command->add_option("-m,--message", options->message, "What has changed, and why")->required();
+    CLI::Option* const message = command->add_option("-m,--message", options->message, "What has changed, and why");
+    command->add_option("-F,--file", options->messageFile, "Take the message from a file, '-' for standard input")
+        ->type_name("FILE")
+        ->excludes(message);
+    command->add_flag("-a,--all", options->takesModified, "Take changed files without staging; new ones are not taken");
     command->add_option("--author", options->author, "Who made it; by default your name and machine");
     CLI::Option* const all = command->add_flag(
         "--all-removed", options->allRemoved, "Remove files that are gone even when a whole folder or many are");
@@ -112,7 +117,17 @@ void addCommit(CLI::App& app)
             "--without-removed", options->withoutRemoved,
             "Keep files that are gone in the repository unless 'tav rm' has removed them")
         ->excludes(all);
-    command->callback([options] { makeCommit(*options); });
+    addExamples(
+        *command, "  tav commit -m 'Moves the north facade'\n"
+                  "  tav commit                 write the message in an editor\n"
+                  "  tav commit -am 'Moves it'  take all changed files");
+    command->callback([options] {
+        if (!options->message && options->messageFile.empty() && !canEdit()) {
+            throw CLI::ParseError(
+                "There is no terminal for an editor. Give a message with -m", CLI::ExitCodes::RequiredError);
+        }
+        makeCommit(*options);
+    });
 }
 
 void addLog(CLI::App& app, std::optional<std::size_t> behindDashes)

@@ -304,6 +304,15 @@ void requireRecordable(NewCommit const& added)
     }
 }
 
+void stageModified(FolderChanges const& changes, common::State& state)
+{
+    std::vector<common::StagedFile> files;
+    for (auto const& file : changes.modified) {
+        files.emplace_back(file.working.path, common::FileChange::modified);
+    }
+    stage(files, state);
+}
+
 /// Brings the contents into the storage, for good.
 void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
 {
@@ -364,13 +373,15 @@ finish(common::RootPath const& root, LocalDatabase& database, PendingCommit cons
 Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start)
 {
     requireNoConflicts(root);
-    auto const cache = readState(root);
-    common::State const& state = cache->read();
+    common::State state = readState(root)->read();
     Connection server(database); // Without one there is nothing to begin.
     fetchHistory(root, database, server, Compared::theEnd);
     failIfNotAtTheEnd(database, state.head);
     Draft draft{root, database, start, database.commits().files(database.currentCommit()), {}, {}};
     FolderChanges const changes = compareWithBase(draft);
+    if (order.takesModified) {
+        stageModified(changes, state); // In memory: a commit that fails has staged nothing.
+    }
     failIfBehindLink(state, root);
     Renames const renames = findRenames(changes, state, database, root);
     std::vector<PlannedFile> plan = planCommit(state, changes, renames, draft.files, root);

@@ -12,6 +12,7 @@ struct CommitOrder {
     OdString author;
     OdString message;
     Missing missing = Missing::areRemoved;
+    bool takesModified = false; ///< changed files are taken without being staged; new ones are not
 };
 
 struct Committed {

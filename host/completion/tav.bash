@@ -64,7 +64,7 @@ _tav_options() { # COMMAND
         init) printf '%s\n' --server ;;
         status) printf '%s\n' --ignored -s --short --json ;;
         add | unstage) printf '%s\n' --all ;;
-        commit) printf '%s\n' -m --message --author --all-removed --without-removed ;;
+        commit) printf '%s\n' -m --message -F --file -a --all --author --all-removed --without-removed ;;
         log) printf '%s\n' -n --count --since --until --author --all --oneline --json ;;
         preview | compare) printf '%s\n' -o --output --json ;;
         restore) printf '%s\n' --from --force ;;
@@ -82,6 +82,7 @@ _tav_options() { # COMMAND
 # Completes the value of the option before it, and says whether there is one.
 _tav_value() { # COMMAND OPTION
     case $1:$2 in
+        commit:-F | commit:--file) _tav_offer_files -f ;;
         :-C | init:--server) _tav_offer_files -d ;;
         preview:-o | preview:--output | compare:-o | compare:--output) _tav_offer_files -f ;;
         restore:--from | files:--at) _tav_offer < <(_tav_references branch tag) ;;
@@ -128,7 +129,8 @@ _tav() {
             :-C) ((++i == COMP_CWORD)) || folder=${COMP_WORDS[i]//[\\\"\']/} ;;
             :-*) ;;
             :*) command=$word ;;
-            commit:-m | commit:--message | commit:--author | log:-n | log:--count) ((++i)) ;;
+            commit:-m | commit:--message | commit:-F | commit:--file | commit:--author) ((++i)) ;;
+            log:-n | log:--count) ((++i)) ;;
             preview:-o | preview:--output | compare:-o | compare:--output) ((++i)) ;;
             log:--since | log:--until | log:--author) ((++i)) ;;
             ignore:--add | restore:--from | files:--at | init:--server) ((++i)) ;;
