@@ -19,31 +19,31 @@ namespace tav {
 /// The files that the repository keeps. Throws `Failure` when the ignore rules cannot be used.
 std::vector<common::File> scan(common::RootPath const& root);
 
-/// A file of a commit, beside what there is of it in the working folder.
+/// A file of a commit, and what is known of the working file at the same path.
 struct CommittedFile {
     OdString path;
     std::string url; ///< as bytes
     Sight sight = {};
-    bool isKnown = false; ///< to hold the content of the commit
+    bool isKnown = false; ///< whether the working file is known to have the content of the commit
 };
 
-/// A commit beside the working folder; both lists are in the order of paths.
+/// A commit compared with the working folder by path; both lists are in the order of paths.
 struct FolderMatch {
     std::vector<CommittedFile> committed;
     std::vector<common::File> untracked;
 };
 
-/// Finds out what there is of the files `committed`, which of them are `known`, and what else there is. Reads no file.
-/// Throws as `scan` does. Asks the disk in two threads, where a second one is to be had.
+/// Finds out which of the files `committed` are in the working folder, which of them are `known`, and which other files
+/// there are. Reads no file. Throws as `scan` does. Queries the disk in two threads if a second one can be started.
 FolderMatch matchFolder(common::RootPath const& root, FileList committed, VerifiedFileList const& known);
 
-/// The same for files that are `scanned` already, without looking at the committed ones.
+/// The same for files that have been `scanned` already; does not examine the committed ones.
 FolderMatch matchPaths(std::vector<common::File> scanned, FileList committed);
 
-/// Looks at each of a list of files, which takes longer than finding the files.
+/// Examines each file of a list, which takes longer than finding the files.
 class Examination {
 public:
-    /// Enters what is seen into `files`. The arguments live longer.
+    /// Enters the results into `files`. The arguments must outlive this object.
     Examination(std::vector<CommittedFile>& files, VerifiedFileList const& known, common::RootPath const& root)
         : files_(files)
         , known_(known)
@@ -51,7 +51,7 @@ public:
     {
     }
 
-    /// Returns when no file is left to look at. Threads that call this at the same time share the work.
+    /// Returns when no file is left to examine. Threads that call this at the same time share the work.
     void run();
 
 private:
@@ -63,28 +63,28 @@ private:
 
 /// How the working folder differs from a commit. All lists are in the order of paths.
 struct FolderChanges : common::RepoChanges {
-    /// Files of the commit in folders that links have replaced. A link may lead anywhere, and no scan enters it: what
-    /// is behind it is not read, and is not taken for removed.
+    /// Files of the commit in folders that links have replaced. A link may lead anywhere, so a scan does not follow it:
+    /// files behind it are neither read nor treated as removed.
     std::vector<common::VersionedFile> unreachable;
 };
 
-/// How the working folder differs from the commit. A file that is known is not read; those that were read and are
-/// unchanged are added to `verified`, if it is given.
+/// How the working folder differs from the commit. A file that is known is not read. Files that were read and are
+/// unchanged are added to `verified`, unless it is null.
 FolderChanges compare(common::RootPath const& root, FolderMatch match, VerifiedFileList* verified = nullptr);
 
 /// Leaves out the files that are known to be unchanged: `compare` would only list them.
 void dropKnown(FolderMatch& match);
 
-/// Enters files that are as the last commit has them into the index, for a command that began at `start`.
+/// Enters files that match the last commit into the index, for a command that began at `start`.
 void enterVerified(VerifiedFileList const& verified, std::uint64_t start, common::State& state);
 
-/// Records what is known of files, as far as that can be done: without a record they are read again.
+/// Records what is known of files. A failure is ignored: files without a record are read again.
 void keepVerified(VerifiedFileList const& verified, LocalDatabase& database);
 
-/// Whether the working file `path` holds another content than the one stored at `url`. Reads the file.
+/// Whether the content of the working file `path` differs from the one stored at `url`. Reads the file.
 bool hasOtherContent(OdString const& path, OdString const& url, common::RootPath const& root);
 
-/// Files that the ignore rules keep out of the repository, hidden ones excepted, in scan order.
+/// Files that the ignore rules keep out of the repository, except hidden ones, in scan order.
 std::vector<OdString> ignoredFiles(common::RootPath const& root);
 
 } // namespace tav

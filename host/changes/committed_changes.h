@@ -1,4 +1,4 @@
-/// What a commit changed, as people see it.
+/// What a commit changed, as commands show it.
 #pragma once
 
 #include "host/repository/local_database.h"
@@ -22,8 +22,8 @@ struct CommittedChange {
 /// In the order of paths. A renamed file is one change.
 std::vector<CommittedChange> committedChanges(CommitTables const& commits, CommitRecord const& commit);
 
-/// What is different in the commit `to` from the commit `from`, in the order of paths. Where `from` is on the line of
-/// first parents of `to`, renames in between are followed.
+/// How the commit `to` differs from the commit `from`, in the order of paths. Where `from` is on the line of first
+/// parents of `to`, renames in between are followed.
 std::vector<CommittedChange>
 changesBetween(CommitTables const& commits, CommitRecord const& from, CommitRecord const& to);
 

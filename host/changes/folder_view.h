@@ -1,4 +1,4 @@
-/// Looking at files of the working folder without reading them.
+/// Examining files of the working folder without reading them.
 #pragma once
 
 #include "host/repository/file_stamp.h"
@@ -13,22 +13,22 @@ namespace tav {
 
 enum class Presence {
     isGone,       ///< nothing is there, or a folder
-    isThere,      ///< a file, or something that cannot be looked at: that is not taken for removed
-    isBehindLink, ///< one of its folders is a link by now, and no scan enters links to folders
+    isThere,      ///< a file, or something that cannot be examined, which does not count as removed
+    isBehindLink, ///< one of its folders is now a link, and a scan does not follow links to folders
 };
 
-/// What there is of a file.
+/// What was found at the path of a file.
 struct Sight {
     Presence presence = Presence::isGone;
     std::optional<FileStamp> stamp; ///< of a regular file; through a link to one, of that file
 };
 
-/// Quick when paths that follow each other are in one folder. One thread.
+/// Fast when consecutive paths are in the same folder. One thread at a time.
 class FolderView {
 public:
     explicit FolderView(common::RootPath const& root);
 
-    /// Looks at `path`, in bytes and relative to the working folder.
+    /// Examines `path`, in bytes and relative to the working folder.
     Sight look(std::string const& path);
     Sight look(OdString const& path) { return look(path.ansi_str()); }
 
@@ -38,7 +38,7 @@ private:
     os::Handle top_;
     os::Handle current_;
     std::optional<std::string> currentPath_;
-    Presence way_ = Presence::isThere; ///< whether files of the current folder can be looked at
+    Presence way_ = Presence::isThere; ///< whether files of the current folder can be examined
 };
 
 } // namespace tav

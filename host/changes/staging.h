@@ -13,28 +13,28 @@
 
 namespace tav {
 
-/// What keeps a file of this name out of every commit, in a sentence; none for a name that a commit can keep.
+/// Why no commit can keep a file of this name, in a sentence; none for a name that a commit can keep.
 std::optional<std::string> whyNotKept(OdString const& path);
 
-/// Stages `files` behind what is staged already; what is staged under the same path gets the new change in its place.
-/// Returns how many were not staged before. Throws `Failure`, with a list of them, for names that no commit can keep;
-/// nothing is staged then.
+/// Stages `files` after what is staged already. A path that is staged already keeps its position and gets the new
+/// change. Returns how many were not staged before. Throws `Failure`, with a list of them, for names that no commit can
+/// keep; nothing is staged then.
 std::size_t stage(std::vector<common::StagedFile> const& files, common::State& state);
 
 /// The paths of all staged files.
 std::set<OdString> stagedPaths(common::State const& state);
 
-/// The paths that staged renames leave.
+/// The former paths of staged renames.
 std::set<OdString> formerPaths(common::State const& state);
 
 /// Both: all paths for which something is staged.
 std::set<OdString> claimedPaths(common::State const& state);
 
-/// Takes `files` out of the staged ones, with what was noted of their renames. Returns how many were staged.
+/// Unstages `files` and forgets their recorded renames. Returns how many were staged.
 std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state);
 
-/// Enters the index records of files that are as the current commit has them, and takes them out of the staged ones. Of
-/// `left`, files that somebody has changed since, only the renames go: what is staged there was not committed.
+/// Enters the index records of files that match the current commit, and unstages them. For the files `left`, which have
+/// been changed since, only the renames are dropped: what is staged there was not committed.
 void applyIndexUpdates(
     IndexUpdates const& files, common::State& state, std::set<OdString> const& left = std::set<OdString>());
 
@@ -44,8 +44,8 @@ struct Move {
     OdString to;
 };
 
-/// Notes that files have moved, and stages them where they are now. One that moved before keeps the path that it had
-/// first; one that is back at that path is no rename any more.
+/// Records that files have moved, and stages them at their new paths. A file that had moved before keeps its first path
+/// as the former one; a file that is back at its first path is no longer a rename.
 void stageMoves(std::vector<Move> const& moves, common::State& state);
 
 } // namespace tav

@@ -30,11 +30,11 @@ struct Status {
     std::vector<OdString> modified;    ///< not staged
     std::vector<OdString> untracked;   ///< not staged
     Renames renamed;                   ///< not staged; the next commit takes that without staging
-    bool isRenameDoubtful = false;     ///< as `isRemovalDoubtful`: some may be copies of missing files
+    bool isRenameDoubtful = false;     ///< like `isRemovalDoubtful`: some may be copies of missing files
     std::vector<OdString> removed;     ///< gone from the working folder; the next commit takes that without staging
-    bool isRemovalDoubtful = false;    ///< the next commit takes `removed` only when it is told to
+    bool isRemovalDoubtful = false;    ///< the next commit takes `removed` only when an option says so
     std::vector<OdString> unreachable; ///< committed files in folders that links have replaced
-    std::vector<OdString> ignored;     ///< filled in when it is asked for
+    std::vector<OdString> ignored;     ///< filled in on request
 
     bool isClean() const
     {

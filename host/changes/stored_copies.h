@@ -1,4 +1,5 @@
-/// Working files as copies of stored versions: what is damaged in the storage may still be whole in the folder.
+/// Working files as copies of stored versions: a content that is damaged in the storage may still be intact in the
+/// working folder.
 #pragma once
 
 #include "host/repository/local_database.h"
@@ -11,7 +12,7 @@ namespace tav {
 
 /// Makes sure that the content at `url`, which the working file `path` has, can be read from the storage; stores it
 /// again from that file where it cannot. True when it was stored again. Reads the stored content as a whole. Throws
-/// `Failure` when the file remains the only copy: it must not be overwritten or removed then. The caller holds the lock
+/// `Failure` when the file remains the only copy; it must not be overwritten or removed then. The caller holds the lock
 /// of the repository.
 bool requireStored(LocalStorage& storage, OdString const& path, OdString const& url);
 

@@ -1,4 +1,4 @@
-/// What is different in the working folder, as people see it.
+/// What differs in the working folder, as commands show it.
 #pragma once
 
 #include "host/repository/local_database.h"
@@ -16,8 +16,8 @@ struct WorkingChange {
     OdString oldUrl;       ///< of the committed content; empty for a new file
 };
 
-/// Against the commit of that hash, in the order of paths. A renamed file, one that 'tav mv' has staged included, is
-/// one change.
+/// Changes relative to the commit of that hash, in the order of paths. A renamed file, including one staged by 'tav
+/// mv', is one change.
 std::vector<WorkingChange>
 workingChanges(common::RootPath const& root, LocalDatabase const& database, OdString const& commit);
 

@@ -1,4 +1,4 @@
-/// Moves of working files that are undone unless the command succeeds.
+/// Renaming of working files that is undone unless the command succeeds.
 #pragma once
 
 #include <string>
@@ -7,8 +7,8 @@
 
 namespace tav {
 
-/// Moves entries, and moves them back in reverse order when it goes without `keep`. Paths are below the folder `top`,
-/// in bytes, and lead through no link.
+/// Moves entries, and moves them back in reverse order when it is destroyed without `keep`. Paths are below the folder
+/// `top`, in bytes, and lead through no link.
 class FileMoves {
 public:
     explicit FileMoves(std::string top) : top_(std::move(top)) {}
@@ -16,7 +16,7 @@ public:
     FileMoves& operator=(FileMoves const&) = delete;
     ~FileMoves();
 
-    /// Throws `Failure` when `to` is taken or the system refuses.
+    /// Throws `Failure` when `to` exists or the system refuses.
     void move(std::string const& from, std::string const& to);
     void keep() { done_.clear(); }
 

@@ -1,4 +1,4 @@
-/// Making the working folder hold the files of a commit.
+/// Writing files of a commit into the working folder: the check, and the update that puts each file in its place.
 #pragma once
 
 #include "host/repository/local_database.h"
@@ -16,56 +16,57 @@ namespace tav {
 
 /// What has to happen to the working folder.
 struct TreeUpdate {
-    Tree writes;   ///< files that get another content
-    Tree removals; ///< files that are in no later commit, with the content that they have been committed with
-    /// Those of them that only interrupted moves may have touched: what is unsaved there stays.
+    Tree writes;   ///< files that get a different content
+    Tree removals; ///< files to remove, with the content that they were committed with
+    /// Those of them that only interrupted checkouts may have written: uncommitted work there is kept.
     std::set<OdString> leftovers;
-    /// URLs of the contents that files have there unless somebody has changed them.
+    /// URLs of the contents that files at these paths have unless they were changed.
     std::multimap<OdString, OdString> expected;
-    /// Files that were found as wanted, once that has been checked.
+    /// Files that `checkUpdate` found to have the wanted content already.
     Tree found;
-    /// What stood at each of the paths when it was checked.
+    /// What was at each of the paths when it was checked.
     std::map<OdString, os::FileMark> marks;
 };
 
-/// What turns the files `from` into the files `to`. Files that differ only in `begun`, the files of interrupted moves
-/// to elsewhere, may be there by now: they go too.
+/// The update that turns the files `from` into the files `to`. The files in which a tree of `begun`, the targets of
+/// interrupted checkouts, differs from `to` may exist by now: they are written or removed too.
 TreeUpdate updateBetween(Tree const& from, std::vector<Tree> const& begun, Tree const& to);
 
-/// Which uncommitted work an update may discard: none, contents that some commit has, wherever, or all of it.
+/// Which uncommitted work an update may discard: none, contents that any commit has, or all of it.
 enum class Discard { nothing, copies, everything };
 
-/// Checks that an update can be carried out, before a byte is written: no path leads out of the working folder or
-/// through a link, no file takes the place of a folder that has other files, and no work is lost unless `discard` says
-/// so. Work is a file with another content than an expected one, and whatever is at the paths `staged`: being in some
-/// commit, or in the one that is to be written, does not make a choice unimportant. Only where `discard` is not
-/// `nothing`, and so nothing is unstaged, a staged file may be as wanted already. The files are read: what an index
-/// says of them does not justify overwriting them. Files that are as wanted are taken out of the update. Committed
-/// contents that go can be read from `storage` afterwards: they are read there, and stored again from the files where
-/// that is needed. Throws `Failure`, which lists the files in the way.
+/// Checks, before anything is written, that an update can be carried out: no path leads out of the working folder or
+/// through a link, no file replaces a folder that has other files, and no work is lost unless `discard` allows it. Work
+/// is a file whose content is not an expected one, and whatever is at the paths `staged`, even when a commit, or the
+/// one to be written, has that content: staging it was a choice. Only where `discard` is not `nothing`, and so nothing
+/// is unstaged, may a staged file have the wanted content already. The files are read: an index record does not justify
+/// overwriting them. Files that have the wanted content already are taken out of the update. Committed contents that
+/// will be overwritten or removed can be read from `storage` afterwards: they are read there, and stored again from the
+/// files if necessary. Throws `Failure`, which lists the files in the way.
 void checkUpdate(
     common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
     std::set<OdString> const& staged, Discard discard, TreeUpdate& update);
 
-/// What an update has brought about.
+/// The result of an update.
 struct Updated {
-    /// Modification times of the files that were written, by path. As far as the file system tells them apart, no two
-    /// are equal: a file that is moved over another of them shows.
+    /// Modification times of the files that were written, by path. No two are equal, as far as the file system can
+    /// distinguish them, so a file that replaces another one of them is noticed.
     std::map<OdString, std::uint64_t> times;
-    /// What may be recorded of the files that are as wanted now.
+    /// What may be recorded of the files that now have the wanted content.
     VerifiedFileList verified;
 };
 
-/// Carries out an update that has been checked. Every file is whole before it takes its name, and when this returns all
-/// of it is safe on the disk. Folders that become empty are removed. `begin` is called when all contents lie ready and
-/// the working folder is still what it was. A file that somebody has changed since it was checked stays as it is, and
-/// ends it. Throws `Failure`; what was written until then stays, and doing the same again completes it. The caller
-/// holds the lock of the repository since `start`.
+/// Carries out an update that has been checked. Every file is complete before it is renamed into place, and when this
+/// returns all of them are safe on the disk. Folders that become empty are removed. `begin` is called when all contents
+/// are ready and the working folder is still unchanged. A file that was changed after the check is left as it is, and
+/// ends the update. Throws `Failure`; what was written until then remains, and repeating the update completes it. The
+/// caller has held the lock of the repository since `start`.
 Updated carryOut(
     common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start,
     std::function<void()> const& begin = [] {});
 
-/// Writes the content of `file` to the path `target`. Throws `Failure`, whose advice tells damage from a full disk.
+/// Writes the content of `file` to the path `target`. Throws `Failure`, whose next step depends on whether the content
+/// is damaged or the disk is full.
 void extract(LocalStorage& storage, Tree::value_type const& file, std::string const& target);
 
 } // namespace tav

@@ -13,7 +13,7 @@ namespace tav {
 /// The words of such a list as they were typed, without "--".
 struct WordList {
     std::vector<std::string> words;
-    std::optional<std::size_t> names; ///< how many words at the end came behind "--", if that was typed
+    std::optional<std::size_t> names; ///< how many words at the end came after "--", if that was typed
 };
 
 struct CommitsAndNames {
@@ -21,12 +21,12 @@ struct CommitsAndNames {
     std::vector<std::string> names;
 };
 
-/// Behind "--" all words are names, and in front of it all are commits. Without it, the leading words that name commits
-/// are commits, and the rest are names. There are at most `most` commits. Throws `Failure` for a word that names a
-/// commit and a file as well, and when there are more commits.
+/// All words after "--" are names of files, and all words before it are commits. Without it, the leading words that
+/// name commits are commits, and the rest are names of files. There are at most `most` commits. Throws `Failure` for a
+/// word that names both a commit and a file, and when there are more commits.
 CommitsAndNames split(WordList const& list, LocalDatabase const& database, std::size_t most);
 
-/// Takes the last word of the form "-5" out of `list`, in front of "--".
+/// Removes the last word of the form "-5" before "--" from `list`.
 std::optional<std::size_t> takeCount(WordList& list);
 
 } // namespace tav

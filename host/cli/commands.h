@@ -1,5 +1,4 @@
-/// The commands of tav, each in the file of its name, and what may be asked of them. A command that fails throws
-/// `Failure`.
+/// The commands of tav, each in a source file of its name, and their options. A command that fails throws `Failure`.
 #pragma once
 
 #include "host/cli/arguments.h"

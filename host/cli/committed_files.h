@@ -1,4 +1,4 @@
-/// The files of a commit, as 'tav files' lists them. The disk is not looked at.
+/// The files of a commit, as 'tav files' lists them. Does not access the working folder.
 #pragma once
 
 #include "host/repository/local_database.h"

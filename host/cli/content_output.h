@@ -1,4 +1,4 @@
-/// Contents of files of commits, printed as they are.
+/// Printing the contents of committed files unchanged.
 #pragma once
 
 #include "host/repository/local_database.h"
@@ -14,8 +14,8 @@ struct FileOfCommit {
     OdString url;
 };
 
-/// The file that "COMMIT:NAME" means; COMMIT may be missing and is the current one then. None when nothing in front of
-/// a colon names a commit. Throws `Failure` when the commit has no such file, or several.
+/// The file that "COMMIT:NAME" means; without COMMIT, it is that of the current commit. None when nothing before a
+/// colon names a commit. Throws `Failure` when the commit has no such file, or several.
 std::optional<FileOfCommit>
 findFileOfCommit(std::string const& typed, LocalDatabase const& database, common::RootPath const& root);
 

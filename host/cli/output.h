@@ -12,7 +12,7 @@
 
 namespace tav {
 
-/// Prints `text`, in UTF-8, as it stands.
+/// Prints `text`, in UTF-8, unchanged.
 void print(std::string const& text);
 /// Prints a document for programs, with a line feed after it.
 void printJson(kutils::json::Value const& document);
@@ -22,14 +22,14 @@ void printError(std::string const& what, std::string const& next);
 void printNote(std::string const& note);
 /// Prints a line of details that follows an error, indented.
 void printErrorDetail(std::string const& detail);
-/// Hands over what was printed; false when anything could not be written.
+/// Flushes what was printed; false when anything could not be written.
 bool flushOutput();
 
-/// A name as people see it. Control characters are escaped: a name may hold any of them, a terminal obeys them, and a
-/// line feed would make two names of one. On a terminal so are characters that cannot be seen, and bytes that are no
-/// UTF-8; elsewhere these stay as they are.
+/// A name in the form that people see. Control characters are escaped: a name may contain any of them, a terminal obeys
+/// them, and a line feed would split the name. On a terminal, invisible characters and bytes that are not valid UTF-8
+/// are escaped too; elsewhere they are unchanged.
 std::string shown(OdString const& name);
-/// A line of a message or of a file: on a terminal with the same escapes, tabs excepted; elsewhere as it stands.
+/// A line of a message or of a file: on a terminal with the same escapes, except for tabs; elsewhere unchanged.
 std::string shownLine(OdString const& line);
 
 /// A line in the form of sha256sum, so that it can check the list: a name with a line end or a backslash is escaped,
@@ -38,7 +38,7 @@ std::string digestLine(Digest const& digest, OdString const& path);
 
 enum class Colour { none, red, green };
 
-/// `text` in that colour where people see it: on a terminal, unless the environment sets NO_COLOR.
+/// `text` in that colour if the output is a terminal and the environment does not set NO_COLOR.
 std::string coloured(Colour colour, std::string text);
 
 } // namespace tav

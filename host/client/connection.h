@@ -17,15 +17,15 @@ std::string defaultServerFolder();
 OdString namedServerFolder(std::string const& typed);
 
 /// Throws `Failure` when the folder `server` is inside the working folder and is not hidden: it would be versioned, and
-/// going back to an earlier commit would take the server back too.
+/// checking out an earlier commit would put an earlier server in its place.
 void failIfInside(OdString const& server, std::string const& workingFolder);
 
-/// The server in `folder`, which is made when it is missing and shall be. Throws `Failure` when it does not answer, or
-/// speaks another version than this program.
+/// The server in `folder`; `missing` says whether a missing one is made. Throws `Failure` when it does not answer, or
+/// uses a different version of the protocol. The only place that makes a `Server`.
 std::unique_ptr<Server> connect(OdString const& folder, EmbeddedServer::Missing missing);
 
-/// Makes a repository on the server in `folder`, which is made when it is missing, and returns its identifier. That is
-/// `id`, unless it is empty: copies of a project find each other by it, whatever server they come from.
+/// Makes a repository on the server in `folder`, which is made when it is missing, and returns its identifier. The
+/// identifier is `id` unless that is empty: copies of a project recognise each other by it on any server.
 OdString makeRepository(OdString const& folder, std::string const& name, OdString const& id = OdString());
 
 /// The identifiers of all repositories of the server in `folder`.
@@ -34,7 +34,7 @@ std::vector<OdString> repositoriesIn(OdString const& folder);
 /// Throws `Failure` when `database` names no server.
 void requireServer(LocalDatabase const& database);
 
-/// A server, and a repository that it keeps.
+/// A connection to a server, for one repository that it keeps.
 class Connection {
 public:
     /// The ones that `database` names. Throws `Failure` when there are none.

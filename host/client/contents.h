@@ -11,7 +11,7 @@ namespace tav {
 
 /// The URLs of all files of all known commits, each once, in ascending order.
 struct Contents {
-    std::vector<OdString> here;      ///< kept here; whether they are whole, only reading them tells
+    std::vector<OdString> here;      ///< kept here; only reading them shows whether they are intact
     std::vector<OdString> elsewhere; ///< of commits that were made in other folders, where their contents are
 };
 

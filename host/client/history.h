@@ -1,8 +1,9 @@
-/// The history that a working folder knows beside the one that its server keeps.
+/// The history that a working folder knows, compared with the one that its server keeps.
 ///
-/// The server numbers commits without a gap. Known here is a part of them: all up to one number, which only learning
-/// moves on, commit by commit, and perhaps some behind a gap, made here while others committed too or left by an older
-/// version of tav. Which contents may go is decided when the two have been compared and nothing is unknown here.
+/// The server numbers commits without a gap. A working folder knows a part of them: all up to one number, which only
+/// fetching increases, and perhaps some after a gap, which were made here while others committed too, or left by an
+/// older version of tav. Contents are removed only when both histories have been compared and no commit is unknown
+/// here.
 #pragma once
 
 #include "host/client/connection.h"
@@ -15,7 +16,8 @@
 
 namespace tav {
 
-/// How the history that is known here differs from the server's. A commit under another number counts on both sides.
+/// How the history that is known here differs from the server's. A commit that has different numbers on the two sides
+/// counts on both.
 struct HistoryComparison {
     std::size_t unknownHere = 0;
     std::size_t unknownThere = 0;
@@ -23,22 +25,22 @@ struct HistoryComparison {
 
 HistoryComparison compareHistory(LocalDatabase const& database, Connection& connection);
 
-/// Gives all commits that the server has behind the number `known` to `take`, in ascending order, page by page.
+/// Passes all commits of the server after the number `known` to `take`, in ascending order, page by page.
 void forEachPageThere(
     Connection& connection, std::int64_t known, std::function<void(std::vector<ChangedCommit> const&)> const& take);
 
-/// What the branches and tags of the server name.
+/// The branches and tags of the server.
 std::vector<common::Reference> referencesThere(Connection& connection);
 
 /// Whether the server has the commit, known here or not.
 bool isOnServer(OdString const& hash, Connection& connection);
 
-/// The commits that are known here and not there under any number, in the order of their numbers.
+/// The commits that are known here and that the server does not have under any number, in the order of their numbers.
 std::vector<OdString> missingThere(LocalDatabase const& database, Connection& connection);
 
-/// How much of what is known here is looked up at the server before it is believed to have all of it.
+/// How much of the known history is looked up on the server before the server is considered to have all of it.
 enum class Compared {
-    theEnd,    ///< the last commit before a gap, and those behind it: enough where nothing is removed
+    theEnd,    ///< the last commit before a gap, and those after it: enough if nothing is removed
     everything ///< takes time for each commit
 };
 
@@ -47,13 +49,13 @@ struct Fetched {
     std::size_t references = 0; ///< new or moved
 };
 
-/// Enters all commits of the server that are not known here, which closes gaps, and what its branches and tags name.
-/// Throws `Failure` when the server lacks what is known here; nothing is entered then. After any other failure whole
-/// commits have been entered, and the next call goes on behind them. The caller holds the lock of the repository.
+/// Enters all commits of the server that are not known here, which closes gaps, and its branches and tags. Throws
+/// `Failure` when the server lacks a known commit; nothing is entered then. After any other failure, some commits have
+/// been entered completely, and the next call continues after them. The caller holds the lock of the repository.
 Fetched fetchHistory(common::RootPath const& root, LocalDatabase& database, Connection& connection, Compared compared);
 
-/// Puts the history of the server in the place of the one that is known here, in one change. The server has all that is
-/// known here, under whatever numbers.
+/// Replaces the known history by that of the server, in one transaction. The server must have every known commit, under
+/// any number.
 void replaceHistory(common::RootPath const& root, LocalDatabase& database, Connection& connection);
 
 } // namespace tav

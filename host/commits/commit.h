@@ -20,14 +20,14 @@ struct Committed {
     bool isNew; ///< false: the order repeats the last commit, and there is nothing else to commit
 };
 
-/// Commits what is staged, what is gone, as far as the order says so, and what has been renamed. Contents are stored,
-/// flushed and read back before the server hears of the commit; killed at any point, `finishCommit` or the same order
-/// leads to one commit. Throws `Failure`; staging and working folder are as they were then. The caller holds the lock
-/// of the repository since `start`, and nothing is unfinished.
+/// Commits what is staged, what has been renamed, and, as far as the order says so, the removal of missing files.
+/// Contents are stored, flushed and read back before the commit is sent to the server. If the process is killed at any
+/// point, `finishCommit` or the same order leads to one commit. Throws `Failure`; staging and working folder are then
+/// as they were. The caller has held the lock of the repository since `start`, and no operation is pending.
 Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start);
 
-/// Sends a commit whose contents are stored, unless the server has it, and enters it here. Throws `Failure`; when it is
-/// the server that refuses, the commit is given up.
+/// Sends a commit whose contents are stored, unless the server has it, and enters it in the local database. Throws
+/// `Failure`; if the server refused the commit, it is abandoned.
 CommitRecord finishCommit(common::RootPath const& root, LocalDatabase& database, PendingCommit const& pending);
 
 } // namespace tav

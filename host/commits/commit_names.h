@@ -1,13 +1,13 @@
-/// From what the user types to commits.
+/// Finding the commit that a typed name means.
 ///
 ///     commit = start step*
 ///     start  = branch or tag | number | at least 4 digits of a hash | "@" | "HEAD" | [branch] "@{" date "}"
 ///     step   = "~" [n] | "^" [n]
 ///
-/// "@" and "HEAD" are the commit that the working folder is at, and so is a missing start. "~n" goes back n first
-/// parents, and "^n" to the n-th parent; both count one without a number, and none with 0. A date goes to the last
-/// commit not after it on the line of first parents. A branch or tag of the whole typed name comes before everything
-/// else, and of what a start can be, the first in this order.
+/// "@", "HEAD" and a missing start mean the commit that the working folder is at. "~n" goes back n times to the first
+/// parent, and "^n" goes to the n-th parent; n is 1 if it is missing, and 0 goes nowhere. A date means the last commit
+/// up to that date along the first parents. A branch or tag with the whole typed name has priority over everything
+/// else. The forms of a start are tried in the order above.
 #pragma once
 
 #include "host/repository/local_database.h"
@@ -17,8 +17,8 @@
 
 namespace tav {
 
-/// The commit that `typed` means; none when it names no commit. Throws `Failure` when it could be several, and when it
-/// goes back behind the first one.
+/// The commit that `typed` means; none when it names no commit. Throws `Failure` when it is ambiguous, and when it goes
+/// back beyond the first commit.
 std::optional<CommitRecord> findCommitIfAny(LocalDatabase const& database, std::string const& typed);
 
 /// The same; throws `Failure` when there is none.

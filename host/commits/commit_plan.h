@@ -15,13 +15,13 @@ struct PlannedFile {
     OdString previousPath; ///< of a file that has been renamed, else empty
 };
 
-/// The staged files, the files that are gone from the working folder, and the renames that nobody staged, in the order
-/// of paths. Throws `Failure` for staged files that are not there any more.
+/// The staged files, the files that are missing from the working folder, and the renames that are not staged, in the
+/// order of paths. Throws `Failure` for staged files that no longer exist.
 std::vector<PlannedFile> planCommit(
     common::State const& state, common::RepoChanges const& changes, Renames const& found, Tree const& base,
     common::RootPath const& root);
 
-/// Says why there is nothing to commit.
+/// Throws a `Failure` that says why there is nothing to commit.
 [[noreturn]] void failForNothing(common::RepoChanges const& changes, common::RootPath const& root);
 
 } // namespace tav

@@ -19,7 +19,7 @@ namespace tav {
 
 class Database;
 
-/// A statement with its parameters and the row that it stands on. Lives no longer than its database.
+/// A statement with its parameters and its current row. The database must outlive it.
 class Statement {
 public:
     /// Sets the next parameter, in the order of the statement.
@@ -27,11 +27,11 @@ public:
     Statement& with(OdString const& text);
     Statement& with(std::string_view bytes); ///< of a text
 
-    /// Goes to the next row; false behind the last. The statement can then be given new parameters and run again.
+    /// Goes to the next row; false after the last. The statement can then be given new parameters and run again.
     bool next();
     /// Runs a statement that has no rows.
     void run();
-    /// Leaves the row that the statement stands on; while it stands on one, other programs cannot change the file.
+    /// Leaves the current row; while a statement has one, other programs cannot change the file.
     void reset();
 
     /// Columns of the row, counted from 0. A null is 0, and an empty text.

@@ -10,7 +10,7 @@
 
 namespace tav {
 
-/// Ends a command. `what` says what failed, `next` what the user can do about it; both in UTF-8, each a sentence.
+/// Ends a command. `what` says what failed, and `next` what the user can do about it; each is a sentence in UTF-8.
 struct Failure {
     Failure(std::string what_, std::string next_) : what(std::move(what_)), next(std::move(next_)) {}
     Failure(ErrorMessage const& error, std::string next_) : Failure(error.message.ansi_str(), std::move(next_))

@@ -1,4 +1,4 @@
-/// Documents of strangers: what is refused is named by its place in the document.
+/// Reading documents from untrusted sources: an error names the member that is refused.
 #pragma once
 
 #include "platform/sdk/OdString.h"
@@ -14,8 +14,8 @@ namespace tav {
 /// The value of a text that is JSON. Throws `Failure`.
 kutils::json::Value parsed(OdString const& text);
 
-/// A value of a document and where it stands there. The value lives longer, and so does the part that this one was
-/// reached through. What has another shape than it is asked for is refused: all operations throw `Failure`.
+/// A value of a document and its place there. The value must outlive it, and so must the part that it was reached
+/// through. All operations throw `Failure` when the value does not have the requested type.
 class Part {
 public:
     /// A whole document.
@@ -34,7 +34,7 @@ public:
 
     /// A text, its surrogate pairs joined.
     OdString text() const;
-    /// A text that comes back the same when it is kept as bytes, and holds no NUL.
+    /// A text that survives conversion to bytes and back, and contains no NUL.
     OdString soundText() const;
     std::int64_t integer() const;
 

@@ -1,13 +1,12 @@
-/// What the disk says of a file without its content being read.
+/// What the disk reports about a file without reading its content.
 #pragma once
 
 #include <cstdint>
 
 namespace tav {
 
-/// Whoever changes the content of a file, or puts another file in its place, changes its stamp as well, unless that
-/// happens within one tick of the clock of the file system: a program can set the modification time, but not the time
-/// of the last change.
+/// Changing the content of a file, or replacing the file, changes its stamp as well, unless that happens within one
+/// tick of the clock of the file system: a program can set the modification time, but not the time of the last change.
 struct FileStamp {
     std::uint64_t size = 0;
     std::uint64_t inode = 0;

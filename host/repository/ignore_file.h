@@ -8,8 +8,8 @@
 
 namespace tav {
 
-/// Throws `Failure` when the ignore file is there and cannot be read: the library would take it for empty then, and
-/// files would be offered for a commit that were meant to stay out.
+/// Throws `Failure` when the ignore file exists and cannot be read: the library would treat it as empty, and files that
+/// were meant to stay out would be offered for a commit.
 void requireRules(common::RootPath const& root);
 
 /// The rules in effect, in order: those of the ignore file, or the defaults when there is none. Throws `Failure` when
@@ -20,10 +20,10 @@ std::vector<OdString> ignoreRules(common::RootPath const& root);
 /// Throws `Failure` when one cannot be made.
 void makeIgnoreFile(common::RootPath const& root);
 
-/// Adds `rule` behind the last rule in effect, making the ignore file first when there is none. What stands behind an
-/// empty line in the file is out of effect and stays behind the new rule. False when the rule is there already.
-/// Throws `Failure` for a rule that is no valid expression or would not be read back, and when the file cannot be
-/// written; the file is untouched then.
+/// Adds `rule` after the last rule in effect, making the ignore file first when there is none. Text after an empty line
+/// in the file has no effect and stays after the new rule. False when the rule exists already.
+/// Throws `Failure` for a rule that is not a valid expression or would not be read back, and when the file cannot be
+/// written; the file is unchanged then.
 bool addIgnoreRule(common::RootPath const& root, OdString const& rule);
 
 } // namespace tav

@@ -1,5 +1,5 @@
-/// The journal: the operation that a command has begun, kept in the database until it has ended, so that the next
-/// command can complete it.
+/// The journal: the operation that a command has begun. The database keeps it until the operation has ended, so that
+/// the next command can complete it.
 #pragma once
 
 #include "host/repository/local_database.h"
@@ -15,26 +15,26 @@
 
 namespace tav {
 
-/// A content that a commit brings.
+/// A content that a commit adds.
 struct NewContent {
     OdString url;
     Digest digest{};
     std::uint64_t size = 0;
 };
 
-/// Index records of files, by path, that become true with the operation: these files are as the current commit has them
-/// then. None: the commit has no such file, or its time is not known.
+/// Index records of files, by path, that become valid when the operation ends: these files then match the current
+/// commit. None: the commit has no such file, or its time is not known.
 using IndexUpdates = std::map<OdString, std::optional<common::IndexData>>;
 
-/// A commit whose contents are all stored. Sending the document again does no harm: the server knows a commit by its
-/// hash.
+/// A commit whose contents are all stored. Sending the document again is harmless: the server recognises a commit by
+/// its hash.
 struct PendingCommit {
     OdString document;
     std::vector<NewContent> contents;
-    IndexUpdates files; ///< those that it takes and those that it removes
+    IndexUpdates files; ///< those that it adds or changes and those that it removes
 };
 
-/// A working folder that is being made to hold another commit.
+/// A checkout of another commit.
 struct PendingCheckout {
     OdString target;                  ///< hash of the commit
     OdString branch;                  ///< where HEAD points to afterwards
@@ -49,18 +49,18 @@ using PendingOperation = std::variant<std::monostate, PendingCommit, PendingChec
 /// Throws `Failure` when the journal cannot be read.
 PendingOperation readJournal(LocalDatabase const& database);
 
-/// Writes what has begun; on its own, or as a part of a `WriteTransaction` of the caller.
+/// Writes the operation that begins, on its own or as part of a `WriteTransaction` of the caller.
 void writeJournal(PendingCommit const& commit, LocalDatabase& database);
 void writeJournal(PendingCheckout const& checkout, LocalDatabase& database);
 
-/// The operation has ended, or is given up.
+/// Removes the operation, which has ended or was abandoned.
 void clearJournal(LocalDatabase& database);
 
-/// Says of a checkout which command was interrupted: "'tav switch a' was interrupted: ...".
+/// Describes an interrupted checkout for the user: "'tav switch a' was interrupted: ...".
 std::string describe(PendingCheckout const& checkout, LocalDatabase const& database);
 
-/// What a reader of the repository should know of an operation that has not ended, because its command was interrupted
-/// or is still running; empty when there is none.
+/// A notice, for commands that only read, about an operation that has not ended because its command was interrupted or
+/// is still running; empty when there is none.
 std::string pendingNotice(common::RootPath const& root, LocalDatabase const& database);
 
 } // namespace tav

@@ -12,21 +12,21 @@
 
 namespace tav {
 
-/// One thread. Every operation throws `Failure` when the database cannot be used; opening also when it is missing
-/// beside stored contents.
+/// One thread at a time. Every operation throws `Failure` when the database cannot be used; opening also throws when it
+/// is missing although contents are stored.
 class LocalDatabase {
 public:
-    /// Opens the database, and makes it when it is missing. One that an earlier tav made is brought to the form of this
-    /// one. The caller holds the lock of the repository.
+    /// Opens the database, and makes it when it is missing. A database of an earlier tav is migrated. The caller holds
+    /// the lock of the repository.
     static LocalDatabase make(common::RootPath const& root);
-    /// The same for the file `path`, in bytes, whatever is beside it.
+    /// The same for the file `path`, in bytes, whether or not contents are stored beside it.
     static LocalDatabase makeAt(std::string const& path);
-    /// Like `make`, but where it is missing an empty one is used instead, which is gone afterwards.
+    /// Like `make`, but when the database is missing, a temporary empty one is used instead.
     static LocalDatabase openForChanges(common::RootPath const& root);
-    /// For commands that only read: one that an earlier tav made stays as it is.
+    /// For commands that only read: a database of an earlier tav is not migrated.
     static LocalDatabase open(common::RootPath const& root);
 
-    /// Whether it is missing or empty beside stored contents: a new one would hide the history.
+    /// Whether it is missing or empty although contents are stored: a new one would hide the history.
     static bool isLost(common::RootPath const& root);
 
     LocalDatabase(LocalDatabase const&) = delete;
@@ -51,15 +51,15 @@ public:
     OdString currentCommit() const { return value("base"); }
     void setCurrentCommit(OdString const& hash) { setValue("base", hash); }
 
-    /// What a command has begun and not ended, as the document that the command wrote; empty when there is nothing.
+    /// The pending operation, as the document that the command wrote; empty when there is none.
     OdString journal() const { return value("unfinished"); }
     void setJournal(OdString const& document) { setValue("unfinished", document); }
 
-    /// URL of a content of this digest that is kept in a revision store; empty when none is known.
+    /// URL of a content with this digest that is kept in a revision store; empty when none is known.
     OdString urlOf(Digest const& digest) const;
-    /// URL under which some commit has a content of this digest; empty when none has.
+    /// URL under which any commit has a content with this digest; empty when none has.
     OdString committedUrlOf(Digest const& digest) const;
-    /// The URLs of all contents that were entered, in ascending order: they are kept in this folder.
+    /// The URLs of all contents that were added, in ascending order: they are kept in this folder.
     std::vector<OdString> contents() const;
     /// Bytes of the content at `url`.
     std::optional<std::uint64_t> sizeOf(OdString const& url) const;

@@ -1,4 +1,4 @@
-/// From what the user types to files of the repository.
+/// Finding the files that a typed name means. For names of commits, see host/commits/commit_names.h.
 #pragma once
 
 #include "common/mu_common_diff.h"
@@ -9,9 +9,9 @@
 
 namespace tav {
 
-/// `typed`, which is relative to the current folder or absolute, relative to the working folder of `root`; an empty
-/// text for the working folder itself. Nothing is looked up on the disk. Throws `Failure` when that lies outside the
-/// working folder.
+/// Converts `typed`, which is absolute or relative to the current folder, to a path relative to the working folder of
+/// `root`; the working folder itself gives an empty text. Does not access the disk. Throws `Failure` when the path is
+/// outside the working folder.
 OdString pathInRepository(common::RootPath const& root, std::string const& typed);
 
 /// The path of the first unchanged file that `name` matches as an expression; empty when there is none.
@@ -30,8 +30,8 @@ public:
     /// All of them, in ascending order of paths.
     std::vector<common::StagedFile> all() const { return findInFolder(OdString()); }
 
-    /// Empty when nothing is found. Throws `Failure` when an expression matches several files, with their list, and
-    /// when the name is no expression that can be used.
+    /// Empty when nothing is found. Throws `Failure` when an expression matches several files, with a list of them, and
+    /// when the name is not a valid expression.
     std::vector<common::StagedFile> find(std::string const& typed) const;
 
 private:

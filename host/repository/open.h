@@ -8,17 +8,17 @@
 
 namespace tav {
 
-/// The repository whose working folder is `folder`; with an empty `folder`, the one that the current folder lies in,
-/// looked for upwards. `folder` is in bytes, as the command line gave it.
+/// The repository whose working folder is `folder`; with an empty `folder`, the one that contains the current folder,
+/// searching parent folders. `folder` is in bytes, as given on the command line.
 /// Throws `Failure` when there is none, and as `requireOwnFiles` does.
 common::RootPath openRepository(std::string const& folder);
 
-/// The one that the current folder lies in; none where there is no repository.
+/// The repository that contains the current folder, if any.
 std::optional<common::RootPath> repositoryHere();
 
 /// Throws `Failure` when ".tav", a folder in it, its state, its settings or its database is a link: commands write and
-/// remove there, and what a link leads to may be another repository's, or not even a repository. Also when the database
-/// has another name: it is changed in place, by readers too when they find a change that was interrupted.
+/// remove there, and a link may lead to another repository or to no repository at all. Also throws when the database
+/// has another hard link: it is changed in place, even by readers when they find an interrupted change.
 void requireOwnFiles(common::RootPath const& root);
 
 } // namespace tav

@@ -1,7 +1,7 @@
-/// Working files that were read, as a table of the local database: what each held, and its stamp at that time.
+/// Working files that were read, as a table of the local database: the digest of each, and its stamp at that time.
 ///
-/// A record says something about a file and nothing about a commit. So it is true whichever commit the folder stands
-/// on, and may be written at any time after the file was read.
+/// A record describes a file, not a commit. So it is valid whichever commit is checked out, and may be written at any
+/// time after the file was read.
 #pragma once
 
 #include "host/database/sqlite.h"
@@ -25,14 +25,14 @@ using VerifiedFileList = std::vector<VerifiedFile>;
 /// One thread. Every operation throws `Failure` when the database cannot be used.
 class VerifiedFiles {
 public:
-    /// The table in `database`, which lives longer.
+    /// The table in `database`, which must outlive this object.
     explicit VerifiedFiles(Database& database) : database_(&database) {}
 
     /// Makes the table in a database without it.
     static void create(Database& database);
 
     VerifiedFileList all() const;
-    /// Adds `files`, in place of what was recorded of the same paths. Part of a `WriteTransaction` of the caller.
+    /// Adds `files`, replacing records of the same paths. Part of a `WriteTransaction` of the caller.
     void put(VerifiedFileList const& files);
 
 private:

@@ -1,4 +1,4 @@
-/// A server in a folder, for those who share a network drive and run no other.
+/// A server in a folder, for users who share a network drive and run no other server.
 #pragma once
 
 #include "host/protocol/server.h"

@@ -1,4 +1,4 @@
-/// The session that every command which changes a repository runs in.
+/// The session in which every command that changes a repository runs.
 #pragma once
 
 #include "host/repository/journal.h"
@@ -14,16 +14,16 @@ namespace tav {
 /// What a session does about an operation that an interrupted command has left in the journal.
 enum class Recovery {
     required,  ///< completes it, or fails
-    attempted, ///< completes it unless that fails: the command can do without, for example while the server is away
-    skipped    ///< leaves it: the command changes where the server is
+    attempted, ///< completes it if possible: the command works without, for example while the server is missing
+    skipped    ///< leaves it pending: the command changes the location of the server
 };
 
-/// Holds the lock of a repository, so that nobody else changes it, and has completed what was interrupted.
+/// Holds the lock of a repository, so that nobody else changes it, and has completed interrupted operations.
 class WriteSession {
 public:
     /// Takes the lock for the command `name`, and recovers. Throws `Failure`.
     WriteSession(common::RootPath const& root, std::string const& name, Recovery recovery = Recovery::required);
-    /// The same for a command that holds the lock already, because it had to make files of the repository first.
+    /// The same for a command that has the lock already because it had to create files of the repository first.
     WriteSession(common::RootPath const& root, os::FileLock lock, Recovery recovery);
 
     common::RootPath const& root() const { return root_; }
@@ -34,7 +34,7 @@ public:
     /// The commit that the recovery has completed, if any.
     std::optional<CommitRecord> const& recoveredCommit() const { return recoveredCommit_; }
 
-    /// Throws `Failure` when an interrupted command has left the files of two commits in the working folder.
+    /// Throws `Failure` when an interrupted command has left files of two commits in the working folder.
     void failIfBetweenCommits() const;
 
 private:

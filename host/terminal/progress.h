@@ -7,8 +7,8 @@
 
 namespace tav {
 
-/// Shows on the error stream how far a work has come, once it has taken half a second. Shows nothing where that stream
-/// is no terminal. The line is wiped when the work is over.
+/// Shows the progress of an operation on the error stream, once it has taken half a second. Shows nothing if that
+/// stream is not a terminal. The line is erased when the operation ends.
 class Progress {
 public:
     using Clock = std::chrono::steady_clock;

@@ -40,9 +40,9 @@ public:
     /// The value of a known key. Environment comes before repository, and that before the user's own.
     std::string value(std::string const& key) const { return effective(key).value; }
     SettingEntry effective(std::string const& key) const;
-    /// The effective value of every key in ascending order, with what is ignored behind it.
+    /// The effective value of every key in ascending order, followed by the ignored entries.
     std::vector<SettingEntry> all() const;
-    /// What stands in one of the two files.
+    /// The entries of one of the two files.
     std::vector<SettingEntry> in(Origin origin) const;
 
 private:
