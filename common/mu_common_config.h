@@ -25,9 +25,8 @@ public:
     explicit ConfigPath(OdString const& path);
 
     /// Checks `path` and makes the folder when it is missing, with its parents. The configuration file is not made.
-    /// Errors: `path` is empty; neither the folder nor one above it exists that `path` names (the root of the file
-    /// system and the current folder do not count); the nearest one that exists may not be written; the folder cannot
-    /// be made.
+    /// Errors: `path` is empty; neither the folder nor any parent that `path` names exists (the root of the file system
+    /// and the current folder do not count); the nearest one that exists is not writable; the folder cannot be made.
     static Expected<ConfigPath> get(OdString const& path);
 
     /// Path of the configuration file in `folder`.
@@ -47,7 +46,7 @@ struct MU_COMMON_EXPORT ConfigPathOrder {
     bool operator()(ConfigPath const& a, ConfigPath const& b) const;
 };
 
-/// What is known of a project beside its path.
+/// What is known of a project besides its path.
 struct ProjectInfo {
     OdString name;  ///< shown to the user
     OdString cloud; ///< its identifier on the server
@@ -59,14 +58,15 @@ struct MU_COMMON_EXPORT ConfigData {
 
     /// Adds a project, or replaces what is known of one.
     void add(OdString const& path, OdString const& name, OdString const& cloud);
-    /// Drops a project, if it is there.
+    /// Removes a project, if it exists.
     void remove(OdString const& path);
 };
 
-/// What the host implements to hear of changes. Registered by address: it removes itself before it is destroyed.
+/// What the host implements to be notified of changes. Registered by address, so it must remove itself before it is
+/// destroyed.
 class MU_COMMON_EXPORT ConfigListener {
 public:
-    /// Called after a writer of the configuration has gone. An exception from here ends the process.
+    /// Called when a `WriteConfigData` is destroyed. An exception from here ends the process.
     virtual void configChanged() = 0;
 
 protected:
@@ -78,7 +78,7 @@ protected:
 
 /// Orders listeners by their addresses.
 struct MU_COMMON_EXPORT ListenerOrder {
-    /// Whether `a` lies before `b`.
+    /// Whether the address of `a` is lower than that of `b`.
     bool
     operator()(std::reference_wrapper<ConfigListener> const& a, std::reference_wrapper<ConfigListener> const& b) const;
 };
@@ -86,10 +86,11 @@ struct MU_COMMON_EXPORT ListenerOrder {
 /// The listeners of a configuration, which it does not own.
 using ConfigListeners = std::set<std::reference_wrapper<ConfigListener>, ListenerOrder>;
 
-/// Access for writing, for as long as it lives. Then it calls all listeners, in ascending order of addresses, whether
-/// or not anything was changed. It needs no memory for that. A listener may add and remove listeners meanwhile, and
-/// destroy removed ones: a removed one is not called any more, and an added one is called if it comes later in the
-/// order. A listener may also release the last owner of the configuration, which then goes when all have been called.
+/// Gives access for writing as long as it lives. Its destructor calls all listeners, in ascending order of addresses,
+/// whether or not anything was changed, and allocates no memory for that. During these calls, a listener may add and
+/// remove listeners, and destroy removed ones: a removed one is not called any more, and an added one is called if it
+/// comes later in the order. A listener may also release the last owner of the configuration, which is then destroyed
+/// when all have been called.
 class MU_COMMON_EXPORT WriteConfigData {
 public:
     /// Keeps data and listeners by reference, and `owner`, which may be null, alive as long as itself.
@@ -110,7 +111,8 @@ private:
     std::shared_ptr<void const> owner_;
 };
 
-/// The configuration of one folder. Held by `std::shared_ptr`; it reaches the disk only when the last owner lets go.
+/// The configuration of one folder. Held by `std::shared_ptr`; it is written to the disk only when the last owner
+/// releases it.
 class MU_COMMON_EXPORT Config : public std::enable_shared_from_this<Config> {
 public:
     class Factory;
@@ -128,28 +130,29 @@ public:
     Config& operator=(Config const&) = delete;
     /// If `write` was ever called, replaces the configuration file as a whole and reports the outcome to the host,
     /// once. Errors reported: the document cannot be built; the file cannot be written. Both leave the old file, except
-    /// when only its folder cannot be flushed: then the new one is there, but after a crash perhaps the old one.
+    /// when only its folder cannot be flushed: then the new file is there, but a crash may bring the old one back.
     ~Config();
 
-    /// The configuration of `folder`, which is made when it is missing. While one lives that was read from a file,
-    /// every caller gets that same one, as it is in memory; without a file every caller gets one of its own, without
-    /// projects. Errors: those of `ConfigPath::get`; the file cannot be read, is not JSON or not of the expected shape.
+    /// The configuration of `folder`, which is made when it is missing. As long as one that was read from a file lives,
+    /// every caller gets that same one, as it is in memory. Without a file, every caller gets a separate one, without
+    /// projects. Errors: those of `ConfigPath::get`; the file cannot be read, is not JSON or does not have the expected
+    /// form.
     static Expected<std::shared_ptr<Config>> load(OdString const& folder, IoInterface const& io);
     /// A temporary host would be gone when the outcome is reported.
     static Expected<std::shared_ptr<Config>> load(OdString const& folder, IoInterface const&& io) = delete;
 
-    /// The process's table of living configurations.
+    /// The table of living configurations in this process.
     static Factory& factory();
 
     /// The content, for reading, valid as long as the configuration.
     ConfigData const& read() const { return data_; }
-    /// The content, for writing; the configuration is saved at its end from here on. The result counts as an owner of a
-    /// configuration that is held by `std::shared_ptr`; any other configuration must outlive it.
+    /// The content, for writing; from here on, the configuration is saved when it is destroyed. The result counts as an
+    /// owner of a configuration that is held by `std::shared_ptr`; any other configuration must outlive it.
     WriteConfigData write();
 
     /// Registers `listener`, once.
     void addListener(ConfigListener& listener);
-    /// Takes back a registration; does nothing for a listener that is not registered.
+    /// Removes `listener`; does nothing for a listener that is not registered.
     void removeListener(ConfigListener& listener);
 
     /// The folder.
@@ -169,7 +172,8 @@ private:
 /// Remembers living configurations by their folder, without keeping them alive.
 class MU_COMMON_EXPORT Config::Factory {
 public:
-    /// The living configuration of `path`, as it is; `data` and `io` are dropped then. Else a new one of `data`.
+    /// The living configuration of `path`, unchanged; `data` and `io` are then ignored. If there is none, a new one
+    /// with `data`.
     std::shared_ptr<Config> get(ConfigPath const& path, ConfigData data, IoInterface const& io);
     /// A temporary host would be gone when the outcome is reported.
     std::shared_ptr<Config> get(ConfigPath const& path, ConfigData data, IoInterface const&& io) = delete;

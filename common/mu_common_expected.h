@@ -1,4 +1,4 @@
-/// Results: a value or the message that says why there is none.
+/// Results: a value, or a message that says why there is none.
 ///
 /// Failures that a caller has to expect (bad data, a full disk, a missing file) are returned as the error of an
 /// `Expected`; the types here live in the global namespace. All of them are plain values without locks.
@@ -17,7 +17,7 @@
 
 /// Why something failed, in words for people.
 struct ErrorMessage {
-    /// Holds `text` as it stands: nothing in it is taken for a placeholder.
+    /// Keeps `text` unchanged: nothing in it is treated as a placeholder.
     explicit ErrorMessage(OdString const& text) : message(text) {}
 
     /// Holds `format` with its placeholders filled in by `OdString::format`; `%ls` takes a `wchar_t const*`.
@@ -48,12 +48,12 @@ public:
     /// Builds the value in place.
     Expected(std::in_place_t) : content_(std::in_place_index<1>) {}
 
-    /// Builds the value in place from `first` and what passing through a temporary leaves of `rest`.
+    /// Builds the value in place from `first` and from what remains of `rest` after passing through temporaries.
     ///
-    /// Each argument after the first is handed once to a temporary of its own type that is destroyed at once. What can
-    /// be copied is copied and stays whole; what can only be moved is moved, so an owner (a `std::unique_ptr`) arrives
-    /// EMPTY at the value and what it owned is gone. Readers of server documents rely on that; do not hand owners in
-    /// here to keep what they own. Aggregates are built as well.
+    /// Each argument after the first is passed to a temporary of its own type, which is destroyed at once. A copyable
+    /// argument is copied and stays intact. A move-only argument is moved, so an owner (a `std::unique_ptr`) arrives
+    /// EMPTY at the value, and what it owned is destroyed. Readers of server documents rely on that; do not pass owners
+    /// whose objects you want to keep. Aggregates can be built too.
     template <class First, class... Rest>
     Expected(std::in_place_t, First&& first, Rest&&... rest)
         : Expected(
@@ -69,7 +69,7 @@ public:
         return std::visit(std::forward<Visitor>(visitor), std::move(content_));
     }
 
-    /// Whether there is a value, and no error.
+    /// Whether there is a value and no error.
     bool hasValue() const noexcept { return content_.index() == 1; }
 
     /// The value of a result that has one; lives as long as the result.
@@ -78,7 +78,7 @@ public:
         assert(hasValue());
         return *std::get_if<1>(&content_);
     }
-    /// Takes it out of a result that goes, so that it may be walked at once: `for (auto& file : collect().value())`.
+    /// Moves it out of a temporary result, so that it can be used in a loop: `for (auto& file : collect().value())`.
     T value() &&
     {
         assert(hasValue());
@@ -91,7 +91,7 @@ public:
         assert(!hasValue());
         return *std::get_if<0>(&content_);
     }
-    /// Takes it out of a result that goes.
+    /// Moves it out of a temporary result.
     ErrorMessage error() &&
     {
         assert(!hasValue());
@@ -141,11 +141,11 @@ namespace mu_common_detail {
 /// Visitor that takes the value out of an `Expected` or throws:
 /// `T value = std::move(expected).visit(GetRValueOrThrow<T>{});`
 ///
-/// On an error it throws `OdError` with one fixed sentence; the message of the error is not in it. Who needs the reason
-/// looks at the result before taking the value out.
+/// On an error it throws `OdError` with one fixed sentence; the message of the error is not in it. A caller that needs
+/// the reason must check the result before taking the value out.
 template <class T>
 struct GetRValueOrThrow {
-    /// Gives the value on.
+    /// Returns the value.
     T&& operator()(T&& value) const { return std::move(value); }
     /// Throws; never returns.
     T&& operator()(ErrorMessage&&) const { mu_common_detail::throwNoValue(); }

@@ -27,12 +27,12 @@ struct Expression {
     std::vector<Expression> parts{}; ///< a group, look-ahead or repetition has one
     std::size_t number = 0;          ///< of a group that is captured, or of the one referred to; counted from 1
     std::size_t least = 1;           ///< of a repetition
-    std::size_t most = 1;            ///< likewise, or `kEndless`
+    std::size_t most = 1;            ///< of a repetition, or `kEndless`
 };
 
-/// Reads `text`, which must outlive the result. Throws `std::regex_error` for an expression that is nested too deep for
-/// the recursive functions that look at it, and for one of more than `kMostParts` characters and groups. Other errors
-/// are left to the standard library's compiler: the tree of an expression that it refuses has no meaning.
+/// Reads `text`, which must outlive the result. Throws `std::regex_error` for an expression that is nested too deeply
+/// for the recursive functions that examine it, and for one of more than `kMostParts` characters and groups. Other
+/// errors are left to the standard library's compiler: the tree of an expression that it refuses has no meaning.
 Expression readExpression(std::string_view text);
 
 /// Whether `expression` is of the kind `kind` or has a part that is.

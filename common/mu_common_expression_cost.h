@@ -1,4 +1,4 @@
-/// What an expression may cost at worst, whatever the text. Internal to the library.
+/// Limits on the worst-case cost of an expression, whatever the text. Internal to the library.
 #pragma once
 
 #include "common/mu_common_expression.h"
@@ -7,24 +7,25 @@
 
 namespace common {
 
-/// Of a file.
+/// The longest name of a file, in bytes.
 constexpr std::size_t kLongestName = 255;
-/// The longest text that back references are followed through: each character takes some levels of recursion.
+/// The longest text for an expression with back references: each character takes some levels of recursion.
 constexpr std::size_t kLongestText = 1024;
 
-// Each of these throws `std::regex_error` for an expression that is beyond the bounds, which are the same for all: in
-// the levels of recursion that it may take, in the states of its automaton, and in steps. A step is one look at one
-// state of the automaton for one character of the text.
+// Each of these throws `std::regex_error` for an expression that exceeds the limits, which are the same for all: levels
+// of recursion, states of the automaton, and steps. A step checks one state of the automaton for one character of the
+// text.
 
-/// Compiling: its recursion, its memory, and its time, which is quadratic in the number of alternatives and long for
-/// classes.
+/// Checks compiling: its recursion, its memory, and its time, which is quadratic in the number of alternatives and long
+/// for classes.
 void checkCompiling(Expression const& expression);
 
-/// Matching a text of up to `longestText` characters in all ways at once, without back references: each state is looked
-/// at once for each position where it may be reached. A look-ahead is a match of its own at each of its positions.
+/// Checks matching a text of up to `longestText` characters in all ways at once, without back references: each state is
+/// checked once for each position where it can be reached. A look-ahead is a separate match at each of its positions.
 void checkMatchingAtOnce(Expression const& expression, std::size_t longestText);
 
-/// The same one way after the other, as back references need it. The expression has been compiled.
+/// Checks matching one way after another, with backtracking, which back references require. The expression must have
+/// been compiled.
 void checkMatchingWayByWay(Expression const& expression, std::size_t longestText);
 
 } // namespace common

@@ -1,8 +1,8 @@
 /// Storage URLs, and the interface of the storage that keeps the contents of all versions.
 ///
 /// A URL that begins with "tf" names a revision of a drawing, "tf:NAME#REVISION"; one that begins with "po" names
-/// another file by the content hash in its last 64 characters. What else stands in a URL is the business of the storage
-/// that made it. The functions keep nothing between calls; any thread may call them.
+/// another file by the content hash in its last 64 characters. The meaning of the rest of a URL is up to the storage
+/// that made it. The functions keep no state; any thread may call them.
 #pragma once
 
 #include "common/mu_common_expected.h"
@@ -23,9 +23,9 @@ enum class StorageType : std::int32_t {
     Object = 1, ///< as an object of its own
 };
 
-/// The kind of storage that `url` names: `Tf` when it begins with "tf", letter case counting, else `Object`.
+/// The kind of storage that `url` names: `Tf` when it begins with "tf" (case-sensitive), else `Object`.
 MU_COMMON_EXPORT StorageType urlToType(OdString const& url);
-/// The kind of storage that the file `path` belongs to: `Tf` when its extension is "dwg", letter case counting, else
+/// The kind of storage that the file `path` belongs to: `Tf` when its extension is "dwg" (case-sensitive), else
 /// `Object`.
 MU_COMMON_EXPORT StorageType fileToType(OdString const& path);
 
@@ -33,10 +33,10 @@ MU_COMMON_EXPORT StorageType fileToType(OdString const& path);
 /// Error: any other beginning, a "tf" URL without '#' or with a line end.
 MU_COMMON_EXPORT Expected<OdString> getRevision(OdString const& url);
 
-/// Full path of the revision store or object that `url` names, inside ".tav" of `root`: the name of a store is what
-/// stands between "tf:" and the first '#'. Nothing is looked up on the disk, and the name is taken as it is: who reads
-/// URLs from strangers checks it first.
-/// Error: any other beginning, a "tf" URL without ':' behind "tf", without '#' or with a line end.
+/// Full path of the revision store or object that `url` names, inside ".tav" of `root`: the name of a store is the text
+/// between "tf:" and the first '#'. Does not access the disk and does not check the name: a caller that gets URLs from
+/// others must check it first.
+/// Error: any other beginning, a "tf" URL without ':' after "tf", without '#' or with a line end.
 MU_COMMON_EXPORT Expected<OdString> getStoragePath(RootPath const& root, OdString const& url);
 
 /// What the host implements to keep contents. `root` is the repository; URLs are those that `store` has returned.
@@ -54,21 +54,21 @@ public:
     /// Whether the content that `url` names is kept.
     virtual Expected<bool> contains(RootPath const& root, OdString const& url) = 0;
 
-    /// Merges through `mergeFromStorage`, given `fourth` and `second`, if the host accepts `first`; a host that
-    /// declines has success at once. `third` is not used. Errors: that of `mergeFromStorage`, unchanged; `second` is
-    /// not in the storage.
+    /// Merges through `mergeFromStorage`, given `fourth` and `second`, if the host accepts `first`; when the host
+    /// declines, the result is success at once. `third` is not used. Errors: that of `mergeFromStorage`, unchanged;
+    /// `second` is not in the storage.
     virtual WriteOutcome merge(
         OdString const& first, OdString const& second, OdString const& third, OdString fourth, RootPath const& root,
         IoInterface const& io);
 
-    /// Gives up the content that `url` names.
+    /// Removes the content that `url` names.
     virtual WriteOutcome remove(RootPath const& root, OdString const& url) = 0;
-    /// Merges the stored version `url` into `target`. True when it is done, false when the version is not in the
+    /// Merges the stored version `url` into `target`. True when it was merged, false when the version is not in the
     /// storage.
     virtual Expected<bool> mergeFromStorage(RootPath const& root, OdString const& target, OdString const& url) = 0;
-    /// The URLs of all revisions kept beside the one that `url` names, oldest first.
+    /// The URLs of all revisions in the same store as the one that `url` names, oldest first.
     virtual Expected<std::vector<OdString>> revisions(RootPath const& root, OdString const& url) = 0;
-    /// Checks that the content that `url` names is kept whole.
+    /// Checks that the content that `url` names is stored and intact.
     virtual WriteOutcome verify(RootPath const& root, OdString const& url) = 0;
 };
 

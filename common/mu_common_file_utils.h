@@ -1,7 +1,7 @@
 /// Walking folders: the files of a repository, its conflicted drawings, and any folder by name patterns.
 ///
-/// Everything here reads the disk without locks: files that come or go during a walk may or may not be listed. Folders
-/// that cannot be opened are skipped silently at any depth, and links to folders are not followed.
+/// Everything here reads the disk without locks: files that appear or disappear during a walk may or may not be listed.
+/// Folders that cannot be opened are skipped silently at any depth, and links to folders are not followed.
 #pragma once
 
 #include "common/mu_common_expected.h"
@@ -27,34 +27,34 @@ struct MU_COMMON_EXPORT CollectOptions {
     bool relativePaths;            ///< results are relative to the walked folder, else they begin with it
     bool collectDirs;              ///< folders are listed too
     std::int32_t enumerationFlags; ///< 4 when hidden entries are listed, else 0
-    /// An entry whose bare name, in its narrow form, is covered as a whole by one of these is skipped, a folder with
-    /// all that is in it. They run as the standard library runs them: some, such as `(a*)*b`, take exponential time on
-    /// a long name. An expression from outside the host belongs into the ignore file, or goes through `RepoIgnore`,
-    /// whose expressions end in bounded time.
+    /// An entry is skipped when one of these matches its whole bare name, in the narrow form; a folder is skipped with
+    /// everything in it. The standard library runs them, so some, such as `(a*)*b`, take exponential time on a long
+    /// name. Expressions from outside the host belong in the ignore file or must go through `RepoIgnore`, whose
+    /// expressions run in bounded time.
     std::vector<std::regex> excludes;
 };
 
 /// What a walk found.
 struct DirContents {
     std::vector<OdString> files; ///< in the order of the walk
-    std::vector<OdString> dirs;  ///< likewise; empty unless folders were asked for
+    std::vector<OdString> dirs;  ///< in the same order; empty unless folders were requested
 };
 
-/// Sets the access and modification time of the file `path` to now. A file that is missing stays missing, and failure
-/// is not reported.
+/// Sets the access and modification time of the file `path` to now. A missing file is not created, and failure is not
+/// reported.
 MU_COMMON_EXPORT void touch(OdString const& path);
 
-/// Lists what is in `folder`, sub-folders included: the files of a folder before anything of its sub-folders, those
-/// depth first, names in byte order.
+/// Lists what is in `folder` and its sub-folders: first the files of a folder, then its sub-folders, depth first, names
+/// in byte order.
 MU_COMMON_EXPORT DirContents collectDirContents(OdString const& folder, CollectOptions const& options);
 
-/// The files under version control, relative to the working folder: what lies in it, hidden entries and what the ignore
-/// rules match excepted, then the files of the properties folder, which travel with the repository.
+/// The files under version control, relative to the working folder: its files, except for hidden entries and those that
+/// the ignore rules match, then the files of the properties folder, which travel with the repository.
 /// Error: the properties folder is not below the working folder. Throws `std::regex_error` for an invalid ignore rule
 /// and `OdError` for an ignore file that cannot be read (see `RepoIgnore`).
 MU_COMMON_EXPORT Expected<std::vector<File>> collectRepoFiles(RootPath const& root);
 
-/// The drawings of which other versions lie in the conflict folder, in ascending order of their paths.
+/// The drawings that have other versions in the conflict folder, in ascending order of their paths.
 MU_COMMON_EXPORT std::vector<std::unique_ptr<ConflictInfo>> collectConflictPaths(RootPath const& root);
 
 } // namespace common

@@ -23,11 +23,11 @@ public:
 
     /// `name`.
     QString getName() const override;
-    /// The resource name of the picture that stands for every author.
+    /// The resource name of the picture that represents every author.
     QString getLeftIconSource() const override;
     /// The author's name up to the first '@', a dot between spaces, and how long ago `date` is: "less than a minute
-    /// ago", minutes, hours, or from a day on (and for a date in the future) the date itself. Without an author the
-    /// time alone. The phrases are translated. Reads the clock: the text changes as time passes.
+    /// ago", minutes, hours, or, after a day or for a date in the future, the date itself. Without an author, only the
+    /// time. The phrases are translated. Reads the clock: the text changes as time passes.
     QString getInfo() const override;
 
     OdTimeStamp date; ///< when the entry was made, in universal time

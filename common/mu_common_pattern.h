@@ -17,26 +17,27 @@
 namespace common {
 
 /// Compiles `expression`, in the ECMAScript grammar, case-sensitive, over the bytes of its narrow form and under the
-/// classic locale whatever the process's is.
-/// The standard library's matcher recurses for every character and may try exponentially many ways. Expressions are
-/// compiled without sub-matches for its polynomial algorithm, which does neither. Back references, which that algorithm
-/// lacks, are followed one way after the other. Throws `std::regex_error` for an invalid expression, and for one that
-/// could take too much stack, memory or time with a text of `longestText` characters (see `checkCompiling` and others).
+/// classic locale, whatever the locale of the process.
+/// The standard library's default matcher recurses for every character and may backtrack exponentially. Expressions are
+/// therefore compiled without sub-matches for its polynomial algorithm, which does neither. That algorithm has no back
+/// references; expressions that have them are matched with backtracking. Throws `std::regex_error` for an invalid
+/// expression, and for one that could take too much stack, memory or time with a text of `longestText` characters (see
+/// `checkCompiling` and others).
 std::regex compilePattern(OdString const& expression, std::size_t longestText);
 
-/// Whether `expression` covers the whole of `text`. Throws `std::regex_error` when a back reference would have to be
-/// followed through a text of more than `kLongestText` characters.
+/// Whether `expression` matches the whole of `text`. Throws `std::regex_error` for an expression with a back reference
+/// and a text of more than `kLongestText` characters.
 bool matchesWhole(std::regex const& expression, std::string const& text);
 
-/// An expression that is one row of single characters, each of them `.`, a class like `[a-c_]` or itself, and each at
-/// will with `*`, `+` or `?`. All ways to match are followed at once, one bit for each character of the row, which
-/// takes a fiftieth of the time of the standard library's matcher.
+/// An expression that is a sequence of single characters, each of them `.`, a class like `[a-c_]` or a literal,
+/// optionally followed by `*`, `+` or `?`. A bit-parallel automaton follows all ways to match at once, with one bit for
+/// each character of the sequence, which takes a fiftieth of the time of the standard library's matcher.
 class CharacterRow {
 public:
-    /// Null for an expression of another form, and for one that is too long.
+    /// Null for any other expression, and for one that is too long.
     static std::unique_ptr<CharacterRow const> of(std::string_view expression);
 
-    /// Whether the row covers the whole of `text`, which holds no line end.
+    /// Whether the sequence matches the whole of `text`, which must not contain a line end.
     bool matches(std::string_view text) const;
 
 private:
@@ -57,18 +58,18 @@ private:
     unsigned length_ = 0;
 };
 
-/// Names to leave out of a scan. A large folder asks for every name, so rules of the common shapes (a fixed name, a
-/// fixed ending, beginning or middle, a row of characters) are decided without running their expression, wherever the
-/// answer is the same.
+/// Names to leave out of a scan. A scan checks every name of a large folder, so rules of the common forms (a fixed
+/// name, a fixed ending, beginning or middle, a sequence of characters) are decided without running their expression,
+/// wherever the answer is the same.
 class NameFilter {
 public:
     /// Compiles `rules` as `compilePattern` does.
     explicit NameFilter(std::vector<OdString> const& rules);
-    /// Takes expressions as they are and runs them.
+    /// Uses compiled expressions and always runs them.
     explicit NameFilter(std::vector<std::regex> const& expressions);
 
     bool isEmpty() const { return rules_.empty(); }
-    /// Whether any rule covers the whole of `name`, which is in its narrow form.
+    /// Whether any rule matches the whole of `name`, which is in its narrow form.
     bool matches(std::string const& name) const;
 
 private:

@@ -1,4 +1,4 @@
-/// The records in which the system talks about files, and two helpers on files of a repository.
+/// Records that describe files, and two helpers for files of a repository.
 ///
 /// All records are plain values without locks; all paths are relative to the working folder unless said otherwise.
 #pragma once
@@ -24,7 +24,7 @@ enum class FileChange : std::int32_t { added = 0, modified = 1, removed = 2 };
 /// "added", "modified" or "removed". Error: any other value.
 MU_COMMON_EXPORT Expected<OdString> toString(FileChange change);
 
-/// The change that `text` names, letter case counting. Error: any other text.
+/// The change that `text` names (case-sensitive). Error: any other text.
 MU_COMMON_EXPORT Expected<FileChange> toFileChange(OdString const& text);
 
 /// One change staged for the next commit.
@@ -32,7 +32,7 @@ struct MU_COMMON_EXPORT StagedFile {
     /// Stores both.
     StagedFile(OdString const& path, FileChange change);
 
-    /// Same path, letter case counting, and same change.
+    /// Same path (case-sensitive) and same change.
     bool operator==(StagedFile const& other) const;
 
     OdString path;     ///< relative to the working folder
@@ -56,7 +56,7 @@ class MU_COMMON_EXPORT RepoFile : public BaseFile {
 public:
     /// Without a previous version.
     RepoFile(OdString const& path, OdString const& storagePath);
-    /// Takes `base` over, which may be null.
+    /// Takes over `base`, which may be null.
     RepoFile(OdString const& path, OdString const& storagePath, std::unique_ptr<BaseFile> base);
 
     OdString storagePath;           ///< storage URL of the content
@@ -65,7 +65,7 @@ public:
 
 /// A candidate for staging.
 struct MU_COMMON_EXPORT PossibleRepoFile {
-    /// What is not named stays unset.
+    /// Members without an argument stay unset.
     ///@{
     explicit PossibleRepoFile(OdString const& path);
     PossibleRepoFile(OdString const& path, OdString const& storagePath);
@@ -91,8 +91,8 @@ struct VersionedFile {
 };
 
 /// The two versions of one file that belong together. `void` stands for a side that is absent. `metaInfo` holds a
-/// `ConflictInfo` for a conflicted file, a `ParentInfo` with parent commits, or nothing. Copies share what the pointers
-/// lead to. `hostValue` means what the host wants it to: the library only keeps it.
+/// `ConflictInfo` for a conflicted file, a `ParentInfo` with parent commits, or nothing. Copies share the objects that
+/// the pointers lead to. `hostValue` is for the host to use: the library only stores it.
 template <class A, class B>
 struct Versions;
 
@@ -126,7 +126,7 @@ template <>
 struct MU_COMMON_EXPORT Versions<VersionedFile, std::shared_ptr<File>> {
     /// Without previous path and extra information.
     explicit Versions(VersionedFile current);
-    /// Takes both owners over. `Expected`'s in-place construction empties owners before they arrive here.
+    /// Takes over both owners. `Expected`'s in-place construction empties them before they arrive here.
     Versions(VersionedFile current, std::unique_ptr<File> previous, std::unique_ptr<MetaInfo> metaInfo);
 
     std::shared_ptr<MetaInfo> metaInfo; ///< may be null
@@ -134,16 +134,16 @@ struct MU_COMMON_EXPORT Versions<VersionedFile, std::shared_ptr<File>> {
     std::shared_ptr<File> previous;     ///< previous path of a renamed file; may be null
 };
 
-/// Appends the line "<local time> - <text>" to the log file of `root`, in UTF-8, creating the file if need be.
-/// False when the file cannot be opened or is not a regular file, without waiting for it; errors of writing are not
-/// detected. Any thread may call it, but lines that are written at the same moment may mix.
+/// Appends the line "<local time> - <text>" to the log file of `root`, in UTF-8, creating the file if necessary.
+/// False when the file cannot be opened or is not a regular file; never blocks on it. Write errors are not detected.
+/// Any thread may call it, but lines that are written at the same time may mix.
 MU_COMMON_EXPORT bool logString(OdString const& text, RootPath const& root);
 
 /// Whether the working file `relativePath` of `root` differs from the recorded `hash`: a prefix of three characters
-/// followed by the SHA-256 digest in lower-case hexadecimal digits. A hash that begins with "tf" names a revision store
-/// and counts as different without a look at the file. A file that cannot be opened counts as empty; from the first
-/// byte that cannot be read, all count as zeros.
-/// Reads the whole file, in pieces: memory does not grow with it. Any thread may call it.
+/// followed by the SHA-256 digest in lower-case hexadecimal digits. A hash that begins with "tf" names a revision
+/// store; the file then counts as different and is not read. A file that cannot be opened counts as empty; all bytes
+/// from the first unreadable one count as zeros.
+/// Reads the whole file in pieces, so memory does not grow with it. Any thread may call it.
 MU_COMMON_EXPORT bool isDifferent(OdString const& relativePath, OdString const& hash, RootPath const& root);
 
 } // namespace common

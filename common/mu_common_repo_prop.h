@@ -14,9 +14,9 @@ namespace common {
 /// One repository: a working folder of drawings with a folder ".tav" directly inside it.
 ///
 /// A plain value that holds the path of the working folder; copies are interchangeable and may be read from any thread.
-/// The operations that compose paths cannot fail and never touch the disk. Parts of a path are joined by exactly one
-/// separator, and neither part is looked at: what begins with a separator gets a doubled one. Nothing is resolved or
-/// made absolute, and letter case counts.
+/// The operations that compose paths cannot fail and never access the disk. They join two parts with one separator and
+/// do not examine either part, so a part that begins with a separator gives two. Nothing is resolved or made absolute,
+/// and paths are case-sensitive.
 class MU_COMMON_EXPORT RootPath {
 public:
     /// Takes the path of the working folder without its trailing separators.
@@ -24,7 +24,7 @@ public:
 
     /// Opens the repository whose working folder is `path`, or with `create` makes it: the working folder with its
     /// missing parents, and an empty ".tav". Only a ".tav" directly inside `path` counts: parent folders are not
-    /// searched. An existing repository is opened without touching the disk.
+    /// searched. Opening an existing repository does not change the disk.
     /// Errors: not a repository (without `create`); the working folder, or ".tav" in it, cannot be made.
     static Expected<RootPath> get(OdString const& path, bool create);
 
@@ -45,14 +45,15 @@ public:
     /// `relative` inside the conflict folder, with its sub-folders.
     OdString conflictPathTo(OdString const& relative) const;
 
-    /// Where the incoming copy of the conflicted drawing `file` lies, relative to the working folder. The folders of
-    /// `file` are dropped: drawings of one name in different folders share their conflict copies.
+    /// The path of the incoming copy of the conflicted drawing `file`, relative to the working folder. The folders of
+    /// `file` are dropped: drawings with the same name in different folders share their conflict copies.
     OdString relativeToTheirs(OdString const& file) const;
-    /// Where the common ancestor of the conflicted drawing `file` lies, likewise.
+    /// The path of the common ancestor of the conflicted drawing `file`, composed in the same way.
     OdString relativeToBase(OdString const& file) const;
 
     /// The part of `path` below the working folder, compared as plain text.
-    /// Error: `path` does not begin with the working folder and a separator. Its text keeps the placeholder unfilled.
+    /// Error: `path` does not begin with the working folder and a separator. The placeholder in its text is not filled
+    /// in.
     Expected<OdString> relativePathTo(OdString const& path) const;
 
 private:
@@ -64,24 +65,24 @@ MU_COMMON_EXPORT OdString repositoryExt();
 
 /// The ignore rules of a repository: which names the scan of the working folder skips.
 ///
-/// They stand in the file "ignore" of the properties folder, one regular expression per line (ECMAScript, letter case
-/// counts, matched against whole names), up to the end of the file or the first empty line. There are no comments, and
-/// blanks belong to the expression. Without the file, backup drawings (.bak) and lock files (.dwl, .dwl2) are ignored.
+/// They are in the file "ignore" of the properties folder, one regular expression per line (ECMAScript, case-sensitive,
+/// matched against whole names), up to the end of the file or the first empty line. There are no comments, and blanks
+/// belong to the expression. Without the file, backup drawings (.bak) and lock files (.dwl, .dwl2) are ignored.
 ///
-/// A snapshot: later changes of the file do not show. One thread at a time.
+/// A snapshot: later changes to the file have no effect. One thread at a time.
 class MU_COMMON_EXPORT RepoIgnore {
 public:
     /// Loads the rules of `root`. Throws `std::regex_error` for a line that is not a valid expression, and for one that
     /// could exhaust the stack or take more than about a second for one file name, however unlikely that name is.
     /// Refused are: groups nested deeper than 100; more than about 8,000 characters in a row, 4,000 alternatives, 4,000
-    /// classes like `[a-z]` or 16,000 characters in all, with counted repetitions written out, but for classes;
-    /// thousands of `\b` behind a loop; repeated look-aheads that repeat much themselves or are many; and with a back
-    /// reference, loops in loops that can divide a text in several ways, as in `(a*)*`, or more than two loops like
-    /// `.*` whose end the next character does not decide (three in a very short expression). Throws `OdError`, naming
-    /// the file, when the ignore file is there but cannot be read.
+    /// classes like `[a-z]`, or 16,000 characters in all (counted repetitions are written out, except for classes);
+    /// thousands of `\b` after a loop; repeated look-aheads that contain many repetitions or are numerous; and, in an
+    /// expression with a back reference, nested loops that can divide a text in several ways, as in `(a*)*`, or more
+    /// than two loops like `.*` whose end is not determined by the next character (three in a very short expression).
+    /// Throws `OdError`, naming the file, when the ignore file exists but cannot be read.
     explicit RepoIgnore(RootPath const& root);
 
-    /// Appends the rules once more. Throws as the constructor does.
+    /// Appends the rules again. Throws as the constructor does.
     void load();
 
     /// Full path of the ignore file, whether or not it exists.
@@ -90,11 +91,11 @@ public:
     std::vector<std::regex> expressions() const;
     /// The texts of the rules, in the same order.
     std::vector<OdString> rules() const;
-    /// Whether a scan skips `name`: any rule covers the whole of it. Takes bounded time for a name that a file can
-    /// have. Throws `std::regex_error` for a rule with a back reference and a name of more than 1,024 bytes.
+    /// Whether a scan skips `name`, that is, whether any rule matches all of it. Takes bounded time for a name that a
+    /// file can have. Throws `std::regex_error` for a rule with a back reference and a name of more than 1,024 bytes.
     bool matches(OdString const& name) const;
 
-    /// Creates the ignore file with the default rules; an existing file is left untouched, which is success. The
+    /// Creates the ignore file with the default rules; an existing file is left unchanged, which is success. The
     /// properties folder must exist. Error: the file could not be written.
     static WriteOutcome write(RootPath const& root);
 

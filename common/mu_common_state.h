@@ -26,15 +26,15 @@ inline OdString const& s_defaultMaster = *new OdString(L"master");
 
 /// What is known of one file of the working folder.
 struct IndexData {
-    std::uint64_t lastChecked = 0; ///< its modification time when it was last looked at, in the ticks of `modifyTime`
+    std::uint64_t lastChecked = 0; ///< its modification time when it was last checked, in the ticks of `modifyTime`
     bool modified = false;         ///< whether the host has marked it as modified since then
 };
 
 /// The working state. Paths are relative to the working folder.
 struct State {
     OdString head = s_defaultMaster; ///< the branch that HEAD points to
-    /// A commit that the host keeps with HEAD. A state file that holds one is not read back: the reader looks the
-    /// number up under another name than the writer gives it.
+    /// A commit that the host keeps with HEAD. A state file with such a number cannot be read back: the reader expects
+    /// it under a different key than the writer uses.
     std::optional<std::uint64_t> headCommit;
     std::vector<StagedFile> stagedFiles;  ///< what the next commit takes, in staging order
     std::map<OdString, OdString> renames; ///< new path of a file that moved, and its previous one
@@ -43,11 +43,11 @@ struct State {
 
 class Transaction;
 
-/// Owns the working state of one repository and saves it when it goes. The state is written only by the destructor: a
-/// process that ends without it loses the changes.
+/// Owns the working state of one repository and saves it on destruction. Only the destructor writes the state: a
+/// process that ends without calling it loses the changes.
 class MU_COMMON_EXPORT Cache {
 public:
-    /// Takes a loaded state over, which counts as unchanged. `io` is kept by address and must outlive the cache.
+    /// Takes over a loaded state, which counts as unchanged. `io` is kept by address and must outlive the cache.
     Cache(RootPath const& root, State state, IoInterface const& io);
     /// Starts with a fresh state, which counts as changed.
     Cache(RootPath const& root, IoInterface const& io);
@@ -59,28 +59,28 @@ public:
     Cache(Cache const&) = delete;
     Cache& operator=(Cache const&) = delete;
     /// Saves a changed state and reports the outcome to the host, once; does neither for an unchanged one. Errors
-    /// reported: a staged change that has no text form; the document cannot be built; the file cannot be written. The
-    /// file then holds what it held before, except when only its folder cannot be flushed: then it holds the new state,
-    /// but after a crash perhaps the old one. It is whole after a crash at any moment.
+    /// reported: a staged change that has no text form; the document cannot be built; the file cannot be written. After
+    /// an error the file is unchanged, except when only its folder cannot be flushed: then it has the new state, but a
+    /// crash may bring the old one back. After a crash at any time, the file is complete, old or new.
     ~Cache();
 
-    /// Loads the state of `root` anew and returns a cache of its own to every caller. The repository must exist: see
-    /// `RootPath::get` for its folder and `create` for its state file.
-    /// Errors: no state file; one that cannot be read; not JSON; HEAD missing or no branch; a member of another shape
-    /// than expected; a staged change that is none. The disk is untouched in each case.
+    /// Loads the state of `root` again for each call, and returns a separate cache to every caller. The repository must
+    /// exist: see `RootPath::get` for its folder and `create` for its state file.
+    /// Errors: no state file; one that cannot be read; not JSON; HEAD missing or not a branch; a member of the wrong
+    /// type; an unknown staged change. The disk is unchanged in each case.
     static Expected<std::shared_ptr<Cache>> get(RootPath const& root, IoInterface const& io);
     /// A temporary host would be gone when the outcome is reported.
     static Expected<std::shared_ptr<Cache>> get(RootPath const& root, IoInterface const&& io) = delete;
 
-    /// Writes the state file of a new repository, the folder of which exists, and reports the outcome to `io`. Does
-    /// nothing when there is one.
+    /// Writes the state file of a new repository, whose folder must exist, and reports the outcome to `io`. Does
+    /// nothing when the file exists.
     static void create(RootPath const& root, IoInterface const& io);
 
     /// The state, for reading, valid as long as the cache.
     State const& read() const { return state_; }
     /// The state, for changing, valid as long as the cache, which counts as changed from here on.
     State& write();
-    /// Guards what happens to the state for as long as the result lives.
+    /// Begins a transaction: changes to the state are undone when the result is destroyed without a commit.
     [[nodiscard]] Transaction getTransaction();
 
 private:
@@ -94,15 +94,15 @@ private:
     IoInterface const* io_;
 };
 
-/// Undoes what happened to the state of a cache since it was made, unless it is committed. Writes nothing itself. The
-/// cache must outlive it. Transactions of one cache end in the reverse order of their making.
+/// Undoes all changes to the state of a cache since its own construction, unless it is committed. Writes nothing
+/// itself. The cache must outlive it. Transactions of one cache must end in the reverse order of their construction.
 class MU_COMMON_EXPORT Transaction {
 public:
     /// Copies the state of `cache`.
     explicit Transaction(Cache& cache);
     Transaction(Transaction const&) = delete;
     Transaction& operator=(Transaction const&) = delete;
-    /// Without a commit puts the copy back; the cache counts as changed then, whether or not it was.
+    /// Without a commit, restores the copy; the cache then counts as changed, whether or not it was.
     ~Transaction();
 
     /// Keeps the changes.
@@ -118,17 +118,18 @@ private:
 /// be examined.
 MU_COMMON_EXPORT std::uint64_t modifyTime(OdString const& path, RootPath const& root);
 
-/// Notes the present modification time of `path` in the index, unmarked. Adds the record when there is none.
+/// Records the current modification time of `path` in the index, not marked as modified. Adds the record when there is
+/// none.
 MU_COMMON_EXPORT void updateIndex(OdString const& path, Cache& cache, RootPath const& root);
 
-/// Does that for all staged files, in order, and drops the records of those staged as removed. The staged files stay.
-/// Without staged files the cache stays unchanged.
+/// Does the same for all staged files, in order, and drops the records of those staged as removed. The files stay
+/// staged. Without staged files, the cache stays unchanged.
 MU_COMMON_EXPORT void updateIndex(Cache& cache, RootPath const& root);
 
 /// Drops the record of `path`, if there is one; the cache counts as changed either way.
 MU_COMMON_EXPORT void removeIndex(OdString const& path, Cache& cache);
 
-/// Makes a position in the index of `cache.read()` writable; the cache counts as changed from here on.
+/// Converts a position in the index of `cache.read()` to a writable one; the cache counts as changed from here on.
 MU_COMMON_EXPORT std::map<OdString, IndexData>::iterator
 openForWrite(std::map<OdString, IndexData>::const_iterator const& position, Cache& cache);
 

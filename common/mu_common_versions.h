@@ -12,8 +12,8 @@
 /// The SHA-256 digest (FIPS 180-4) of exactly `size` bytes at `data`: 64 lower-case hexadecimal digits.
 MU_COMMON_EXPORT OdString generateSha(char const* data, int size);
 
-/// The digest of the first n bytes of the narrow form of `text`, n being its number of characters. For texts beyond
-/// ASCII that is less than the whole; stored digests depend on it.
+/// The digest of the first n bytes of the narrow form of `text`, n being its number of characters. For texts with
+/// characters beyond ASCII that is not the whole text; stored digests depend on it.
 MU_COMMON_EXPORT OdString generateSha(OdString const& text);
 
 namespace common {
@@ -27,9 +27,9 @@ public:
     ContentDigest& operator=(ContentDigest const&) = delete;
     ~ContentDigest();
 
-    /// Adds `size` bytes at `data`, of which nothing is kept.
+    /// Adds `size` bytes at `data`, which are not kept.
     void update(char const* data, std::size_t size);
-    /// The digest of all bytes added, 64 lower-case hexadecimal digits. Called once, last.
+    /// The digest of all bytes added, 64 lower-case hexadecimal digits. To be called once, last.
     OdString finish();
 
 private:
@@ -46,8 +46,7 @@ public:
     virtual ~MetaInfo();
 };
 
-/// A conflicted drawing and the other versions of it. As scanning builds it, all paths are relative to the conflict
-/// folder.
+/// A conflicted drawing and its other versions. In the result of a scan, all paths are relative to the conflict folder.
 class MU_COMMON_EXPORT ConflictInfo : public MetaInfo {
 public:
     /// Stores the three.
@@ -92,7 +91,7 @@ public:
     std::shared_ptr<MetaInfo>& metaInfo() const;
     ///@}
 
-    /// Same path, letter case counting, and same status; the extra information takes no part.
+    /// Same path (case-sensitive) and same status; the extra information is not compared.
     bool operator==(StatusRef const& other) const;
 
     bool selected = true; ///< true in every handle that the library makes; the host may keep a choice here

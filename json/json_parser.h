@@ -1,5 +1,5 @@
 /// How a document is read: tokens, values made of them, and long arrays that never become values. Callers that read
-/// whole documents need `json/json_reader.h` only.
+/// whole documents need only `json/json_reader.h`.
 #pragma once
 
 #include "platform/sdk/OdString.h"
@@ -39,8 +39,8 @@ struct Token {
 
 /// Cuts a range of characters into tokens. The range must outlive the scanner.
 ///
-/// The range is read as if the character 0 followed it for ever. A character that turns out not to belong to a token
-/// is put back for the next one, except the character 0: as a mark for the end of a number it is used up.
+/// The range is read as if it were followed by an endless sequence of the character 0. A character that turns out not
+/// to belong to a token is put back for the next one, except the character 0: at the end of a number it is consumed.
 template <class String, class Iterator>
 class KUTILS_JSON_EXPORT Scanner {
 public:
@@ -51,16 +51,16 @@ public:
     /// The next token; it lives until the next call.
     Token<String>& nextToken();
 
-    /// Read on behind the character that a token starts with.
+    /// Continue after the first character of a token.
     Token<String>& readNumber(Char first);
     Token<String>& readString();
     Token<String>& readTrue();
     Token<String>& readFalse();
     Token<String>& readNull();
 
-    /// Where the next character is read.
+    /// The position of the next character.
     Iterator position() const { return at_; }
-    /// Reads on from a position that this scanner was at.
+    /// Continues from a former position of this scanner.
     void moveTo(Iterator position) { at_ = position; }
 
 private:
@@ -86,21 +86,21 @@ private:
     Token<String> token_;
 };
 
-/// Takes long arrays element by element while the document is read: as values they need many times the memory of what
-/// becomes of them, and most of the time goes into making and destroying them.
+/// Receives long arrays element by element while the document is read. As values, they would need many times the memory
+/// of the final result, and most of the time would go into making and destroying them.
 class KUTILS_JSON_EXPORT Element_sink {
 public:
     using Tokens = Scanner<std::wstring, wchar_t const*>;
 
     virtual ~Element_sink() = default;
 
-    /// Whether the sink wants the elements of the array that is the member `key` of the document's object. What came
-    /// from an earlier member of that name counts no longer.
+    /// Whether the sink wants the elements of the array that is the member `key` of the document's object. Elements of
+    /// an earlier member of that name are then void.
     virtual bool begin(std::wstring const& key) = 0;
-    /// Takes an element that is an object straight from its tokens, from the one behind `{` up to `}`, when it has the
-    /// shape that is usual for it. On false the element is read again, as a value.
+    /// Takes an element that is an object directly from its tokens, from the one after `{` up to `}`, if it has the
+    /// usual form. If this returns false, the element is read again, as a value.
     virtual bool take(Tokens& tokens) = 0;
-    /// Takes an element of any other shape.
+    /// Takes an element of any other form.
     virtual void take(Value element) = 0;
 };
 
@@ -113,12 +113,12 @@ public:
 
     Parser(Iterator begin, Iterator end, Element_sink* sink = nullptr) : scanner_(begin, end), sink_(sink) {}
 
-    /// Reads one value into `out` and moves `begin` behind the last character that was used. False on a syntax error or
-    /// an empty range; `out` is then as it was.
+    /// Reads one value into `out` and moves `begin` past the last character that was used. False on a syntax error or
+    /// an empty range; `out` is then unchanged.
     static bool parse(Iterator& begin, Iterator end, Value& out, Element_sink* sink = nullptr);
 
     /// Reads the next value into `out`. False if there was a `]` instead and `closeAllowed` is set; throws `Error` on
-    /// anything else that is no value. `out` changes only when a whole value was read.
+    /// anything else that is not a value. `out` changes only when a whole value was read.
     bool get(Value& out, bool closeAllowed);
 
 private:
@@ -140,8 +140,8 @@ private:
     bool isFirstElement_ = false; ///< Whether none of them has been read.
 };
 
-/// As `json::read_string`, but the elements of arrays that `sink` wants go there, and these arrays are empty in `out`.
-/// After a syntax error what the sink has got is of no use.
+/// As `json::read_string`, but the elements of arrays that `sink` wants go to it, and these arrays are empty in `out`.
+/// After a syntax error, discard what the sink has received.
 KUTILS_JSON_EXPORT bool read_string(Value& out, OdString const& text, Element_sink& sink);
 
 extern template class Scanner<std::wstring, wchar_t const*>;

@@ -15,15 +15,15 @@ namespace kutils::json {
 /// What a value holds. The numbers appear in the texts of `ValueError`.
 enum class Value_type : std::int32_t { object, array, string, boolean, integer, real, null };
 
-/// A value was asked for something that it does not hold. The text is "value type is 2 not 0" for a string that was
-/// asked for an object.
+/// Thrown when a value does not have the requested type. The text is "value type is 2 not 0" when an object was
+/// requested from a string.
 class KUTILS_JSON_EXPORT ValueError : public std::runtime_error {
 public:
     using std::runtime_error::runtime_error;
 };
 
 /// The containers of a value whose texts are of type `S`. Objects are ordered by plain comparison of the characters of
-/// their keys, so a value knows nothing of the order in which members were read or added.
+/// their keys, so a value does not keep the order in which members were read or added.
 template <class S>
 struct KUTILS_JSON_EXPORT Config_map {
     using String = S; ///< texts and keys
@@ -37,9 +37,9 @@ struct KUTILS_JSON_EXPORT Config_map {
 
 /// A JSON value. A plain value: copies are deep and independent, and any thread may use its own.
 ///
-/// Values may be nested as deep as memory allows: copying, comparing, assigning and destroying never go down the call
-/// stack, whether that is done to a value or to a bare `Object` or `Array` of values. Destroying and moving need no
-/// memory and never throw; the other operations throw what allocation throws, and then leave nothing behind.
+/// Values may be nested as deep as memory allows: copying, comparing, assigning and destroying never recurse, neither
+/// for a value nor for a bare `Object` or `Array` of values. Destroying and moving allocate nothing and never throw;
+/// the other operations throw what allocation throws, and then leave nothing behind.
 template <class Config>
 class KUTILS_JSON_EXPORT Value_impl {
 public:
@@ -50,7 +50,7 @@ public:
     /// A null value.
     Value_impl() noexcept = default;
     Value_impl(Value_impl const& other);
-    /// Takes what `other` holds and leaves it null.
+    /// Takes the content of `other` and leaves it null.
     Value_impl(Value_impl&& other) noexcept
         : type_(std::exchange(other.type_, Value_type::null))
         , is_uint64_(std::exchange(other.is_uint64_, false))
@@ -66,7 +66,7 @@ public:
     Value_impl(String string);
     /// Copies `string` up to its NUL; null gives the empty string.
     Value_impl(typename String::value_type const* string);
-    /// Only a bool makes a bool, not any pointer that happens to come by.
+    /// Only a bool converts to a bool; a pointer does not.
     template <class T>
     Value_impl(T const*) = delete;
     Value_impl(bool value) noexcept : type_(Value_type::boolean) { payload_.boolean = value; }
@@ -106,7 +106,7 @@ public:
         }
     }
 
-    /// Exchanges what both hold.
+    /// Exchanges the contents of both.
     void swap(Value_impl& other) noexcept
     {
         std::swap(type_, other.type_);
@@ -114,10 +114,10 @@ public:
         std::swap(payload_, other.payload_);
     }
 
-    /// What the value holds.
+    /// The type of the value.
     Value_type type() const noexcept { return type_; }
-    /// Whether an integer was made or read as an unsigned one; false for every other type. The reader takes each
-    /// integer without a minus sign for unsigned.
+    /// Whether an integer was made or read as an unsigned one; false for every other type. The reader treats each
+    /// integer without a minus sign as unsigned.
     bool is_uint64() const noexcept { return is_uint64_; }
 
     /// Throws `ValueError` unless the value is of type `expected`. Each of the accessors below checks its type first;
@@ -129,7 +129,7 @@ public:
         }
     }
 
-    /// What the value holds, by reference where it is large.
+    /// The content of the value, by reference where it is large.
     ///@{
     Object const& get_object() const { return check_type(Value_type::object), payload_.object->content; }
     Object& get_object() { return check_type(Value_type::object), payload_.object->content; }
@@ -143,12 +143,12 @@ public:
     std::int32_t get_int() const { return static_cast<std::int32_t>(get_uint64()); }
     /// The 64 bits of an integer, whether it is a signed or an unsigned one.
     std::int64_t get_int64() const { return static_cast<std::int64_t>(get_uint64()); }
-    /// The 64 bits of an integer, likewise.
+    /// The same 64 bits as an unsigned integer.
     std::uint64_t get_uint64() const { return check_type(Value_type::integer), payload_.integer; }
     /// A real, or an integer converted to one.
     double get_real() const;
 
-    /// Whether both are of one type and hold the same. Integers are compared as numbers: a signed and an unsigned 5 are
+    /// Whether both have the same type and content. Integers are compared as numbers: a signed and an unsigned 5 are
     /// equal, since both are written `5`; -1 and 18446744073709551615 are not. An integer never equals a real. Reals
     /// are compared as doubles, so NaN equals nothing.
     friend bool operator==(Value_impl const& a, Value_impl const& b) { return a.equals(b); }
@@ -156,7 +156,7 @@ public:
     friend bool operator!=(Value_impl const& a, Value_impl const& b) { return !a.equals(b); }
 
 private:
-    /// A container on the heap. The link serves only for taking a document apart without memory.
+    /// A container on the heap. The link serves only to destroy a document without allocating memory.
     template <class Container>
     struct Box {
         Container content;

@@ -19,23 +19,23 @@ namespace kutils::json {
 /// The text of `value`, without a line feed at its end, in time proportional to its length. Throws `std::bad_alloc`
 /// when there is no memory for it, and `std::length_error` when it would be longer than a string can be.
 ///
-/// Members stand in ascending order of their keys. Reals are written in fixed notation with 16 decimals, so only those
-/// that have no more read back as they were; infinity and NaN become `inf` and `nan`, which do not read back at all.
-/// With `pretty` each item stands on a line of its own, four spaces further in than its container, and a key is
-/// followed by ` : `; without, there are no spaces and no line feeds.
+/// Members are in ascending order of their keys. Reals are written in fixed notation with 16 decimals, so a real with
+/// more decimals does not read back unchanged; infinity and NaN become `inf` and `nan`, which cannot be read back at
+/// all. With `pretty`, each item is on its own line, indented four spaces more than its container, and a key is
+/// followed by ` : `; without it, there are no spaces and no line feeds.
 ///
-/// A character that is not printable is written as `\u` and the four hexadecimal digits of its low 16 bits. Which
-/// characters are printable is for the C library to say, by the current locale of the process: in the "C" locale no
-/// character beyond ASCII is. A character above U+FFFF that is not printable therefore loses its upper bits. Nothing
-/// else depends on any locale.
+/// A character that is not printable is written as `\u` and the four hexadecimal digits of its low 16 bits. The C
+/// library decides which characters are printable, by the current locale of the process: in the "C" locale no character
+/// beyond ASCII is. A character above U+FFFF that is not printable therefore loses its upper bits. Nothing else depends
+/// on any locale.
 ///
-/// The value may be nested as deep as memory allows, but mind that the indentation of the pretty layout grows with the
-/// square of the depth.
+/// The value may be nested as deep as memory allows, but the indentation of the pretty layout grows with the square of
+/// the depth.
 KUTILS_JSON_EXPORT std::wstring write_string(Value const& value, bool pretty);
 
 namespace detail {
 
-/// `text` with everything escaped that cannot stand in a string as it is.
+/// `text` with every character escaped that must be escaped in a string.
 KUTILS_JSON_EXPORT std::wstring add_esc_chars(std::wstring const& text);
 
 /// If `c` has an escape of two characters, appends that to `text` and returns true: backspace, tab, line feed, form
@@ -45,8 +45,8 @@ KUTILS_JSON_EXPORT bool add_esc_char(wchar_t c, std::wstring& text);
 /// `\u` and four upper-case hexadecimal digits for the low 16 bits of `c`.
 KUTILS_JSON_EXPORT std::wstring non_printable_to_string(unsigned c);
 
-/// The characters that stand in a string as they are: the printable ones that need no escape, by the locale that was
-/// current when the object was made and, beyond ASCII, by the one that is current when it is asked.
+/// The characters that are written unescaped: the printable ones that need no escape. ASCII follows the locale at the
+/// time of construction; all other characters follow the locale at the time of the call.
 class KUTILS_JSON_EXPORT Plain_chars {
 public:
     Plain_chars();
@@ -61,8 +61,8 @@ private:
     std::array<bool, 128> ascii_;
 };
 
-/// Writes to a stream, one text behind the other. The stream must outlive the generator. When an operation throws, the
-/// stream has got a part of the text, and the generator is of no further use.
+/// Writes texts to a stream, one after another. The stream must outlive the generator. When an operation throws, the
+/// stream has received a part of the text, and the generator must not be used any more.
 template <class Value, class Stream>
 class KUTILS_JSON_EXPORT Generator {
 public:
@@ -82,9 +82,9 @@ public:
     template <class Container>
     void output_array_or_obj(Container const& container, Char open, Char close);
 
-    /// Write a document piece by piece, for one that is too large to be made as a value first: containers are begun and
-    /// ended, a member is a key and then a value or container, an element is announced in the same way. The operations
-    /// above are not for such a document: they end all that is open.
+    /// Write a document piece by piece, when it is too large to be built as a value first. Containers are begun and
+    /// ended, a member is a key followed by a value or container, and `element` announces an element in the same way.
+    /// Do not mix this with the operations above: they end all open containers.
     ///@{
     void begin_object() { begin({L'}'}, L'{'); }
     void begin_array() { begin({L']'}, L'['); }
@@ -93,13 +93,13 @@ public:
     void value(Value const& value);
     void value(std::basic_string_view<Char> text) { placeText(text); }
     void value(bool value) { place(value); }
-    /// Only a bool is written as one, not any pointer that happens to come by.
+    /// Only a bool is written as a bool; a pointer is not.
     template <class T>
     void value(T const*) = delete;
     void value(std::uint64_t value);
     /// Ends the innermost container.
     void end() { leave(); }
-    /// Lets the stream have what was written so far.
+    /// Passes what was written so far to the stream.
     void flush();
     ///@}
 

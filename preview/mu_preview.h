@@ -2,10 +2,10 @@
 ///
 /// Most programs that write drawings put a small picture of the drawing near the beginning of the file: a bitmap, a PNG
 /// or a metafile. `preview::find` finds it and checks every field on the way, so that a caller can hand the picture to
-/// a decoder. Nothing else of the drawing is looked at.
+/// a decoder. Nothing else in the drawing is read.
 ///
 /// The library needs nothing but the C++ library. It keeps no state, so any thread may call it. It allocates nothing
-/// and reads less than 3 KiB of a drawing, whatever its bytes are.
+/// and reads less than 3 KiB of a drawing, whatever the content.
 ///
 ///     preview::Preview const found = preview::find(bytesOfTheDrawing);
 ///     if (found.status == preview::Status::found && found.kind == preview::Kind::png) {
@@ -17,7 +17,7 @@
 #include <cstdint>
 #include <string_view>
 
-/// Marks what libmu_preview shows to its users; everything else in it is hidden.
+/// Marks the exported symbols of libmu_preview; all others are hidden.
 #define MU_PREVIEW_EXPORT __attribute__((visibility("default")))
 
 namespace preview {
@@ -26,7 +26,7 @@ namespace preview {
 enum class Status : std::uint8_t {
     found,     ///< there is a picture, and its fields are consistent
     none,      ///< the bytes are not a drawing, or a drawing without a picture
-    damaged,   ///< a field contradicts another one, or leads out of the file
+    damaged,   ///< a field contradicts another one, or points outside the file
     tooLarge,  ///< the picture claims more than the limits allow
     unreadable ///< the source could not be read
 };
@@ -48,8 +48,8 @@ struct Limits {
 /// Where the parts of a bitmap are, as offsets from its first byte. All of them are inside the bitmap, and so are the
 /// rows of an uncompressed one.
 ///
-/// A file header makes a .bmp file of the bitmap. Its 14 bytes are, little-endian: "BM", 32 bits with the length of the
-/// bitmap plus 14, 32 zero bits, and 32 bits with `pixels` plus 14.
+/// A file header turns the bitmap into a .bmp file. Its 14 bytes are, little-endian: "BM", 32 bits with the length of
+/// the bitmap plus 14, 32 zero bits, and 32 bits with `pixels` plus 14.
 struct BitmapLayout {
     std::uint32_t bitsPerPixel = 0;  ///< 1, 4, 8, 16, 24 or 32
     std::uint32_t compression = 0;   ///< as in the header: 0 none, 1 and 2 run lengths, 3 and 6 none but with masks
@@ -81,8 +81,8 @@ class MU_PREVIEW_EXPORT Source {
 public:
     /// Length of the drawing in bytes.
     virtual std::uint64_t size() const = 0;
-    /// Reads `count` bytes at `offset` into `bytes`. They are inside the drawing, by its `size`. False when they could
-    /// not all be read: `find` ends then, and says `unreadable`.
+    /// Reads `count` bytes at `offset` into `bytes`. They are inside the drawing, by its `size`. False when not all of
+    /// them could be read: `find` then ends with the status `unreadable`.
     virtual bool read(std::uint64_t offset, char* bytes, std::size_t count) = 0;
 
 protected:
@@ -99,7 +99,7 @@ protected:
 /// and entries of unknown kinds are ignored.
 MU_PREVIEW_EXPORT Preview find(std::string_view drawing, Limits const& limits = {});
 
-/// The same for a drawing that is read piece by piece. What `source` throws passes through.
+/// The same for a drawing that is read piece by piece. Exceptions of `source` are passed on.
 MU_PREVIEW_EXPORT Preview find(Source& source, Limits const& limits = {});
 
 } // namespace preview

@@ -9,7 +9,7 @@
 
 namespace preview::detail {
 
-/// The longest header of a picture that is looked at: that of the fifth version of bitmaps.
+/// The longest picture header that is read: that of version 5 bitmaps.
 constexpr std::size_t kMaxHeaderSize = 124;
 
 inline std::uint32_t byteAt(std::string_view bytes, std::size_t at)
@@ -27,8 +27,9 @@ inline std::uint32_t littleEndian32(std::string_view bytes, std::size_t at)
     return littleEndian16(bytes, at) | littleEndian16(bytes, at + 2) << 16U;
 }
 
-/// Each enters size and layout of the picture of `picture.length` bytes that begins with `header`: its first
-/// `kMaxHeaderSize` bytes, or all of them. Null when all of it is valid, else what is wrong, as a sentence.
+/// Each sets the size and layout of the picture of `picture.length` bytes that begins with `header`, which has its
+/// first `kMaxHeaderSize` bytes, or all of them if there are fewer. Returns null when the header is valid, else a
+/// sentence that says what is wrong.
 char const* readBitmapHeader(std::string_view header, Preview& picture);
 char const* readPngHeader(std::string_view header, Preview& picture);
 

@@ -1,4 +1,4 @@
-/// Many changes below one folder that are made safe together: one flush per file costs seconds per thousand.
+/// Many changes below one folder that are flushed together: one flush per file takes seconds for a thousand files.
 #pragma once
 
 #include "platform/mu_platform_export.h"
@@ -11,10 +11,10 @@
 
 namespace os {
 
-/// What stood under a name at some moment, as far as that tells one state of a file from another.
+/// What was at a path at one time, as far as needed to distinguish one state of a file from another.
 struct FileMark {
-    bool isThere = false;  ///< a folder is no file, and nor is anything behind a link
-    bool isShared = false; ///< has other names: these come and go without a change of the content
+    bool isThere = false;  ///< neither a folder nor anything behind a link counts as a file
+    bool isShared = false; ///< has other hard links, which come and go without a change to the content
     std::uint64_t device = 0;
     std::uint64_t number = 0; ///< on the device
     std::uint64_t length = 0;
@@ -22,30 +22,30 @@ struct FileMark {
     std::int64_t changed = 0;  ///< the same, of the last change of content, name or permissions
 };
 
-/// Whether nothing has happened to a file between two marks, unless it was written within one tick of the clock.
+/// Whether a file is unchanged between two marks. A change within one tick of the clock is not detected.
 MU_PLATFORM_EXPORT bool isSame(FileMark const& a, FileMark const& b);
 
-/// Puts files into place below a folder, and takes files away. No path ever leads through a link, not even through one
-/// that takes the place of a folder meanwhile. Paths are relative, in bytes, and have no component "..". One thread.
+/// Puts files in their places below a folder, and removes files. No path ever leads through a link, not even through
+/// one that replaces a folder during the call. Paths are relative, in bytes, and have no component "..". One thread.
 class MU_PLATFORM_EXPORT Batch {
 public:
-    /// Opens `folder`, which must exist; else every operation fails.
+    /// Opens `folder`, which must exist; otherwise every operation fails.
     explicit Batch(std::string const& folder);
 
-    /// Marks what stands under `path`. Nothing there, or a folder, is no error.
+    /// Marks what is at `path`. A missing file or a folder is not an error.
     [[nodiscard]] std::error_code mark(std::string const& path, FileMark& mark);
-    /// Gives the file `from`, a path of any kind, the name `path`, making missing folders. What stands there is
-    /// replaced: a file leaves its permissions to the new one, a link is replaced itself, and a folder goes when there
-    /// are only folders in it. To another file system the file is copied first, beside its place under a hidden name
-    /// that ends in ".tmp". After an error the old file is there and `from` is too.
+    /// Renames the file `from`, which may be any path, to `path`, and makes missing folders. An existing entry is
+    /// replaced: the new file takes the permissions of an old file, a link is replaced itself, and a folder is removed
+    /// if it contains nothing but folders. If the file is on a different file system, it is first copied to the target
+    /// folder under a hidden name that ends in ".tmp". After an error, both the old file and `from` still exist.
     [[nodiscard]] std::error_code place(std::string const& from, std::string const& path);
-    /// Removes the file `path`, of a link the link itself. Success when it is not there.
+    /// Removes the file `path`; of a link, the link itself. Success when it does not exist.
     [[nodiscard]] std::error_code remove(std::string const& path);
-    /// Removes the folder that `path` lies in as far as it is empty, and those above it that are empty then.
+    /// Removes the folder of `path` if it is empty, and then those above it that have become empty.
     void removeEmptyFoldersOf(std::string const& path);
 
-    /// Waits until everything written to the file system, by whomever, is safe on the disk; to every one that was
-    /// written to.
+    /// Waits until everything written to the file system, by any process, is safe on the disk; does so for every file
+    /// system that this batch has written to.
     [[nodiscard]] std::error_code flush();
 
 private:

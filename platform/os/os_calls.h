@@ -12,7 +12,7 @@ namespace os {
 
 /// One entry per call, named after it and with its parameters: the result is -1 with `errno` set when it fails.
 /// Every replacement, move and removal of a file, and every write to an open one, goes through this table, so that a
-/// test can stand in for any call and make it fail. Not in it are the library's log and `touch`,
+/// test can replace any call and make it fail. Exceptions are the library's log and `touch`,
 /// because an editor's own platform has no such table, and what SQLite writes.
 struct Calls {
     int (*openat)(int folder, char const* path, int flags, mode_t mode);

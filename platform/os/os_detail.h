@@ -1,4 +1,5 @@
-/// What the sources of this folder share: results of calls, calls that go on after a signal, and entries of folders.
+/// Helpers shared by the sources of this folder: results of calls, calls that continue after a signal, and entries of
+/// folders.
 #pragma once
 
 #include "platform/os/os_calls.h"
@@ -19,7 +20,7 @@ namespace os::detail {
 
 /// For listing and flushing a folder.
 constexpr int kFolderFlags = O_RDONLY | O_DIRECTORY;
-/// For passing through a folder that is no link. Needs no right to list the folder.
+/// For passing through a folder that is not a link. Needs no permission to list the folder.
 constexpr int kPassingFlags = O_PATH | O_DIRECTORY | O_NOFOLLOW;
 
 inline std::error_code systemError(int number)
@@ -114,7 +115,7 @@ inline Handle openAt(int folder, std::string const& path, int flags, mode_t mode
     return Handle(retried([&] { return calls().openat(folder, path.c_str(), flags | O_CLOEXEC, mode); }));
 }
 
-/// Opens the regular file `path`. Anything else is refused without waiting for it. `file` changes only on success.
+/// Opens the regular file `path`. Anything else is refused without blocking. `file` changes only on success.
 inline std::error_code openRegular(std::string const& path, int flags, Handle& file)
 {
     if (!isPath(path)) {
@@ -138,7 +139,7 @@ inline std::error_code flush(Handle const& file)
 }
 
 /// Waits until the entries of a folder are safe on the disk. Some file systems keep their folders safe themselves and
-/// know no flushing of them.
+/// do not support flushing them.
 inline std::error_code flushEntries(Handle const& folder)
 {
     std::error_code const error = flush(folder);
@@ -146,7 +147,7 @@ inline std::error_code flushEntries(Handle const& folder)
 }
 
 /// Opens the folder `path` below the open folder `top` part by part, each with `open(folder, name)`; an empty `path` is
-/// `top` itself. A part that is a link, or becomes one meanwhile, is no folder.
+/// `top` itself. A part that is a link, or becomes one during the call, does not count as a folder.
 template <class Open>
 Handle walk(int top, std::string const& path, Open const& open)
 {

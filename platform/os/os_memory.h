@@ -7,12 +7,12 @@
 
 namespace os {
 
-/// From this size on, the C library maps a block for itself alone. Advice on smaller ones may stay with parts of the
+/// From this size on, the C library maps each block separately. Advice on smaller blocks may stick to parts of the
 /// heap.
 inline constexpr std::size_t kAlwaysMapped = std::size_t{32} << 20;
 
-/// Asks for large pages for the whole pages of `size` bytes at `begin`, which nobody has written to yet: the first
-/// touch of a page costs more than filling it. Where that is refused, pages stay small.
+/// Asks for large pages for the whole pages of `size` bytes at `begin`, which must not have been written to yet: the
+/// first access to a page costs more than filling it. If the system refuses, pages stay small.
 MU_PLATFORM_EXPORT void adviseLargePages(void* begin, std::size_t size);
 
 } // namespace os

@@ -1,4 +1,4 @@
-/// Looking along a path for links before anything is written by it.
+/// Checking the parts of a path for links before anything is written to it.
 #pragma once
 
 #include "platform/mu_platform_export.h"
@@ -9,7 +9,7 @@
 
 namespace os {
 
-/// The first part of a path that keeps a write from going where the path says.
+/// The first part of a path that would prevent a write from going where the path says.
 struct Obstacle {
     enum class Kind {
         none,
@@ -23,9 +23,9 @@ struct Obstacle {
     std::error_code error;
 };
 
-/// Looks at the parts of `path` from the folder `top` on, the last part included, and follows no link; `top` itself may
-/// be one. What does not exist yet is no obstacle. A part that becomes a link behind the look shows to those who open
-/// the parts one by one, as `Batch` and `moveEntry` do.
+/// Examines the parts of `path` below the folder `top`, including the last one, and follows no link; `top` itself may
+/// be one. Parts that do not exist yet are not obstacles. A part that becomes a link after this check is detected only
+/// by callers that open the parts one by one, as `Batch` and `moveEntry` do.
 MU_PLATFORM_EXPORT Obstacle findObstacle(std::string const& top, std::string const& path);
 
 } // namespace os

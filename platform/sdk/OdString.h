@@ -59,8 +59,8 @@ public:
     /// A character that UTF-8 cannot carry (a lone surrogate that holds no byte) is written in the three-byte pattern.
     std::string ansi_str() const;
 
-    /// Replaces the text by `format`, filled in as `wprintf` does; `%ls` takes a `wchar_t const*`. There is no limit
-    /// on the length. A format that the C library refuses leaves the text as `format` stands.
+    /// Replaces the text by `format`, filled in as `wprintf` does; `%ls` takes a `wchar_t const*`. There is no limit on
+    /// the length. If the C library refuses the format, the text becomes `format` itself.
     /// `format` is never a text that came from outside: hand such a text in as an argument.
     OdString& format(wchar_t const* format, ...);
 
@@ -71,7 +71,7 @@ public:
     OdString& operator+=(wchar_t other);
     ///@}
 
-    /// Both texts, one behind the other.
+    /// Both texts, one after the other.
     ///@{
     friend OdString operator+(OdString const& left, OdString const& right)
     {

@@ -21,7 +21,7 @@ public:
     /// Reads the clock unless `value` is `kInitZero`.
     explicit OdTimeStamp(InitialValue value);
 
-    /// The Julian day number: 2440588 is 1970-01-01. The difference of two stamps holds its whole days here.
+    /// The Julian day number: 2440588 is 1970-01-01. For the difference of two stamps, the number of whole days.
     std::int64_t julianDay() const noexcept { return day_; }
     /// Milliseconds since midnight, 0 to 86,399,999.
     std::int32_t msecsPastMidnight() const noexcept { return msecs_; }
@@ -35,10 +35,10 @@ public:
     /// milliseconds beyond them.
     OdTimeStamp& operator-=(OdTimeStamp const& other) noexcept;
 
-    /// Writes the moment into `out` by `pattern`. Known after the percent sign: `Y` year, `m` month, `b` month's
+    /// Writes the moment into `out` by `pattern`. Supported after the percent sign: `Y` year, `m` month, `b` month's
     /// abbreviation, `d` day of the month, `a` day's abbreviation, `H` hour, `M` minute, `S` second, each with its
-    /// leading zeros, and the percent sign itself. `#` in between drops leading zeros (`%#d`). Anything else stands as
-    /// it is.
+    /// leading zeros, and the percent sign itself. `#` in between drops leading zeros (`%#d`). Anything else is copied
+    /// unchanged.
     void strftime(OdString const& pattern, OdString& out) const;
     /// Writes the moment into `out` in the form "Tue Mar  5 14:07:09 2024".
     void ctime(OdString& out) const;

@@ -1,4 +1,4 @@
-/// Folders: making one, and listing what lies in it.
+/// Folders: making one, and listing its entries.
 #pragma once
 
 #include "platform/mu_platform_export.h"
@@ -10,11 +10,11 @@
 
 namespace ut {
 
-/// An open folder. It is read once, when it is opened; every enumeration is served from that reading, sorted by name
-/// in byte order, so that lists are the same on every machine. One thread at a time.
+/// An open folder. It is read once, when it is opened; every enumeration uses that result, sorted by name in byte
+/// order, so that lists are the same on every machine. One thread at a time.
 ///
 /// Listed are regular files (links to files count as files) and folders (links to folders are left out, so that no walk
-/// runs in circles). Dangling links and every other kind of entry are left out, and so are "." and "..".
+/// is endless). Dangling links and all other kinds of entries are left out, and so are "." and "..".
 /// Names that begin with a dot are hidden.
 class MU_PLATFORM_EXPORT Dir {
 public:
@@ -25,7 +25,8 @@ public:
 
     /// Whether `path` names a folder, links followed. False for a file.
     static bool exists(OdString const& path);
-    /// Makes the folder `path`, whose parent must exist. False when it could not be made, also when the name is taken.
+    /// Makes the folder `path`, whose parent must exist. False when it could not be made, for example because the name
+    /// exists.
     static bool create(OdString const& path);
 
     /// Reads the folder. False when it cannot be opened or read; nothing is enumerated then.
@@ -33,10 +34,10 @@ public:
     /// The path that was opened, as it was given.
     OdString getName() const { return path_; }
 
-    /// Starts an enumeration of what `flags` asks for and gives its first name, without the folder. `filter` is empty:
-    /// names of every shape are listed. False, with `name` untouched, when there is none.
+    /// Starts an enumeration of what `flags` selects and gives its first name, without the folder. `filter` must be
+    /// empty: all names are listed. False, with `name` unchanged, when there is none.
     bool getFirst(OdString& name, OdString const& filter, int flags);
-    /// The next name of the enumeration; false, with `name` untouched, at its end.
+    /// The next name of the enumeration; false, with `name` unchanged, at its end.
     bool getNext(OdString& name);
 
 private:

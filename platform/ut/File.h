@@ -10,7 +10,7 @@
 
 namespace ut {
 
-/// An open file. Owns the handle and closes it when it goes. One thread at a time.
+/// An open file. Owns the handle and closes it on destruction. One thread at a time.
 /// Only regular files are opened (links followed): a folder, a pipe or a device is refused without waiting for it.
 class MU_PLATFORM_EXPORT File {
 public:
@@ -24,7 +24,7 @@ public:
     File& operator=(File const&) = delete;
     ~File();
 
-    /// Opens the file at its beginning. False when it cannot be opened or is no regular file.
+    /// Opens the file at its beginning. False when it cannot be opened or is not a regular file.
     bool open(OdString const& path, OpenMode mode);
     /// Length in bytes; 0 when no file is open.
     std::uint64_t length() const;
