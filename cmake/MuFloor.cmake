@@ -1,4 +1,4 @@
-# The floors of the house: platform, json, common, host, each folder an object library of its own.
+# Floors are the layers of docs/architecture.md: platform, json, common and host. Each folder is an object library.
 #
 # Include lines name the folder ("json/json_value.h"), so one include path at the top of the tree would show every
 # floor to every other. Instead each floor gets a tree that holds a link to its own folder and nothing else, and a

@@ -1,4 +1,4 @@
-/// Removing what nobody needs from the storage.
+/// Removing what no commit needs from the storage.
 #pragma once
 
 #include "host/storage/freed.h"
@@ -12,7 +12,7 @@
 
 namespace tav {
 
-/// What a cleaning leaves.
+/// What a cleaning must keep.
 struct Needed {
     /// Adds the content at `url`.
     void add(StorageUrl const& url);
@@ -20,12 +20,12 @@ struct Needed {
 
     std::set<Digest> objects;
     std::map<std::string, std::set<Digest>> revisions; ///< by store
-    std::set<std::string> storesLeftAlone;             ///< with all they hold
+    std::set<std::string> storesLeftAlone;             ///< with everything in them
 };
 
 /// Removes everything but what is `needed` and the revisions that it builds on, and what interrupted operations have
-/// left. Throws `StorageError`: at once when a folder cannot be read or a file not removed; in the end, of the first
-/// such store, when stores stay as they are because something needed in them cannot be read.
+/// left. Throws `StorageError`: immediately when a folder cannot be read or a file cannot be removed; at the end, for
+/// the first such store, when stores were left unchanged because something needed in them cannot be read.
 Freed removeUnneeded(StorageLayout const& layout, Needed const& needed);
 
 /// Removes only what interrupted operations have left. Throws `StorageError`.

@@ -1,4 +1,4 @@
-/// Contents as the storage works on them.
+/// Contents, in memory or in a file, as the storage processes them.
 #pragma once
 
 #include "platform/os/os_open_file.h"
@@ -13,7 +13,7 @@
 
 namespace tav {
 
-/// Memory that grows and is never filled: pages that nobody writes cost nothing.
+/// Memory that grows and is not initialised: pages that are never written cost nothing.
 class Buffer {
 public:
     Buffer() = default;
@@ -26,7 +26,7 @@ public:
     }
     ~Buffer() = default;
 
-    /// At least `size` bytes, valid until the next call. What they held is lost when they have to grow.
+    /// At least `size` bytes, valid until the next call. Their content is lost when they have to grow.
     /// Throws `std::bad_alloc`.
     char* reserve(std::size_t size);
     /// The bytes last reserved; null when there are none yet.
@@ -48,12 +48,12 @@ public:
     Content() = default;
     /// `length` bytes in memory.
     Content(Buffer bytes, std::size_t length) : bytes_(std::move(bytes)), length_(length) {}
-    /// The first `length` bytes of `file`; errors speak of it as `name`.
+    /// The first `length` bytes of `file`; errors call it `name`.
     Content(os::OpenFile file, std::uint64_t length, std::string name);
 
     std::uint64_t length() const { return length_; }
     bool isInMemory() const { return !file_.isOpen(); }
-    /// Gives the memory of the content away for other use; the content is gone.
+    /// Releases the memory of the content for other use; the content is lost.
     Buffer takeMemory() { return std::move(bytes_); }
 
     /// The `count` bytes at `offset`, which must be inside. Valid as long as the content and until `buffer`, which

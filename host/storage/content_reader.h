@@ -12,27 +12,27 @@
 
 namespace tav {
 
-/// Reads the contents of one repository, those of a batch that is not flushed included. Everything throws
+/// Reads the contents of one repository, including those of a batch that is not flushed. Everything throws
 /// `StorageError`.
 class ContentReader {
 public:
     /// Keeps `layout` and `batch` by address.
     ContentReader(StorageLayout const& layout, Batch const& batch) : layout_(layout), batch_(batch) {}
 
-    /// Whether the content is kept. An object is taken to be there when its file is.
+    /// Whether the content is stored. An object counts as stored if its file exists.
     bool isKept(StorageUrl const& url) const;
-    /// Whether the content is kept whole. Reads it.
+    /// Whether the content is stored and intact. Reads it.
     bool isReadable(StorageUrl const& url) const;
     /// Length of the content in bytes, without unpacking it.
     std::uint64_t lengthOf(StorageUrl const& url) const;
 
-    /// Gives `sink` the content, and throws when it was not the right one.
+    /// Passes the content to `sink`, and throws when its digest is wrong.
     void read(StorageUrl const& url, Sink const& sink) const;
     /// Writes the content into the new file `path`, and does not flush it. After an error there is no file, except one
     /// that was there before.
     void extract(StorageUrl const& url, std::string const& path) const;
 
-    /// Holds a content that those read next build on, so that it is not unpacked for each.
+    /// Keeps a content that the next ones to be read build on, so that it is not unpacked for each.
     void setBase(std::optional<KnownContent> base) { base_ = std::move(base); }
     KnownContent const* base() const { return base_ ? &*base_ : nullptr; }
 

@@ -11,8 +11,8 @@
 
 namespace tav {
 
-/// Writes contents of one repository, and notes in a batch what has to be flushed. Everything throws `StorageError`,
-/// and leaves nothing of the content behind then.
+/// Writes contents of one repository, and records in a batch what must be flushed. All operations throw `StorageError`,
+/// and then leave nothing of the content behind.
 class ContentWriter {
 public:
     /// Keeps `layout`, `batch` and `reader` by address. Contents are compressed in segments of 2^`segmentLog` bytes.
@@ -25,7 +25,7 @@ public:
     }
 
     /// Writes `content` to `url` unless it can be read there. A revision builds on the one with the digest `previous`
-    /// of its store, or else on the newest, where that makes it smaller. The reader holds that base then: whoever reads
+    /// of its store, or else on the newest, if that makes it smaller. The reader then keeps that base, because reading
     /// the revision back needs it again.
     void write(StorageUrl const& url, Content const& content, Digest const& previous);
 

@@ -1,8 +1,8 @@
-/// Contents to zstd frames and back.
+/// Converting contents to zstd frames and back.
 ///
-/// A content is cut into segments of one length, each compressed into one frame. Where there is a base, the frame may
-/// refer to what the base holds at the place of the segment and half a segment's length around it. So any content is
-/// worked on with at most about six segments' lengths of memory, tables of zstd included.
+/// A content is cut into segments of equal length, each compressed into one frame. If there is a base, the frame may
+/// refer to the bytes of the base at the offset of the segment, plus half a segment's length before and after it. So
+/// any content is processed with at most about six segments' lengths of memory, including the tables of zstd.
 #pragma once
 
 #include "host/storage/content.h"
@@ -18,20 +18,20 @@
 
 namespace tav {
 
-/// Takes the bytes of something piece by piece.
+/// Receives bytes piece by piece.
 using Sink = std::function<void(std::string_view)>;
 
-/// What became of a content.
+/// The result of compressing a content.
 struct Compressed {
     std::uint64_t framesLength = 0;
     bool usesBase = false; ///< whether any of the frames needs the base
 };
 
-/// Compresses `content` in segments of 2^`segmentLog` bytes, on `base` unless it is null; `sink` gets the frames.
-/// Of the two forms of a segment, with the base and without, the smaller is taken; the second is not tried when the
-/// first has at most a sixteenth of the segment's length, since no more than that could be saved.
-/// Throws `StorageError` when the bytes that were compressed do not have the digest `digest`, which happens only when a
-/// file changes meanwhile (contents in memory are not digested again), and what `sink` throws.
+/// Compresses `content` in segments of 2^`segmentLog` bytes, on `base` unless it is null; `sink` receives the frames.
+/// Each segment is compressed with and without the base, and the smaller result is used; the second is not tried when
+/// the first has at most a sixteenth of the segment's length, because no more than that could be saved.
+/// Throws `StorageError` when the compressed bytes do not have the digest `digest`, which happens only when a file
+/// changes during the call (contents in memory are not digested again), and what `sink` throws.
 Compressed
 compress(Content const& content, Digest const& digest, Content const* base, unsigned segmentLog, Sink const& sink);
 
@@ -44,10 +44,10 @@ struct Frames {
     std::uint64_t offset; ///< of the first
 };
 
-/// Unpacks the frames of `record`, on `base` unless it is whole, and gives `sink` the content, a segment at a time;
-/// `segment` holds it meanwhile, and the last one afterwards. No number in the file is trusted: throws `StorageError`
-/// when the frames are not what the header says, "... is damaged." said of `name`; and what `sink` throws. Whether it
-/// is the right content is for the caller to find out.
+/// Unpacks the frames of `record`, on `base` unless it is whole, and passes the content to `sink`, a segment at a time;
+/// `segment` is the buffer, which has the last segment afterwards. No number in the file is trusted: throws
+/// `StorageError` ("`name` is damaged.") when the frames do not match the header, and what `sink` throws. The caller
+/// must check the digest of the content.
 void decompress(
     Record const& record, Frames const& frames, Content const* base, std::string const& name, Buffer& segment,
     Sink const& sink);

@@ -1,4 +1,4 @@
-/// What cleaning wins.
+/// What cleaning has freed.
 #pragma once
 
 #include <cstddef>

@@ -1,4 +1,4 @@
-/// What the storage holds.
+/// Lists of what is in the storage.
 #pragma once
 
 #include "host/storage/storage_layout.h"

@@ -5,23 +5,23 @@
 /// with zstd, checked against its SHA-256 digest whenever it is read, and described in docs/formats/storage.md.
 ///
 /// URLs are "tf:NAME#DIGEST" and "po:DIGEST" (host/storage/storage_url.h): a URL names the same content in every
-/// repository. Equal content is kept once, so a drawing may get the URL of an object, and the reverse.
+/// repository. Equal contents are stored once, so a drawing may get the URL of an object, and the other way round.
 ///
-/// Storing goes in batches, and nothing of a batch counts before it is flushed:
+/// Contents are stored in batches, and nothing in a batch is permanent until it is flushed:
 ///
 ///     LocalStorage storage(root, previousUrl, knownUrl);
 ///     auto const plan = storage.store(L"plan.dwg"); // its URL, for this object only
 ///     auto const note = storage.store(L"note.txt");
-///     storage.flush();                              // now for everybody; without it both are taken back
+///     storage.flush();                              // now permanent; without it both are removed
 ///     storage.verify(plan.value());                 // reads back what a commit is about to rely on
 ///
-/// One thread at a time. What changes the storage is for who holds the lock of the repository; reading needs none. All
-/// errors are sentences in English that name what they speak of. No content ends the process: lack of memory is an
+/// One thread at a time. Only the holder of the repository's lock may change the storage; reading needs no lock. All
+/// errors are English sentences that name the file or content. No content ends the process: running out of memory is an
 /// error too. The code of an error is the system's, as in `errno`, and 0 where a content is missing or damaged.
 ///
 /// Memory: files up to 64 MiB are held whole, with their base, a spare for unpacking it and the result, so a file of n
-/// MiB needs about four times n. Beyond that, work goes by segments of 64 MiB, whatever the length. No operation uses
-/// more than some 400 MiB; storing a second version of a file of 1.5 GiB was measured to use 223.
+/// MiB needs about four times n. Longer contents are processed in segments of 64 MiB, whatever the length. No operation
+/// uses more than some 400 MiB; storing a second version of a file of 1.5 GiB was measured to use 223.
 #pragma once
 
 #include "common/mu_common_expected.h"
@@ -52,52 +52,54 @@ public:
 
     /// The storage of the repository `root`.
     ///
-    /// `previousUrl` gives, for a path, the URL of the version that the last commit holds of that file, under whatever
-    /// path: its store is appended to. `knownUrl` gives, for a digest, the URL under which its content is kept already.
-    /// Either may be empty. Only tests give a `segmentLog`: contents are worked on in pieces of 2^`segmentLog` bytes.
+    /// `previousUrl` returns, for a path, the URL of that file's version in the last commit, under its former path if
+    /// it was renamed: the new version is appended to the same store. `knownUrl` returns, for a digest, the URL under
+    /// which its content is stored already. Either may be empty. Only tests pass a `segmentLog`: contents are processed
+    /// in segments of 2^`segmentLog` bytes.
     explicit LocalStorage(
         common::RootPath root, UrlOfPath previousUrl = {}, UrlOfDigest knownUrl = {},
         unsigned segmentLog = kSegmentLog);
     LocalStorage(LocalStorage const&) = delete;
     LocalStorage& operator=(LocalStorage const&) = delete;
-    /// Takes back what was stored and not flushed.
+    /// Removes what was stored and not flushed.
     ~LocalStorage() = default;
 
-    /// Keeps the content of `path`, which is relative to the working folder. The URL may be handed on once `flush` has
-    /// succeeded; this object reads the content at once. A repetition gives the same URL. A content that is kept
-    /// already is read, once in a batch, and stored again under its URL where it is damaged or gone. What is kept is
-    /// what was read, under its own digest; a file seen to change meanwhile is an error ("has changed while it was
-    /// being stored"), after which the caller tries again. An error leaves nothing of the file behind.
+    /// Stores the content of `path`, which is relative to the working folder. Pass the URL on only after `flush` has
+    /// succeeded; this object can read the content immediately. Storing it again gives the same URL. A content that is
+    /// stored already is read, once per batch, and stored again under its URL if it is damaged or missing. What is
+    /// stored is what was read, under its own digest; a file that changes during the call is an error ("has changed
+    /// while it was being stored"), after which the caller tries again. An error leaves nothing of the file behind.
     Expected<OdString> store(OdString const& path);
-    /// Waits until everything stored since the last flush is safe on the disk, in one go. After an error nothing of it
-    /// is kept, and its URLs are void.
+    /// Waits until everything stored since the last flush is safe on the disk, with one flush. After an error all of it
+    /// has been removed, and its URLs are void.
     WriteOutcome flush();
-    /// Makes the content at `url` readable: where it is damaged or gone it is stored again, flushed and read back, from
-    /// the file `path`, relative to the working folder, which has that content. True when it was stored again.
+    /// Makes the content at `url` readable: if it is damaged or missing, it is stored again from the file `path`,
+    /// relative to the working folder, which must have that content, then flushed and read back. True when it was
+    /// stored again.
     Expected<bool> repair(OdString const& url, OdString const& path);
 
-    /// The URLs of all contents that are kept, in ascending order, whether a commit has them or not.
+    /// The URLs of all stored contents, in ascending order, whether a commit has them or not.
     Expected<std::set<OdString>> contents() const;
-    /// Whether the content is kept; that it is whole, `verify` finds out. Error: not a URL of this storage.
+    /// Whether the content is stored; `verify` checks that it is intact. Error: not a URL of this storage.
     Expected<bool> contains(OdString const& url) const;
     /// Length of the content in bytes, without unpacking it.
     Expected<std::uint64_t> size(OdString const& url) const;
-    /// Gives the content to `sink`, piece by piece. Until this returns success the content may yet turn out to be
-    /// damaged. A sink that returns false gets no more; that is an error too ("was not read to its end").
+    /// Passes the content to `sink`, piece by piece. Until this returns success, the content may still turn out to be
+    /// damaged. A sink that returns false receives no more; that is an error too ("was not read to its end").
     WriteOutcome read(OdString const& url, std::function<bool(char const*, std::size_t)> const& sink) const;
     /// Reads the content and checks its digest.
     WriteOutcome verify(OdString const& url) const;
-    /// Writes the content into the new file `path`, a full path in bytes, and does not flush it. When the name is
-    /// taken, nothing is touched; after any other error there is no file.
+    /// Writes the content into the new file `path`, a full path in bytes, and does not flush it. When the name exists,
+    /// nothing is changed; after any other error there is no file.
     WriteOutcome extract(OdString const& url, std::string const& path) const;
 
     /// Removes everything but `urls` and the revisions that they build on, and what interrupted operations have left.
-    /// A store is rewritten beside the old one, flushed, read back, and takes its place. A store in which something to
-    /// be kept cannot be read stays as it is; the rest is cleaned, and then that is the error. A store that belongs to
-    /// one of `elsewhere`, URLs of contents that need not be here, stays as well, and that is no error. What was stored
-    /// and not flushed is flushed first.
+    /// A store is rewritten beside the old one, flushed, read back, and renamed over it. A store in which something to
+    /// be kept cannot be read is left unchanged; the others are cleaned, and then this is reported as the error. A
+    /// store that belongs to one of `elsewhere`, URLs of contents that need not be here, is also left unchanged, which
+    /// is not an error. What was stored and not flushed is flushed first.
     Expected<Freed> keepOnly(std::set<OdString> const& urls, std::set<OdString> const& elsewhere = {});
-    /// Removes only what interrupted operations have left. No content goes, whether a commit needs it or not.
+    /// Removes only what interrupted operations have left. No content is removed, whether a commit needs it or not.
     Expected<Freed> removeLeftovers();
 
 private:

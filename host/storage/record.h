@@ -1,4 +1,4 @@
-/// Records, the one form in which contents are kept: a header and zstd frames (docs/formats/storage.md).
+/// Records, the format in which contents are stored: a header and zstd frames (docs/formats/storage.md).
 #pragma once
 
 #include "host/text/digest.h"
@@ -15,7 +15,7 @@ namespace tav {
 inline constexpr unsigned kSegmentLog = 26;
 inline constexpr unsigned kSmallestSegmentLog = 12;
 
-/// What the header of a record says.
+/// The values in the header of a record.
 struct Record {
     Digest digest{};                ///< of the content
     Digest base{};                  ///< of the content that the frames build on; all zeros: on none
@@ -29,13 +29,13 @@ struct Record {
 
 inline constexpr std::size_t kHeaderLength = 104;
 
-/// What every header begins with.
+/// The beginning of every header.
 std::string_view headerMark();
 
 /// The header of `record`.
 std::string headerOf(Record const& record);
 
-/// Reads a header. None unless `bytes` are exactly one whose check sum holds and whose numbers can be true.
+/// Reads a header. None unless `bytes` is exactly one header with a correct checksum and possible numbers.
 std::optional<Record> parseHeader(std::string_view bytes);
 
 } // namespace tav

@@ -1,4 +1,4 @@
-/// Files of records: a revision store holds many, an object is one with a single record (docs/formats/storage.md).
+/// Files of records: a revision store has many, an object has exactly one (docs/formats/storage.md).
 #pragma once
 
 #include "host/storage/content.h"
@@ -15,7 +15,7 @@
 
 namespace tav {
 
-/// A delta may build on another one. At most this many lead from a whole content to any other.
+/// A delta can build on another delta. At most this many lead from a whole content to any other one.
 inline constexpr std::size_t kLongestChain = 32;
 /// The same for contents longer than a segment: each step on the way goes through a file.
 inline constexpr std::size_t kLongestLargeChain = 8;
@@ -29,7 +29,7 @@ struct Entry {
     std::uint64_t end() const { return framesOffset() + record.framesLength; }
 };
 
-/// A content that was read and checked, kept for another use.
+/// A content that was read and checked, kept for reuse.
 struct KnownContent {
     Digest digest{};
     Content content;
@@ -38,44 +38,44 @@ struct KnownContent {
 /// An open file of records, and the list of them. Everything throws `StorageError`. One thread at a time. Only the
 /// holder of the repository's lock may append; readers need no lock, and an append does not disturb them.
 ///
-/// Damage is stepped over: where a header does not hold, the next one that does is looked for. What follows the last
-/// record is not seen by readers. The next append takes its place where it is a torn tail, left by an append that never
-/// ended; else it may be a record with a damaged header, which stays, and the append goes behind it.
+/// Damage is skipped: after an invalid header, the next valid one is searched for. Readers ignore the bytes after the
+/// last record. The next append overwrites them if they are a torn tail, which an interrupted append has left.
+/// Otherwise they may be a record with a damaged header, so they are kept, and the append goes after them.
 class RecordFile {
 public:
-    /// Opens the file `path`. Messages speak of it as `name`.
+    /// Opens the file `path`. Messages call it `name`.
     static RecordFile openForReading(std::string const& path, std::string name);
     static RecordFile openForChanging(std::string const& path, std::string name);
     /// Makes the file, which must not exist.
     static RecordFile create(std::string const& path, std::string name);
 
-    /// In the order of the file, which is that of their making.
+    /// In the order of the file, oldest first.
     std::vector<Entry> const& entries() const { return entries_; }
     /// Where the next record goes.
     std::uint64_t end() const { return end_; }
     /// Length of the file, any torn tail included.
     std::uint64_t length() const { return length_; }
-    /// Whether the file is its records and nothing else.
+    /// Whether the file consists of its records and nothing else.
     bool isClean() const;
 
     /// The newest record of the content `digest`: its index.
     std::optional<std::size_t> find(Digest const& digest) const;
     /// Whether there is a record of the content `digest`, or one that builds on it.
     bool isNamed(Digest const& digest) const;
-    /// The records that lead to the content of record `index`, the whole one first, that record last: of each base the
-    /// newest. Throws when one is missing or there are too many.
+    /// The records that lead to the content of record `index`, from the whole one to that record, with the newest
+    /// record of each base. Throws when one is missing or there are too many.
     std::vector<std::size_t> chainOf(std::size_t index) const;
 
-    /// Gives `sink` the content of record `index`, and throws if it was not the right one: nothing that `sink` got may
-    /// be trusted before this has returned. Large contents on the way are in files without names in `scratch`. Where
-    /// the record builds on `known`, if that is not null, its base is not read.
+    /// Passes the content of record `index` to `sink`, and throws if its digest is wrong: do not trust anything that
+    /// `sink` received before this has returned. Large intermediate contents are in unnamed files in `scratch`. If the
+    /// record builds on `known`, which may be null, its base is not read.
     void read(std::size_t index, std::string const& scratch, KnownContent const* known, Sink const& sink) const;
     /// The content of record `index`, checked.
     Content load(std::size_t index, std::string const& scratch) const;
 
-    /// Appends `content`, on `base` where that is not null and makes it smaller; `base` is a content of this file. A
-    /// failure leaves the file as it was, as far as the disk lets it. Throws when the content turns out to be another
-    /// than `digest`.
+    /// Appends `content`, as a delta to `base` if that is not null and makes it smaller; `base` is a content of this
+    /// file. A failure leaves the file unchanged, as far as the disk permits. Throws when the digest of the content is
+    /// not `digest`.
     void append(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog);
     /// Appends the record `index` of `other` unchanged.
     void appendFrom(RecordFile const& other, std::size_t index);

@@ -1,4 +1,4 @@
-/// Rewriting a revision store without the revisions that nobody needs.
+/// Rewriting a revision store without the revisions that are not needed.
 #pragma once
 
 #include "host/storage/freed.h"
@@ -9,12 +9,12 @@
 
 namespace tav {
 
-/// Leaves of the revision store `path`, called `name` in errors, the revisions `digests` and those that they build on.
-/// Without any of them the store is removed. Returns what went.
+/// Reduces the revision store `path`, called `name` in errors, to the revisions `digests` and those that they build on.
+/// If nothing remains, the store is removed. Returns what was removed.
 ///
-/// The new form is written beside the old one, flushed, read back, and takes its place; a store that holds nothing else
-/// is not touched. Throws `StorageError`, with the store as it was, when one of `digests` cannot be read. Large
-/// contents on the way are in files without names in `scratch`.
+/// The new store is written beside the old one, flushed, read back, and renamed over it; a store with nothing to remove
+/// is not changed. Throws `StorageError`, and leaves the store unchanged, when one of `digests` cannot be read. Large
+/// intermediate contents are in unnamed files in `scratch`.
 Freed reduceStore(
     std::string const& path, std::string const& name, std::set<Digest> const& digests, std::string const& scratch);
 

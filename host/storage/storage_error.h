@@ -1,4 +1,4 @@
-/// How the parts of the storage fail among themselves.
+/// The exception that the parts of the storage use internally.
 #pragma once
 
 #include <string>
@@ -12,10 +12,10 @@ struct StorageError {
     explicit StorageError(std::string what_, int code_ = 0) : what(std::move(what_)), code(code_) {}
 
     std::string what;
-    int code; ///< of the system, as in `errno`; 0 when it is the content that is wrong
+    int code; ///< of the system, as in `errno`; 0 when the content is wrong
 };
 
-/// Throws unless `error` is none. `what` begins the sentence that the system's reason ends.
+/// Throws if `error` is an error. `what` begins the sentence, and the system's reason ends it.
 inline void check(std::error_code const& error, std::string const& what)
 {
     if (error) {

@@ -12,12 +12,12 @@
 
 namespace tav {
 
-/// Paths in bytes, inside ".tav" of one repository. Nothing is looked up on the disk.
+/// Paths in bytes, inside ".tav" of one repository. Does not access the disk.
 class StorageLayout {
 public:
     explicit StorageLayout(common::RootPath const& root);
 
-    /// ".tav" itself: large contents on their way are in files without names there.
+    /// ".tav" itself: large intermediate contents are in unnamed files there.
     std::string const& scratchFolder() const { return tavFolder_; }
     std::string const& storeFolder() const { return storeFolder_; }
     std::string const& objectFolder() const { return objectFolder_; }
@@ -35,7 +35,7 @@ public:
     static std::optional<std::string> storeIn(std::string_view name);
     /// Whether the file `name` of `storeFolder` is a store that was being rewritten.
     static bool isNewForm(std::string_view name);
-    /// The file that the new form of the store in the file `path` is written to.
+    /// The file to which a store in the file `path` is rewritten.
     static std::string newFormOf(std::string const& path);
 
 private:
