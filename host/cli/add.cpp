@@ -132,9 +132,9 @@ void addFilesToStage(AddOptions const& options)
         count = stage(chosen.files, cache.write());
     });
     if (repaired > 0) {
-        print("Repaired " + counted(repaired, "stored version") + ".\n");
+        report("Repaired " + counted(repaired, "stored version") + ".\n");
     }
-    print(count == 0 ? "Nothing new to stage.\n" : "Staged " + counted(count, "file") + ".\n");
+    report(count == 0 ? "Nothing new to stage.\n" : "Staged " + counted(count, "file") + ".\n");
 }
 
 } // namespace tav

@@ -81,7 +81,7 @@ void make(ReferenceOptions const& options, Kind const& kind)
     WriteSession session(openRepository(""), kind.name);
     CommitRecord const commit = findCommit(session.database(), options.commit);
     makeReference(session.database(), {fromUtf8(*options.name), commit.hash, kind.type});
-    print(
+    report(
         std::string("Made the ") + kind.name + " '" + shown(fromUtf8(*options.name)) + "' at commit " +
         std::to_string(commit.number) + ".\n");
 }

@@ -55,7 +55,7 @@ void checkOut(CheckoutOptions const& options)
     OdString const branch = readState(session.root())->read().head;
     CheckedOut const result =
         checkOutCommit(session.root(), session.database(), {commit.hash, branch}, discardOf(options), session.start());
-    print("Now at commit " + std::to_string(commit.number) + described(result, session.root()));
+    report("Now at commit " + std::to_string(commit.number) + described(result, session.root()));
 }
 
 void switchBranch(CheckoutOptions const& options)
@@ -72,7 +72,7 @@ void switchBranch(CheckoutOptions const& options)
     }
     CheckedOut const result = checkOutCommit(
         session.root(), session.database(), {branch->commitHash, branch->name}, discardOf(options), session.start());
-    print("Now on branch " + shown(branch->name) + described(result, session.root()));
+    report("Now on branch " + shown(branch->name) + described(result, session.root()));
 }
 
 } // namespace tav

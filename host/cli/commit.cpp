@@ -50,7 +50,7 @@ std::string authorOf(CommitOptions const& options)
 
 void printCommit(CommitRecord const& commit, char const* verb)
 {
-    print(
+    report(
         std::string(verb) + " commit " + std::to_string(commit.number) + " (" + commit.hash.left(12).ansi_str() +
         ").\n");
 }

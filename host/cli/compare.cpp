@@ -52,7 +52,7 @@ void compareDrawing(CompareOptions const& options)
     }
     print(before.label + " and " + after.label + ". " + summary(comparison));
     if (!options.file.empty()) {
-        print("Wrote the comparison to '" + shown(fromUtf8(options.file)) + "'.\n");
+        report("Wrote the comparison to '" + shown(fromUtf8(options.file)) + "'.\n");
     }
 }
 

@@ -126,7 +126,7 @@ void unset(std::string const& key, Origin origin)
             "'" + key + "' is not set for " + placeOf(origin) + ".", "Run 'tav config --list' to see what is set.");
     }
     locked.file.save();
-    print("'" + shown(fromUtf8(key)) + "' is no longer set for " + placeOf(origin) + ".\n");
+    report("'" + shown(fromUtf8(key)) + "' is no longer set for " + placeOf(origin) + ".\n");
 }
 
 } // namespace
@@ -150,7 +150,7 @@ void config(ConfigOptions const& options)
     } else if (options.value) {
         Origin const origin = chosenFile(options);
         saveSetting(*options.key, *options.value, origin);
-        print(
+        report(
             "'" + shown(fromUtf8(*options.key)) + "' is '" + shown(fromUtf8(*options.value)) + "' for " +
             placeOf(origin) + ".\n");
         noteOther(*options.key, origin);

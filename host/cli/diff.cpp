@@ -5,6 +5,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
+#include "host/cli/pager.h"
 #include "host/errors/failure.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
@@ -259,6 +260,7 @@ void printDocument(
 
 void showDifferences(DiffOptions const& options)
 {
+    Pager const pager;
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
     WordList words = options.arguments;

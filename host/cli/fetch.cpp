@@ -15,12 +15,12 @@ void fetch()
     Connection connection(session.database());
     Fetched const fetched = fetchHistory(session.root(), session.database(), connection, Compared::everything);
     if (fetched.commits == 0 && fetched.references == 0) {
-        print("Nothing is new on the server.\n");
+        report("Nothing is new on the server.\n");
         return;
     }
-    print("Fetched " + counted(fetched.commits, "commit") + ".\n");
+    report("Fetched " + counted(fetched.commits, "commit") + ".\n");
     if (fetched.references > 0) {
-        print("Branches and tags that are new or have moved: " + std::to_string(fetched.references) + ".\n");
+        report("Branches and tags that are new or have moved: " + std::to_string(fetched.references) + ".\n");
     }
 }
 

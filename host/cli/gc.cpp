@@ -98,11 +98,11 @@ void collectGarbage()
     LocalStorage storage(session.root());
     Freed const freed = removeWhatNobodyNeeds(session, storage);
     RemovedFiles const files = cleanRemovedFiles(session.root(), session.database(), storage);
-    print(
+    report(
         "Removed " + counted(freed.contents, "stored version") + " that no commit needs; " + sizeText(freed.bytes) +
         " freed.\n");
     if (files.freed.contents > 0) {
-        print(
+        report(
             "Removed " + counted(files.freed.contents, "file") + " that a killed 'tav rm' had left; " +
             sizeText(files.freed.bytes) + " freed.\n");
     }

@@ -16,7 +16,7 @@ void addRule(common::RootPath const& root, std::string const& rule)
 {
     WriteSession const session(root, "ignore", Recovery::attempted);
     OdString const pattern = fromUtf8(rule);
-    print(
+    report(
         addIgnoreRule(root, pattern) ? "Names that match '" + shown(pattern) + "' are ignored from now on.\n"
                                      : "The rule '" + shown(pattern) + "' was there already.\n");
 }

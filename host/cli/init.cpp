@@ -101,8 +101,8 @@ void init(InitOptions const& options)
     WriteSession session(root, std::move(lock), Recovery::attempted);
     chooseServer(session.database(), server, folder, name);
     enterProject(session.database(), folder, name);
-    print(found);
-    print(
+    report(found);
+    report(
         existed ? "The repository in '" + shown(path) + "' was there already; it is complete.\n"
                 : "Made a repository in '" + shown(path) + "'.\n");
 }

@@ -2,6 +2,7 @@
 #include "host/cli/commit_output.h"
 #include "host/cli/current_settings.h"
 #include "host/cli/output.h"
+#include "host/cli/pager.h"
 #include "host/errors/failure.h"
 #include "host/history/ancestry.h"
 #include "host/history/file_history.h"
@@ -252,6 +253,7 @@ void printForPeople(std::vector<Entry> const& entries, Names const& names, bool 
 
 void showLog(LogOptions const& options)
 {
+    Pager const pager;
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
     if (std::string const notice = pendingNotice(root, database); !notice.empty()) {

@@ -180,7 +180,7 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
         stage(changed, state);
     });
     onDisk.keep();
-    print("Renamed '" + shown(from) + "' to '" + shown(to) + "'.\n");
+    report("Renamed '" + shown(from) + "' to '" + shown(to) + "'.\n");
 }
 
 } // namespace tav

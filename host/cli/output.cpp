@@ -1,5 +1,7 @@
 #include "host/cli/output.h"
 
+#include "host/cli/current_settings.h"
+#include "host/errors/failure.h"
 #include "host/text/characters.h"
 #include "host/text/utf8.h"
 
@@ -7,7 +9,6 @@
 
 #include <algorithm>
 #include <cstdio>
-#include <cstdlib>
 #include <string_view>
 
 namespace tav {
@@ -68,11 +69,35 @@ std::string asSentence(std::string const& text)
     return isEnded ? text : text + ".";
 }
 
+/// Settings that cannot be used are no reason to show nothing: 'tav config' says what is wrong with them.
+std::string colourSetting()
+{
+    try {
+        return currentSettings().value("color");
+    } catch (Failure const&) {
+        return "auto";
+    }
+}
+
+bool wantsColours()
+{
+    std::string const& chosen = terminalOptions().colour;
+    std::string const when = chosen.empty() ? colourSetting() : chosen;
+    return when == "always" || (when == "auto" && isTerminal());
+}
+
 } // namespace
 
 void print(std::string const& text)
 {
     std::fwrite(text.data(), 1, text.size(), stdout);
+}
+
+void report(std::string const& text)
+{
+    if (!terminalOptions().isQuiet) {
+        print(text);
+    }
 }
 
 void printJson(kutils::json::Value const& document)
@@ -127,8 +152,7 @@ std::string digestLine(Digest const& digest, OdString const& path)
 
 std::string coloured(Colour colour, std::string text)
 {
-    static char const* const noColour = std::getenv("NO_COLOR");
-    bool const isWanted = isTerminal() && (!noColour || !*noColour);
+    static bool const isWanted = wantsColours();
     if (!isWanted || colour == Colour::none) {
         return text;
     }

@@ -14,6 +14,8 @@ namespace tav {
 
 /// Prints `text`, in UTF-8, unchanged.
 void print(std::string const& text);
+/// Prints what a command has done, unless the user asked for quiet.
+void report(std::string const& text);
 /// Prints a document for programs, with a line feed after it.
 void printJson(kutils::json::Value const& document);
 /// Prints "tav: <what> <next>" as one line on the error stream.
@@ -38,7 +40,7 @@ std::string digestLine(Digest const& digest, OdString const& path);
 
 enum class Colour { none, red, green };
 
-/// `text` in that colour if the output is a terminal and the environment does not set NO_COLOR.
+/// `text` in that colour if the user wants colours: by default on a terminal.
 std::string coloured(Colour colour, std::string text);
 
 } // namespace tav

@@ -111,7 +111,7 @@ void restoreFiles(RestoreOptions const& options)
     Updated const updated = carryOut(root, storage, update, session.start());
     changeState(root, [&](common::Cache& cache) { enterFiles(files, base, updated.times, cache.write()); });
     keepVerified(updated.verified, session.database());
-    print(
+    report(
         counted(files.size(), "file") + " as in commit " + std::to_string(commit.number) + ", " +
         std::to_string(update.writes.size()) + " written.\n");
 }

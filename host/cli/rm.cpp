@@ -237,7 +237,7 @@ void removeFiles(std::vector<std::string> const& names)
         count += stage(without(renamed, chosen), cache.write());
     });
     departures.finish();
-    print("Removed " + counted(count, "file") + "; the next commit takes that.\n");
+    report("Removed " + counted(count, "file") + "; the next commit takes that.\n");
 }
 
 } // namespace tav

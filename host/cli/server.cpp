@@ -127,12 +127,12 @@ void server(ServerOptions const& options)
     Connection connection(database);
     if (options.send) {
         Sent const sent = sendAgain(session.root(), database, connection);
-        print("Sent " + counted(sent.commits, "commit") + ".\n");
+        report("Sent " + counted(sent.commits, "commit") + ".\n");
         noteGivenUp(sent.givenUp, database.commits());
     } else {
         fetchHistory(session.root(), database, connection, Compared::everything);
     }
-    print("The history is kept in '" + shown(folder) + "' now.\n");
+    report("The history is kept in '" + shown(folder) + "' now.\n");
 }
 
 } // namespace tav

@@ -2,6 +2,7 @@
 #include "host/cli/commit_output.h"
 #include "host/cli/content_output.h"
 #include "host/cli/output.h"
+#include "host/cli/pager.h"
 #include "host/commits/commit_names.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
@@ -101,6 +102,7 @@ fileToShow(ShowOptions const& options, LocalDatabase const& database, common::Ro
 
 void showCommit(ShowOptions const& options)
 {
+    Pager const pager;
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
     if (auto const file = fileToShow(options, database, root)) {

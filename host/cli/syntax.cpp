@@ -2,9 +2,12 @@
 
 #include "host/cli/commands.h"
 #include "host/cli/commit_message.h"
+#include "host/cli/terminal.h"
+#include "host/terminal/progress.h"
 
 #include <CLI/CLI.hpp>
 
+#include <cstdint>
 #include <memory>
 #include <optional>
 #include <string>
@@ -347,6 +350,28 @@ void addExport(CLI::App& app)
     command->callback([arguments] { exportCommit(arguments->first, arguments->second); });
 }
 
+/// The options of every command. They are understood before the command and behind it; the help of tav shows them.
+void addTerminalOptions(CLI::App& app, char const* group)
+{
+    TerminalOptions& options = terminalOptions();
+    app.add_option("--color", options.colour, "When to use colours: auto, always or never")
+        ->type_name("WHEN")
+        ->check(CLI::IsMember({"auto", "always", "never"}))
+        ->group(group);
+    app.add_flag(
+           "--no-pager", [&options](std::int64_t) { options.hasPager = false; }, "Show long output at once")
+        ->group(group);
+    app.add_flag(
+           "-q,--quiet",
+           [&options](std::int64_t) {
+               options.isQuiet = true;
+               hideProgress();
+           },
+           "Say nothing of what has been done")
+        ->group(group);
+    app.add_flag("--yes", options.asksNothing, "Ask nothing: take the usual answer")->group(group);
+}
+
 } // namespace
 
 void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
@@ -378,6 +403,10 @@ void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
     addOnlyJson(*app.add_subcommand("verify", "Read every stored version and check it against its digest"), verifyAll);
     app.add_subcommand("gc", "Remove what no commit needs from the storage")->callback(collectGarbage);
     addExport(app);
+    addTerminalOptions(app, "Options");
+    for (CLI::App* const command : app.get_subcommands({})) {
+        addTerminalOptions(*command, "");
+    }
 }
 
 } // namespace tav

@@ -30,7 +30,7 @@ void unstageFiles(UnstageOptions const& options)
         }
         count = unstage(chosen, cache.write());
     });
-    print("Took " + counted(count, "file") + " out of the next commit.\n");
+    report("Took " + counted(count, "file") + " out of the next commit.\n");
 }
 
 } // namespace tav

@@ -83,6 +83,7 @@ _tav_options() { # COMMAND
 _tav_value() { # COMMAND OPTION
     case $1:$2 in
         commit:-F | commit:--file) _tav_offer_files -f ;;
+        *:--color) _tav_offer_words auto always never ;;
         :-C | init:--server) _tav_offer_files -d ;;
         preview:-o | preview:--output | compare:-o | compare:--output) _tav_offer_files -f ;;
         restore:--from | files:--at) _tav_offer < <(_tav_references branch tag) ;;
@@ -126,6 +127,7 @@ _tav() {
     for ((i = 1; i < COMP_CWORD; ++i)); do
         word=${COMP_WORDS[i]}
         case $command:$word in
+            :--color) ((++i)) ;;
             :-C) ((++i == COMP_CWORD)) || folder=${COMP_WORDS[i]//[\\\"\']/} ;;
             :-*) ;;
             :*) command=$word ;;
@@ -141,7 +143,7 @@ _tav() {
     [[ $folder != \~ && $folder != \~/* ]] || folder=$HOME${folder:1}
     ((COMP_CWORD > 1)) && _tav_value "$command" "$previous" && return
     if [[ -z $command && $current == -* ]]; then
-        _tav_offer_words -C -h --help --version
+        _tav_offer_words -C --color --no-pager -q --quiet --yes -h --help --version
     elif [[ -z $command ]]; then
         _tav_offer_words "$commands"
     elif [[ $current == -* ]]; then

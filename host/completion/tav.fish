@@ -55,6 +55,10 @@ complete -c tav -f
 complete -c tav -s h -l help -d 'Show this help and do nothing else'
 complete -c tav -n "not __fish_seen_subcommand_from $commands" -l version \
     -d 'Show the version and do nothing else'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -l color -x -a 'auto always never' -d 'When to use colours'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -l no-pager -d 'Show long output at once'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -s q -l quiet -d 'Say nothing of what has been done'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -l yes -d 'Ask nothing: take the usual answer'
 complete -c tav -n "not __fish_seen_subcommand_from $commands" -s C -x -a '(__fish_complete_directories)' \
     -d 'Work as if started in FOLDER'
 

@@ -14,12 +14,19 @@ constexpr std::chrono::milliseconds kPatience(500);
 constexpr std::chrono::milliseconds kInterval(100);
 constexpr std::uint64_t kWidth = 30;
 
+bool isHidden = false;
+
 } // namespace
+
+void hideProgress()
+{
+    isHidden = true;
+}
 
 Progress::Progress(std::string what, std::uint64_t total, Clock::time_point (*now)())
     : what_(std::move(what))
     , total_(std::max<std::uint64_t>(total, 1))
-    , enabled_(isatty(STDERR_FILENO) == 1)
+    , enabled_(!isHidden && isatty(STDERR_FILENO) == 1)
     , now_(now)
     , next_(now() + kPatience)
 {

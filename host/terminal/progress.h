@@ -7,6 +7,9 @@
 
 namespace tav {
 
+/// Shows no progress from now on.
+void hideProgress();
+
 /// Shows the progress of an operation on the error stream, once it has taken half a second. Shows nothing if that
 /// stream is not a terminal. The line is erased when the operation ends.
 class Progress {

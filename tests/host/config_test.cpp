@@ -214,6 +214,12 @@ TEST_F(Author, IsNotAskedForWithoutATerminal)
     EXPECT_FALSE(home_.has("tav/config"));
 }
 
+TEST_F(Author, IsNotAskedForWithYes)
+{
+    EXPECT_EQ(commit("Bob\n", {"--yes"}).err, "");
+    EXPECT_FALSE(home_.has("tav/config"));
+}
+
 TEST_F(Author, OfTheRepositoryIsTaken)
 {
     config({"--repository", "user.name", "Ann of the bridge"});

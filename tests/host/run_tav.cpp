@@ -66,6 +66,7 @@ void take(Setting const& setting, int in, int out, int err)
     require(setenv("XDG_DATA_HOME", (home() + "/data").c_str(), 1) == 0, "setenv");
     require(setenv("XDG_CONFIG_HOME", (home() + "/config").c_str(), 1) == 0, "setenv");
     require(setenv("XDG_CACHE_HOME", (home() + "/cache").c_str(), 1) == 0, "setenv");
+    require(setenv("TERM", "dumb", 1) == 0, "setenv"); // No pager comes in between, unless a test wants one.
     for (std::string const& variable : setting.environment) {
         std::size_t const end = variable.find('=');
         require(setenv(variable.substr(0, end).c_str(), variable.substr(end + 1).c_str(), 1) == 0, "setenv");
