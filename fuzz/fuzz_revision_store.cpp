@@ -2,12 +2,13 @@
 // digest of what was given out is the one of the header.
 #include "common/mu_common_versions.h"
 
-#include "host/storage/record_file.h"
+#include "host/storage/chain.h"
 #include "host/storage/storage_error.h"
 
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
+#include <memory>
 #include <string>
 #include <sys/mman.h>
 #include <unistd.h>
@@ -40,16 +41,18 @@ private:
     int file_;
 };
 
-void readRecord(tav::RecordFile const& store, std::size_t index)
+void readRecord(std::shared_ptr<tav::RecordFile const> const& store, std::size_t index)
 {
     common::ContentDigest digest;
     try {
-        store.read(index, "/tmp", nullptr, [&](std::string_view piece) { digest.update(piece.data(), piece.size()); });
+        tav::ChainReader("/tmp").read({store, index}, tav::basesIn(store), [&](std::string_view piece) {
+            digest.update(piece.data(), piece.size());
+        });
     } catch (tav::StorageError const& error) {
         require(error.what == "The store is damaged.");
         return;
     }
-    require(digest.finish().ansi_str() == tav::hexOf(store.entries()[index].record.digest));
+    require(digest.finish().ansi_str() == tav::hexOf(store->entries()[index].record.digest));
 }
 
 } // namespace
@@ -57,11 +60,12 @@ void readRecord(tav::RecordFile const& store, std::size_t index)
 extern "C" int LLVMFuzzerTestOneInput(std::uint8_t const* data, std::size_t size)
 {
     MemoryFile const file(data, size);
-    tav::RecordFile const store = tav::RecordFile::openForReading(file.path(), "The store");
-    require(store.length() == size && store.end() <= size);
-    for (std::size_t i = 0; i < store.entries().size(); ++i) {
-        tav::Entry const& entry = store.entries()[i];
-        require(entry.end() <= size && store.find(entry.record.digest).has_value());
+    auto const store =
+        std::make_shared<tav::RecordFile const>(tav::RecordFile::openForReading(file.path(), "The store"));
+    require(store->length() == size && store->end() <= size);
+    for (std::size_t i = 0; i < store->entries().size(); ++i) {
+        tav::Entry const& entry = store->entries()[i];
+        require(entry.end() <= size && store->find(entry.record.digest).has_value());
         if (entry.record.length <= kLongest) {
             readRecord(store, i);
         }

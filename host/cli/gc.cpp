@@ -4,6 +4,7 @@
 #include "host/cli/output.h"
 #include "host/client/contents.h"
 #include "host/client/history.h"
+#include "host/commits/turn_over.h"
 #include "host/errors/failure.h"
 #include "host/repository/journal.h"
 #include "host/repository/open.h"
@@ -73,6 +74,21 @@ std::string whyOnlyLeftovers(WriteSession& session, LocalStorage& storage)
     return doubt.empty() ? doubt : "the server does not say what its commits need. " + doubt;
 }
 
+/// A failure does not keep the rest from being cleaned: that may be what frees the space that was missing.
+void turnOver(WriteSession& session)
+{
+    TurnedOver const turned = turnOverObjects(session.root(), session.database());
+    if (turned.freed.contents > 0) {
+        print(
+            "Turned " + counted(turned.freed.contents, "stored version") + " into " +
+            (turned.freed.contents == 1 ? "a difference; " : "differences; ") + sizeText(turned.freed.bytes) +
+            " freed.\n");
+    }
+    if (turned.error) {
+        printNote("Not all stored versions were turned into differences: " + turned.error->message.ansi_str());
+    }
+}
+
 /// Leftovers go first: on a full disk nothing can be learned.
 Freed removeWhatNobodyNeeds(WriteSession& session, LocalStorage& storage)
 {
@@ -82,6 +98,7 @@ Freed removeWhatNobodyNeeds(WriteSession& session, LocalStorage& storage)
         printNote("Only leftovers are removed: " + why);
         return leftovers;
     }
+    turnOver(session);
     Contents const needed = contentsOf(session.root(), session.database());
     Freed const unneeded = valueOrFail(
         storage.keepOnly(setOf(needed.here), setOf(needed.elsewhere)),

@@ -5,6 +5,7 @@
 #include "host/changes/staging.h"
 #include "host/client/connection.h"
 #include "host/client/history.h"
+#include "host/commits/similar_files.h"
 #include "host/errors/failure.h"
 #include "host/history/commit_hash.h"
 #include "host/history/tracked_path.h"
@@ -318,8 +319,9 @@ void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
 {
     Tree const base = draft.files;
     LocalStorage storage(
-        draft.root, [&](OdString const& path) { return previousUrl(draft, base, path); },
-        [&](Digest const& digest) { return draft.database.urlOf(digest); });
+        draft.root, {[&](OdString const& path) { return previousUrl(draft, base, path); },
+                     [&](Digest const& digest) { return draft.database.urlOf(digest); },
+                     [&](OdString const& path) { return similarFiles(draft.files, path); }});
     storeAll(draft, plan, storage);
     if (draft.files == base) {
         throw Failure("What is staged is as it was committed.", "Run 'tav unstage --all' to clear it.");

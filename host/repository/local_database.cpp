@@ -9,7 +9,9 @@
 
 #include <array>
 #include <cstddef>
+#include <cstdlib>
 #include <filesystem>
+#include <string>
 
 namespace tav {
 
@@ -27,9 +29,14 @@ void makeFirstTables(Database& database)
     database.run(kFirstTables);
 }
 
+/// From here on objects may build on others. The tables stay as they are: the version alone keeps an earlier tav from
+/// taking such objects for damaged, and their bases for what nobody needs.
+void allowBasesOfObjects(Database& /*unused*/) {}
+
 /// Each makes the next version out of the one before; a new file is version 0. Steps are added and never changed: files
 /// that earlier versions of tav made have to pass them all.
-constexpr std::array kSteps = {makeFirstTables, VerifiedFiles::create, CommitTables::createIndex, LastChanges::create};
+constexpr std::array kSteps = {
+    makeFirstTables, VerifiedFiles::create, CommitTables::createIndex, LastChanges::create, allowBasesOfObjects};
 
 constexpr std::int64_t kVersion = kSteps.size();
 constexpr std::int64_t kFirstWithVerifiedFiles = 2;
@@ -132,9 +139,19 @@ void LocalDatabase::setServer(OdString const& folder, OdString const& repository
     transaction.commit();
 }
 
+std::int64_t LocalDatabase::turnedOver() const
+{
+    return std::strtoll(value("turned over").ansi_str().c_str(), nullptr, 10);
+}
+
+void LocalDatabase::setTurnedOver(std::int64_t commit)
+{
+    setValue("turned over", fromUtf8(std::to_string(commit)));
+}
+
 OdString LocalDatabase::urlOf(Digest const& digest) const
 {
-    Statement row = database_.prepare("SELECT url FROM contents WHERE digest = ? AND url LIKE 'tf:%' ORDER BY url");
+    Statement row = database_.prepare("SELECT url FROM contents WHERE digest = ? ORDER BY url LIKE 'tf:%' DESC, url");
     return row.with(std::string_view(hexOf(digest))).next() ? row.text(0) : OdString();
 }
 

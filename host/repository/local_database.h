@@ -51,11 +51,15 @@ public:
     OdString currentCommit() const { return value("base"); }
     void setCurrentCommit(OdString const& hash) { setValue("base", hash); }
 
+    /// The number of the commit up to which objects were turned over into differences; 0 when none were.
+    std::int64_t turnedOver() const;
+    void setTurnedOver(std::int64_t commit);
+
     /// The pending operation, as the document that the command wrote; empty when there is none.
     OdString journal() const { return value("unfinished"); }
     void setJournal(OdString const& document) { setValue("unfinished", document); }
 
-    /// URL of a content with this digest that is kept in a revision store; empty when none is known.
+    /// URL of a content with this digest that is stored here, preferably in a revision store; empty when none is known.
     OdString urlOf(Digest const& digest) const;
     /// URL under which any commit has a content with this digest; empty when none has.
     OdString committedUrlOf(Digest const& digest) const;

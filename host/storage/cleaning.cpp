@@ -2,13 +2,18 @@
 
 #include "host/storage/files.h"
 #include "host/storage/inventory.h"
+#include "host/storage/object_bases.h"
 #include "host/storage/reduced_store.h"
 #include "host/storage/storage_error.h"
+#include "host/text/characters.h"
 
 #include "platform/os/os_files.h"
 #include "platform/os/os_open_file.h"
 
+#include <algorithm>
+#include <iterator>
 #include <sys/stat.h>
+#include <vector>
 
 namespace tav {
 
@@ -32,15 +37,47 @@ Freed removeAllIn(std::string const& folder)
     return freed;
 }
 
-Freed cleanObjects(StorageLayout const& layout, std::set<Digest> const& needed)
+/// What nobody needs among the objects, given that what a needed one builds on is needed too.
+std::vector<Digest> unneededObjects(StorageLayout const& layout, std::set<Digest> const& needed)
 {
-    Freed freed;
-    for (Digest const& digest : objectsIn(layout)) {
-        if (needed.count(digest) == 0) {
-            freed += removeFile(layout.fileOf({{}, digest}), 1);
-        }
+    std::set<Digest> const objects = objectsIn(layout);
+    std::vector<Digest> unneeded;
+    std::set_difference(objects.begin(), objects.end(), needed.begin(), needed.end(), std::back_inserter(unneeded));
+    if (unneeded.empty()) {
+        return unneeded; // The headers need not be read.
     }
-    return freed;
+    ObjectBases const bases(layout);
+    std::set<Digest> kept;
+    std::set_intersection(
+        objects.begin(), objects.end(), needed.begin(), needed.end(), std::inserter(kept, kept.end()));
+    if (auto const unknown = bases.firstUnknown(kept)) {
+        throw StorageError("The object " + quoted(StorageUrl{{}, *unknown}.text()) + " is damaged.");
+    }
+    std::set<Digest> basesOfKept;
+    for (Digest const& digest : kept) {
+        std::vector<Digest> const chain = bases.chainOf(digest);
+        basesOfKept.insert(chain.begin(), chain.end());
+    }
+    unneeded.erase(
+        std::remove_if(
+            unneeded.begin(), unneeded.end(), [&](Digest const& digest) { return basesOfKept.count(digest) > 0; }),
+        unneeded.end());
+    return unneeded;
+}
+
+/// Returns why the objects stay, if they do: what builds on what is not known then.
+std::optional<StorageError> cleanObjects(StorageLayout const& layout, std::set<Digest> const& needed, Freed& freed)
+{
+    std::vector<Digest> unneeded;
+    try {
+        unneeded = unneededObjects(layout, needed);
+    } catch (StorageError const& error) {
+        return error;
+    }
+    for (Digest const& digest : unneeded) {
+        freed += removeFile(layout.fileOf({{}, digest}), 1);
+    }
+    return std::nullopt;
 }
 
 /// Cleans the stores one by one. One that cannot be cleaned stays as it is; returns why, of the first such store.
@@ -85,8 +122,9 @@ std::set<Digest> Needed::revisionsIn(std::string const& store) const
 Freed removeUnneeded(StorageLayout const& layout, Needed const& needed)
 {
     Freed freed = removeLeftovers(layout);
-    freed += cleanObjects(layout, needed.objects);
-    std::optional<StorageError> const error = cleanStores(layout, needed, freed);
+    std::optional<StorageError> const objectError = cleanObjects(layout, needed.objects, freed);
+    std::optional<StorageError> const storeError = cleanStores(layout, needed, freed);
+    std::optional<StorageError> const error = objectError ? objectError : storeError;
     flushFolders(layout);
     if (error) {
         throw StorageError(*error);

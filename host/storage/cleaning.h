@@ -23,9 +23,9 @@ struct Needed {
     std::set<std::string> storesLeftAlone;             ///< with everything in them
 };
 
-/// Removes everything but what is `needed` and the revisions that it builds on, and what interrupted operations have
-/// left. Throws `StorageError`: immediately when a folder cannot be read or a file cannot be removed; at the end, for
-/// the first such store, when stores were left unchanged because something needed in them cannot be read.
+/// Removes everything but what is `needed` and what that builds on, and what interrupted operations have left. Throws
+/// `StorageError`: immediately when a file cannot be removed; at the end, when stores were left unchanged because
+/// something needed in them cannot be read, or all objects because it is not known what a needed one builds on.
 Freed removeUnneeded(StorageLayout const& layout, Needed const& needed);
 
 /// Removes only what interrupted operations have left. Throws `StorageError`.

@@ -8,15 +8,6 @@
 
 namespace tav {
 
-namespace {
-
-[[noreturn]] void throwMissing(StorageUrl const& url)
-{
-    throw StorageError(quoted(url.text()) + " is not in the storage.");
-}
-
-} // namespace
-
 std::string ContentReader::fileOf(StorageUrl const& url) const
 {
     return batch_.readableFile(layout_.fileOf(url));
@@ -31,7 +22,7 @@ bool ContentReader::isKept(StorageUrl const& url) const
     return RecordFile::openForReading(file, "The store of " + quoted(url.text())).find(url.digest).has_value();
 }
 
-bool ContentReader::isReadable(StorageUrl const& url) const
+bool ContentReader::isReadable(StorageUrl const& url)
 {
     try {
         read(url, [](std::string_view) {});
@@ -41,26 +32,63 @@ bool ContentReader::isReadable(StorageUrl const& url) const
     }
 }
 
-std::uint64_t ContentReader::lengthOf(StorageUrl const& url) const
+Link ContentReader::find(StorageUrl const& url) const
 {
-    Found const found = find(url);
-    return found.file.entries()[found.index].record.length;
+    return findIn(fileOf(url), url, quoted(url.text()));
 }
 
-void ContentReader::read(StorageUrl const& url, Sink const& sink) const
+Link ContentReader::findIn(std::string const& path, StorageUrl const& url, std::string const& name) const
 {
-    Found const found = find(url);
-    found.file.read(found.index, layout_.scratchFolder(), base(), sink);
+    if (!exists(path)) {
+        throw StorageError(name + " is not in the storage.");
+    }
+    auto const file = std::make_shared<RecordFile const>(RecordFile::openForReading(path, "The content of " + name));
+    if (auto const index = file->find(url.digest)) {
+        return {file, *index};
+    }
+    if (url.isObject()) {
+        file->failAsDamaged();
+    }
+    throw StorageError(name + " is not in the storage.");
 }
 
-void ContentReader::extract(StorageUrl const& url, std::string const& path) const
+FindBase ContentReader::basesOf(StorageUrl const& url, Link const& link) const
 {
-    Found const found = find(url);
+    if (!url.isObject()) {
+        return basesIn(link.file);
+    }
+    return [this, top = quoted(url.text())](Digest const& digest) {
+        StorageUrl const base{{}, digest};
+        return findIn(fileOf(base), base, quoted(base.text()) + ", which " + top + " builds on,");
+    };
+}
+
+std::vector<Link> ContentReader::chainTo(StorageUrl const& url) const
+{
+    Link const link = find(url);
+    return chainOf(link, basesOf(url, link));
+}
+
+void ContentReader::read(StorageUrl const& url, Sink const& sink)
+{
+    Link const link = find(url);
+    contents_.read(link, basesOf(url, link), sink);
+}
+
+void ContentReader::readObjectIn(std::string const& path, StorageUrl const& url)
+{
+    Link const link = findIn(path, url, quoted(url.text()));
+    contents_.read(link, basesOf(url, link), [](std::string_view) {});
+}
+
+void ContentReader::extract(StorageUrl const& url, std::string const& path)
+{
+    Link const link = find(url);
     os::OpenFile file;
     check(file.create(path, 0666), "'" + path + "' cannot be made");
     std::uint64_t offset = 0;
     try {
-        found.file.read(found.index, layout_.scratchFolder(), base(), [&](std::string_view piece) {
+        contents_.read(link, basesOf(url, link), [&](std::string_view piece) {
             check(file.writeAt(offset, piece), "'" + path + "' cannot be written");
             offset += piece.size();
         });
@@ -70,22 +98,17 @@ void ContentReader::extract(StorageUrl const& url, std::string const& path) cons
     }
 }
 
-ContentReader::Found ContentReader::find(StorageUrl const& url) const
+std::shared_ptr<Content const> ContentReader::load(StorageUrl const& url)
 {
-    std::string const path = fileOf(url);
-    if (!exists(path)) {
-        throwMissing(url);
+    Link const link = find(url);
+    return contents_.load(link, basesOf(url, link));
+}
+
+void ContentReader::remember(Digest const& digest, Content content)
+{
+    if (content.isInMemory() && content.length() <= kLongestRemembered) {
+        contents_.remember(digest, std::make_shared<Content const>(std::move(content)));
     }
-    std::string const name = "The content of " + quoted(url.text());
-    RecordFile file = RecordFile::openForReading(path, name);
-    std::optional<std::size_t> const index = file.find(url.digest);
-    if (index) {
-        return {std::move(file), *index};
-    }
-    if (url.isObject()) {
-        throw StorageError(name + " is damaged.");
-    }
-    throwMissing(url);
 }
 
 } // namespace tav

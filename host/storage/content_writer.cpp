@@ -8,31 +8,13 @@
 
 namespace tav {
 
-namespace {
-
-/// The record that a new revision builds on: the previous one, or, where its chain is full, the whole one that the
-/// chain begins with.
-std::optional<std::size_t> baseIn(RecordFile const& store, Digest const& previous)
-{
-    if (store.entries().empty()) {
-        return std::nullopt;
-    }
-    std::size_t const newest = store.entries().size() - 1;
-    std::vector<std::size_t> const chain = store.chainOf(store.find(previous).value_or(newest));
-    Record const& last = store.entries()[chain.back()].record;
-    std::size_t const longest = last.length > last.segmentLength() ? kLongestLargeChain : kLongestChain;
-    return chain.size() <= longest ? chain.back() : chain.front();
-}
-
-} // namespace
-
-void ContentWriter::write(StorageUrl const& url, Content const& content, Digest const& previous)
+void ContentWriter::write(StorageUrl const& url, Content const& content, Digest const& base)
 {
     batch_.watch(layout_.scratchFolder());
-    url.isObject() ? writeObject(url, content) : writeRevision(url, content, previous);
+    url.isObject() ? writeObject(url, content, base) : writeRevision(url, content, base);
 }
 
-void ContentWriter::writeObject(StorageUrl const& url, Content const& content)
+void ContentWriter::writeObject(StorageUrl const& url, Content const& content, Digest const& base)
 {
     makeFolders(layout_.incomingFolder());
     batch_.addFolder(layout_.objectFolder());
@@ -42,18 +24,25 @@ void ContentWriter::writeObject(StorageUrl const& url, Content const& content)
     std::string const path = layout_.fileOf(url);
     bool const replaces = exists(path);
     std::string const incoming = layout_.incomingFileOf(url.digest);
-    [[maybe_unused]] std::error_code const mostlyMissing = os::removeUnflushed(incoming);
+    writeObjectTo(incoming, url, content, replaces ? Digest{} : base); // Others may build on a damaged one.
+    batch_.addObject(path, incoming, replaces);
+}
+
+void ContentWriter::writeObjectTo(
+    std::string const& path, StorageUrl const& url, Content const& content, Digest const& base) const
+{
+    std::optional<KnownContent> const known = base == Digest{} ? std::nullopt : loadBase({{}, base});
+    [[maybe_unused]] std::error_code ignored = os::removeUnflushed(path); // Mostly missing.
     try {
-        RecordFile file = RecordFile::create(incoming, "The object " + quoted(url.text()));
-        file.append(content, url.digest, nullptr, segmentLog_);
-        batch_.addObject(path, incoming, replaces);
+        RecordFile file = RecordFile::create(path, "The object " + quoted(url.text()));
+        file.append(content, url.digest, known ? &*known : nullptr, segmentLog_);
     } catch (...) {
-        [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(incoming);
+        ignored = os::removeUnflushed(path);
         throw;
     }
 }
 
-void ContentWriter::writeRevision(StorageUrl const& url, Content const& content, Digest const& previous)
+void ContentWriter::writeRevision(StorageUrl const& url, Content const& content, Digest const& base)
 {
     std::string const file = layout_.fileOf(url);
     std::string const name = nameOfStore(url.store);
@@ -66,7 +55,7 @@ void ContentWriter::writeRevision(StorageUrl const& url, Content const& content,
         return;
     }
     try {
-        append(url, content, previous, store);
+        append(url, content, base, store);
     } catch (...) {
         if (isNew) {
             [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(file);
@@ -77,27 +66,23 @@ void ContentWriter::writeRevision(StorageUrl const& url, Content const& content,
 }
 
 // What was found damaged is kept whole: others may build on it, and their chains do not get longer by that.
-void ContentWriter::append(StorageUrl const& url, Content const& content, Digest const& previous, RecordFile& store)
+void ContentWriter::append(StorageUrl const& url, Content const& content, Digest const& base, RecordFile& store)
 {
-    reader_.setBase(std::nullopt); // The next one needs its memory.
-    if (!store.isNamed(url.digest)) {
-        reader_.setBase(loadBase(store, previous));
+    std::optional<KnownContent> known;
+    if (!store.entries().empty() && !store.isNamed(url.digest)) {
+        known = loadBase({url.store, store.find(base) ? base : store.entries().back().record.digest});
     }
-    store.append(content, url.digest, reader_.base(), segmentLog_);
-    if (reader_.base() != nullptr && !reader_.base()->content.isInMemory()) {
-        reader_.setBase(std::nullopt);
-    }
+    store.append(content, url.digest, known ? &*known : nullptr, segmentLog_);
 }
 
-/// None where it cannot be read: nothing is built on a damaged content.
-std::optional<KnownContent> ContentWriter::loadBase(RecordFile const& store, Digest const& previous) const
+/// The content at `base`, or, where its chain is full, the whole one that the chain begins with. None where it cannot
+/// be read: nothing is built on a damaged content.
+std::optional<KnownContent> ContentWriter::loadBase(StorageUrl const& base) const
 {
     try {
-        std::optional<std::size_t> const index = baseIn(store, previous);
-        if (!index) {
-            return std::nullopt;
-        }
-        return KnownContent{store.entries()[*index].record.digest, store.load(*index, layout_.scratchFolder())};
+        std::vector<Link> const chain = reader_.chainTo(base);
+        StorageUrl const chosen{base.store, (hasRoom(chain) ? chain.front() : chain.back()).record().digest};
+        return KnownContent{chosen.digest, reader_.load(chosen)};
     } catch (StorageError const&) {
         return std::nullopt;
     }

@@ -6,8 +6,8 @@
 #include "host/storage/storage_layout.h"
 #include "host/storage/storage_url.h"
 
-#include <cstddef>
 #include <optional>
+#include <string>
 
 namespace tav {
 
@@ -24,16 +24,19 @@ public:
     {
     }
 
-    /// Writes `content` to `url` unless it can be read there. A revision builds on the one with the digest `previous`
-    /// of its store, or else on the newest, if that makes it smaller. The reader then keeps that base, because reading
-    /// the revision back needs it again.
-    void write(StorageUrl const& url, Content const& content, Digest const& previous);
+    /// Writes `content` to `url` unless it can be read there. It builds on the content with the digest `base` if that
+    /// makes it smaller. The base of a revision is in the same store, or else the newest one there is taken; the base
+    /// of an object is another object, or all zeros for none.
+    void write(StorageUrl const& url, Content const& content, Digest const& base);
+    /// Writes the object to the new file `path`, on `base` if that makes it smaller.
+    void
+    writeObjectTo(std::string const& path, StorageUrl const& url, Content const& content, Digest const& base) const;
 
 private:
-    void writeObject(StorageUrl const& url, Content const& content);
-    void writeRevision(StorageUrl const& url, Content const& content, Digest const& previous);
-    void append(StorageUrl const& url, Content const& content, Digest const& previous, RecordFile& store);
-    std::optional<KnownContent> loadBase(RecordFile const& store, Digest const& previous) const;
+    void writeObject(StorageUrl const& url, Content const& content, Digest const& base);
+    void writeRevision(StorageUrl const& url, Content const& content, Digest const& base);
+    void append(StorageUrl const& url, Content const& content, Digest const& base, RecordFile& store);
+    std::optional<KnownContent> loadBase(StorageUrl const& base) const;
 
     StorageLayout const& layout_;
     Batch& batch_;

@@ -1,12 +1,16 @@
 #include "host/storage/local_storage.h"
 
 #include "host/storage/cleaning.h"
+#include "host/storage/files.h"
 #include "host/storage/inventory.h"
+#include "host/storage/similarity.h"
 #include "host/storage/storage_error.h"
 #include "host/text/characters.h"
 #include "host/text/utf8.h"
 
 #include "common/mu_common_file_storage.h"
+
+#include "platform/os/os_open_file.h"
 
 #include <cerrno>
 #include <new>
@@ -15,6 +19,9 @@
 namespace tav {
 
 namespace {
+
+/// Opening a store means reading all its headers, and each version of each drawing in it adds one.
+constexpr std::size_t kMostRecordsToJoin = 100;
 
 ErrorMessage withCode(ErrorMessage message, int code)
 {
@@ -75,10 +82,9 @@ Content openContent(std::string const& path, std::string const& name, std::uint6
 
 } // namespace
 
-LocalStorage::LocalStorage(common::RootPath root, UrlOfPath previousUrl, UrlOfDigest knownUrl, unsigned segmentLog)
+LocalStorage::LocalStorage(common::RootPath root, Versions versions, unsigned segmentLog)
     : root_(std::move(root))
-    , previousUrl_(std::move(previousUrl))
-    , knownUrl_(std::move(knownUrl))
+    , versions_(std::move(versions))
     , segmentLog_(segmentLog)
     , layout_(root_)
     , reader_(layout_, batch_)
@@ -89,19 +95,72 @@ LocalStorage::LocalStorage(common::RootPath root, UrlOfPath previousUrl, UrlOfDi
 Expected<OdString> LocalStorage::store(OdString const& path)
 {
     return guarded<OdString>([&] {
-        Content const content = open(path);
+        Content content = open(path);
         Digest const digest = digestOf(content);
         if (auto const stored = batch_.urlOf(digest)) {
             return *stored;
         }
         std::optional<StorageUrl> const known = knownPlace(digest);
-        StorageUrl const url = known ? *known : newPlace(path, digest);
-        if (!known || !reader_.isReadable(url)) {
-            writer_.write(url, content, previousVersion(path).digest);
-        }
-        batch_.addUrl(digest, url.text());
-        return url.text();
+        OdString const url = known ? storeAgain(path, content, *known) : storeNew(path, content, digest);
+        batch_.addUrl(digest, url);
+        reader_.remember(digest, std::move(content));
+        return url;
     });
+}
+
+// Where it should be: what is damaged or gone there is stored again for all commits that name it. An object is stored
+// whole then, since others may build on it.
+OdString LocalStorage::storeAgain(OdString const& path, Content const& content, StorageUrl const& url)
+{
+    if (!reader_.isReadable(url)) {
+        std::optional<StorageUrl> const previous = url.isObject() ? std::nullopt : previousVersion(path);
+        writer_.write(url, content, previous ? previous->digest : Digest{});
+    }
+    return url.text();
+}
+
+OdString LocalStorage::storeNew(OdString const& path, Content const& content, Digest const& digest)
+{
+    bool const isDrawing = common::fileToType(path) == common::StorageType::Tf;
+    std::optional<StorageUrl> const base = baseFor(path, content, !isDrawing);
+    StorageUrl url{{}, digest};
+    if (isDrawing) {
+        url.store = base ? base->store : newStoreName(path, digest);
+    }
+    writer_.write(url, content, base ? base->digest : Digest{});
+    return url.text();
+}
+
+std::optional<StorageUrl> LocalStorage::baseFor(OdString const& path, Content const& content, bool isObject)
+{
+    std::optional<StorageUrl> const previous = previousVersion(path);
+    return previous && previous->isObject() == isObject ? previous : similarContent(path, content, isObject);
+}
+
+std::optional<StorageUrl> LocalStorage::similarContent(OdString const& path, Content const& content, bool isObject)
+{
+    if (!versions_.similar || !canBeCompared(content.length()) || !content.isInMemory()) {
+        return std::nullopt;
+    }
+    for (OdString const& text : versions_.similar(path)) {
+        std::optional<StorageUrl> const url = parseUrl(text);
+        if (url && url->isObject() == isObject && isSimilar(content, *url)) {
+            return url;
+        }
+    }
+    return std::nullopt;
+}
+
+/// Also whether it can be read.
+bool LocalStorage::isSimilar(Content const& content, StorageUrl const& url)
+{
+    try {
+        Link const link = reader_.find(url);
+        return canBeCompared(link.record().length) && link.file->entries().size() <= kMostRecordsToJoin &&
+               resembles(content, *reader_.load(url));
+    } catch (StorageError const&) {
+        return false;
+    }
 }
 
 WriteOutcome LocalStorage::flush()
@@ -120,11 +179,68 @@ Expected<bool> LocalStorage::repair(OdString const& text, OdString const& path)
         if (digestOf(content) != url.digest) {
             throw StorageError(quoted(path) + " has another content by now.");
         }
-        writer_.write(url, content, previousVersion(path).digest);
+        storeAgain(path, content, url);
         batch_.flush();
         reader_.read(url, [](std::string_view) {});
         return true;
     });
+}
+
+Expected<Freed> LocalStorage::turnOver(OdString const& text, OdString const& path)
+{
+    return guarded<Freed>([&] {
+        StorageUrl const url = urlOf(text);
+        if (!bases_) {
+            bases_.emplace(layout_);
+        }
+        if (!url.isObject() || !bases_->isWhole(url.digest) || !reader_.isReadable(url)) {
+            return Freed();
+        }
+        std::shared_ptr<Content const> const content = reader_.load(url);
+        std::optional<Digest> const base = newBaseFor(url, path, *content);
+        return base ? replaceObject(url, *content, *base) : Freed();
+    });
+}
+
+/// What the object can build on without a circle and without making the chain of another one too long.
+std::optional<Digest> LocalStorage::newBaseFor(StorageUrl const& url, OdString const& path, Content const& content)
+{
+    std::optional<StorageUrl> const base = baseFor(path, content, true);
+    if (!base) {
+        return std::nullopt;
+    }
+    std::vector<Digest> const chain = bases_->chainOf(base->digest);
+    std::size_t const longest = content.length() > std::uint64_t{1} << segmentLog_ ? kLongestLargeChain : kLongestChain;
+    std::size_t const above = bases_->deltasAbove(url.digest);
+    if (chain.back() == url.digest || above >= longest) {
+        return std::nullopt;
+    }
+    return chain.size() + above <= longest ? chain.front() : chain.back();
+}
+
+Freed LocalStorage::replaceObject(StorageUrl const& url, Content const& content, Digest const& base)
+{
+    std::string const path = layout_.fileOf(url);
+    std::string const incoming = layout_.incomingFileOf(url.digest);
+    makeFolders(layout_.incomingFolder());
+    writer_.writeObjectTo(incoming, url, content, base);
+    try {
+        RecordFile const written = RecordFile::openForReading(incoming, "The object " + quoted(url.text()));
+        std::uint64_t const before = reader_.find(url).file->length();
+        if (written.length() >= before) {
+            check(os::removeUnflushed(incoming), "'" + incoming + "' cannot be removed");
+            return {};
+        }
+        flushFile(incoming);
+        reader_.readObjectIn(incoming, url);
+        batch_.addFolder(layout_.objectFolder());
+        check(os::renameUnflushed(incoming, path), "'" + path + "' cannot be made");
+        bases_->setBase(url.digest, written.entries().at(0).record.base);
+        return {1, before - written.length()};
+    } catch (...) {
+        [[maybe_unused]] std::error_code const ignored = os::removeUnflushed(incoming);
+        throw;
+    }
 }
 
 Content LocalStorage::open(OdString const& path) const
@@ -132,26 +248,15 @@ Content LocalStorage::open(OdString const& path) const
     return openContent(root_.pathTo(path).ansi_str(), quoted(path), std::uint64_t{1} << segmentLog_);
 }
 
-// Where it should be: what is damaged or gone there is stored again for all commits that name it.
 std::optional<StorageUrl> LocalStorage::knownPlace(Digest const& digest) const
 {
-    std::optional<StorageUrl> url = knownUrl_ ? parseUrl(knownUrl_(digest)) : std::nullopt;
+    std::optional<StorageUrl> url = versions_.known ? parseUrl(versions_.known(digest)) : std::nullopt;
     return url && url->digest == digest ? url : std::nullopt;
 }
 
-StorageUrl LocalStorage::newPlace(OdString const& path, Digest const& digest) const
+std::optional<StorageUrl> LocalStorage::previousVersion(OdString const& path) const
 {
-    if (common::fileToType(path) != common::StorageType::Tf) {
-        return {{}, digest};
-    }
-    StorageUrl const previous = previousVersion(path);
-    return {previous.isObject() ? newStoreName(path, digest) : previous.store, digest};
-}
-
-StorageUrl LocalStorage::previousVersion(OdString const& path) const
-{
-    std::optional<StorageUrl> const previous = previousUrl_ ? parseUrl(previousUrl_(path)) : std::nullopt;
-    return previous.value_or(StorageUrl());
+    return versions_.previous ? parseUrl(versions_.previous(path)) : std::nullopt;
 }
 
 Expected<std::set<OdString>> LocalStorage::contents() const
@@ -166,7 +271,7 @@ Expected<bool> LocalStorage::contains(OdString const& url) const
 
 Expected<std::uint64_t> LocalStorage::size(OdString const& url) const
 {
-    return guarded<std::uint64_t>([&] { return reader_.lengthOf(urlOf(url)); });
+    return guarded<std::uint64_t>([&] { return reader_.find(urlOf(url)).record().length; });
 }
 
 WriteOutcome LocalStorage::read(OdString const& url, std::function<bool(char const*, std::size_t)> const& sink) const

@@ -1,15 +1,16 @@
 /// The storage inside ".tav", where the contents of all versions are kept.
 ///
-/// A drawing's versions are appended to a revision store, ".tav/tf/NAME.tf", each as the difference to an earlier one
-/// where that is smaller; every other content is an object of its own, ".tav/objects/DIGEST". All of it is compressed
-/// with zstd, checked against its SHA-256 digest whenever it is read, and described in docs/formats/storage.md.
+/// A drawing's versions are appended to a revision store, ".tav/tf/NAME.tf"; every other content is an object of its
+/// own, ".tav/objects/DIGEST". Either is stored as the difference to the version before it, or to a similar content, if
+/// that is smaller. All of it is compressed with zstd, checked against its SHA-256 digest whenever it is read, and
+/// described in docs/formats/storage.md.
 ///
 /// URLs are "tf:NAME#DIGEST" and "po:DIGEST" (host/storage/storage_url.h): a URL names the same content in every
 /// repository. Equal contents are stored once, so a drawing may get the URL of an object, and the other way round.
 ///
 /// Contents are stored in batches, and nothing in a batch is permanent until it is flushed:
 ///
-///     LocalStorage storage(root, previousUrl, knownUrl);
+///     LocalStorage storage(root, {previousUrl, knownUrl, similarUrls});
 ///     auto const plan = storage.store(L"plan.dwg"); // its URL, for this object only
 ///     auto const note = storage.store(L"note.txt");
 ///     storage.flush();                              // now permanent; without it both are removed
@@ -31,6 +32,7 @@
 #include "host/storage/content_reader.h"
 #include "host/storage/content_writer.h"
 #include "host/storage/freed.h"
+#include "host/storage/object_bases.h"
 #include "host/storage/storage_layout.h"
 #include "host/storage/storage_url.h"
 
@@ -40,25 +42,28 @@
 #include <optional>
 #include <set>
 #include <string>
+#include <vector>
 
 namespace tav {
 
 /// See above.
 class LocalStorage {
 public:
-    /// Both answer with a URL, or an empty text when there is none.
-    using UrlOfPath = std::function<OdString(OdString const& path)>;
-    using UrlOfDigest = std::function<OdString(Digest const& digest)>;
+    /// What else is stored, so that a content can be stored as the difference to it. Each may be empty, and may answer
+    /// with an empty text.
+    struct Versions {
+        /// For a path, the URL of that file's version in the last commit, under its former path if it was renamed.
+        std::function<OdString(OdString const& path)> previous;
+        /// For a digest, the URL under which its content is stored already.
+        std::function<OdString(Digest const& digest)> known;
+        /// For the path of a file without a version before, a few URLs of contents that it may resemble, the most
+        /// likely first.
+        std::function<std::vector<OdString>(OdString const& path)> similar;
+    };
 
-    /// The storage of the repository `root`.
-    ///
-    /// `previousUrl` returns, for a path, the URL of that file's version in the last commit, under its former path if
-    /// it was renamed: the new version is appended to the same store. `knownUrl` returns, for a digest, the URL under
-    /// which its content is stored already. Either may be empty. Only tests pass a `segmentLog`: contents are processed
-    /// in segments of 2^`segmentLog` bytes.
-    explicit LocalStorage(
-        common::RootPath root, UrlOfPath previousUrl = {}, UrlOfDigest knownUrl = {},
-        unsigned segmentLog = kSegmentLog);
+    /// The storage of the repository `root`. Only tests pass a `segmentLog`: contents are processed in segments
+    /// of 2^`segmentLog` bytes.
+    explicit LocalStorage(common::RootPath root, Versions versions = {}, unsigned segmentLog = kSegmentLog);
     LocalStorage(LocalStorage const&) = delete;
     LocalStorage& operator=(LocalStorage const&) = delete;
     /// Removes what was stored and not flushed.
@@ -93,11 +98,18 @@ public:
     /// nothing is changed; after any other error there is no file.
     WriteOutcome extract(OdString const& url, std::string const& path) const;
 
-    /// Removes everything but `urls` and the revisions that they build on, and what interrupted operations have left.
+    /// Stores the object at `url`, a version of the file `path`, as the difference to the version before it or to a
+    /// similar content, if it is whole and that is smaller. Returns what became free. The new form is written beside
+    /// the old one, flushed, read back, and renamed over it; call `flush` at the end. After an error the object is
+    /// unchanged. Meant for one pass over all objects, older versions first: which objects build on which is read only
+    /// once.
+    Expected<Freed> turnOver(OdString const& url, OdString const& path);
+    /// Removes everything but `urls` and what they build on, and what interrupted operations have left.
     /// A store is rewritten beside the old one, flushed, read back, and renamed over it. A store in which something to
-    /// be kept cannot be read is left unchanged; the others are cleaned, and then this is reported as the error. A
-    /// store that belongs to one of `elsewhere`, URLs of contents that need not be here, is also left unchanged, which
-    /// is not an error. What was stored and not flushed is flushed first.
+    /// be kept cannot be read is left unchanged, and so are all objects if the header of one to be kept cannot be read;
+    /// the rest is cleaned, and then this is reported as the error. A store that belongs to one of `elsewhere`, URLs of
+    /// contents that need not be here, is also left unchanged, which is not an error. What was stored and not flushed
+    /// is flushed first.
     Expected<Freed> keepOnly(std::set<OdString> const& urls, std::set<OdString> const& elsewhere = {});
     /// Removes only what interrupted operations have left. No content is removed, whether a commit needs it or not.
     Expected<Freed> removeLeftovers();
@@ -105,17 +117,23 @@ public:
 private:
     Content open(OdString const& path) const;
     std::optional<StorageUrl> knownPlace(Digest const& digest) const;
-    StorageUrl newPlace(OdString const& path, Digest const& digest) const;
-    StorageUrl previousVersion(OdString const& path) const;
+    std::optional<StorageUrl> previousVersion(OdString const& path) const;
+    OdString storeAgain(OdString const& path, Content const& content, StorageUrl const& url);
+    OdString storeNew(OdString const& path, Content const& content, Digest const& digest);
+    std::optional<StorageUrl> baseFor(OdString const& path, Content const& content, bool isObject);
+    std::optional<StorageUrl> similarContent(OdString const& path, Content const& content, bool isObject);
+    bool isSimilar(Content const& content, StorageUrl const& url);
+    std::optional<Digest> newBaseFor(StorageUrl const& url, OdString const& path, Content const& content);
+    Freed replaceObject(StorageUrl const& url, Content const& content, Digest const& base);
 
     common::RootPath root_;
-    UrlOfPath previousUrl_;
-    UrlOfDigest knownUrl_;
+    Versions versions_;
     unsigned segmentLog_;
     StorageLayout layout_;
     Batch batch_;
-    ContentReader reader_;
+    mutable ContentReader reader_; // remembers contents
     ContentWriter writer_;
+    std::optional<ObjectBases> bases_; // while objects are turned over
 };
 
 } // namespace tav

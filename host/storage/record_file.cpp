@@ -2,8 +2,6 @@
 
 #include "host/storage/storage_error.h"
 
-#include "common/mu_common_versions.h"
-
 #include <algorithm>
 #include <array>
 #include <string_view>
@@ -164,27 +162,12 @@ bool RecordFile::isNamed(Digest const& digest) const
     });
 }
 
-std::vector<std::size_t> RecordFile::chainOf(std::size_t index) const
-{
-    std::vector<std::size_t> chain = {index};
-    while (!entries_[chain.back()].record.isWhole()) {
-        std::optional<std::size_t> const base = find(entries_[chain.back()].record.base);
-        if (!base || chain.size() > kLongestChain) {
-            throw StorageError(name_ + " is damaged.");
-        }
-        chain.push_back(*base);
-    }
-    std::reverse(chain.begin(), chain.end());
-    return chain;
-}
-
 void RecordFile::unpack(std::size_t index, Content const* base, Buffer& memory, Sink const& sink) const
 {
     Entry const& entry = entries_[index];
     decompress(entry.record, {file_, entry.framesOffset()}, base, name_, memory, sink);
 }
 
-// Up to the length of a segment in `memory`, else in a file without a name.
 Content RecordFile::unpack(std::size_t index, Content const* base, std::string const& scratch, Buffer memory) const
 {
     Record const& record = entries_[index].record;
@@ -202,51 +185,9 @@ Content RecordFile::unpack(std::size_t index, Content const* base, std::string c
     return {std::move(file), record.length, "A temporary file"};
 }
 
-// The memory of one content of the chain is used again for the next but one: fresh pages cost as much as unpacking.
-std::optional<Content> RecordFile::loadBase(std::size_t index, std::string const& scratch, Buffer& spare) const
+void RecordFile::failAsDamaged() const
 {
-    std::vector<std::size_t> const chain = chainOf(index);
-    std::optional<Content> base;
-    for (std::size_t i = 0; i + 1 < chain.size(); ++i) {
-        Content next = unpack(chain[i], base ? &*base : nullptr, scratch, std::move(spare));
-        spare = base ? base->takeMemory() : Buffer();
-        base = std::move(next);
-    }
-    return base;
-}
-
-void RecordFile::requireDigest(std::size_t index, Digest const& digest) const
-{
-    if (digest != entries_[index].record.digest) {
-        throw StorageError(name_ + " is damaged.");
-    }
-}
-
-void RecordFile::read(std::size_t index, std::string const& scratch, KnownContent const* known, Sink const& sink) const
-{
-    Buffer spare;
-    bool const isOnKnown = known != nullptr && entries_[index].record.base == known->digest;
-    std::optional<Content> const base = isOnKnown ? std::nullopt : loadBase(index, scratch, spare);
-    common::ContentDigest digest;
-    unpack(
-        index,
-        isOnKnown ? &known->content
-        : base    ? &*base
-                  : nullptr,
-        spare, [&](std::string_view piece) {
-            digest.update(piece.data(), piece.size());
-            sink(piece);
-        });
-    requireDigest(index, finish(digest));
-}
-
-Content RecordFile::load(std::size_t index, std::string const& scratch) const
-{
-    Buffer spare;
-    std::optional<Content> const base = loadBase(index, scratch, spare);
-    Content content = unpack(index, base ? &*base : nullptr, scratch, std::move(spare));
-    requireDigest(index, digestOf(content));
-    return content;
+    throw StorageError(name_ + " is damaged.");
 }
 
 void RecordFile::write(std::uint64_t offset, std::string_view bytes) const
@@ -259,7 +200,7 @@ Record RecordFile::writeRecord(
     Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog) const
 {
     std::uint64_t offset = end() + kHeaderLength;
-    Content const* const baseContent = base != nullptr ? &base->content : nullptr;
+    Content const* const baseContent = base != nullptr ? base->content.get() : nullptr;
     Compressed const compressed = compress(content, digest, baseContent, segmentLog, [&](std::string_view frame) {
         write(offset, frame);
         offset += frame.size();
@@ -302,7 +243,7 @@ void RecordFile::appendFrom(RecordFile const& other, std::size_t index)
             std::size_t const wanted = std::min<std::uint64_t>(piece.size(), entry.end() - offset);
             std::size_t const done = other.readUpTo(offset, piece.data(), wanted);
             if (done < wanted) {
-                throw StorageError(other.name_ + " is damaged.");
+                other.failAsDamaged();
             }
             write(end() + offset - entry.offset, {piece.data(), done});
             offset += done;

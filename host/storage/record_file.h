@@ -9,16 +9,12 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <optional>
 #include <string>
 #include <vector>
 
 namespace tav {
-
-/// A delta can build on another delta. At most this many lead from a whole content to any other one.
-inline constexpr std::size_t kLongestChain = 32;
-/// The same for contents longer than a segment: each step on the way goes through a file.
-inline constexpr std::size_t kLongestLargeChain = 8;
 
 /// A record and its place in the file.
 struct Entry {
@@ -29,10 +25,10 @@ struct Entry {
     std::uint64_t end() const { return framesOffset() + record.framesLength; }
 };
 
-/// A content that was read and checked, kept for reuse.
+/// A content that was read and checked, for others to build on.
 struct KnownContent {
     Digest digest{};
-    Content content;
+    std::shared_ptr<Content const> content;
 };
 
 /// An open file of records, and the list of them. Everything throws `StorageError`. One thread at a time. Only the
@@ -62,20 +58,16 @@ public:
     std::optional<std::size_t> find(Digest const& digest) const;
     /// Whether there is a record of the content `digest`, or one that builds on it.
     bool isNamed(Digest const& digest) const;
-    /// The records that lead to the content of record `index`, from the whole one to that record, with the newest
-    /// record of each base. Throws when one is missing or there are too many.
-    std::vector<std::size_t> chainOf(std::size_t index) const;
+    /// Passes the content of record `index`, which builds on `base` unless that is null, to `sink`; `memory` holds a
+    /// segment of it meanwhile, and the last one afterwards. The caller checks the digest.
+    void unpack(std::size_t index, Content const* base, Buffer& memory, Sink const& sink) const;
+    /// The whole content: in `memory` if it is at most a segment long, otherwise in an unnamed file in `scratch`.
+    Content unpack(std::size_t index, Content const* base, std::string const& scratch, Buffer memory) const;
+    /// Throws the error of a damaged file.
+    [[noreturn]] void failAsDamaged() const;
 
-    /// Passes the content of record `index` to `sink`, and throws if its digest is wrong: do not trust anything that
-    /// `sink` received before this has returned. Large intermediate contents are in unnamed files in `scratch`. If the
-    /// record builds on `known`, which may be null, its base is not read.
-    void read(std::size_t index, std::string const& scratch, KnownContent const* known, Sink const& sink) const;
-    /// The content of record `index`, checked.
-    Content load(std::size_t index, std::string const& scratch) const;
-
-    /// Appends `content`, as a delta to `base` if that is not null and makes it smaller; `base` is a content of this
-    /// file. A failure leaves the file unchanged, as far as the disk permits. Throws when the digest of the content is
-    /// not `digest`.
+    /// Appends `content`, as a delta to `base` if that is not null and makes it smaller. A failure leaves the file
+    /// unchanged, as far as the disk permits. Throws when the digest of the content is not `digest`.
     void append(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog);
     /// Appends the record `index` of `other` unchanged.
     void appendFrom(RecordFile const& other, std::size_t index);
@@ -91,10 +83,6 @@ private:
     bool isTorn(std::uint64_t offset) const;
     bool isZero(std::uint64_t offset) const;
     std::size_t readUpTo(std::uint64_t offset, char* buffer, std::size_t count) const;
-    std::optional<Content> loadBase(std::size_t index, std::string const& scratch, Buffer& spare) const;
-    Content unpack(std::size_t index, Content const* base, std::string const& scratch, Buffer memory) const;
-    void unpack(std::size_t index, Content const* base, Buffer& memory, Sink const& sink) const;
-    void requireDigest(std::size_t index, Digest const& digest) const;
     void write(std::uint64_t offset, std::string_view bytes) const;
     Record
     writeRecord(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog) const;

@@ -1,6 +1,6 @@
 #include "host/storage/reduced_store.h"
 
-#include "host/storage/record_file.h"
+#include "host/storage/chain.h"
 #include "host/storage/storage_error.h"
 #include "host/storage/storage_layout.h"
 
@@ -20,12 +20,14 @@ std::size_t indexOf(RecordFile const& store, Digest const& digest, std::string c
     return *index;
 }
 
-std::set<std::size_t> neededOf(RecordFile const& store, std::set<Digest> const& digests, std::string const& name)
+std::set<std::size_t>
+neededOf(std::shared_ptr<RecordFile const> const& store, std::set<Digest> const& digests, std::string const& name)
 {
     std::set<std::size_t> needed;
     for (Digest const& digest : digests) {
-        std::vector<std::size_t> const chain = store.chainOf(indexOf(store, digest, name));
-        needed.insert(chain.begin(), chain.end());
+        for (Link const& link : chainOf({store, indexOf(*store, digest, name)}, basesIn(store))) {
+            needed.insert(link.index);
+        }
     }
     return needed;
 }
@@ -43,9 +45,10 @@ void writeReduced(
 void readBack(
     std::string const& path, std::string const& name, std::set<Digest> const& digests, std::string const& scratch)
 {
-    RecordFile const reduced = RecordFile::openForReading(path, name);
+    auto const reduced = std::make_shared<RecordFile const>(RecordFile::openForReading(path, name));
+    ChainReader contents(scratch);
     for (Digest const& digest : digests) {
-        reduced.read(indexOf(reduced, digest, name), scratch, nullptr, [](std::string_view) {});
+        contents.read({reduced, indexOf(*reduced, digest, name)}, basesIn(reduced), [](std::string_view) {});
     }
 }
 
@@ -54,8 +57,9 @@ void readBack(
 Freed reduceStore(
     std::string const& path, std::string const& name, std::set<Digest> const& digests, std::string const& scratch)
 {
-    RecordFile const old = RecordFile::openForChanging(path, name);
-    std::set<std::size_t> const needed = neededOf(old, digests, name);
+    auto const store = std::make_shared<RecordFile const>(RecordFile::openForChanging(path, name));
+    RecordFile const& old = *store;
+    std::set<std::size_t> const needed = neededOf(store, digests, name);
     std::size_t const dropped = old.entries().size() - needed.size();
     if (needed.empty()) {
         check(os::removeUnflushed(path), "'" + path + "' cannot be removed");

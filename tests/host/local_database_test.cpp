@@ -65,14 +65,14 @@ TEST_F(LocalDatabase, IsBroughtToThisVersionForWhoChangesIt)
 {
     makeFirstVersion();
     tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
-    EXPECT_EQ(version(), 4);
+    EXPECT_EQ(version(), 5);
     database.addVerified({verified("a.dwg")});
     EXPECT_THAT(tav::LocalDatabase::open(repo.root()).verifiedFiles(), ElementsAre(verified("a.dwg")));
 }
 
 TEST_F(LocalDatabase, IsRefusedWhenANewerVersionMadeIt)
 {
-    tav::Database(path).setVersion(5);
+    tav::Database(path).setVersion(6);
     try {
         tav::LocalDatabase::open(repo.root());
         FAIL() << "no failure";

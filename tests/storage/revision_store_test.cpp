@@ -4,6 +4,7 @@
 #include "tests/support/utf8.h"
 
 #include <functional>
+#include <memory>
 #include <zstd.h>
 
 namespace storage_tests {
@@ -267,11 +268,11 @@ TEST_P(RevisionStoreChains, GrowToTheirBoundAndBeginAgain)
         versions.push_back(i == 0 ? content : edited(versions.back(), i));
         urls.push_back(commit("plan.dwg", versions.back()));
     }
-    tav::RecordFile const records = recordsOf(urls[0]);
-    ASSERT_EQ(records.entries().size(), 40u);
+    auto const records = std::make_shared<tav::RecordFile const>(recordsOf(urls[0]));
+    ASSERT_EQ(records->entries().size(), 40u);
     for (std::size_t i = 0; i < 40; ++i) {
         std::size_t const expected = i == 0 ? 0 : (i - 1) % GetParam().longest + 1;
-        EXPECT_EQ(records.chainOf(i).size() - 1, expected) << i;
+        EXPECT_EQ(tav::chainOf({records, i}, tav::basesIn(records)).size() - 1, expected) << i;
         EXPECT_EQ(contentOf(urls[i]), versions[i]) << i;
     }
 }
@@ -415,9 +416,10 @@ TEST_F(MadeUpStore, IsNotFollowedAlongALongChain)
         bytes += headerOf(recordOf(i == 68 ? char{1} : static_cast<char>(i - 1), i, frame, 3)) + frame;
     }
     EXPECT_EQ(read(bytes), damagedX);
-    EXPECT_EQ(recordsOf(kUrl).entries().size(), 34u);
-    EXPECT_EQ(recordsOf(kUrl).chainOf(32).size(), 33u);
-    EXPECT_THROW(static_cast<void>(recordsOf(kUrl).chainOf(33)), tav::StorageError);
+    auto const records = std::make_shared<tav::RecordFile const>(recordsOf(kUrl));
+    ASSERT_EQ(records->entries().size(), 34u);
+    EXPECT_EQ(tav::chainOf({records, 32}, tav::basesIn(records)).size(), 33u);
+    EXPECT_THROW(static_cast<void>(tav::chainOf({records, 33}, tav::basesIn(records))), tav::StorageError);
 }
 
 } // namespace

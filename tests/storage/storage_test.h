@@ -1,8 +1,8 @@
 /// A repository whose storage a test fills.
 #pragma once
 
+#include "host/storage/chain.h"
 #include "host/storage/local_storage.h"
-#include "host/storage/record_file.h"
 #include "host/storage/storage_error.h"
 
 #include "tests/support/temp_repository.h"
@@ -53,8 +53,10 @@ protected:
     tav::LocalStorage newStorage() const
     {
         return tav::LocalStorage(
-            repo.root(), [this](OdString const& path) { return lookUp(committed, path); },
-            [this](tav::Digest const& digest) { return lookUp(known, support::fromUtf8(tav::hexOf(digest))); },
+            repo.root(),
+            {[this](OdString const& path) { return lookUp(committed, path); },
+             [this](tav::Digest const& digest) { return lookUp(known, support::fromUtf8(tav::hexOf(digest))); },
+             [this](OdString const&) { return similar; }},
             kSegmentLog);
     }
 
@@ -107,6 +109,20 @@ protected:
         return tav::RecordFile::openForReading(repo.pathTo(fileOf(url)), "The store");
     }
 
+    /// The record of an object.
+    tav::Record objectOf(std::string const& url) const { return recordsOf(url).entries().at(0).record; }
+    /// The URL of the object that the one at `url` builds on.
+    std::string baseOf(std::string const& url) const { return "po:" + tav::hexOf(objectOf(url).base); }
+    /// How many differences lead to an object.
+    std::size_t deltasOf(std::string url) const
+    {
+        std::size_t count = 0;
+        for (; !objectOf(url).isWhole(); url = baseOf(url)) {
+            ++count;
+        }
+        return count;
+    }
+
     /// The files of the storage, without folders.
     std::vector<std::string> files() const
     {
@@ -122,6 +138,7 @@ protected:
     support::TempRepository const repo;
     std::map<std::string, std::string> committed; ///< by path
     std::map<std::string, std::string> known;     ///< by digest
+    std::vector<OdString> similar;                ///< of each file without a version before
 
 private:
     static OdString lookUp(std::map<std::string, std::string> const& urls, OdString const& key)
