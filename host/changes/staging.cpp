@@ -135,17 +135,24 @@ std::size_t unstage(std::vector<common::StagedFile> const& files, common::State&
     return dropStaged(paths, state);
 }
 
-void applyIndexUpdates(IndexUpdates const& files, common::State& state, std::set<OdString> const& left)
+void enterRecords(IndexUpdates const& files, common::State& state)
 {
-    std::vector<common::StagedFile> committed;
     for (auto const& [path, record] : files) {
-        if (left.count(path) == 0) {
-            committed.emplace_back(path, common::FileChange::modified);
-        }
         if (record) {
             state.index.insert_or_assign(path, *record);
         } else {
             state.index.erase(path);
+        }
+    }
+}
+
+void applyIndexUpdates(IndexUpdates const& files, common::State& state, std::set<OdString> const& left)
+{
+    enterRecords(files, state);
+    std::vector<common::StagedFile> committed;
+    for (auto const& [path, record] : files) {
+        if (left.count(path) == 0) {
+            committed.emplace_back(path, common::FileChange::modified);
         }
     }
     unstage(committed, state);

@@ -1,7 +1,7 @@
 /// What the commands change in the working state.
 #pragma once
 
-#include "host/repository/journal.h"
+#include "host/repository/operation.h"
 
 #include "common/mu_common_state.h"
 
@@ -32,6 +32,9 @@ std::set<OdString> claimedPaths(common::State const& state);
 
 /// Unstages `files` and forgets their recorded renames. Returns how many were staged.
 std::size_t unstage(std::vector<common::StagedFile> const& files, common::State& state);
+
+/// Adds the index records of files, or removes them.
+void enterRecords(IndexUpdates const& files, common::State& state);
 
 /// Enters the index records of files that match the current commit, and unstages them. For the files `left`, which have
 /// been changed since, only the renames are dropped: what is staged there was not committed.

@@ -3,6 +3,7 @@
 #include "host/changes/changes.h"
 #include "host/changes/index_record.h"
 #include "host/changes/staging.h"
+#include "host/checkout/permissions.h"
 #include "host/repository/conflicts.h"
 #include "host/repository/working_state.h"
 
@@ -69,8 +70,8 @@ void addChanged(Changed const& changed, TreeUpdate& update)
 {
     for (Tree const* const files : {&changed.modified, &changed.removed}) {
         for (auto const& file : *files) {
-            if (update.removals.count(file.first) == 0) {
-                update.writes.insert(file);
+            if (update.removals.count(file.first) == 0 && update.writes.insert(file).second) {
+                update.expected.insert(file);
             }
         }
     }
@@ -117,47 +118,201 @@ IndexUpdates settledBy(TreeUpdate const& whole, TreeUpdate const& update, Update
     return files;
 }
 
+/// A move between two sets of files.
+struct Course {
+    TreeUpdate whole; ///< before the check
+    TreeUpdate update;
+    PendingCheckout move;
+    std::vector<FileContents> uncommitted = {}; ///< files that get contents which are not those of the commit
+};
+
+/// Moves the files. `begin` notes in the journal what begins, as a part of a `WriteTransaction`.
+template <class Begin>
+CheckedOut carryOutMove(
+    common::RootPath const& root, LocalDatabase& database, LocalStorage& storage, Course& course, std::uint64_t start,
+    Begin const& begin)
+{
+    Updated const updated = carryOut(root, storage, course.update, start, [&] {
+        WriteTransaction transaction(database.database());
+        begin();
+        transaction.commit();
+    });
+    WriteTransaction transaction(database.database());
+    database.setCurrentCommit(course.move.target);
+    course.move.isWritten = true;
+    course.move.files = settledBy(course.whole, course.update, updated, start);
+    for (FileContents const& file : course.uncommitted) {
+        course.move.files[file.path] = std::nullopt;
+    }
+    database.operations().setPending(course.move);
+    database.addVerified(updated.verified);
+    transaction.commit();
+    finishCheckout(root, database, course.move);
+    return {course.update.writes.size(), course.update.removals.size()};
+}
+
+/// What stood in the folder and is in none of the commits `from`, between which it is.
+std::vector<FileContents> exceptions(TreeUpdate const& update, std::vector<Tree> const& from, Tree const& to)
+{
+    Tree before = update.others;
+    for (OdString const& path : update.missing) {
+        bool const isInAll =
+            std::all_of(from.begin(), from.end(), [&](Tree const& files) { return files.count(path) > 0; });
+        if (isInAll) {
+            before.emplace(path, OdString());
+        }
+    }
+    std::vector<FileContents> files;
+    for (auto const& [path, url] : before) {
+        auto const after = to.find(path);
+        files.push_back({path, url, after == to.end() ? OdString() : after->second});
+    }
+    return files;
+}
+
+/// Notes the permissions of files that go, which may make exceptions of them.
+void notePermissions(common::RootPath const& root, TreeUpdate const& update, std::vector<FileContents>& files)
+{
+    std::set<OdString> known;
+    for (FileContents& file : files) {
+        known.insert(file.path);
+        file.permissions = file.after.isEmpty() ? ownPermissions(root.pathTo(file.path).ansi_str()) : 0;
+    }
+    for (auto const& [path, url] : update.removals) {
+        std::uint32_t const permissions =
+            known.count(path) == 0 ? ownPermissions(root.pathTo(path).ansi_str()) : std::uint32_t{0};
+        if (permissions != 0) {
+            files.push_back({path, url, OdString(), permissions});
+        }
+    }
+}
+
+/// What the move does to the staged files: those that are as the commit has them are no changes any more.
+StagingChange settling(TreeUpdate const& whole, common::State const& state)
+{
+    IndexUpdates files;
+    for (auto const& [path, url] : whole.writes) {
+        files.emplace(path, common::IndexData());
+    }
+    for (auto const& [path, url] : whole.removals) {
+        files.emplace(path, std::nullopt);
+    }
+    common::State after = stagedPart(state);
+    applyIndexUpdates(files, after);
+    dropRenamesOf(files, after);
+    return stagingChange(state, after);
+}
+
+/// The files of a commit, and over them what a move has found or left there besides.
+Tree filesAround(OdString const& commit, Operation const& move, Side side, LocalDatabase const& database)
+{
+    Tree files = database.commits().files(commit);
+    for (FileContents const& file : move.files) {
+        OdString const& url = side == Side::before ? file.before : file.after;
+        if (url.isEmpty()) {
+            files.erase(file.path);
+        } else {
+            files[file.path] = url;
+        }
+    }
+    return files;
+}
+
 } // namespace
 
 CheckedOut checkOutCommit(
-    common::RootPath const& root, LocalDatabase& database, Destination const& destination, Discard discard,
+    common::RootPath const& root, LocalDatabase& database, Position const& destination, OdString const& command,
+    Discard discard, std::uint64_t start)
+{
+    requireNoConflicts(root);
+    auto const cache = readState(root);
+    common::State const& state = cache->read();
+    Position const here = {database.currentCommit(), state.head};
+    std::vector<OdString> const begun = begunCheckouts(database);
+    std::vector<Tree> from = filesOf(begun, database);
+    Tree const to = database.commits().files(destination.commit);
+    Tree current = database.commits().files(here.commit);
+    Course course{updateBetween(current, from, to), {}, {destination.commit, destination.branch, false, begun}};
+    Changed const changed = changedFiles(root, database, start);
+    if (discard == Discard::everything) {
+        addChanged(changed, course.whole);
+    }
+    std::set<OdString> const staged = claimedPaths(state);
+    std::size_t const unsaved = countKept(changed, course.whole, staged);
+    course.update = course.whole;
+    LocalStorage storage(root);
+    checkUpdate(root, database, storage, staged, discard, course.update);
+    from.push_back(std::move(current));
+    Operation operation;
+    operation.kind = Kind::move;
+    operation.command = command;
+    operation.phase = Phase::running;
+    operation.before = here;
+    operation.after = destination;
+    operation.files = exceptions(course.update, from, to);
+    notePermissions(root, course.update, operation.files);
+    operation.staging = settling(course.whole, state);
+    CheckedOut moved = carryOutMove(
+        root, database, storage, course, start, [&] { beginMove(std::move(operation), course.move, database); });
+    moved.kept = unsaved;
+    return moved;
+}
+
+CheckedOut turnMove(
+    common::RootPath const& root, LocalDatabase& database, Operation const& move, Phase phase, Discard discard,
     std::uint64_t start)
 {
     requireNoConflicts(root);
+    Side const to = phase == Phase::undoing ? Side::before : Side::after;
+    Position const& destination = to == Side::before ? move.before : move.after;
+    Position const& here = to == Side::before ? move.after : move.before;
     std::vector<OdString> const begun = begunCheckouts(database);
-    TreeUpdate whole = updateBetween(
-        database.commits().files(database.currentCommit()), filesOf(begun, database),
-        database.commits().files(destination.commit));
-    Changed const changed = changedFiles(root, database, start);
-    if (discard == Discard::everything) {
-        addChanged(changed, whole);
+    std::vector<Tree> from = filesOf(begun, database);
+    from.push_back(filesAround(here.commit, move, to == Side::before ? Side::after : Side::before, database));
+    Tree const wanted = filesAround(destination.commit, move, to, database);
+    Course course{
+        updateBetween(database.commits().files(database.currentCommit()), from, wanted),
+        {},
+        {destination.commit, destination.branch, false, begun},
+        move.files};
+    course.update = course.whole;
+    if (to == Side::before) {
+        addPermissions(move.files, course.update);
     }
-    std::set<OdString> const staged = claimedPaths(readState(root)->read());
-    std::size_t const kept = countKept(changed, whole, staged);
-    TreeUpdate update = whole;
     LocalStorage storage(root);
-    checkUpdate(root, database, storage, staged, discard, update);
-    PendingCheckout move{destination.commit, destination.branch, false, begun};
-    Updated const updated = carryOut(root, storage, update, start, [&] { writeJournal(move, database); });
-    WriteTransaction transaction(database.database());
-    database.setCurrentCommit(destination.commit);
-    move.isWritten = true;
-    move.files = settledBy(whole, update, updated, start);
-    writeJournal(move, database);
-    database.addVerified(updated.verified);
-    transaction.commit();
-    finishCheckout(root, database, move);
-    return {update.writes.size(), update.removals.size(), kept};
+    checkUpdate(root, database, storage, {}, discard, course.update); // What is staged is as it was.
+    std::vector<FileContents> const discarded = discardedFiles(course.update, to);
+    CheckedOut moved = carryOutMove(root, database, storage, course, start, [&] {
+        database.operations().setPhase(move.id, phase);
+        database.operations().setFiles(move.id, discarded);
+        database.operations().setPending(course.move);
+    });
+    moved.discarded = pathsOf(discarded);
+    return moved;
 }
 
+/// A move that is undone brings back what was staged.
 void finishCheckout(common::RootPath const& root, LocalDatabase& database, PendingCheckout const& move)
 {
+    auto operation = database.operations().running();
+    bool const isUndone = operation && operation->phase == Phase::undoing;
+    if (isUndone) {
+        database.operations().readDetails(*operation);
+    }
     changeState(root, [&](common::Cache& cache) {
-        cache.write().head = move.branch;
-        applyIndexUpdates(move.files, cache.write());
-        dropRenamesOf(move.files, cache.write());
+        common::State& state = cache.write();
+        state.head = move.branch;
+        if (!isUndone) {
+            applyIndexUpdates(move.files, state);
+            dropRenamesOf(move.files, state);
+            return;
+        }
+        enterRecords(move.files, state);
+        if (!isOn(Side::before, operation->staging, state) && isOn(Side::after, operation->staging, state)) {
+            bringTo(Side::before, operation->staging, state);
+        }
     });
-    clearJournal(database);
+    endOperation(database);
 }
 
 } // namespace tav

@@ -5,6 +5,7 @@
 #include "host/changes/index_record.h"
 #include "host/changes/stored_copies.h"
 #include "host/checkout/file_clock.h"
+#include "host/checkout/permissions.h"
 #include "host/errors/failure.h"
 #include "host/history/tracked_path.h"
 #include "host/terminal/progress.h"
@@ -84,6 +85,8 @@ public:
 
     /// The files that go, with the URLs of their contents.
     Tree const& replaced() const { return replaced_; }
+    /// The files that go with contents that are nowhere else.
+    std::vector<OdString> const& discarded() const { return discarded_; }
 
 private:
     /// Takes out of `files` what stays as it is.
@@ -98,6 +101,9 @@ private:
             bool const isLeftover = update_.leftovers.count(path) > 0;
             if (isStagedWork(path, finding) || (isUnsaved && !isLeftover)) {
                 inTheWay_.push_back(path.ansi_str());
+            }
+            if (isUnsaved && !isLeftover) {
+                discarded_.push_back(path);
             }
             if (finding == Finding::isAsWanted && areWritten) {
                 update_.found.insert(*file);
@@ -131,6 +137,9 @@ private:
             return wanted ? lookIntoFolder(path) : Finding::isAsWanted;
         }
         if (type == fs::file_type::not_found) {
+            if (update_.expected.count(path) > 0) {
+                update_.missing.insert(path);
+            }
             return wanted ? Finding::isFree : Finding::isAsWanted;
         }
         if (type != fs::file_type::regular) {
@@ -143,27 +152,34 @@ private:
                 "'" + path.ansi_str() + "' cannot be read, and may hold changes that are in no commit.",
                 "Nothing has been written; check the disk and your rights to the file.");
         }
+        OdString url = digest ? expectedUrlOf(path, *digest) : OdString();
+        bool const isExpected = !url.isEmpty();
         if (digest && wanted && digest == digestOf(*wanted)) {
+            if (!isExpected) {
+                update_.others.emplace(path, *wanted);
+            }
             return Finding::isAsWanted;
         }
-        OdString const url = digest ? urlOf(path, *digest) : OdString();
+        if (digest && !isExpected && discard_ != Discard::nothing) {
+            url = database_.committedUrlOf(*digest);
+        }
         if (url.isEmpty()) {
             return Finding::holdsUnsaved;
+        }
+        if (!isExpected) {
+            update_.others.emplace(path, url);
         }
         replaced_.emplace(path, url);
         return Finding::isFree;
     }
 
-    /// The URL of a content that may be replaced at `path`; empty when it may not.
-    OdString urlOf(OdString const& path, Digest const& digest) const
+    /// The URL of the content of this digest that is expected at `path`; empty when none is.
+    OdString expectedUrlOf(OdString const& path, Digest const& digest) const
     {
         auto const [begin, end] = update_.expected.equal_range(path);
         auto const isIt = [&](auto const& file) { return digestOf(file.second) == digest; };
         auto const file = std::find_if(begin, end, isIt);
-        if (file != end) {
-            return file->second;
-        }
-        return discard_ == Discard::nothing ? OdString() : database_.committedUrlOf(digest);
+        return file == end ? OdString() : file->second;
     }
 
     /// Whether a file can take the place of the folder `path` once the files that go are gone. They have been sifted:
@@ -208,8 +224,26 @@ private:
     TreeUpdate& update_;
     os::Batch batch_;
     Tree replaced_;
+    std::vector<OdString> discarded_;
     std::vector<std::string> inTheWay_;
 };
+
+/// Keeps contents that nobody has committed. A file that cannot be read is given up with its content.
+void storeDiscarded(
+    common::RootPath const& root, LocalStorage& storage, std::vector<OdString> const& paths, TreeUpdate& update)
+{
+    std::vector<OdString> urls;
+    for (OdString const& path : paths) {
+        if (fileDigest(root.pathTo(path))) {
+            urls.push_back(valueOrFail(storage.store(path), kNothingYet));
+            update.others[path] = urls.back();
+        }
+    }
+    valueOrFail(storage.flush(), kNothingYet);
+    for (OdString const& url : urls) {
+        valueOrFail(storage.verify(url), "Nothing has been written; the disk may be failing.");
+    }
+}
 
 OdString const kRestoring = L".tav/restoring";
 
@@ -262,9 +296,10 @@ void requireDone(std::error_code const& error, OdString const& path, char const*
 using Stamps = std::map<OdString, FileStamp>;
 
 Stamps extractAll(
-    common::RootPath const& root, LocalStorage& storage, Tree const& files, std::uint64_t time,
+    common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t time,
     Restored const& restored)
 {
+    Tree const& files = update.writes;
     Stamps stamps;
     FolderView view(root);
     Progress progress("files", files.size());
@@ -273,6 +308,9 @@ Stamps extractAll(
         std::string const target = restored.pathOf(number);
         extract(storage, file, target);
         requireDone(os::setModificationTime(target, time - number * kBetweenFiles), file.first, kNothingYet);
+        if (auto const own = update.permissions.find(file.first); own != update.permissions.end()) {
+            setPermissions(target, own->second);
+        }
         Sight const sight = view.look(kRestoring + L"/" + std::to_wstring(number).c_str());
         stamps.emplace(file.first, sight.stamp.value_or(FileStamp{}));
         ++number;
@@ -423,6 +461,44 @@ void checkUpdate(
         requireStored(storage, path, url);
         progress.advance();
     }
+    if (!check.discarded().empty()) {
+        storeDiscarded(root, storage, check.discarded(), update);
+    }
+}
+
+/// The files whose unexpected contents go, with these in place of what was expected.
+std::vector<FileContents> discardedFiles(TreeUpdate const& update, Side to)
+{
+    std::vector<FileContents> files;
+    for (Tree const* const tree : {&update.writes, &update.removals}) {
+        for (auto const& [path, wanted] : *tree) {
+            auto const other = update.others.find(path);
+            if (other != update.others.end()) {
+                files.push_back(
+                    to == Side::before ? FileContents{path, wanted, other->second}
+                                       : FileContents{path, other->second, wanted});
+            }
+        }
+    }
+    return files;
+}
+
+void addPermissions(std::vector<FileContents> const& files, TreeUpdate& update)
+{
+    for (FileContents const& file : files) {
+        if (file.permissions != 0) {
+            update.permissions.emplace(file.path, file.permissions);
+        }
+    }
+}
+
+std::vector<OdString> pathsOf(std::vector<FileContents> const& files)
+{
+    std::vector<OdString> paths;
+    for (FileContents const& file : files) {
+        paths.push_back(file.path);
+    }
+    return paths;
 }
 
 Updated carryOut(
@@ -431,7 +507,7 @@ Updated carryOut(
 {
     os::Batch batch(root.path().ansi_str());
     Restored const restored(root);
-    Stamps const stamps = extractAll(root, storage, update.writes, timeForWrittenFiles(start), restored);
+    Stamps const stamps = extractAll(root, storage, update, timeForWrittenFiles(start), restored);
     requireDone(batch.flush(), kRestoring, kNothingYet);
     requireAllUnchanged(batch, update);
     begin();

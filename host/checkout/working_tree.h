@@ -26,6 +26,12 @@ struct TreeUpdate {
     Tree found;
     /// What was at each of the paths when it was checked.
     std::map<OdString, os::FileMark> marks;
+    /// Contents found there that are not expected, as they can be read from the storage.
+    Tree others;
+    /// Paths at which a content is expected, and no file was found.
+    std::set<OdString> missing;
+    /// Permissions of files that come back, where they are not those of every new file.
+    std::map<OdString, std::uint32_t> permissions;
 };
 
 /// The update that turns the files `from` into the files `to`. The files in which a tree of `begun`, the targets of
@@ -40,12 +46,19 @@ enum class Discard { nothing, copies, everything };
 /// is a file whose content is not an expected one, and whatever is at the paths `staged`, even when a commit, or the
 /// one to be written, has that content: staging it was a choice. Only where `discard` is not `nothing`, and so nothing
 /// is unstaged, may a staged file have the wanted content already. The files are read: an index record does not justify
-/// overwriting them. Files that have the wanted content already are taken out of the update. Committed contents that
-/// will be overwritten or removed can be read from `storage` afterwards: they are read there, and stored again from the
-/// files if necessary. Throws `Failure`, which lists the files in the way.
+/// overwriting them. Files that have the wanted content already are taken out of the update. All contents that will be
+/// overwritten or removed, discarded ones included, can be read from `storage` afterwards: they are read there, and
+/// stored from the files if necessary. Throws `Failure`, which lists the files in the way.
 void checkUpdate(
     common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
     std::set<OdString> const& staged, Discard discard, TreeUpdate& update);
+
+/// The files of a checked update whose unexpected contents will be overwritten, for the log of an operation that goes
+/// to the side `to`: their present contents are those of the other side.
+std::vector<FileContents> discardedFiles(TreeUpdate const& update, Side to);
+/// Adds the permissions of files that undoing an operation writes again.
+void addPermissions(std::vector<FileContents> const& files, TreeUpdate& update);
+std::vector<OdString> pathsOf(std::vector<FileContents> const& files);
 
 /// The result of an update.
 struct Updated {

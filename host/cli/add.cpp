@@ -5,7 +5,9 @@
 #include "host/changes/stored_copies.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/typed_command.h"
 #include "host/errors/failure.h"
+#include "host/repository/log_entry.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/working_state.h"
@@ -13,6 +15,7 @@
 #include "host/text/plural.h"
 
 #include <algorithm>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -125,12 +128,16 @@ void addFilesToStage(AddOptions const& options)
     keepVerified(settledFiles(verified, session.start()), session.database());
     std::size_t count = 0;
     std::size_t repaired = 0;
+    std::optional<LogEntry> entry;
     changeState(root, [&](common::Cache& cache) {
+        entry.emplace(session.database(), typedCommand("add", options.names, options.all), cache.read());
         enterVerified(verified, session.start(), cache.write());
         Chosen const chosen = chosenFiles(options, changes, root);
         repaired = repair(chosen.unchanged, root);
         count = stage(chosen.files, cache.write());
+        entry->write(cache.read());
     });
+    entry->keep();
     if (repaired > 0) {
         report("Repaired " + counted(repaired, "stored version") + ".\n");
     }

@@ -1,6 +1,7 @@
 #include "host/checkout/checkout.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/typed_command.h"
 #include "host/commits/commit_names.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
@@ -53,8 +54,9 @@ void checkOut(CheckoutOptions const& options)
     WriteSession session(openRepository(""), "checkout");
     CommitRecord const commit = findCommit(session.database(), options.target);
     OdString const branch = readState(session.root())->read().head;
-    CheckedOut const result =
-        checkOutCommit(session.root(), session.database(), {commit.hash, branch}, discardOf(options), session.start());
+    CheckedOut const result = checkOutCommit(
+        session.root(), session.database(), {commit.hash, branch}, typedCommand("checkout", {options.target}),
+        discardOf(options), session.start());
     report("Now at commit " + std::to_string(commit.number) + described(result, session.root()));
 }
 
@@ -71,7 +73,8 @@ void switchBranch(CheckoutOptions const& options)
             "Run 'tav branch' to see those that there are, or 'tav branch NAME' to make one.");
     }
     CheckedOut const result = checkOutCommit(
-        session.root(), session.database(), {branch->commitHash, branch->name}, discardOf(options), session.start());
+        session.root(), session.database(), {branch->commitHash, branch->name},
+        typedCommand("switch", {options.target}), discardOf(options), session.start());
     report("Now on branch " + shown(branch->name) + described(result, session.root()));
 }
 

@@ -107,6 +107,16 @@ struct CheckoutOptions {
 void checkOut(CheckoutOptions const& options);
 void switchBranch(CheckoutOptions const& options);
 
+struct UndoOptions {
+    bool list = false;
+    std::size_t count = 0; ///< of those that are listed; 0: all
+    bool dryRun = false;
+    bool force = false;
+    bool json = false;
+};
+void undo(UndoOptions const& options);
+void redo(UndoOptions const& options);
+
 struct ReferenceOptions {
     std::optional<std::string> name; ///< of a new one; without it they are listed
     std::string commit;              ///< empty: where the user is

@@ -4,7 +4,9 @@
 #include "host/checkout/file_moves.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/typed_command.h"
 #include "host/errors/failure.h"
+#include "host/repository/log_entry.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/working_state.h"
@@ -16,6 +18,7 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <optional>
 #include <set>
 #include <string>
 #include <utility>
@@ -154,7 +157,7 @@ std::vector<common::StagedFile> changedAndBack(
 
 void moveFiles(std::string const& typedFrom, std::string const& typedTo)
 {
-    WriteSession const session(openRepository(""), "mv", Recovery::attempted);
+    WriteSession session(openRepository(""), "mv", Recovery::attempted);
     common::RootPath const& root = session.root();
     OdString const from = pathInRepository(root, typedFrom);
     OdString const to = targetOf(from, typedTo, root);
@@ -168,9 +171,15 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     }
     checkTarget(to, root);
     checkFolders(to, root);
+    std::optional<LogEntry> entry; // Goes last: after a failure the file is back by then.
     FileMoves onDisk(root.path().ansi_str());
-    onDisk.move(from.ansi_str(), to.ansi_str());
     changeState(root, [&](common::Cache& cache) {
+        entry.emplace(session.database(), typedCommand("mv", {typedFrom, typedTo}), cache.read());
+        entry->operation().kind = Kind::rename;
+        entry->operation().movedFrom = from;
+        entry->operation().movedTo = to;
+        entry->write(cache.read());
+        onDisk.move(from.ansi_str(), to.ansi_str());
         common::State& state = cache.write();
         FileList const committed = lastCommitFiles(root);
         noteReturns(moves, committed, state);
@@ -178,8 +187,10 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
         stageMoves(moves, state);
         dropRenamesTo(moves, root, state);
         stage(changed, state);
+        entry->write(state);
     });
     onDisk.keep();
+    entry->keep();
     report("Renamed '" + shown(from) + "' to '" + shown(to) + "'.\n");
 }
 

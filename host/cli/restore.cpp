@@ -3,8 +3,10 @@
 #include "host/checkout/working_tree.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/typed_command.h"
 #include "host/commits/commit_names.h"
 #include "host/errors/failure.h"
+#include "host/repository/log_entry.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/working_state.h"
@@ -93,6 +95,20 @@ void enterFiles(
     unstage(unchanged, state);
 }
 
+/// What is written over what. A file that could not be read cannot be brought back.
+std::vector<FileContents> replacedFiles(TreeUpdate const& update)
+{
+    std::vector<FileContents> files;
+    for (auto const& [path, url] : update.writes) {
+        auto const before = update.others.find(path);
+        bool const isKnown = before != update.others.end();
+        if (isKnown || !update.marks.at(path).isThere) {
+            files.push_back({path, isKnown ? before->second : OdString(), url});
+        }
+    }
+    return files;
+}
+
 } // namespace
 
 void restoreFiles(RestoreOptions const& options)
@@ -108,7 +124,14 @@ void restoreFiles(RestoreOptions const& options)
     checkUpdate(
         root, session.database(), storage, stagedContents(readState(root)->read(), root),
         options.force ? Discard::everything : Discard::copies, update);
-    Updated const updated = carryOut(root, storage, update, session.start());
+    common::State after = readState(root)->read();
+    LogEntry entry(session.database(), typedCommand("restore", options.names), after);
+    enterFiles(files, base, {}, after);
+    entry.operation().files = replacedFiles(update);
+    Updated const updated = carryOut(root, storage, update, session.start(), [&] {
+        entry.write(after);
+        entry.keep(); // What is written from here on stays.
+    });
     changeState(root, [&](common::Cache& cache) { enterFiles(files, base, updated.times, cache.write()); });
     keepVerified(updated.verified, session.database());
     report(

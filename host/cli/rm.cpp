@@ -3,10 +3,13 @@
 #include "host/changes/staging.h"
 #include "host/changes/stored_copies.h"
 #include "host/checkout/file_moves.h"
+#include "host/checkout/permissions.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/typed_command.h"
 #include "host/errors/failure.h"
 #include "host/history/tracked_path.h"
+#include "host/repository/log_entry.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/repository/working_state.h"
@@ -214,28 +217,47 @@ std::vector<common::StagedFile> chosenFiles(
     return chosen;
 }
 
+/// The chosen files that are there.
+std::vector<FileContents>
+filesToGo(std::vector<common::StagedFile> const& chosen, Tree const& reachable, common::RootPath const& root)
+{
+    std::vector<FileContents> files;
+    for (common::StagedFile const& file : chosen) {
+        auto const version = reachable.find(file.path);
+        if (version != reachable.end() && ut::FileName::fileExists(root.pathTo(file.path))) {
+            files.push_back(
+                {file.path, version->second, OdString(), ownPermissions(root.pathTo(file.path).ansi_str())});
+        }
+    }
+    return files;
+}
+
 } // namespace
 
 void removeFiles(std::vector<std::string> const& names)
 {
     WriteSession session(openRepository(""), "rm", Recovery::attempted);
     common::RootPath const& root = session.root();
+    std::optional<LogEntry> entry; // Goes last: after a failure the files are back by then.
     Departures departures(root);
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
+        entry.emplace(session.database(), typedCommand("rm", names), cache.read());
         FolderChanges const changes =
             compare(root, matchFolder(root, lastCommitFiles(root), session.database().verifiedFiles()));
         Removable const files = removableIn(changes);
         std::vector<common::StagedFile> const chosen =
             chosenFiles(names, changes, finderOf(files, root), cache.read(), root);
         std::set<OdString> const renamed = formerPaths(cache.read());
-        for (common::StagedFile const& file : chosen) {
-            auto const reachable = files.reachable.find(file.path);
-            bool const isTaken = reachable != files.reachable.end() && departures.take(file.path, reachable->second);
-            count += isTaken ? renamed.count(file.path) : 0; // Those are not staged below.
+        count = stage(without(renamed, chosen), cache.write());
+        entry->operation().files = filesToGo(chosen, files.reachable, root);
+        entry->write(cache.read());
+        for (FileContents const& file : entry->operation().files) {
+            bool const isTaken = departures.take(file.path, file.before);
+            count += isTaken ? renamed.count(file.path) : 0; // Those are not staged above.
         }
-        count += stage(without(renamed, chosen), cache.write());
     });
+    entry->keep();
     departures.finish();
     report("Removed " + counted(count, "file") + "; the next commit takes that.\n");
 }

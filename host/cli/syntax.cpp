@@ -269,6 +269,40 @@ void addSwitch(CLI::App& app)
     command->callback([options] { switchBranch(*options); });
 }
 
+std::shared_ptr<UndoOptions> addTurning(CLI::App& command, char const* dryRunHelp)
+{
+    auto const options = std::make_shared<UndoOptions>();
+    command.add_flag("--dry-run", options->dryRun, dryRunHelp);
+    command.add_flag("--force", options->force, "Overwrite files that have been changed since; that can be taken back");
+    addJson(command, options->json);
+    return options;
+}
+
+void addUndo(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("undo", "Take back the last command");
+    auto const options = addTurning(*command, "Show what would be taken back");
+    CLI::Option* const list =
+        command->add_flag("--list", options->list, "List the commands that can be taken back, the last one first");
+    list->excludes("--dry-run")->excludes("--force");
+    command->add_option("-n,--count", options->count, "List so many at most")
+        ->type_name("COUNT")
+        ->check(CLI::PositiveNumber)
+        ->needs(list);
+    addExamples(
+        *command, "  tav undo            take back the last command\n"
+                  "  tav undo --list     show what can be taken back");
+    command->callback([options] { undo(*options); });
+}
+
+void addRedo(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("redo", "Do again what 'tav undo' has taken back");
+    auto const options = addTurning(*command, "Show what would be done again");
+    addExamples(*command, "  tav redo            do again what the last 'tav undo' has taken back");
+    command->callback([options] { redo(*options); });
+}
+
 void addReferences(CLI::App& command, void (*run)(ReferenceOptions const& options))
 {
     auto const options = std::make_shared<ReferenceOptions>();
@@ -392,6 +426,8 @@ void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
     addRestore(app);
     addCheckout(app);
     addSwitch(app);
+    addUndo(app);
+    addRedo(app);
     addReferences(*app.add_subcommand("branch", "List the branches, or make one"), branch);
     addReferences(*app.add_subcommand("tag", "List the tags, or make one"), tag);
     app.add_subcommand("fetch", "Learn the commits, branches and tags that the server has")->callback(fetch);

@@ -17,6 +17,7 @@
 #include <optional>
 #include <string>
 #include <utility>
+#include <variant>
 #include <vector>
 
 namespace tav {
@@ -30,8 +31,24 @@ struct Damage {
     OdString store;   ///< path of the file that is damaged
 };
 
+/// Of a content that only the log of operations names there is no commit.
+FileVersion fileAt(OdString const& url, LocalDatabase const& database)
+{
+    FileVersion file = database.commits().firstFileAt(url);
+    if (file.commit == 0) {
+        file.path = database.operations().pathAt(url);
+    }
+    return file;
+}
+
+std::string ownerOf(FileVersion const& file)
+{
+    return "for '" + file.path.ansi_str() + "' " +
+           (file.commit == 0 ? "of the commands to undo" : "of commit " + std::to_string(file.commit));
+}
+
 std::vector<Damage>
-damagesOf(common::RootPath const& root, CommitTables const& commits, std::vector<OdString> const& urls)
+damagesOf(common::RootPath const& root, LocalDatabase const& database, std::vector<OdString> const& urls)
 {
     std::vector<Damage> damages;
     LocalStorage storage(root);
@@ -40,7 +57,7 @@ damagesOf(common::RootPath const& root, CommitTables const& commits, std::vector
         if (auto const outcome = storage.verify(url); !outcome.hasValue()) {
             auto const store = common::getStoragePath(root, url);
             damages.push_back(
-                {url, outcome.error().message, commits.firstFileAt(url),
+                {url, outcome.error().message, fileAt(url, database),
                  store.hasValue() ? store.value() : OdString::kEmpty});
         }
         progress.advance();
@@ -51,7 +68,8 @@ damagesOf(common::RootPath const& root, CommitTables const& commits, std::vector
 /// How the history that is known here differs from the server's; none when it does not, or the server is away.
 std::optional<Failure> differenceFromServer(LocalDatabase const& database)
 {
-    bool const isUnfinished = !database.journal().isEmpty(); // The server may have a commit already that is noted here.
+    // The server may have a commit already that is noted here.
+    bool const isUnfinished = !std::holds_alternative<std::monostate>(database.pendingOperation());
     if (database.repositoryId().isEmpty() || isUnfinished) {
         return std::nullopt;
     }
@@ -94,7 +112,7 @@ Repaired repair(common::RootPath const& root, LocalDatabase const& database, std
         os::FileLock const lock = lockRepository(root, "verify");
         LocalStorage storage(root);
         Repaired repaired = repairFromFolder(root, database, storage, urlsOf(damages));
-        damages = damagesOf(root, database.commits(), urlsOf(damages)); // Others may have built on what was damaged.
+        damages = damagesOf(root, database, urlsOf(damages)); // Others may have built on what was damaged.
         return repaired;
     } catch (Failure const& failure) {
         printNote("Nothing could be repaired from the working folder: " + failure.what);
@@ -159,8 +177,7 @@ void printSummary(Contents const& contents, std::vector<Damage> const& damages)
         "Put copies of these files from a backup in their place:");
     for (Damage const& damage : damages) {
         failure.details.push_back(
-            damage.store.ansi_str() + ", for '" + damage.file.path.ansi_str() + "' of commit " +
-            std::to_string(damage.file.commit) + ": " + damage.what.ansi_str());
+            damage.store.ansi_str() + ", " + ownerOf(damage.file) + ": " + damage.what.ansi_str());
     }
     throw failure;
 }
@@ -173,7 +190,7 @@ void verifyAll(bool json)
     LocalDatabase const database = LocalDatabase::open(root);
     database.failIfDamaged();
     Contents const contents = contentsOf(root, database);
-    std::vector<Damage> damages = damagesOf(root, database.commits(), contents.here);
+    std::vector<Damage> damages = damagesOf(root, database, contents.here);
     Repaired const repaired = damages.empty() ? Repaired() : repair(root, database, damages);
     if (json) {
         printDocument(contents, damages, repaired);
@@ -181,7 +198,7 @@ void verifyAll(bool json)
         printRepaired(repaired);
         printSummary(contents, damages);
     }
-    std::optional<Failure> const difference = differenceFromServer(database);
+    std::optional<Failure> difference = differenceFromServer(database);
     if (!damages.empty()) {
         if (difference) {
             printNote(difference->what + " " + difference->next);
@@ -189,7 +206,7 @@ void verifyAll(bool json)
         failForDamages(damages, contents.here.size());
     }
     if (difference) {
-        throw *difference;
+        throw Failure(std::move(*difference));
     }
 }
 

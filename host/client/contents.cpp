@@ -2,6 +2,8 @@
 
 #include "host/storage/local_storage.h"
 
+#include <algorithm>
+
 namespace tav {
 
 namespace {
@@ -22,7 +24,13 @@ Contents contentsOf(common::RootPath const& root, LocalDatabase const& database)
 {
     Contents contents;
     LocalStorage storage(root);
-    for (OdString const& url : database.commits().urls()) {
+    std::vector<OdString> const committed = database.commits().urls();
+    for (OdString const& url : database.hasOperations() ? database.operations().urls() : std::vector<OdString>()) {
+        if (!std::binary_search(committed.begin(), committed.end(), url)) {
+            contents.here.push_back(url);
+        }
+    }
+    for (OdString const& url : committed) {
         bool const here = isHere(url, database, storage);
         (here ? contents.here : contents.elsewhere).push_back(url);
     }

@@ -9,7 +9,7 @@
 
 namespace tav {
 
-/// The URLs of all files of all known commits, each once, in ascending order.
+/// The URLs of all files of all known commits, and of those that operations may have to bring back, each once.
 struct Contents {
     std::vector<OdString> here;      ///< kept here; only reading them shows whether they are intact
     std::vector<OdString> elsewhere; ///< of commits that were made in other folders, where their contents are

@@ -160,7 +160,7 @@ sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& dat
     } catch (Failure& failure) {
         bool const isElsewhere = failure.code == static_cast<std::int32_t>(ServerError::noRepository);
         if (isElsewhere || !isOnServer(commit.commit.hash, connection)) {
-            clearJournal(database);
+            giveUpOperation(database);
         }
         if (isElsewhere) {
             failure.next += " What was to be committed is staged as before.";
@@ -314,6 +314,21 @@ void stageModified(FolderChanges const& changes, common::State& state)
     stage(files, state);
 }
 
+/// What the commit changes here; `staging` is what is staged on the disk.
+Operation operationOf(Draft const& draft, common::State const& staging, CommitOrder const& order, OdString const& hash)
+{
+    Operation operation;
+    operation.kind = Kind::commit;
+    operation.command = L"commit -m " + order.message;
+    operation.phase = Phase::running;
+    operation.before = {draft.database.currentCommit(), staging.head};
+    operation.after = {hash, staging.head};
+    common::State after = stagedPart(staging);
+    applyIndexUpdates(draft.pending.files, after);
+    operation.staging = stagingChange(staging, after);
+    return operation;
+}
+
 /// Brings the contents into the storage, for good.
 void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
 {
@@ -353,6 +368,22 @@ std::set<OdString> changedSince(IndexUpdates const& files, common::State const& 
     return changed;
 }
 
+/// Other files may have been staged since the commit began. The log says what it has taken of them, unless it has done
+/// so before a crash.
+void noteStaging(StagingChange const& change, common::State const& after, LocalDatabase& database)
+{
+    auto operation = database.operations().running();
+    if (!operation || isEmpty(change)) {
+        return;
+    }
+    database.operations().readDetails(*operation);
+    if (!isOn(Side::after, operation->staging, after)) {
+        WriteTransaction transaction(database.database());
+        database.operations().setStaging(operation->id, change);
+        transaction.commit();
+    }
+}
+
 CommitRecord
 finish(common::RootPath const& root, LocalDatabase& database, PendingCommit const& pending, NewCommit commit)
 {
@@ -364,9 +395,11 @@ finish(common::RootPath const& root, LocalDatabase& database, PendingCommit cons
     enter(commit, pending, database);
     changeState(root, [&](common::Cache& cache) {
         std::set<OdString> const left = changedSince(pending.files, cache.read(), root);
+        common::State const before = stagedPart(cache.read());
         applyIndexUpdates(pending.files, cache.write(), left);
+        noteStaging(stagingChange(before, cache.read()), cache.read(), database);
     });
-    clearJournal(database);
+    endOperation(database);
     return commit.commit;
 }
 
@@ -375,7 +408,8 @@ finish(common::RootPath const& root, LocalDatabase& database, PendingCommit cons
 Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start)
 {
     requireNoConflicts(root);
-    common::State state = readState(root)->read();
+    auto const cache = readState(root);
+    common::State state = cache->read();
     Connection server(database); // Without one there is nothing to begin.
     fetchHistory(root, database, server, Compared::theEnd);
     failIfNotAtTheEnd(database, state.head);
@@ -406,7 +440,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     draft.pending.document = commitInfoDocument(added);
     requireRecordable(added);
     WriteTransaction transaction(database.database());
-    writeJournal(draft.pending, database);
+    beginCommit(operationOf(draft, cache->read(), order, added.commit.hash), draft.pending, database);
     database.addVerified(settledFiles(std::move(draft.verified), start));
     transaction.commit();
     return {finish(root, database, draft.pending, std::move(added)), true};

@@ -69,6 +69,8 @@ _tav_options() { # COMMAND
         preview | compare) printf '%s\n' -o --output --json ;;
         restore) printf '%s\n' --from --force ;;
         checkout | switch) printf '%s\n' --force ;;
+        undo) printf '%s\n' --list -n --count --dry-run --force --json ;;
+        redo) printf '%s\n' --dry-run --force --json ;;
         server) printf '%s\n' --send ;;
         files) printf '%s\n' --hash --long --at --json ;;
         ignore) printf '%s\n' --add --json ;;
@@ -87,7 +89,7 @@ _tav_value() { # COMMAND OPTION
         :-C | init:--server) _tav_offer_files -d ;;
         preview:-o | preview:--output | compare:-o | compare:--output) _tav_offer_files -f ;;
         restore:--from | files:--at) _tav_offer < <(_tav_references branch tag) ;;
-        commit:-m | commit:--message | commit:--author | log:-n | log:--count | ignore:--add) ;;
+        commit:-m | commit:--message | commit:--author | log:-n | log:--count | undo:-n | undo:--count | ignore:--add) ;;
         log:--since | log:--until) _tav_offer_words today yesterday ;;
         log:--author) ;;
         *) return 1 ;;
@@ -119,8 +121,8 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
 }
 
 _tav() {
-    local commands='init status add unstage mv rm commit log show cat diff preview compare restore checkout switch branch tag fetch server
-        files ignore config projects verify gc export'
+    local commands='init status add unstage mv rm commit log show cat diff preview compare restore checkout switch undo redo
+        branch tag fetch server files ignore config projects verify gc export'
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
     local command='' folder='' number=1 word i
     COMPREPLY=()

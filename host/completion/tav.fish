@@ -1,7 +1,7 @@
 # Completion of tav for fish: commands, options, files, branches and tags.
 
-set -l commands init status add unstage mv rm commit log show cat diff preview compare restore checkout switch branch tag fetch server \
-    files ignore config projects verify gc export
+set -l commands init status add unstage mv rm commit log show cat diff preview compare restore checkout switch undo redo \
+    branch tag fetch server files ignore config projects verify gc export
 
 # Runs tav on the repository that the line names with -C, for what it knows.
 function __tav_ask
@@ -81,6 +81,8 @@ __tav_command compare 'Show two versions of a drawing as pictures, and what diff
 __tav_command restore 'Bring files back as a commit has them' $commands
 __tav_command checkout 'Make the working folder what it was at a commit' $commands
 __tav_command switch 'Go on with the work on another branch' $commands
+__tav_command undo 'Take back the last command' $commands
+__tav_command redo "Do again what 'tav undo' has taken back" $commands
 __tav_command branch 'List the branches, or make one' $commands
 __tav_command tag 'List the tags, or make one' $commands
 __tav_command fetch 'Learn the commits, branches and tags that the server has' $commands
@@ -141,6 +143,14 @@ complete -c tav -n '__fish_seen_subcommand_from checkout' -l force -d 'Overwrite
 complete -c tav -n '__fish_seen_subcommand_from checkout' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from switch' -l force -d 'Overwrite files with uncommitted changes'
 complete -c tav -n '__fish_seen_subcommand_from switch' -a '(__tav_references branch)'
+complete -c tav -n '__fish_seen_subcommand_from undo' -l list -d 'List the commands that can be taken back'
+complete -c tav -n '__fish_seen_subcommand_from undo' -s n -l count -x -d 'List so many at most'
+complete -c tav -n '__fish_seen_subcommand_from undo' -l dry-run -d 'Show what would be taken back'
+complete -c tav -n '__fish_seen_subcommand_from undo' -l force -d 'Overwrite files that have been changed since'
+complete -c tav -n '__fish_seen_subcommand_from undo' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from redo' -l dry-run -d 'Show what would be done again'
+complete -c tav -n '__fish_seen_subcommand_from redo' -l force -d 'Overwrite files that have been changed since'
+complete -c tav -n '__fish_seen_subcommand_from redo' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from branch' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from branch; and __tav_arguments 1 branch' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from tag' -l json -d 'Print a document for programs'

@@ -448,6 +448,34 @@ void CommitTables::set(common::Reference const& reference)
     row.with(numberOf(reference.commitHash)).run();
 }
 
+void CommitTables::removeReference(OdString const& name)
+{
+    Statement row = database_->prepare("DELETE FROM refs WHERE repository = ? AND name = ?");
+    row.with(repository_).with(name).run();
+}
+
+std::vector<CommitNumber> CommitTables::between(OdString const& from, OdString const& to) const
+{
+    Statement rows = database_->prepare(R"(
+        WITH RECURSIVE
+            kept(n) AS (
+                SELECT number FROM commits WHERE repository = ?1 AND hash = ?3
+                UNION
+                SELECT parent FROM parents JOIN kept ON repository = ?1 AND number = n),
+            past(n) AS (
+                SELECT number FROM commits WHERE repository = ?1 AND hash = ?2
+                UNION
+                SELECT parent FROM parents JOIN past ON repository = ?1 AND number = n)
+        SELECT number, hash FROM commits JOIN past ON repository = ?1 AND number = n
+        WHERE n NOT IN (SELECT n FROM kept) ORDER BY number)");
+    rows.with(repository_).with(from).with(to);
+    std::vector<CommitNumber> numbers;
+    while (rows.next()) {
+        numbers.push_back({rows.integer(0), rows.text(1)});
+    }
+    return numbers;
+}
+
 std::int64_t CommitTables::numberOf(OdString const& hash) const
 {
     Statement row = database_->prepare("SELECT number FROM commits WHERE repository = ? AND hash = ?");

@@ -129,6 +129,11 @@ public:
     /// Makes a reference, or moves the one of that name. Its commit must be there. Part of a `WriteTransaction` of the
     /// caller.
     void set(common::Reference const& reference);
+    /// Removes the reference of that name, if there is one. Part of a `WriteTransaction` of the caller.
+    void removeReference(OdString const& name);
+    /// The commits that are before `from`, or `from` itself, and not before `to`, in ascending order. An empty `to` is
+    /// before the first commit.
+    std::vector<CommitNumber> between(OdString const& from, OdString const& to) const;
 
 private:
     std::int64_t numberOf(OdString const& hash) const;

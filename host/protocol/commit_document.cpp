@@ -102,12 +102,20 @@ std::optional<OdString> readExpected(Part const& part)
     return readHash(*expected);
 }
 
+/// Who removes a reference says what it names.
+OdString readTarget(Part const& part, std::optional<OdString> const& expected)
+{
+    bool const mayBeRemoved = expected && !expected->isEmpty();
+    return mayBeRemoved && part.text().isEmpty() ? OdString() : readHash(part);
+}
+
 ReferenceChange readReference(Part const& part)
 {
+    std::optional<OdString> expected = readExpected(part);
     common::Reference const reference(
-        readReferenceName(part.member(keys::s_ref_name.c_str())), readHash(part.member(keys::s_commitHash.c_str())),
-        readType(part.member(L"refType")));
-    return {reference, readExpected(part)};
+        readReferenceName(part.member(keys::s_ref_name.c_str())),
+        readTarget(part.member(keys::s_commitHash.c_str()), expected), readType(part.member(L"refType")));
+    return {reference, std::move(expected)};
 }
 
 void checkNames(Part const& part, std::vector<ReferenceChange> const& changes)

@@ -15,7 +15,7 @@
 
 namespace tav {
 
-/// A reference that is to be made or moved.
+/// A reference that is to be made or moved; without a commit, removed.
 struct ReferenceChange {
     common::Reference reference;
     /// Hash of the commit that it is expected to name now, empty where it is expected not to exist; none: anything.

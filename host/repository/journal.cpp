@@ -1,122 +1,20 @@
 #include "host/repository/journal.h"
 
-#include "host/errors/failure.h"
 #include "host/repository/lock.h"
-#include "host/text/characters.h"
-#include "host/text/json_text.h"
-#include "host/text/utf8.h"
 
-#include "common/mu_common_json.h"
-#include "json/json_reader.h"
-
+#include <algorithm>
 #include <string>
 
 namespace tav {
 
 namespace {
 
-using kutils::json::Array;
-using kutils::json::Object;
-using kutils::json::Value;
-
-OdString textOf(Object const& object, OdString const& key)
-{
-    return withoutPairs(common::getStringValue(object, key, OdString::kEmpty));
-}
-
-Array arrayOf(IndexUpdates const& files)
-{
-    Array array;
-    for (auto const& [path, record] : files) {
-        Object object;
-        object[L"path"] = jsonText(path);
-        if (record) {
-            object[L"time"] = record->lastChecked;
-            object[L"modified"] = record->modified;
-        }
-        array.emplace_back(std::move(object));
-    }
-    return array;
-}
-
-IndexUpdates filesOf(Object const& document)
-{
-    IndexUpdates files;
-    for (Value const& element : common::getArrayValue(document, L"files", L"")) {
-        Object const& file = element.get_object();
-        std::optional<common::IndexData> record;
-        if (common::hasKey(file, L"time")) {
-            record = {common::getUInt64Value(file, L"time", L""), common::getBoolValue(file, L"modified", L"")};
-        }
-        files.emplace(textOf(file, L"path"), record);
-    }
-    return files;
-}
-
-Object documentOf(PendingCommit const& pending)
-{
-    Array contents;
-    for (NewContent const& content : pending.contents) {
-        Object object;
-        object[L"url"] = jsonText(content.url);
-        object[L"digest"] = jsonText(fromUtf8(hexOf(content.digest)));
-        object[L"size"] = content.size;
-        contents.emplace_back(std::move(object));
-    }
-    Object document;
-    document[L"document"] = jsonText(pending.document);
-    document[L"contents"] = std::move(contents);
-    document[L"files"] = arrayOf(pending.files);
-    return document;
-}
-
-Object documentOf(PendingCheckout const& pending)
-{
-    Object document;
-    document[L"target"] = jsonText(pending.target);
-    document[L"branch"] = jsonText(pending.branch);
-    document[L"written"] = pending.isWritten;
-    Array begun;
-    for (OdString const& target : pending.begun) {
-        begun.emplace_back(jsonText(target));
-    }
-    document[L"begun"] = std::move(begun);
-    document[L"files"] = arrayOf(pending.files);
-    return document;
-}
-
-PendingCommit commitOf(Object const& document)
-{
-    PendingCommit pending;
-    pending.document = textOf(document, L"document");
-    for (Value const& element : common::getArrayValue(document, L"contents", L"")) {
-        Object const& content = element.get_object();
-        pending.contents.push_back(
-            {textOf(content, L"url"), digestFromHex(textOf(content, L"digest").ansi_str()).value(),
-             common::getUInt64Value(content, L"size", L"")});
-    }
-    pending.files = filesOf(document);
-    return pending;
-}
-
-PendingCheckout checkoutOf(Object const& document)
-{
-    PendingCheckout pending{
-        textOf(document, L"target"), textOf(document, L"branch"), common::getBoolValue(document, L"written", L"")};
-    if (common::hasKey(document, L"begun")) {
-        for (Value const& element : common::getArrayValue(document, L"begun", L"")) {
-            std::wstring const& target = element.get_string();
-            pending.begun.push_back(withoutPairs(OdString(target.c_str(), target.size())));
-        }
-    }
-    if (common::hasKey(document, L"files")) { // Earlier versions of tav did not write them.
-        pending.files = filesOf(document);
-    }
-    return pending;
-}
-
 std::string commandOf(PendingCheckout const& checkout, LocalDatabase const& database)
 {
+    auto const operation = database.hasOperations() ? database.operations().running() : std::nullopt;
+    if (operation && operation->phase != Phase::running) {
+        return operation->phase == Phase::undoing ? "tav undo" : "tav redo";
+    }
     auto const branch = database.commits().reference(checkout.branch);
     bool const isBranch = branch && branch->commitHash == checkout.target;
     auto const commit = database.commits().find(checkout.target);
@@ -124,42 +22,76 @@ std::string commandOf(PendingCheckout const& checkout, LocalDatabase const& data
                     : "tav checkout " + (commit ? std::to_string(commit->number) : checkout.target.ansi_str());
 }
 
+/// Of a file that both have changed the interrupted move has seen what was there first.
+void takeOver(Operation const& begun, Operation& move)
+{
+    auto const isKnown = [&](FileContents const& file) {
+        auto const isIt = [&](FileContents const& other) { return other.path == file.path; };
+        return std::any_of(begun.files.begin(), begun.files.end(), isIt);
+    };
+    move.before = begun.before;
+    move.files.erase(std::remove_if(move.files.begin(), move.files.end(), isKnown), move.files.end());
+    move.files.insert(move.files.end(), begun.files.begin(), begun.files.end());
+}
+
+/// What becomes of an operation that ends.
+Phase phaseAfter(Phase phase)
+{
+    return phase == Phase::undoing ? Phase::undone : Phase::done;
+}
+
 } // namespace
 
 PendingOperation readJournal(LocalDatabase const& database)
 {
-    OdString const text = database.journal();
-    if (text.isEmpty()) {
-        return {};
+    return database.pendingOperation();
+}
+
+void beginCommit(Operation const& operation, PendingCommit const& commit, LocalDatabase& database)
+{
+    database.operations().add(operation);
+    database.operations().setPending(commit);
+}
+
+void beginMove(Operation operation, PendingCheckout const& checkout, LocalDatabase& database)
+{
+    Operations& operations = database.operations();
+    auto begun = operations.running();
+    if (begun && begun->phase == Phase::running) {
+        operations.readDetails(*begun);
+        takeOver(*begun, operation);
+        operations.remove(begun->id);
+    } else if (begun) { // It is given up half way, and the move begins from there.
+        operations.setPhase(begun->id, begun->phase == Phase::undoing ? Phase::done : Phase::undone);
     }
-    try {
-        Value document;
-        kutils::json::read_string(document, text);
-        Object const& object = document.get_object();
-        if (common::hasKey(object, L"target")) {
-            return checkoutOf(object);
-        }
-        return commitOf(object);
-    } catch (std::exception const&) {
-        throw Failure(
-            "What an interrupted command noted in '" + database.path() + "' cannot be read.",
-            "Put a copy of that file from a backup in its place.");
+    operations.add(operation);
+    operations.setPending(checkout);
+}
+
+void endOperation(LocalDatabase& database)
+{
+    WriteTransaction transaction(database.database());
+    auto const operation = database.operations().running();
+    if (!operation) {
+        return;
     }
+    database.operations().clearPending();
+    if (operation->command.isEmpty()) {
+        database.operations().remove(operation->id);
+    } else {
+        database.operations().setPhase(operation->id, phaseAfter(operation->phase));
+    }
+    transaction.commit();
 }
 
-void writeJournal(PendingCommit const& commit, LocalDatabase& database)
+void giveUpOperation(LocalDatabase& database)
 {
-    database.setJournal(compactText(documentOf(commit)));
-}
-
-void writeJournal(PendingCheckout const& checkout, LocalDatabase& database)
-{
-    database.setJournal(compactText(documentOf(checkout)));
-}
-
-void clearJournal(LocalDatabase& database)
-{
-    database.setJournal(OdString::kEmpty);
+    WriteTransaction transaction(database.database());
+    if (auto const operation = database.operations().running()) {
+        database.operations().clearPending();
+        database.operations().remove(operation->id);
+    }
+    transaction.commit();
 }
 
 std::string describe(PendingCheckout const& checkout, LocalDatabase const& database)
@@ -169,17 +101,14 @@ std::string describe(PendingCheckout const& checkout, LocalDatabase const& datab
 
 std::string pendingNotice(common::RootPath const& root, LocalDatabase const& database)
 {
-    OdString const journal = database.journal();
-    if (journal.isEmpty()) {
+    PendingOperation pending = readJournal(database);
+    if (std::holds_alternative<std::monostate>(pending)) {
         return {};
     }
     if (std::string const holder = lockHolder(root); !holder.empty()) {
         return holder + ", is changing the repository.";
     }
-    if (database.journal() != journal) { // It has ended meanwhile.
-        return {};
-    }
-    PendingOperation const pending = readJournal(database);
+    pending = readJournal(database); // It may have ended meanwhile.
     if (std::holds_alternative<PendingCommit>(pending)) {
         return "A commit was interrupted. The next command that changes something completes it.";
     }

@@ -35,11 +35,12 @@ void allowBasesOfObjects(Database& /*unused*/) {}
 
 /// Each makes the next version out of the one before; a new file is version 0. Steps are added and never changed: files
 /// that earlier versions of tav made have to pass them all.
-constexpr std::array kSteps = {
-    makeFirstTables, VerifiedFiles::create, CommitTables::createIndex, LastChanges::create, allowBasesOfObjects};
+constexpr std::array kSteps = {makeFirstTables,     VerifiedFiles::create, CommitTables::createIndex,
+                               LastChanges::create, allowBasesOfObjects,   Operations::create};
 
 constexpr std::int64_t kVersion = kSteps.size();
 constexpr std::int64_t kFirstWithVerifiedFiles = 2;
+constexpr std::int64_t kFirstWithOperations = 6;
 
 void failIfLost(common::RootPath const& root)
 {
@@ -92,6 +93,7 @@ LocalDatabase::LocalDatabase(std::string const& path, Use use)
     : database_(path)
     , commits_(database_, 1)
     , verifiedFiles_(database_)
+    , operations_(database_)
 {
     std::int64_t const version = database_.version();
     if (version > kVersion) {
@@ -120,6 +122,16 @@ VerifiedFileList LocalDatabase::verifiedFiles() const
 void LocalDatabase::addVerified(VerifiedFileList const& files)
 {
     verifiedFiles_.put(files);
+}
+
+bool LocalDatabase::hasOperations() const
+{
+    return database_.version() >= kFirstWithOperations;
+}
+
+PendingOperation LocalDatabase::pendingOperation() const
+{
+    return hasOperations() ? operations_.pending() : Operations::pendingIn(database_);
 }
 
 void LocalDatabase::failIfDamaged() const

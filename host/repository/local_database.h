@@ -2,6 +2,7 @@
 #pragma once
 
 #include "host/history/commit_tables.h"
+#include "host/repository/operations.h"
 #include "host/repository/verified_files.h"
 
 #include "common/mu_common_repo_prop.h"
@@ -55,9 +56,12 @@ public:
     std::int64_t turnedOver() const;
     void setTurnedOver(std::int64_t commit);
 
-    /// The pending operation, as the document that the command wrote; empty when there is none.
-    OdString journal() const { return value("unfinished"); }
-    void setJournal(OdString const& document) { setValue("unfinished", document); }
+    /// Whether there is a log of operations: databases of earlier versions have none.
+    bool hasOperations() const;
+    Operations& operations() { return operations_; }
+    Operations const& operations() const { return operations_; }
+    /// The pending operation, also of a database that an earlier version made.
+    PendingOperation pendingOperation() const;
 
     /// URL of a content with this digest that is stored here, preferably in a revision store; empty when none is known.
     OdString urlOf(Digest const& digest) const;
@@ -81,6 +85,7 @@ private:
     Database database_;
     CommitTables commits_;
     VerifiedFiles verifiedFiles_;
+    Operations operations_;
 };
 
 } // namespace tav

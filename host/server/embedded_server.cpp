@@ -29,7 +29,8 @@ using kutils::json::Value;
 
 namespace keys = common::json;
 
-constexpr std::int64_t kTablesVersion = 1;
+constexpr std::int64_t kTablesVersion = 2;
+constexpr std::int64_t kFirstWithDelivered = 2;
 constexpr wchar_t const* kCommandVersion = L"1";
 constexpr mode_t kFolderPermissions = 0777;
 constexpr std::size_t kChangesOfAPage = 10'000;
@@ -44,8 +45,12 @@ struct Repository {
 /// Whether a rule that protects what others have is in force.
 enum class Force { no, yes };
 
+/// Up to which number commits have been handed out, of each repository: nobody but who made them has those behind it.
+constexpr char const* kDelivered = "CREATE TABLE delivered (repository INTEGER PRIMARY KEY, number INTEGER NOT NULL)";
+
 void createTables(Database& database)
 {
+    database.run(kDelivered);
     database.run("CREATE TABLE repositories (key INTEGER PRIMARY KEY, id TEXT NOT NULL UNIQUE, name TEXT NOT NULL)");
     CommitTables::create(database);
     database.setVersion(kTablesVersion);
@@ -61,10 +66,21 @@ void prepareTables(Database& database)
         }
         transaction.commit();
     }
-    if (database.version() != kTablesVersion) {
+    if (database.version() > kTablesVersion) {
         throw Failure(
             "The database '" + database.path() + "' was made by a newer tav.",
             "Install that one, or name another folder for the server.");
+    }
+}
+
+/// Brings tables that an earlier tav made to the form of this one; that handed out all that there was. Part of a
+/// `WriteTransaction` of the caller: who only reads a server may not be allowed to change it.
+void upgrade(Database& database)
+{
+    if (database.version() < kFirstWithDelivered) {
+        database.run(kDelivered);
+        database.run("INSERT INTO delivered SELECT repository, max(number) FROM commits GROUP BY repository");
+        database.setVersion(kTablesVersion);
     }
 }
 
@@ -104,7 +120,7 @@ void requireParents(CommitTables const& tables, CommitRecord const& commit)
             throw Failure("The server does not have the parent commit " + quoted(parent) + ".", kNothingChanged);
         }
     }
-    if (commit.parents.empty() && tables.lastNumber() != 0) {
+    if (commit.parents.empty() && !tables.references().empty()) {
         throw withCode(
             Failure("The repository has commits already; one without a parent would not follow them.", kFetchFirst),
             ServerError::hasMovedOn);
@@ -162,9 +178,72 @@ void requireExpected(std::optional<common::Reference> const& there, ReferenceCha
         ServerError::hasMovedOn);
 }
 
-void setReference(CommitTables& tables, ReferenceChange const& change, Force force)
+struct Request {
+    Database& database;
+    Repository repository; ///< as far as the request names one
+    OdString const& document;
+};
+
+std::int64_t deliveredNumber(Request const& request)
+{
+    Statement row = request.database.prepare("SELECT number FROM delivered WHERE repository = ?");
+    return row.with(request.repository.key).next() ? row.integer(0) : 0;
+}
+
+/// Why the branch `there` may not leave these commits behind, as the ends of a sentence.
+std::vector<std::string> hindrances(
+    Request const& request, CommitTables const& tables, common::Reference const& there,
+    std::vector<CommitNumber> const& left)
+{
+    std::vector<std::string> reasons;
+    for (common::Reference const& other : tables.references()) {
+        auto const isNamed = [&](CommitNumber const& commit) { return tables.isBefore(commit.hash, other.commitHash); };
+        if (other.name != there.name && std::any_of(left.begin(), left.end(), isNamed)) {
+            reasons.push_back(quoted(other.name) + " has it");
+        }
+    }
+    if (left.front().number <= deliveredNumber(request)) {
+        reasons.emplace_back("it may be in other working folders");
+    }
+    return reasons;
+}
+
+/// A branch goes back, or aside, only while that takes no commit away from anybody.
+void requireLeavable(
+    Request const& request, CommitTables const& tables, common::Reference const& there, OdString const& to)
+{
+    std::vector<CommitNumber> const left = tables.between(there.commitHash, to);
+    std::string reasons;
+    for (std::string const& reason :
+         left.empty() ? std::vector<std::string>() : hindrances(request, tables, there, left)) {
+        reasons += (reasons.empty() ? "" : ", and ") + reason;
+    }
+    if (!reasons.empty()) {
+        throw Failure(
+            "Commit " + std::to_string(left.front().number) + " cannot be taken back: " + reasons + ".",
+            "Make another commit that puts things right.");
+    }
+}
+
+void removeReference(Request const& request, CommitTables& tables, ReferenceChange const& change)
+{
+    auto const there = tables.reference(change.reference.name);
+    if (!there) {
+        return;
+    }
+    requireSameType(*there, change.reference);
+    requireExpected(there, change);
+    requireLeavable(request, tables, *there, OdString());
+    tables.removeReference(there->name);
+}
+
+void setReference(Request const& request, CommitTables& tables, ReferenceChange const& change, Force force)
 {
     common::Reference const& wanted = change.reference;
+    if (wanted.commitHash.isEmpty()) {
+        removeReference(request, tables, change);
+        return;
+    }
     if (!tables.find(wanted.commitHash)) {
         throw Failure(
             "The server does not have the commit " + quoted(wanted.commitHash) + " of " + quoted(wanted.name) + ".",
@@ -176,7 +255,11 @@ void setReference(CommitTables& tables, ReferenceChange const& change, Force for
     }
     requireExpected(there, change);
     if (there && force == Force::no && there->commitHash != wanted.commitHash) {
-        requireForward(tables, *there, wanted);
+        if (change.expected && wanted.type == common::EType::branch) {
+            requireLeavable(request, tables, *there, wanted.commitHash);
+        } else {
+            requireForward(tables, *there, wanted);
+        }
     }
     tables.set(wanted);
 }
@@ -188,12 +271,6 @@ bool hasPassed(CommitTables const& tables, common::Reference const& branch, OdSt
     return there && there->type == branch.type && branch.type == common::EType::branch && branch.commitHash == hash &&
            tables.isBefore(hash, there->commitHash);
 }
-
-struct Request {
-    Database& database;
-    Repository repository; ///< as far as the request names one
-    OdString const& document;
-};
 
 OdString answerVersion(Request const&)
 {
@@ -242,10 +319,11 @@ OdString answerCommit(Request const& request, Force force)
     requireHash(added);
     CommitTables tables(request.database, request.repository.key);
     WriteTransaction transaction(request.database);
+    upgrade(request.database);
     bool const isNew = addUnlessThere(tables, added);
     for (ReferenceChange const& reference : added.references) {
         if (isNew || force == Force::yes || !hasPassed(tables, reference.reference, added.commit.hash)) {
-            setReference(tables, reference, force);
+            setReference(request, tables, reference, force);
         }
     }
     transaction.commit();
@@ -258,21 +336,41 @@ OdString answerReferences(Request const& request, Force force)
     CommitTables tables(request.database, request.repository.key);
     if (!wanted.empty()) { // Who only asks does not wait for those who write.
         WriteTransaction transaction(request.database);
+        upgrade(request.database);
         for (ReferenceChange& reference : wanted) {
             if (force == Force::no && !reference.expected) {
                 reference.expected = OdString(); // Who does not say what is there does not know of it.
             }
-            setReference(tables, reference, force);
+            setReference(request, tables, reference, force);
         }
         transaction.commit();
     }
     return compactText(referencesDocument(tables.references()));
 }
 
+/// That it cannot be noted is no reason to hand nothing out: no commit is lost by that.
+void noteDelivered(Request const& request, CommitTables const& tables, std::int64_t known)
+{
+    std::int64_t const last = tables.lastNumber();
+    bool const isToNote =
+        last > known && request.database.version() >= kFirstWithDelivered && last > deliveredNumber(request);
+    if (!isToNote) {
+        return;
+    }
+    try {
+        WriteTransaction transaction(request.database);
+        Statement row = request.database.prepare("INSERT OR REPLACE INTO delivered VALUES (?, ?)");
+        row.with(request.repository.key).with(last).run();
+        transaction.commit();
+    } catch (Failure const&) {
+    }
+}
+
 OdString answerFetch(Request const& request)
 {
     std::int64_t const known = readLastNumber(request.document);
     CommitTables const tables(request.database, request.repository.key);
+    noteDelivered(request, tables, known);
     return fetchDocument(repositoryDocument(request.repository.id, request.repository.name), tables, known);
 }
 
@@ -285,7 +383,9 @@ OdString answerNumbers(Request const& request)
 OdString answerHistory(Request const& request)
 {
     std::int64_t const known = readLastNumber(request.document);
-    return historyPage(CommitTables(request.database, request.repository.key), known, kChangesOfAPage);
+    CommitTables const tables(request.database, request.repository.key);
+    noteDelivered(request, tables, known);
+    return historyPage(tables, known, kChangesOfAPage);
 }
 
 template <Force force>

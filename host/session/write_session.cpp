@@ -36,7 +36,7 @@ WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Reco
         if (recovery == Recovery::required) {
             throw;
         }
-        if (isCommit && database_.journal().isEmpty()) {
+        if (isCommit && !database_.operations().running()) {
             std::fputs(
                 "tav: A commit that was interrupted has been given up, as the server refuses it. What it was to take "
                 "is staged as before.\n",

@@ -37,12 +37,15 @@ Subcommands:
   restore                     Bring files back as a commit has them
   checkout, co                Make the working folder what it was at a commit
   switch                      Go on with the work on another branch
+  undo                        Take back the last command
+  redo                        Do again what 'tav undo' has taken back
   branch                      List the branches, or make one
   tag                         List the tags, or make one
   fetch                       Learn the commits, branches and tags that the server has
   server                      Show where the history is kept, or name its new place
   files                       List the files that the repository keeps
   ignore                      Show the rules for names to ignore, or add one
+  config                      Show or change settings
   projects                    List the repositories that you have made
   verify                      Read every stored version and check it against its digest
   gc                          Remove what no commit needs from the storage

@@ -1,7 +1,9 @@
 #include "host/repository/local_database.h"
 
 #include "host/errors/failure.h"
+#include "host/repository/journal.h"
 
+#include "tests/host/earlier_database.h"
 #include "tests/support/temp_repository.h"
 
 #include <gmock/gmock.h>
@@ -37,8 +39,9 @@ protected:
     /// Makes the file what the first version of its tables was.
     void makeFirstVersion() const
     {
+        host_tests::makeSecondVersion(path, {});
         tav::Database file(path);
-        file.run("DROP TABLE verified_files; DROP INDEX changes_by_path; DROP TABLE last_changes");
+        file.run("DROP TABLE verified_files");
         file.setVersion(1);
     }
 
@@ -65,14 +68,62 @@ TEST_F(LocalDatabase, IsBroughtToThisVersionForWhoChangesIt)
 {
     makeFirstVersion();
     tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
-    EXPECT_EQ(version(), 5);
+    EXPECT_EQ(version(), 6);
     database.addVerified({verified("a.dwg")});
     EXPECT_THAT(tav::LocalDatabase::open(repo.root()).verifiedFiles(), ElementsAre(verified("a.dwg")));
 }
 
+char const* const kNotedCommit = R"({"document":"the document","contents":[{"url":"po:1","size":7,"digest":)"
+                                 R"("d1ce000000000000000000000000000000000000000000000000000000000000"}],)"
+                                 R"("files":[{"path":"a.dwg","time":5,"modified":true},{"path":"ö.dwg"}]})";
+
+void expectNotedCommit(tav::PendingOperation const& pending)
+{
+    auto const& commit = std::get<tav::PendingCommit>(pending);
+    EXPECT_EQ(commit.document, OdString(L"the document"));
+    ASSERT_EQ(commit.contents.size(), 1U);
+    EXPECT_EQ(commit.contents[0].url, OdString(L"po:1"));
+    EXPECT_EQ(commit.contents[0].size, 7U);
+    EXPECT_EQ(commit.contents[0].digest, (tav::Digest{0xd1, 0xce}));
+    ASSERT_EQ(commit.files.size(), 2U);
+    EXPECT_EQ(commit.files.at(L"a.dwg")->lastChecked, 5U);
+    EXPECT_TRUE(commit.files.at(L"a.dwg")->modified);
+    EXPECT_FALSE(commit.files.at(L"\xF6.dwg"));
+}
+
+TEST_F(LocalDatabase, ShowsWhatTheSecondVersionHasNotedToWhoOnlyReads)
+{
+    host_tests::makeSecondVersion(path, OdString(kNotedCommit, CP_UTF_8));
+    expectNotedCommit(tav::LocalDatabase::open(repo.root()).pendingOperation());
+    EXPECT_EQ(version(), 2);
+}
+
+TEST_F(LocalDatabase, TakesOverACommitThatTheSecondVersionHasNoted)
+{
+    host_tests::makeSecondVersion(path, OdString(kNotedCommit, CP_UTF_8));
+    tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
+    expectNotedCommit(database.pendingOperation());
+    tav::endOperation(database);
+    EXPECT_TRUE(std::holds_alternative<std::monostate>(database.pendingOperation()));
+    EXPECT_TRUE(database.operations().latest(10).empty()); // It does not say how to take it back.
+}
+
+TEST_F(LocalDatabase, TakesOverACheckoutThatTheSecondVersionHasNoted)
+{
+    host_tests::makeSecondVersion(
+        path, L"{\"target\":\"c\",\"branch\":\"main\",\"written\":false,\"begun\":[\"a\",\"b\"],\"files\":[]}");
+    tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
+    tav::PendingOperation const pending = database.pendingOperation();
+    auto const& checkout = std::get<tav::PendingCheckout>(pending);
+    EXPECT_EQ(checkout.target, OdString(L"c"));
+    EXPECT_EQ(checkout.branch, OdString(L"main"));
+    EXPECT_FALSE(checkout.isWritten);
+    EXPECT_THAT(checkout.begun, ElementsAre(OdString(L"a"), OdString(L"b")));
+}
+
 TEST_F(LocalDatabase, IsRefusedWhenANewerVersionMadeIt)
 {
-    tav::Database(path).setVersion(6);
+    tav::Database(path).setVersion(7);
     try {
         tav::LocalDatabase::open(repo.root());
         FAIL() << "no failure";

@@ -175,7 +175,10 @@ TEST_F(Lock, IsNotTakenThroughALink)
 TEST_F(Lock, OfARunningCommandKeepsItsWorkFromBeingCalledInterrupted)
 {
     tav::LocalDatabase database = tav::LocalDatabase::make(repo.root());
-    tav::writeJournal(tav::PendingCommit{L"{}", {}, {}}, database);
+    tav::Operation commit;
+    commit.kind = tav::Kind::commit;
+    commit.phase = tav::Phase::running;
+    tav::beginCommit(commit, {L"{}", {}, {}}, database);
     {
         os::FileLock const lock = hold("'tav commit', process 7 on studio");
         for (char const* const command : {"status", "log"}) {

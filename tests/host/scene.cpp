@@ -6,6 +6,7 @@
 #include "host/changes/digest.h"
 #include "host/changes/folder_view.h"
 #include "host/repository/local_database.h"
+#include "host/repository/working_state.h"
 #include "host/storage/local_storage.h"
 #include "host/text/utf8.h"
 #include "platform/os/os_calls.h"
@@ -244,6 +245,35 @@ std::string Scene::situation() const
     return text + withoutTimes(place_.read("now/repository/.tav/tav.state")) + rows;
 }
 
+std::string Scene::work() const
+{
+    std::string text;
+    for (auto const& [path, content] : files()) {
+        text += path + ": " + content + "\n";
+    }
+    auto const cache = tav::readState(root());
+    text += "on " + cache->read().head.ansi_str() + "\n";
+    for (common::StagedFile const& file : cache->read().stagedFiles) {
+        text += "staged " + file.path.ansi_str() + " " + std::to_string(static_cast<int>(file.change)) + "\n";
+    }
+    for (auto const& [path, previous] : cache->read().renames) {
+        text += "renamed " + previous.ansi_str() + " " + path.ansi_str() + "\n";
+    }
+    tav::LocalDatabase const local = tav::LocalDatabase::open(root());
+    tav::Database const server(place_.pathTo("now/server/server.db"));
+    std::string const refs = "name || ' ' || type || ' ' || number";
+    return text + "at " + local.currentCommit().ansi_str() + "\n" + rowsOf(server, "refs", refs) +
+           rowsOf(tav::Database(local.path()), "refs", refs);
+}
+
+void Scene::forgetOperations() const
+{
+    tav::Database database(folder() + "/.tav/tav.db");
+    for (char const* const table : {"operation_files", "operation_staging", "operation_renames", "operations"}) {
+        database.run(("DELETE FROM " + std::string(table)).c_str());
+    }
+}
+
 std::string difference(std::string const& before, std::string const& after)
 {
     std::vector<std::string> const old = linesOf(before);
@@ -382,6 +412,21 @@ std::vector<SceneRow> const& historyRows()
          {"init", "--server", "../server"},
          [](Scene const& scene) { fs::remove(scene.folder() + "/.tav/tav.db"); },
          false}};
+    return rows;
+}
+
+std::vector<SceneRow> const& undoRows()
+{
+    auto const editNote = [](Scene const& scene) { scene.write("note.txt", "third"); };
+    static std::vector<SceneRow> const rows = {
+        {"Add", {"add", "note.txt"}, editNote},
+        {"Unstage", {"unstage", "--all"}, changeFiles},
+        {"Rm", {"rm", "plan.dwg", "note.txt"}, [](Scene const&) {}},
+        {"Mv", {"mv", "plan.dwg", "план.dwg"}, [](Scene const&) {}},
+        {"Restore", {"restore", "plan.dwg", "note.txt", "old/gone.dwg", "--from", "1", "--force"}, editNote},
+        {"Checkout", {"checkout", "1"}, stageNewFile},
+        {"CheckoutByForce", {"checkout", "1", "--force"}, editNote},
+        {"Commit", {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"}, changeFiles}};
     return rows;
 }
 

@@ -62,6 +62,11 @@ public:
     /// count when they are empty.
     std::string situation() const;
 
+    /// What a user has: contents, what is staged and renamed, the references, and where the folder stands.
+    std::string work() const;
+    /// Empties the log of operations.
+    void forgetOperations() const;
+
 private:
     support::TempFolder const place_;
     mutable int written_ = 0;
@@ -84,6 +89,9 @@ bool isDone(Outcome const& outcome);
 
 /// The commands whose failures and crashes are tested: each writes, replaces and removes something.
 std::vector<SceneRow> const& sceneRows();
+
+/// The same for commands that can be undone.
+std::vector<SceneRow> const& undoRows();
 
 /// The same for commands that bring the history here and that of the server together. The two differ before them, which
 /// `verify` reports.

@@ -1,6 +1,7 @@
 // Servers that were moved, lost or put back, and a database that was lost: what is whole somewhere comes back.
 #include "host/database/sqlite.h"
 
+#include "tests/host/earlier_database.h"
 #include "tests/host/history_test.h"
 
 #include <gmock/gmock.h>
@@ -296,9 +297,7 @@ protected:
         place.write("server/server.db", old);
         place.write("repository/.tav/tav.db", database);
         place.write("repository/.tav/tav.state", state);
-        tav::Database local(place.pathTo("repository/.tav/tav.db"));
-        tav::Statement row = local.prepare("INSERT OR REPLACE INTO settings VALUES ('unfinished', ?)");
-        row.with(OdString(document.c_str(), CP_UTF_8)).run();
+        makeSecondVersion(place.pathTo("repository/.tav/tav.db"), OdString(document.c_str(), CP_UTF_8));
     }
 
 private:

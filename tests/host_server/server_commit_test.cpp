@@ -87,11 +87,18 @@ TEST_F(ServerCommit, MovesReferencesAnywhereWhenForced)
 
 TEST_F(ServerCommit, RefusesASecondBeginning)
 {
-    send(commit('a', "", {}, {}));
+    send(commit('a', "", {}, {"branch main a"}));
     EXPECT_EQ(
         send(commit('b', "", {"plan 1"}, {})),
         "error: The repository has commits already; one without a parent would not follow them. Merge what others "
         "have done, or send it as a branch of its own.");
+}
+
+TEST_F(ServerCommit, MayBeginAnewWhenTheFirstOneHasBeenTakenBack)
+{
+    send(commit('a', "", {}, {"branch main a"}));
+    EXPECT_EQ(ask("references <id>", R"([{"commitHash":"","expected":"<a>","name":"main","refType":"branch"}])"), "[]");
+    EXPECT_EQ(send(commit('b', "", {"plan 1"}, {"branch main b -"})), R"([{"commitNo":2,"hash":"<b>"}])");
 }
 
 TEST_F(ServerCommit, RefusesAnUnknownParent)

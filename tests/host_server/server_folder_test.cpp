@@ -45,9 +45,29 @@ TEST_F(ServerFolder, ShowsAnotherServerEverything)
     EXPECT_EQ(ask("references <id>", "[]"), server::references({"branch main b"}));
 }
 
+TEST_F(ServerFolder, OfAnEarlierVersionCountsAllCommitsAsHandedOut)
+{
+    ask("commit <id>", commit('b', "a", {}, {"branch main b"}));
+    {
+        tav::Database database(databasePath());
+        database.run("DROP TABLE delivered");
+        database.setVersion(1);
+    }
+    EXPECT_EQ(askAnother("references <id>", "[]"), server::references({"branch main b"}));
+    askAnother("fetch <id>", "[]");
+    EXPECT_EQ(tav::Database(databasePath()).version(), 1); // Who reads leaves it as it is.
+    EXPECT_EQ(
+        askAnother("references <id>", server::references({"branch main a b"})),
+        "error: Commit 2 cannot be taken back: it may be in other working folders. Make another commit that puts "
+        "things right.");
+    ask("commit <id>", commit('c', "b", {}, {"branch main c b"}));
+    EXPECT_EQ(
+        askAnother("references <id>", server::references({"branch main b c"})), server::references({"branch main b"}));
+}
+
 TEST_F(ServerFolder, OfANewerVersionIsRefused)
 {
-    tav::Database(databasePath()).setVersion(2);
+    tav::Database(databasePath()).setVersion(3);
     EXPECT_EQ(
         askAnother("repositories", ""),
         "error: The database '" + databasePath() +

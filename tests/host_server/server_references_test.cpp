@@ -8,6 +8,8 @@ using server::commit;
 using server::references;
 using server::replaced;
 
+constexpr char const* kRemoveMain = R"([{"commitHash":"","expected":"<b>","name":"main","refType":"branch"}])";
+
 class ServerReferences : public server::ServerTest {
 protected:
     ServerReferences()
@@ -66,16 +68,54 @@ TEST_F(ServerReferences, MoveAllOrNone)
     EXPECT_EQ(move("[]"), references({"branch main a", "tag v1 a"}));
 }
 
-TEST_F(ServerReferences, DoNotMoveBackOrAsideUnlessForced)
+TEST_F(ServerReferences, MoveBackOrAsideWhileNobodyHasWhatTheyLeave)
 {
-    std::string const refusal =
-        "error: The branch 'main' has commits that the new one does not follow. Merge what others have done, or "
-        "send it as a branch of its own.";
     move(references({"branch main b a"}));
+    EXPECT_EQ(move(references({"branch main a b"})), references({"branch main a", "tag v1 a"}));
+    EXPECT_EQ(move(references({"branch main b a"})), references({"branch main b", "tag v1 a"}));
+    EXPECT_EQ(move(references({"branch main c b"})), references({"branch main c", "tag v1 a"}));
+}
+
+TEST_F(ServerReferences, DoNotLeaveWhatOthersHaveUnlessForced)
+{
+    move(references({"branch main b a", "tag v2 b -"}));
+    ask("history <id>", R"([{"commitNo":1,"hash":""}])");
+    std::string const refusal = "error: Commit 2 cannot be taken back: 'v2' has it, and it may be in other working "
+                                "folders. Make another commit that puts things right.";
     EXPECT_EQ(move(references({"branch main a b"})), refusal);
     EXPECT_EQ(move(references({"branch main c b"})), refusal);
-    EXPECT_EQ(force(references({"branch main c", "tag v1 b"})), references({"branch main c", "tag v1 b"}));
-    EXPECT_EQ(force(references({"branch main a"})), references({"branch main a", "tag v1 b"}));
+    EXPECT_EQ(force(references({"branch main c", "tag v1 b"})), references({"branch main c", "tag v1 b", "tag v2 b"}));
+}
+
+TEST_F(ServerReferences, DoNotLeaveWhatAFetchHasBrought)
+{
+    move(references({"branch main b a"}));
+    ask("fetch <id>", "[]");
+    EXPECT_EQ(
+        move(references({"branch main a b"})),
+        "error: Commit 2 cannot be taken back: it may be in other working folders. Make another commit that puts "
+        "things right.");
+}
+
+TEST_F(ServerReferences, GoOnlyWhileNoOtherHasTheirCommits)
+{
+    force(references({"tag v1 b"}));
+    force(references({"branch main b", "branch side b"}));
+    EXPECT_EQ(
+        move(kRemoveMain), "error: Commit 1 cannot be taken back: 'side' has it, and 'v1' has it. Make another commit "
+                           "that puts things right.");
+}
+
+TEST_F(ServerReferences, GoOnlyFromWhereTheyAreExpected)
+{
+    std::string const document = R"([{"commitHash":"",MORE"name":"main","refType":"branch"}])";
+    std::string const refusal = "error: '[0].commitHash' must be a hash of 64 lower-case hexadecimal digits. Nothing "
+                                "has changed on the server.";
+    EXPECT_EQ(move(replaced(document, "MORE", "")), refusal);
+    EXPECT_EQ(move(replaced(document, "MORE", R"("expected":"",)")), refusal);
+    EXPECT_EQ(
+        move(kRemoveMain),
+        "error: The branch 'main' names another commit by now. Fetch what others have done, and try again.");
 }
 
 TEST_F(ServerReferences, KeepTheirTypeAlsoWhenForced)

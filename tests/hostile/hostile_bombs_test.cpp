@@ -4,6 +4,7 @@
 #include "host/repository/local_database.h"
 #include "host/text/utf8.h"
 
+#include "tests/host/earlier_database.h"
 #include "tests/host/history_test.h"
 #include "tests/host/run_here.h"
 #include "tests/support/rows.h"
@@ -140,7 +141,8 @@ INSTANTIATE_TEST_SUITE_P(Kinds, BombInAFile, testing::ValuesIn(kBombs), support:
 
 TEST_P(BombInAFile, IsToldWhereACommandNotedWhatItHasBegun)
 {
-    tav::LocalDatabase::make(repo.root()).setJournal(tav::fromUtf8(GetParam().text()));
+    tav::LocalDatabase::make(repo.root());
+    makeSecondVersion(repo.pathTo(".tav/tav.db"), tav::fromUtf8(GetParam().text()));
     repo.write("a.dwg", "new");
     for (Arguments const& command : {Arguments{"status"}, {"add", "--all"}}) {
         expectAnswer(limited(command));
