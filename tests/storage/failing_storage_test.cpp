@@ -49,10 +49,12 @@ public:
     }
 
     using StorageTest::commit;
+    using StorageTest::committed;
     using StorageTest::contains;
     using StorageTest::contentOf;
     using StorageTest::fileOf;
     using StorageTest::files;
+    using StorageTest::makeWhole;
     using StorageTest::newStorage;
     using StorageTest::repo;
     using StorageTest::store;
@@ -196,6 +198,33 @@ TEST_P(FailingStorage, CleansWithoutLosingWhatIsKept)
         EXPECT_EQ(scene.files(), scene.before) << name;
         std::string const content = scene.contentOf(other);
         EXPECT_TRUE(content == drawing(5, 3 * kSegment) || content == "'" + other + "' is not in the storage.");
+    }
+}
+
+TEST_P(FailingStorage, TurnsAnObjectOverOrLeavesItAsItWas)
+{
+    bool more = true;
+    for (int n = 0; more; ++n) {
+        Scene scene;
+        std::string const content = edited(drawing(2, 100), 7);
+        std::string const next = scene.commit("next", content);
+        scene.makeWhole(next, content);
+        std::string const whole = scene.repo.read(Scene::fileOf(next));
+        scene.committed["next"] = scene.object;
+        bool succeeded = false;
+        std::string name;
+        {
+            FailingCall const failing(n, GetParam());
+            tav::LocalStorage storage = scene.newStorage();
+            succeeded = storage.turnOver(support::fromUtf8(next), L"next").hasValue();
+            more = failing.hasFailed();
+            name = failing.name();
+        }
+        EXPECT_TRUE(scene.isOldWhole()) << name;
+        EXPECT_EQ(scene.contentOf(next), content) << name;
+        EXPECT_FALSE(scene.repo.has(".tav/objects/incoming/" + next.substr(3))) << name;
+        EXPECT_TRUE(succeeded || scene.repo.read(Scene::fileOf(next)) == whole) << name;
+        EXPECT_TRUE(more || scene.repo.read(Scene::fileOf(next)) != whole) << "it was not turned over at all";
     }
 }
 

@@ -194,6 +194,112 @@ TEST_F(Objects, AreVerifiedInTheirOwnFileHoweverOftenTheyWereRead)
     EXPECT_EQ(messageOf(storage.verify(support::fromUtf8(urls[1]))), "The content of " + message(1, "is damaged."));
 }
 
+/// What cleaning makes of objects.
+class TurningOver : public Objects {
+protected:
+    /// "whole" versions of a file, each of which `committed` has before the next one is turned over.
+    void commitWhole(unsigned count)
+    {
+        commitVersions(count);
+        for (std::size_t i = 0; i < urls.size(); ++i) {
+            makeWhole(urls[i], contents[i]);
+        }
+    }
+
+    /// Turns over version `i` as the one after `previous`: how many contents became smaller, or the message.
+    std::string turnOver(tav::LocalStorage& storage, std::size_t i, std::string const& previous)
+    {
+        committed["PLAN.DWG"] = previous;
+        auto const freed = storage.turnOver(support::fromUtf8(urls[i]), L"PLAN.DWG");
+        return freed.hasValue() ? std::to_string(freed.value().contents) : messageOf(freed);
+    }
+
+    void expectAllReadable() const
+    {
+        for (std::size_t i = 0; i < urls.size(); ++i) {
+            EXPECT_EQ(contentOf(urls[i]), contents[i]) << i;
+        }
+    }
+};
+
+TEST_F(TurningOver, MakesDifferencesOfWholeObjects)
+{
+    commitWhole(40);
+    tav::LocalStorage storage = newStorage();
+    EXPECT_EQ(turnOver(storage, 0, ""), "0");
+    for (std::size_t i = 1; i < urls.size(); ++i) {
+        EXPECT_EQ(turnOver(storage, i, urls[i - 1]), "1") << i;
+        EXPECT_EQ(deltasOf(urls[i]), (i - 1) % 32 + 1) << i;
+    }
+    EXPECT_EQ(messageOf(storage.flush()), "success");
+    expectAllReadable();
+    EXPECT_EQ(turnOver(storage, 5, urls[4]), "0") << "it is a difference already";
+}
+
+TEST_F(TurningOver, LeavesWhatDoesNotGetSmaller)
+{
+    commitWhole(1);
+    urls.push_back(commit("other", drawing(9, 3000)));
+    contents.push_back(drawing(9, 3000));
+    tav::LocalStorage storage = newStorage();
+    EXPECT_EQ(turnOver(storage, 1, urls[0]), "0");
+    EXPECT_TRUE(objectOf(urls[1]).isWhole());
+    EXPECT_THAT(files(), testing::Not(testing::Contains(testing::HasSubstr("incoming/"))));
+}
+
+TEST_F(TurningOver, MakesNoCircle)
+{
+    commitVersions(3);
+    tav::LocalStorage storage = newStorage();
+    EXPECT_EQ(turnOver(storage, 0, urls[2]), "0") << "a file that became again what it was";
+    EXPECT_EQ(turnOver(storage, 0, urls[0]), "0");
+    expectAllReadable();
+}
+
+TEST_F(TurningOver, MakesNoChainTooLong)
+{
+    commitVersions(34); // 32 differences on the first one, and one more
+    std::string const first = store("first.DWG", edited(contents[0], 99));
+    tav::LocalStorage storage = newStorage();
+    EXPECT_EQ(turnOver(storage, 0, first), "0");
+    expectAllReadable();
+}
+
+TEST_F(TurningOver, LeavesADamagedObjectAndBuildsNothingOnOne)
+{
+    commitWhole(3);
+    repo.write(fileOf(urls[1]), "damaged");
+    tav::LocalStorage storage = newStorage();
+    EXPECT_EQ(turnOver(storage, 1, urls[0]), "0");
+    EXPECT_EQ(turnOver(storage, 2, urls[1]), "0");
+    EXPECT_EQ(repo.read(fileOf(urls[1])), "damaged");
+    EXPECT_TRUE(objectOf(urls[2]).isWhole());
+}
+
+TEST_F(TurningOver, LeavesAllThatOthersBuildOnWhenTheRestIsRemoved)
+{
+    commitVersions(4);
+    std::string const dropped = store("dropped", "dropped");
+    auto const freed = newStorage().keepOnly({support::fromUtf8(urls[2])});
+    ASSERT_TRUE(freed.hasValue()) << messageOf(freed);
+    EXPECT_EQ(freed.value().contents, 2u);
+    EXPECT_EQ(contentOf(urls[2]), contents[2]);
+    EXPECT_FALSE(contains(urls[3]));
+    EXPECT_FALSE(contains(dropped));
+}
+
+TEST_F(TurningOver, RemovesNoObjectWhereItIsNotKnownWhatOneBuildsOn)
+{
+    commitVersions(3);
+    std::string bytes = repo.read(fileOf(urls[1]));
+    bytes[40] = static_cast<char>(bytes[40] ^ 1);
+    repo.write(fileOf(urls[1]), bytes);
+    EXPECT_EQ(
+        messageOf(newStorage().keepOnly({support::fromUtf8(urls[1])})), "The object '" + urls[1] + "' is damaged.");
+    EXPECT_EQ(contentOf(urls[0]), contents[0]);
+    EXPECT_EQ(repo.read(fileOf(urls[1])), bytes);
+}
+
 /// Objects as somebody else could have made them.
 class MadeUpObjects : public StorageTest {
 protected:

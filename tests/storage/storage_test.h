@@ -10,9 +10,12 @@
 
 #include <gmock/gmock.h>
 
+#include <algorithm>
+#include <filesystem>
 #include <map>
 #include <random>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace storage_tests {
@@ -111,6 +114,16 @@ protected:
 
     /// The record of an object.
     tav::Record objectOf(std::string const& url) const { return recordsOf(url).entries().at(0).record; }
+    /// Makes an object whole, as earlier versions of tav stored all of them.
+    void makeWhole(std::string const& url, std::string const& content) const
+    {
+        std::filesystem::remove(repo.pathTo(fileOf(url)));
+        tav::Buffer bytes;
+        std::copy(content.begin(), content.end(), bytes.reserve(content.size()));
+        tav::RecordFile::create(repo.pathTo(fileOf(url)), "The object")
+            .append({std::move(bytes), content.size()}, *tav::digestFromHex(url.substr(3)), nullptr, kSegmentLog);
+    }
+
     /// The URL of the object that the one at `url` builds on.
     std::string baseOf(std::string const& url) const { return "po:" + tav::hexOf(objectOf(url).base); }
     /// How many differences lead to an object.
