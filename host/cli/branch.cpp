@@ -86,9 +86,52 @@ void make(ReferenceOptions const& options, Kind const& kind)
         std::to_string(commit.number) + ".\n");
 }
 
-void listOrMake(ReferenceOptions const& options, Kind const& kind)
+void remove(ReferenceOptions const& options, Kind const& kind)
 {
-    if (options.name) {
+    WriteSession session(openRepository(""), kind.name);
+    LocalDatabase& database = session.database();
+    common::Reference const reference = findReference(database, fromUtf8(*options.name), kind.type);
+    std::string const name = shown(reference.name);
+    if (kind.type == common::EType::branch && reference.name == readState(session.root())->read().head) {
+        throw Failure("You are on the branch '" + name + "'.", "Run 'tav switch' to go to another branch first.");
+    }
+    if (!options.force) {
+        failIfOnlyWayToCommits(database, reference);
+    }
+    auto const commit = database.commits().find(reference.commitHash);
+    std::string const number = commit ? std::to_string(commit->number) : reference.commitHash.ansi_str();
+    std::string const what = std::string(kind.name) + " '" + name + "', which was at commit " + number;
+    if (options.dryRun) {
+        print("Would delete the " + what + ".\n");
+        return;
+    }
+    removeReference(database, reference);
+    report("Deleted the " + what + ".\n");
+}
+
+void rename(ReferenceOptions const& options)
+{
+    WriteSession session(openRepository(""), "branch");
+    common::RootPath const& root = session.root();
+    OdString const head = readState(root)->read().head;
+    bool const namesBoth = !options.commit.empty();
+    OdString const from = namesBoth ? fromUtf8(*options.name) : head;
+    OdString const to = fromUtf8(namesBoth ? options.commit : *options.name);
+    renameBranch(session.database(), findReference(session.database(), from, common::EType::branch), to, [&] {
+        if (from == head) {
+            changeState(root, [&](common::Cache& cache) { cache.write().head = to; });
+        }
+    });
+    report("Renamed the branch '" + shown(from) + "' to '" + shown(to) + "'.\n");
+}
+
+void run(ReferenceOptions const& options, Kind const& kind)
+{
+    if (options.isDeleted) {
+        remove(options, kind);
+    } else if (options.isRenamed) {
+        rename(options);
+    } else if (options.name) {
         make(options, kind);
     } else {
         list(options, kind);
@@ -99,12 +142,12 @@ void listOrMake(ReferenceOptions const& options, Kind const& kind)
 
 void branch(ReferenceOptions const& options)
 {
-    listOrMake(options, kBranch);
+    run(options, kBranch);
 }
 
 void tag(ReferenceOptions const& options)
 {
-    listOrMake(options, kTag);
+    run(options, kTag);
 }
 
 } // namespace tav

@@ -3,13 +3,16 @@
 #include "host/cli/output.h"
 #include "host/cli/typed_command.h"
 #include "host/commits/commit_names.h"
+#include "host/commits/references.h"
 #include "host/errors/failure.h"
+#include "host/repository/journal.h"
 #include "host/repository/open.h"
 #include "host/repository/working_state.h"
 #include "host/session/write_session.h"
 #include "host/text/plural.h"
 #include "host/text/utf8.h"
 
+#include <filesystem>
 #include <string>
 
 namespace tav {
@@ -47,22 +50,89 @@ std::string described(CheckedOut const& result, common::RootPath const& root)
     return staged == 0 ? text : text + counted(staged, "staged file") + " carried along.\n";
 }
 
+void goTo(
+    WriteSession& session, common::Reference const& branch, OdString const& command, CheckoutOptions const& options)
+{
+    CheckedOut const result = checkOutCommit(
+        session.root(), session.database(), {branch.commitHash, branch.name}, command, discardOf(options),
+        session.start());
+    report("Now on branch " + shown(branch.name) + described(result, session.root()));
+}
+
+/// Before the first commit no branch exists, and the first one only gets another name.
+void nameFirstBranch(common::RootPath const& root, OdString const& name)
+{
+    requireReferenceName(name);
+    changeState(root, [&](common::Cache& cache) { cache.write().head = name; });
+    report("Now on branch " + shown(name) + ".\n");
+}
+
+void switchToNew(WriteSession& session, CheckoutOptions const& options)
+{
+    LocalDatabase& database = session.database();
+    OdString const name = fromUtf8(options.target);
+    if (options.commit.empty() && database.currentCommit().isEmpty()) {
+        nameFirstBranch(session.root(), name);
+        return;
+    }
+    session.failIfBetweenCommits();
+    common::Reference const branch(name, findCommit(database, options.commit).hash, common::EType::branch);
+    makeReference(database, branch);
+    try {
+        goTo(session, branch, typedCommand("switch -c", {options.target}), options);
+    } catch (Failure const&) {
+        if (readState(session.root())->read().head != name && readJournal(database).index() == 0) {
+            removeReference(database, branch); // Nothing has been touched, so the command has done nothing.
+        }
+        throw;
+    }
+}
+
+bool isFile(std::string const& name)
+{
+    std::error_code error;
+    return std::filesystem::exists(std::filesystem::symlink_status(name, error));
+}
+
+CommitRecord commitToGoTo(LocalDatabase const& database, std::string const& typed)
+{
+    auto const commit = findCommitIfAny(database, typed);
+    if (!commit && isFile(typed)) {
+        throw Failure(
+            "'" + typed + "' is a file, not a commit.", "Run 'tav restore " + typed + "' to bring a file back.");
+    }
+    return commit ? *commit : findCommit(database, typed);
+}
+
 } // namespace
 
 void checkOut(CheckoutOptions const& options)
 {
     WriteSession session(openRepository(""), "checkout");
-    CommitRecord const commit = findCommit(session.database(), options.target);
+    auto const reference = session.database().commits().reference(fromUtf8(options.target));
+    if (reference && reference->type == common::EType::branch) {
+        goTo(session, *reference, typedCommand("checkout", {options.target}), options);
+        return;
+    }
+    CommitRecord const commit = commitToGoTo(session.database(), options.target);
     OdString const branch = readState(session.root())->read().head;
     CheckedOut const result = checkOutCommit(
         session.root(), session.database(), {commit.hash, branch}, typedCommand("checkout", {options.target}),
         discardOf(options), session.start());
     report("Now at commit " + std::to_string(commit.number) + described(result, session.root()));
+    auto const end = session.database().commits().reference(branch);
+    if (end && end->commitHash != commit.hash) {
+        report("To commit here, create a branch with 'tav switch -c NAME'.\n");
+    }
 }
 
 void switchBranch(CheckoutOptions const& options)
 {
     WriteSession session(openRepository(""), "switch");
+    if (options.isNew) {
+        switchToNew(session, options);
+        return;
+    }
     auto const branch = session.database().commits().reference(fromUtf8(options.target));
     if (branch && branch->type == common::EType::tag) {
         throw Failure("'" + options.target + "' is a tag.", "Use 'tav checkout " + options.target + "' to go there.");
@@ -70,12 +140,9 @@ void switchBranch(CheckoutOptions const& options)
     if (!branch) {
         throw Failure(
             "There is no branch '" + options.target + "'.",
-            "Run 'tav branch' to see those that there are, or 'tav branch NAME' to make one.");
+            "Run 'tav branch' to see those that there are, or 'tav switch -c NAME' to create one.");
     }
-    CheckedOut const result = checkOutCommit(
-        session.root(), session.database(), {branch->commitHash, branch->name},
-        typedCommand("switch", {options.target}), discardOf(options), session.start());
-    report("Now on branch " + shown(branch->name) + described(result, session.root()));
+    goTo(session, *branch, typedCommand("switch", {options.target}), options);
 }
 
 } // namespace tav

@@ -102,6 +102,8 @@ void restoreFiles(RestoreOptions const& options);
 
 struct CheckoutOptions {
     std::string target;
+    std::string commit; ///< where a new branch begins; empty: where the user is
+    bool isNew = false; ///< the branch is created
     bool force = false;
 };
 void checkOut(CheckoutOptions const& options);
@@ -119,7 +121,11 @@ void redo(UndoOptions const& options);
 
 struct ReferenceOptions {
     std::optional<std::string> name; ///< of a new one; without it they are listed
-    std::string commit;              ///< empty: where the user is
+    std::string commit;              ///< empty: where the user is; the new name of a branch that is renamed
+    bool isDeleted = false;
+    bool isRenamed = false;
+    bool force = false; ///< also if no other branch or tag leads to the commits
+    bool dryRun = false;
     bool json = false;
 };
 void branch(ReferenceOptions const& options);

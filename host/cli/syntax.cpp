@@ -266,6 +266,12 @@ void addSwitch(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("switch", "Go on with the work on another branch");
     auto const options = addCheckoutOptions(*command, "BRANCH", "Name of the branch");
+    CLI::Option* const create = command->add_flag("-c,--create", options->isNew, "Create the branch");
+    command->add_option("COMMIT", options->commit, "Where a new branch begins; by default where you are")
+        ->needs(create);
+    addExamples(
+        *command, "  tav switch master\n"
+                  "  tav switch -c variant tender    create a branch at a tag, and go there");
     command->callback([options] { switchBranch(*options); });
 }
 
@@ -303,13 +309,43 @@ void addRedo(CLI::App& app)
     command->callback([options] { redo(*options); });
 }
 
-void addReferences(CLI::App& command, void (*run)(ReferenceOptions const& options))
+/// Options of branches and tags alike. Returns the one for the name.
+CLI::Option* addReferenceOptions(CLI::App& command, ReferenceOptions& options)
 {
+    CLI::Option* const name = command.add_option("NAME", options.name, "Name of a new one; without it, list them");
+    command.add_option("COMMIT", options.commit, "Where it begins; by default where you are")->needs(name);
+    command.add_flag("--json", options.json, "Print a document for programs")->excludes(name);
+    CLI::Option* const remove = command.add_flag("-d,--delete", options.isDeleted, "Delete the one called NAME");
+    remove->needs(name);
+    command.add_flag("--force", options.force, "Delete it even if nothing else leads to its commits")->needs(remove);
+    command.add_flag("--dry-run", options.dryRun, "Only show what would be deleted")->needs(remove);
+    return remove;
+}
+
+void addBranch(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("branch", "List the branches, or create, rename or delete one");
     auto const options = std::make_shared<ReferenceOptions>();
-    CLI::Option* const name = command.add_option("NAME", options->name, "Name of a new one; without it, list them");
-    command.add_option("COMMIT", options->commit, "Where it begins; by default where you are")->needs(name);
-    command.add_flag("--json", options->json, "Print a document for programs")->excludes(name);
-    command.callback([options, run] { run(*options); });
+    CLI::Option* const remove = addReferenceOptions(*command, *options);
+    command->add_flag("-m,--move", options->isRenamed, "Rename the current branch to NAME, or NAME to COMMIT")
+        ->needs(command->get_option("NAME"))
+        ->excludes(remove);
+    addExamples(
+        *command, "  tav branch variant        create a branch here\n"
+                  "  tav branch -m draft plan  give the branch draft the name plan\n"
+                  "  tav branch -d variant     delete a branch");
+    command->callback([options] { branch(*options); });
+}
+
+void addTag(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("tag", "List the tags, or create or delete one");
+    auto const options = std::make_shared<ReferenceOptions>();
+    addReferenceOptions(*command, *options);
+    addExamples(
+        *command, "  tav tag tender 12    name commit 12\n"
+                  "  tav tag -d tender    delete a tag");
+    command->callback([options] { tag(*options); });
 }
 
 void addServer(CLI::App& app)
@@ -428,8 +464,8 @@ void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
     addSwitch(app);
     addUndo(app);
     addRedo(app);
-    addReferences(*app.add_subcommand("branch", "List the branches, or make one"), branch);
-    addReferences(*app.add_subcommand("tag", "List the tags, or make one"), tag);
+    addBranch(app);
+    addTag(app);
     app.add_subcommand("fetch", "Learn the commits, branches and tags that the server has")->callback(fetch);
     addServer(app);
     addFiles(app);

@@ -68,15 +68,18 @@ _tav_options() { # COMMAND
         log) printf '%s\n' -n --count --since --until --author --all --oneline --json ;;
         preview | compare) printf '%s\n' -o --output --json ;;
         restore) printf '%s\n' --from --force ;;
-        checkout | switch) printf '%s\n' --force ;;
         undo) printf '%s\n' --list -n --count --dry-run --force --json ;;
         redo) printf '%s\n' --dry-run --force --json ;;
+        checkout) printf '%s\n' --force ;;
+        switch) printf '%s\n' -c --create --force ;;
+        branch) printf '%s\n' -d --delete --force --dry-run -m --move --json ;;
+        tag) printf '%s\n' -d --delete --force --dry-run --json ;;
         server) printf '%s\n' --send ;;
         files) printf '%s\n' --hash --long --at --json ;;
         ignore) printf '%s\n' --add --json ;;
         config) printf '%s\n' --list --unset --user --repository --json ;;
         diff) printf '%s\n' --stat --text --json ;;
-        show | branch | tag | projects | verify) printf '%s\n' --json ;;
+        show | projects | verify) printf '%s\n' --json ;;
     esac
     printf '%s\n' -h --help
 }

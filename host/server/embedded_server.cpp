@@ -225,7 +225,7 @@ void requireLeavable(
     }
 }
 
-void removeReference(Request const& request, CommitTables& tables, ReferenceChange const& change)
+void removeReference(Request const& request, CommitTables& tables, ReferenceChange const& change, Force force)
 {
     auto const there = tables.reference(change.reference.name);
     if (!there) {
@@ -233,7 +233,9 @@ void removeReference(Request const& request, CommitTables& tables, ReferenceChan
     }
     requireSameType(*there, change.reference);
     requireExpected(there, change);
-    requireLeavable(request, tables, *there, OdString());
+    if (force == Force::no) {
+        requireLeavable(request, tables, *there, OdString());
+    }
     tables.removeReference(there->name);
 }
 
@@ -241,7 +243,7 @@ void setReference(Request const& request, CommitTables& tables, ReferenceChange 
 {
     common::Reference const& wanted = change.reference;
     if (wanted.commitHash.isEmpty()) {
-        removeReference(request, tables, change);
+        removeReference(request, tables, change, force);
         return;
     }
     if (!tables.find(wanted.commitHash)) {

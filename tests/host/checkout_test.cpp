@@ -134,7 +134,9 @@ protected:
 
 TEST_F(Moving, CheckoutMakesTheFolderWhatItWas)
 {
-    EXPECT_EQ(tav({"checkout", "1"}), done("Now at commit 1 (2 files written, 1 removed).\n"));
+    EXPECT_EQ(
+        tav({"checkout", "1"}), done("Now at commit 1 (2 files written, 1 removed).\n"
+                                     "To commit here, create a branch with 'tav switch -c NAME'.\n"));
     EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "sub/", "sub/b.txt"));
     EXPECT_EQ(repo.read("a.dwg"), "one");
     EXPECT_EQ(
@@ -304,7 +306,9 @@ TEST_F(Moving, SwitchCarriesStagedFilesAlongAndSaysSo)
 TEST_F(Moving, CheckoutTakesAFileThatHoldsTheNewContentAsItIs)
 {
     repo.write("a.dwg", "one");
-    EXPECT_EQ(tav({"checkout", "1"}), done("Now at commit 1 (1 file written, 1 removed).\n"));
+    EXPECT_EQ(
+        tav({"checkout", "1"}), done("Now at commit 1 (1 file written, 1 removed).\n"
+                                     "To commit here, create a branch with 'tav switch -c NAME'.\n"));
     EXPECT_EQ(status(), kClean);
 }
 
@@ -371,7 +375,7 @@ TEST_F(Moving, SwitchWantsABranch)
             tav({"switch", name}),
             failed(
                 "tav: There is no branch '" + name +
-                "'. Run 'tav branch' to see those that there are, or 'tav branch NAME' to make one.\n"));
+                "'. Run 'tav branch' to see those that there are, or 'tav switch -c NAME' to create one.\n"));
     }
 }
 
