@@ -45,6 +45,12 @@ bool mustBeEscaped(wchar_t c)
     return isControl(c) || isInvisible(c) || isHigh(c) || isLow(c);
 }
 
+/// A byte of a name that is not valid UTF-8.
+bool isStrayByte(wchar_t c)
+{
+    return c >= 0xDC80 && c <= 0xDCFF;
+}
+
 OdString asText(std::wstring const& characters)
 {
     return OdString(characters.data(), characters.size());
@@ -99,12 +105,24 @@ bool isInvisible(wchar_t c)
     return range != kInvisible.end() && code >= range->first;
 }
 
+bool cannotBeSeen(wchar_t c)
+{
+    return isControl(c) || isInvisible(c) || isStrayByte(c);
+}
+
+OdString asEscape(wchar_t c)
+{
+    auto const code = static_cast<unsigned>(c);
+    bool const isByte = code <= 0xFF || isStrayByte(c);
+    return OdString().format(isByte ? L"\\x%02X" : L"\\u%04X", isByte ? code & 0xFF : code);
+}
+
 std::string quoted(OdString const& text)
 {
     OdString shown;
     for (std::size_t i = 0; i < std::min(text.getLength(), kLongestQuote); ++i) {
         wchar_t const c = text.getAt(i);
-        shown += mustBeEscaped(c) ? OdString().format(L"\\u%04X", static_cast<unsigned>(c)) : OdString(&c, 1);
+        shown += mustBeEscaped(c) ? asEscape(c) : OdString(&c, 1);
     }
     return "'" + shown.ansi_str() + (text.getLength() > kLongestQuote ? "...'" : "'");
 }

@@ -22,6 +22,13 @@ bool isControl(wchar_t c);
 /// pass over them in names.
 bool isInvisible(wchar_t c);
 
+/// Whether a terminal obeys the character, passes over it, or may take it for another one: that may happen to a byte of
+/// a name that is not valid UTF-8.
+bool cannotBeSeen(wchar_t c);
+
+/// The character as lists and messages show it when it cannot be seen: a byte as "\x0A", others as "\u200B".
+OdString asEscape(wchar_t c);
+
 /// `text` in quotes for messages, on one line: what cannot be seen is escaped, and a long text is cut off.
 std::string quoted(OdString const& text);
 

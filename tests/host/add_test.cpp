@@ -284,8 +284,8 @@ TEST_F(Add, NamesAllFilesThatNoCommitCanKeep)
         EXPECT_EQ(
             tav({"add", name}), failed(
                                     refusal +
-                                    "  The path 'b\\u000A.dwg' holds a control character or a line end.\n"
-                                    "  The path 'c\\u001B.dwg' holds a control character or a line end.\n" +
+                                    "  The path 'b\\x0A.dwg' holds a control character or a line end.\n"
+                                    "  The path 'c\\x1B.dwg' holds a control character or a line end.\n" +
                                     ofNoCharacter));
     }
     EXPECT_EQ(tav({"add", "a.dwg", noCharacter}), failed(refusal + ofNoCharacter));

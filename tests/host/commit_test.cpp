@@ -439,8 +439,8 @@ TEST_F(Commit, RefusesNamesThatNoSystemShallMeet)
         tav({"commit", "-m", "drawn"}),
         failed("tav: No commit can keep these names. Nothing has been committed; rename the files, or take them out "
                "with 'tav unstage NAME':\n"
-               "  The path 'a\\u001B[31m.dwg' holds a control character or a line end.\n"
-               "  The path 'b\\u000A.dwg' holds a control character or a line end.\n"));
+               "  The path 'a\\x1B[31m.dwg' holds a control character or a line end.\n"
+               "  The path 'b\\x0A.dwg' holds a control character or a line end.\n"));
 }
 
 TEST_F(Commit, IsShownWithItsControlCharactersEscapedOnATerminal)

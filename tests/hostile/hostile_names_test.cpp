@@ -181,7 +181,7 @@ TEST_F(NameWithControls, IsTakenByNoCommit)
         tav({"add", "--all"}),
         failed("tav: No commit can keep these names. Nothing has been staged; rename the files, or leave them out with "
                "'tav ignore':\n"
-               "  The path 'a\\u000A\\u001B]0;b\\u0007\\u000D\\u007F.dwg' holds a control character or a line end.\n"));
+               "  The path 'a\\x0A\\x1B]0;b\\x07\\x0D\\x7F.dwg' holds a control character or a line end.\n"));
     EXPECT_EQ(tav({"add", "b.dwg", ".tav/properties/ignore"}).code, 0);
     EXPECT_EQ(tav({"commit", "-m", "the rest"}).code, 0);
     EXPECT_EQ(tav({"mv", kName, "c.dwg"}), done("Renamed '" + std::string(kShown) + "' to 'c.dwg'.\n"));
