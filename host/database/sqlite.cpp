@@ -17,18 +17,6 @@ sqlite3* opened(std::string const& path, int flags, int& code)
     return handle;
 }
 
-std::string adviceFor(int code, std::string const& path)
-{
-    switch (code & 0xFF) {
-    case SQLITE_BUSY:
-    case SQLITE_LOCKED: return "Another program uses it; run the command again when that is done.";
-    case SQLITE_CORRUPT:
-    case SQLITE_NOTADB: return "Put a copy of it from a backup in its place.";
-    case SQLITE_FULL: return "Free some space there and run the command again; nothing has changed.";
-    default: return "Check the free space and your rights in the folder of '" + path + "'.";
-    }
-}
-
 } // namespace
 
 Statement::Statement(Database const& database, Handle handle) : database_(&database), handle_(std::move(handle)) {}
@@ -101,7 +89,13 @@ OdString Statement::text(int column) const
 }
 
 Database::Database(std::string const& path, std::chrono::milliseconds patience)
+    : Database(path, "Put a copy of it from a backup in its place.", patience)
+{
+}
+
+Database::Database(std::string const& path, char const* adviceForDamage, std::chrono::milliseconds patience)
     : path_(path)
+    , adviceForDamage_(adviceForDamage)
     , handle_(nullptr, sqlite3_close_v2)
 {
     constexpr int kOneThread = SQLITE_OPEN_NOMUTEX; // Locks took a tenth of the time of reading a long table.
@@ -165,9 +159,21 @@ std::string Database::damage() const
     return found == "ok" ? std::string() : found;
 }
 
+std::string Database::adviceFor(int code) const
+{
+    switch (code & 0xFF) {
+    case SQLITE_BUSY:
+    case SQLITE_LOCKED: return "Another program uses it; run the command again when that is done.";
+    case SQLITE_CORRUPT:
+    case SQLITE_NOTADB: return adviceForDamage_;
+    case SQLITE_FULL: return "Free some space there and run the command again; nothing has changed.";
+    default: return "Check the free space and your rights in the folder of '" + path_ + "'.";
+    }
+}
+
 void Database::fail(int code) const
 {
-    throw Failure("The database '" + path_ + "' cannot be used: " + sqlite3_errstr(code) + ".", adviceFor(code, path_));
+    throw Failure("The database '" + path_ + "' cannot be used: " + sqlite3_errstr(code) + ".", adviceFor(code));
 }
 
 // A savepoint, unlike a transaction, may stand inside of a change.

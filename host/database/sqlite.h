@@ -58,6 +58,8 @@ public:
     /// written it is opened for reading. Triggers and views of the file are not run. While another program holds the
     /// file an operation waits up to `patience`.
     explicit Database(std::string const& path, std::chrono::milliseconds patience = kPatience);
+    /// The same, with the advice for a damaged file, a sentence.
+    Database(std::string const& path, char const* adviceForDamage, std::chrono::milliseconds patience = kPatience);
 
     std::string const& path() const { return path_; }
 
@@ -76,8 +78,10 @@ public:
 
 private:
     void distrustSchema();
+    std::string adviceFor(int code) const;
 
     std::string path_;
+    char const* adviceForDamage_;
     std::unique_ptr<sqlite3, int (*)(sqlite3*)> handle_;
 };
 

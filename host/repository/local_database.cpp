@@ -41,6 +41,9 @@ constexpr std::array kSteps = {makeFirstTables,     VerifiedFiles::create, Commi
 constexpr std::int64_t kVersion = kSteps.size();
 constexpr std::int64_t kFirstWithVerifiedFiles = 2;
 constexpr std::int64_t kFirstWithOperations = 6;
+constexpr char const* kAdviceForDamage =
+    "Put a copy of it from a backup in its place, or move it away and run 'tav init', which makes it again from the "
+    "server.";
 
 void failIfLost(common::RootPath const& root)
 {
@@ -90,7 +93,7 @@ LocalDatabase LocalDatabase::open(common::RootPath const& root)
 }
 
 LocalDatabase::LocalDatabase(std::string const& path, Use use)
-    : database_(path)
+    : database_(path, kAdviceForDamage)
     , commits_(database_, 1)
     , verifiedFiles_(database_)
     , operations_(database_)
@@ -137,9 +140,7 @@ PendingOperation LocalDatabase::pendingOperation() const
 void LocalDatabase::failIfDamaged() const
 {
     if (std::string const damage = database_.damage(); !damage.empty()) {
-        throw Failure(
-            "The database '" + path() + "' is damaged: " + damage + ".",
-            "Put a copy of it from a backup in its place.");
+        throw Failure("The database '" + path() + "' is damaged: " + damage + ".", kAdviceForDamage);
     }
 }
 

@@ -340,7 +340,9 @@ TEST_F(WaitingCommit, IsSentWhenTheServerIsFoundAgain)
         tav({"log"}).err, "tav: A commit was interrupted. The next command that changes something completes it.\n");
     EXPECT_THAT(tav({"switch", "side"}).err, HasSubstr("run 'tav server FOLDER'"));
     EXPECT_EQ(tav({"server", place.pathTo("moved")}).code, 0);
-    EXPECT_EQ(tav({"commit", "-m", "third", "--author", "ann@studio"}).out.substr(0, 18), "Completed commit 3");
+    Outcome const repeated = tav({"commit", "-m", "third", "--author", "ann@studio"});
+    EXPECT_EQ(repeated.out.substr(0, 18), "Completed commit 3");
+    EXPECT_EQ(repeated.err, "");
     EXPECT_EQ(tav({"log"}).err, "");
 }
 
@@ -410,6 +412,23 @@ TEST_F(LostDatabase, IsMadeAgainFromTheServer)
     EXPECT_EQ(tav({"verify"}), done("Read 3 stored versions; nothing is damaged.\n"));
     commitFile("note.txt", "more", "third");
     EXPECT_FALSE(place.has("repository/.tav/tav.db.new"));
+}
+
+TEST_F(LostDatabase, ReplacesADamagedOneThatWasMovedAway)
+{
+    std::string const before = history();
+    std::string const database = place.read("repository/.tav/tav.db");
+    constexpr char const* kAdvice = "Put a copy of it from a backup in its place, or move it away and run 'tav init', "
+                                    "which makes it again from the server.\n";
+    for (std::string const& damaged : {std::string("no database"), database.substr(0, 3 * 4096)}) {
+        place.write("repository/.tav/tav.db", damaged);
+        Outcome const outcome = tav({"verify"});
+        EXPECT_EQ(outcome.code, 1);
+        EXPECT_THAT(outcome.err, testing::EndsWith(kAdvice));
+        move("repository/.tav/tav.db", "damaged.db");
+        EXPECT_EQ(tav({"init", "--server", server()}).code, 0);
+        EXPECT_EQ(history(), before);
+    }
 }
 
 TEST_F(LostDatabase, IsThatOfTheRepositoryWhoseVersionsAreHere)
