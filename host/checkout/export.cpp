@@ -1,6 +1,7 @@
 #include "host/checkout/export.h"
 
 #include "host/checkout/working_tree.h"
+#include "host/client/contents.h"
 #include "host/errors/failure.h"
 #include "host/history/tracked_path.h"
 #include "host/storage/local_storage.h"
@@ -10,6 +11,7 @@
 #include "platform/os/os_files.h"
 
 #include <filesystem>
+#include <iterator>
 #include <vector>
 
 namespace tav {
@@ -33,9 +35,13 @@ void prepare(std::string const& target)
 }
 
 /// What belongs to the repository itself would make the folder look like one.
-bool isExported(OdString const& path)
+Tree withoutOwnFiles(Tree files)
 {
-    return path.left(5) != OdString(L".tav/");
+    for (auto file = files.begin(); file != files.end();) {
+        bool const isOwn = file->first.left(5) == OdString(L".tav/");
+        file = isOwn ? files.erase(file) : std::next(file);
+    }
+    return files;
 }
 
 void checkPaths(Tree const& files)
@@ -60,17 +66,12 @@ void takeBack(std::vector<OdString> const& written, std::string const& target)
     }
 }
 
-void exportTo(
-    std::string const& target, common::RootPath const& root, Tree const& files, std::vector<OdString>& written)
+void exportTo(std::string const& target, LocalStorage& storage, Tree const& files, std::vector<OdString>& written)
 {
-    LocalStorage storage(root);
     os::Batch batch(target);
     Progress progress("files", files.size());
     for (auto const& [path, url] : files) {
         progress.advance();
-        if (!isExported(path)) {
-            continue;
-        }
         extract(storage, {path, url}, target + kIncoming);
         written.push_back(path);
         if (std::error_code const error = batch.place(target + kIncoming, path.ansi_str())) {
@@ -84,13 +85,17 @@ void exportTo(
 
 } // namespace
 
-std::size_t exportFiles(common::RootPath const& root, Tree const& files, std::string const& target)
+std::size_t
+exportFiles(common::RootPath const& root, LocalDatabase const& database, Tree const& files, std::string const& target)
 {
     checkPaths(files);
+    Tree const exported = withoutOwnFiles(files);
+    LocalStorage storage(root);
+    requireHere(exported, database, storage);
     prepare(target);
     std::vector<OdString> written;
     try {
-        exportTo(target, root, files, written);
+        exportTo(target, storage, exported, written);
     } catch (...) {
         takeBack(written, target);
         throw;

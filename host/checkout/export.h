@@ -1,7 +1,7 @@
 /// Files of a commit outside of the repository.
 #pragma once
 
-#include "host/history/commit_tables.h"
+#include "host/repository/local_database.h"
 
 #include "common/mu_common_repo_prop.h"
 
@@ -12,6 +12,7 @@ namespace tav {
 
 /// Writes `files` into the folder `target`, in bytes, which is made when it is missing and must be empty else; returns
 /// their number. All of it is safe on the disk then. Throws `Failure`; what was written until then stays there.
-std::size_t exportFiles(common::RootPath const& root, Tree const& files, std::string const& target);
+std::size_t
+exportFiles(common::RootPath const& root, LocalDatabase const& database, Tree const& files, std::string const& target);
 
 } // namespace tav

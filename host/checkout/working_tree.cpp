@@ -6,6 +6,7 @@
 #include "host/changes/stored_copies.h"
 #include "host/checkout/file_clock.h"
 #include "host/checkout/permissions.h"
+#include "host/client/contents.h"
 #include "host/errors/failure.h"
 #include "host/history/tracked_path.h"
 #include "host/terminal/progress.h"
@@ -456,6 +457,7 @@ void checkUpdate(
 {
     Check check(root, database, staged, discard, update);
     check.run();
+    requireHere(update.writes, database, storage);
     Progress progress("stored versions", check.replaced().size());
     for (auto const& [path, url] : check.replaced()) {
         requireStored(storage, path, url);

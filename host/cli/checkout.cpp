@@ -2,6 +2,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/cli/typed_command.h"
+#include "host/client/history.h"
 #include "host/commits/commit_names.h"
 #include "host/commits/references.h"
 #include "host/errors/failure.h"
@@ -104,6 +105,17 @@ CommitRecord commitToGoTo(LocalDatabase const& database, std::string const& type
     return commit ? *commit : findCommit(database, typed);
 }
 
+[[noreturn]] void failForUnknownBranch(std::string const& name, LocalDatabase const& database)
+{
+    if (isNamedThere(fromUtf8(name), database)) {
+        throw Failure(
+            "'" + name + "' is known only to the server.", "Run 'tav fetch' to learn it, and then this command again.");
+    }
+    throw Failure(
+        "There is no branch '" + name + "'.",
+        "Run 'tav branch' to see those that there are, or 'tav switch -c NAME' to create one.");
+}
+
 } // namespace
 
 void checkOut(CheckoutOptions const& options)
@@ -138,9 +150,7 @@ void switchBranch(CheckoutOptions const& options)
         throw Failure("'" + options.target + "' is a tag.", "Use 'tav checkout " + options.target + "' to go there.");
     }
     if (!branch) {
-        throw Failure(
-            "There is no branch '" + options.target + "'.",
-            "Run 'tav branch' to see those that there are, or 'tav switch -c NAME' to create one.");
+        failForUnknownBranch(options.target, session.database());
     }
     goTo(session, *branch, typedCommand("switch", {options.target}), options);
 }

@@ -2,6 +2,7 @@
 
 #include "host/changes/line_diff.h"
 #include "host/cli/output.h"
+#include "host/client/contents.h"
 #include "host/commits/commit_names.h"
 #include "host/errors/failure.h"
 #include "host/repository/names.h"
@@ -28,7 +29,10 @@ fileOf(CommitRecord const& commit, std::string const& name, LocalDatabase const&
             "Commit " + std::to_string(commit.number) + " has no file '" + name + "'.",
             "Run 'tav files --at " + std::to_string(commit.number) + "' to see its files.");
     }
-    return {commit.number, found.front().path, files.at(found.front().path)};
+    OdString const& path = found.front().path;
+    LocalStorage storage(root);
+    requireHere({{path, files.at(path)}}, database, storage);
+    return {commit.number, path, files.at(path)};
 }
 
 constexpr char const* kVerify = "Run 'tav verify' to see what is damaged.";

@@ -17,7 +17,7 @@ void exportCommit(std::string const& typed, std::string const& target)
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
     CommitRecord const commit = findCommit(database, typed);
-    std::size_t const count = exportFiles(root, database.commits().files(commit.hash), target);
+    std::size_t const count = exportFiles(root, database, database.commits().files(commit.hash), target);
     report(
         "Wrote " + counted(count, "file") + " of commit " + std::to_string(commit.number) + " into '" +
         shown(fromUtf8(target)) + "'.\n");

@@ -1,6 +1,7 @@
 #include "host/client/contents.h"
 
-#include "host/storage/local_storage.h"
+#include "host/errors/failure.h"
+#include "host/text/characters.h"
 
 #include <algorithm>
 
@@ -35,6 +36,17 @@ Contents contentsOf(common::RootPath const& root, LocalDatabase const& database)
         (here ? contents.here : contents.elsewhere).push_back(url);
     }
     return contents;
+}
+
+void requireHere(Tree const& files, LocalDatabase const& database, LocalStorage& storage)
+{
+    for (auto const& [path, url] : files) {
+        if (!isHere(url, database, storage)) {
+            throw Failure(
+                "This version of " + quoted(path) + " was made in another folder, and its content is not here.",
+                "Nothing has been written; get the file from that folder.");
+        }
+    }
 }
 
 } // namespace tav

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "host/repository/local_database.h"
+#include "host/storage/local_storage.h"
 
 #include "common/mu_common_repo_prop.h"
 
@@ -16,5 +17,8 @@ struct Contents {
 };
 
 Contents contentsOf(common::RootPath const& root, LocalDatabase const& database);
+
+/// Throws `Failure` for the first of `files` whose content was never here: that is no damage.
+void requireHere(Tree const& files, LocalDatabase const& database, LocalStorage& storage);
 
 } // namespace tav

@@ -161,6 +161,18 @@ std::vector<common::Reference> referencesThere(Connection& connection)
     });
 }
 
+bool isNamedThere(OdString const& name, LocalDatabase const& database)
+{
+    try {
+        Connection connection(database);
+        std::vector<common::Reference> const names = referencesThere(connection);
+        auto const isIt = [&](common::Reference const& reference) { return reference.name == name; };
+        return std::any_of(names.begin(), names.end(), isIt);
+    } catch (Failure const&) {
+        return false;
+    }
+}
+
 bool isOnServer(OdString const& hash, Connection& connection)
 {
     std::vector<CommitNumber> const there = numbersThere(connection, 1);

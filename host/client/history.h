@@ -32,6 +32,9 @@ void forEachPageThere(
 /// The branches and tags of the server.
 std::vector<common::Reference> referencesThere(Connection& connection);
 
+/// Whether the server is there and has a branch or tag of that name.
+bool isNamedThere(OdString const& name, LocalDatabase const& database);
+
 /// Whether the server has the commit, known here or not.
 bool isOnServer(OdString const& hash, Connection& connection);
 

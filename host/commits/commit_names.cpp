@@ -14,6 +14,7 @@ namespace tav {
 namespace {
 
 constexpr std::size_t kShortestPrefix = 4;
+constexpr char const* kSeeAll = "Run 'tav log' or 'tav branch' to see them, or 'tav fetch' for those of others.";
 constexpr char const* kSeeLog = "Run 'tav log' to see the commits.";
 
 std::optional<std::int64_t> numberIn(std::string_view typed)
@@ -180,7 +181,7 @@ CommitRecord findCommit(LocalDatabase const& database, std::string const& typed)
     if (typed.empty() || database.commits().lastNumber() == 0) {
         throw Failure("There is no commit yet.", "Make the first one with 'tav add --all' and 'tav commit'.");
     }
-    throw Failure("There is no commit, branch or tag '" + typed + "'.", "Run 'tav log' or 'tav branch' to see them.");
+    throw Failure("There is no commit, branch or tag '" + typed + "'.", kSeeAll);
 }
 
 } // namespace tav

@@ -1,6 +1,6 @@
 #include "host/commits/references.h"
 
-#include "host/client/connection.h"
+#include "host/client/history.h"
 #include "host/errors/failure.h"
 #include "host/history/reference_name.h"
 #include "host/protocol/commit_document.h"
@@ -14,7 +14,7 @@ namespace tav {
 
 namespace {
 
-char const* kindOf(common::Reference const& reference)
+std::string kindOf(common::Reference const& reference)
 {
     return reference.type == common::EType::branch ? "branch" : "tag";
 }
@@ -23,7 +23,7 @@ void requireFreeName(LocalDatabase const& database, OdString const& name)
 {
     if (auto const old = database.commits().reference(name)) {
         throw Failure(
-            std::string("There is a ") + kindOf(*old) + " '" + name.ansi_str() + "' already.", "Choose another name.");
+            "There is a " + kindOf(*old) + " '" + name.ansi_str() + "' already.", "Choose another name.");
     }
     requireReferenceName(name);
 }
@@ -38,6 +38,19 @@ bool isReachedFromOthers(CommitTables const& commits, common::Reference const& r
     });
 }
 
+/// It is made, not moved: one of that name may be there that is not known here.
+void makeOnServer(common::Reference const& reference, LocalDatabase const& database)
+{
+    try {
+        Connection(database).request("references", referenceChanges({{reference, OdString::kEmpty}}));
+    } catch (Failure& failure) {
+        if (isNamedThere(reference.name, database)) {
+            failure.next = "Run 'tav fetch' to see what the server has under this name.";
+        }
+        throw;
+    }
+}
+
 } // namespace
 
 void requireReferenceName(OdString const& name)
@@ -50,11 +63,15 @@ void requireReferenceName(OdString const& name)
 void makeReference(LocalDatabase& database, common::Reference const& reference)
 {
     requireFreeName(database, reference.name);
-    Connection(database).request(
-        "references", referenceChanges({{reference, OdString::kEmpty}})); // It is made, not moved.
-    WriteTransaction transaction(database.database());
-    database.commits().set(reference);
-    transaction.commit();
+    makeOnServer(reference, database);
+    try {
+        WriteTransaction transaction(database.database());
+        database.commits().set(reference);
+        transaction.commit();
+    } catch (Failure& failure) {
+        failure.next = "The server has the " + kindOf(reference) + "; correct that and run 'tav fetch'.";
+        throw;
+    }
 }
 
 common::Reference findReference(LocalDatabase const& database, OdString const& name, common::EType type)
@@ -74,7 +91,7 @@ void failIfOnlyWayToCommits(LocalDatabase const& database, common::Reference con
 {
     if (!isReachedFromOthers(database.commits(), reference)) {
         throw Failure(
-            "Only the " + std::string(kindOf(reference)) + " '" + reference.name.ansi_str() +
+            "Only the " + kindOf(reference) + " '" + reference.name.ansi_str() +
                 "' leads to its last commits.",
             "Create a tag there to keep them in the history, or delete it with --force.");
     }

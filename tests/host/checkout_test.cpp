@@ -158,9 +158,10 @@ TEST_F(Moving, CommitsAreNamedByNumberHashBranchAndTag)
     EXPECT_THAT(values({"show", "master"}, "number"), ElementsAre("2"));
     for (std::string const name : {"3", "nothing", "0", "-1x", "fff"}) {
         EXPECT_EQ(
-            tav({"checkout", "--", name}),
-            failed(
-                "tav: There is no commit, branch or tag '" + name + "'. Run 'tav log' or 'tav branch' to see them.\n"));
+            tav({"checkout", "--", name}), failed(
+                                               "tav: There is no commit, branch or tag '" + name +
+                                               "'. Run 'tav log' or 'tav branch' to see them, or "
+                                               "'tav fetch' for those of others.\n"));
     }
 }
 

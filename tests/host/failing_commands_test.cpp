@@ -120,5 +120,32 @@ INSTANTIATE_TEST_SUITE_P(
             ErrorRow{"Death", support::FailingCall::kKillProcess, Lasts::once, 1})),
     rowName);
 
+TEST(FailingBranch, IsLearnedByFetchWhenTheServerHasMadeIt)
+{
+    Scene const scene([](Scene const&) {});
+    std::string const local = scene.folder() + "/.tav/tav.db";
+    int made = 0;
+    for (int n = 0;; ++n) {
+        scene.reset();
+        Outcome const outcome = scene.inCopy([&] {
+            support::FailingCall const failing(n, ENOSPC, Lasts::on);
+            int const code = runHere({"branch", "side"});
+            return failing.hasFailed() ? code : kAllCallsWorked;
+        });
+        if (outcome.code == kAllCallsWorked) {
+            break;
+        }
+        bool const isMade = scene.inCopy([] { return runHere({"fetch"}); }).out.find("Nothing") == std::string::npos;
+        if (isMade && outcome.err.find(local) != std::string::npos) {
+            ++made;
+            EXPECT_EQ(
+                outcome.err.substr(outcome.err.find(". ") + 2),
+                "The server has the branch; correct that and run 'tav fetch'.\n");
+            EXPECT_EQ(scene.tav({"branch"}).out, "* master  (commit 2)\n  side  (commit 2)\n");
+        }
+    }
+    EXPECT_GT(made, 0);
+}
+
 } // namespace
 } // namespace host_tests

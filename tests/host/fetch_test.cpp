@@ -142,7 +142,6 @@ protected:
         ASSERT_EQ(inOther({"switch", "copy"}).code, 0);
     }
 
-private:
     support::TempFolder const place_;
 };
 
@@ -183,6 +182,35 @@ TEST_F(TwoFolders, KeepWhatTheirOwnCommitsNeedInGc)
     EXPECT_EQ(inOther({"checkout", "3"}).code, 0);
 }
 
+TEST_F(TwoFolders, SayWhichVersionsAreInTheOtherOne)
+{
+    ASSERT_EQ(tav({"branch", "side"}).code, 0);
+    ASSERT_EQ(tav({"switch", "side"}).code, 0);
+    repo.write("a.txt", "there already");
+    commitFile("b.txt", "two", "second");
+    place_.write("copy/a.txt", "there already");
+    ASSERT_EQ(inOther({"fetch"}).code, 0);
+    auto const elsewhere = [](std::string const& name) {
+        return failed(
+            "tav: This version of '" + name +
+            "' was made in another folder, and its content is not here. Nothing has "
+            "been written; get the file from that folder.\n");
+    };
+    std::string const before = inOther({"status", "--json"}).out;
+    for (Arguments const& command :
+         {Arguments{"checkout", "2"},
+          {"switch", "side"},
+          {"checkout", "2", "--force"},
+          {"restore", "b.txt", "--from", "2"},
+          {"cat", "2:b.txt"}}) {
+        EXPECT_EQ(inOther(command), elsewhere("b.txt")) << command.front();
+    }
+    EXPECT_EQ(inOther({"export", "2", "exported"}), elsewhere("a.txt"));
+    EXPECT_EQ(inOther({"status", "--json"}).out, before);
+    EXPECT_FALSE(place_.has("copy/exported"));
+    EXPECT_EQ(inOther({"restore", "plan.dwg", "--from", "2"}).code, 0);
+}
+
 TEST_F(TwoFolders, RefuseAFolderThatFollowsAnEarlierCommitOfItsBranch)
 {
     commitFile("plan.dwg", "two", "second");
@@ -199,13 +227,24 @@ TEST_F(TwoFolders, DoNotMoveABranchOfTheOther)
     ASSERT_EQ(inOther({"branch", "side"}).code, 0);
     EXPECT_EQ(
         tav({"branch", "side"}),
-        failed("tav: There is a branch 'side' already. Choose another name. Your working folder is as it was.\n"));
+        failed("tav: There is a branch 'side' already. Choose another name. Run 'tav fetch' to see what the server has "
+               "under this name.\n"));
     EXPECT_EQ(
         tav({"tag", "side"}),
-        failed("tav: 'side' is the name of a branch already. Choose another name. Your working folder is as it "
-               "was.\n"));
+        failed("tav: 'side' is the name of a branch already. Choose another name. Run 'tav fetch' to see what the "
+               "server has under this name.\n"));
     EXPECT_EQ(inOther({"fetch"}).code, 0);
     EXPECT_THAT(inOther({"branch"}).out, HasSubstr("  side  (commit 1)\n"));
+}
+
+TEST_F(TwoFolders, SayHowToGetABranchThatOnlyTheServerKnows)
+{
+    ASSERT_EQ(inOther({"branch", "side"}).code, 0);
+    EXPECT_EQ(
+        tav({"switch", "side"}),
+        failed("tav: 'side' is known only to the server. Run 'tav fetch' to learn it, and then this command again.\n"));
+    EXPECT_EQ(tav({"fetch"}).code, 0);
+    EXPECT_EQ(tav({"switch", "side"}), done("Now on branch side.\n"));
 }
 
 TEST_F(TwoFolders, LearnBranchesAndTagsWithACommit)

@@ -261,7 +261,8 @@ TEST_F(CommittedFiles, AreThoseOfTheCommitThatIsNamed)
     EXPECT_THAT(values({"files", "--hash", "--at", "@"}, "sha256"), testing::Contains(kDigestOfAbc));
     EXPECT_EQ(
         tav({"files", "--at", "7"}),
-        failed("tav: There is no commit, branch or tag '7'. Run 'tav log' or 'tav branch' to see them.\n"));
+        failed("tav: There is no commit, branch or tag '7'. Run 'tav log' or 'tav branch' to see them, or 'tav fetch' "
+               "for those of others.\n"));
 }
 
 TEST_F(CommittedFiles, ShowTheCommitThatRenamedThem)
