@@ -42,13 +42,14 @@ TreeUpdate updateBetween(Tree const& from, std::vector<Tree> const& begun, Tree 
 enum class Discard { nothing, copies, everything };
 
 /// Checks, before anything is written, that an update can be carried out: no path leads out of the working folder or
-/// through a link, no file replaces a folder that has other files, the contents to be
-/// written are here, and no work is lost unless `discard` allows it. Work is a file whose content is not an expected one, and whatever is at the paths `staged`, even when a commit, or the
-/// one to be written, has that content: staging it was a choice. Only where `discard` is not `nothing`, and so nothing
-/// is unstaged, may a staged file have the wanted content already. The files are read: an index record does not justify
-/// overwriting them. Files that have the wanted content already are taken out of the update. All contents that will be
-/// overwritten or removed, discarded ones included, can be read from `storage` afterwards: they are read there, and
-/// stored from the files if necessary. Throws `Failure`, which lists the files in the way.
+/// through a link, no file replaces a folder that has other files, the contents to be written are here, and no work is
+/// lost unless `discard` allows it. Work is a file whose content is not an expected one, and whatever is at the paths
+/// `staged`, even when a commit, or the one to be written, has that content: staging it was a choice. Only where
+/// `discard` is not `nothing`, and so nothing is unstaged, may a staged file have the wanted content already. The files
+/// are read: an index record does not justify overwriting them. Files that have the wanted content already are taken
+/// out of the update. All contents that will be overwritten or removed, discarded ones included, can be read from
+/// `storage` afterwards: they are read there, and stored from the files if necessary. Throws `Failure`, which lists the
+/// files in the way.
 void checkUpdate(
     common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
     std::set<OdString> const& staged, Discard discard, TreeUpdate& update);

@@ -108,12 +108,13 @@ bool isRepeated(CommitOrder const& order, WriteSession const& session)
 
 void carryOut(CommitOrder const& order, common::RootPath const& root)
 {
-    WriteSession session(root, "commit");
-    session.failIfBetweenCommits();
+    WriteSession session(root, "commit", Recovery::required, Note::byCommand);
     if (isRepeated(order, session)) {
         printCommit(*session.recoveredCommit(), "Completed");
         return;
     }
+    session.noteRecovery();
+    session.failIfBetweenCommits();
     Committed const committed = commit(session.root(), session.database(), order, session.start());
     printCommit(committed.commit, committed.isNew ? "Made" : "Nothing has changed since");
 }

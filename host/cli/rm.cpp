@@ -32,47 +32,67 @@ namespace {
 
 namespace fs = std::filesystem;
 
-template <class List, class PathOf>
-bool holds(List const& list, OdString const& path, PathOf const& pathOf)
-{
-    return std::any_of(list.begin(), list.end(), [&](auto const& item) { return pathOf(item) == path; });
-}
-
 [[noreturn]] void failForChanges(std::string const& name)
 {
     throw Failure("'" + name + "' has changes that are in no commit.", "Commit them first.");
 }
 
-/// A folder is removed only when no work in it would be lost.
-void failForChangesIn(OdString const& folder, common::RepoChanges const& changes)
+/// The committed files, and where the storage has what they hold.
+struct CommittedFiles {
+    Tree reachable; ///< in the working folder, unless they are gone already
+    Tree others;    ///< behind links: they are not touched
+    Tree changed;   ///< they hold what no commit has
+};
+
+CommittedFiles committedFiles(FolderChanges const& changes)
 {
-    OdString const prefix = folder + L"/";
+    CommittedFiles files;
+    for (common::VersionedFile const& file : changes.unchanged) {
+        files.reachable.emplace(file.path, file.storagePath);
+    }
+    for (auto const& file : changes.removed) {
+        files.reachable.emplace(file.committed.path, file.committed.storagePath);
+    }
+    for (common::VersionedFile const& file : changes.unreachable) {
+        files.others.emplace(file.path, file.storagePath);
+    }
     for (auto const& file : changes.modified) {
-        if (file.working.path.left(prefix.getLength()) == prefix) {
-            failForChanges(file.working.path.ansi_str());
+        files.changed.emplace(file.committed.path, file.committed.storagePath);
+    }
+    return files;
+}
+
+NameFinder finderOf(CommittedFiles const& files, common::RootPath const& root)
+{
+    std::vector<common::StagedFile> all;
+    for (Tree const* const tree : {&files.reachable, &files.others, &files.changed}) {
+        for (auto const& [path, url] : *tree) {
+            all.emplace_back(path, common::FileChange::removed);
         }
     }
+    return {all, root};
 }
 
 /// The committed files that `name` means. Only content that a commit keeps may be removed.
 std::vector<common::StagedFile> removableFiles(
-    std::string const& name, common::RepoChanges const& changes, NameFinder const& committed,
+    std::string const& name, common::RepoChanges const& changes, CommittedFiles const& files, NameFinder const& finder,
     common::RootPath const& root)
 {
     OdString const typed = pathInRepository(root, name);
-    auto const workingPath = [](auto const& file) { return file.working.path; };
-    if (holds(changes.untracked, typed, workingPath)) {
+    auto const isTyped = [&](auto const& file) { return file.working.path == typed; };
+    if (std::any_of(changes.untracked.begin(), changes.untracked.end(), isTyped)) {
         throw Failure(
             "'" + name + "' is in no commit: removing it would lose it.",
             "Use 'tav unstage' if it is staged, and delete it yourself if you do not need it.");
     }
-    if (holds(changes.modified, typed, workingPath)) {
-        failForChanges(name);
-    }
-    failForChangesIn(typed, changes);
-    std::vector<common::StagedFile> found = committed.find(name);
+    std::vector<common::StagedFile> found = finder.find(name);
     if (found.empty()) {
         throw Failure("No committed file matches '" + name + "'.", "Run 'tav status' to see what there is.");
+    }
+    for (common::StagedFile const& file : found) { // A folder is removed only when no work in it would be lost.
+        if (files.changed.count(file.path) > 0) {
+            failForChanges(file.path.ansi_str());
+        }
     }
     return found;
 }
@@ -95,38 +115,6 @@ std::vector<common::StagedFile> without(std::set<OdString> const& renamed, std::
     auto const isRenamed = [&](common::StagedFile const& file) { return renamed.count(file.path) > 0; };
     files.erase(std::remove_if(files.begin(), files.end(), isRenamed), files.end());
     return files;
-}
-
-/// The files that may be removed, and where the storage has what they hold.
-struct Removable {
-    Tree reachable; ///< in the working folder, unless they are gone already
-    Tree others;    ///< behind links: they are not touched
-};
-
-Removable removableIn(FolderChanges const& changes)
-{
-    Removable files;
-    for (common::VersionedFile const& file : changes.unchanged) {
-        files.reachable.emplace(file.path, file.storagePath);
-    }
-    for (auto const& file : changes.removed) {
-        files.reachable.emplace(file.committed.path, file.committed.storagePath);
-    }
-    for (common::VersionedFile const& file : changes.unreachable) {
-        files.others.emplace(file.path, file.storagePath);
-    }
-    return files;
-}
-
-NameFinder finderOf(Removable const& files, common::RootPath const& root)
-{
-    std::vector<common::StagedFile> all;
-    for (Tree const* const tree : {&files.reachable, &files.others}) {
-        for (auto const& [path, url] : *tree) {
-            all.emplace_back(path, common::FileChange::removed);
-        }
-    }
-    return {all, root};
 }
 
 /// The paths come from a database that anybody may have made, and folders may have become links meanwhile.
@@ -205,13 +193,14 @@ private:
 };
 
 std::vector<common::StagedFile> chosenFiles(
-    std::vector<std::string> const& names, FolderChanges const& changes, NameFinder const& committed,
+    std::vector<std::string> const& names, FolderChanges const& changes, CommittedFiles const& files,
     common::State const& state, common::RootPath const& root)
 {
+    NameFinder const finder = finderOf(files, root);
     std::vector<common::StagedFile> chosen;
     for (std::string const& name : names) {
         failIfRenamed(name, state, root);
-        std::vector<common::StagedFile> const found = removableFiles(name, changes, committed, root);
+        std::vector<common::StagedFile> const found = removableFiles(name, changes, files, finder, root);
         chosen.insert(chosen.end(), found.begin(), found.end());
     }
     return chosen;
@@ -245,9 +234,8 @@ void removeFiles(std::vector<std::string> const& names)
         entry.emplace(session.database(), typedCommand("rm", names), cache.read());
         FolderChanges const changes =
             compare(root, matchFolder(root, lastCommitFiles(root), session.database().verifiedFiles()));
-        Removable const files = removableIn(changes);
-        std::vector<common::StagedFile> const chosen =
-            chosenFiles(names, changes, finderOf(files, root), cache.read(), root);
+        CommittedFiles const files = committedFiles(changes);
+        std::vector<common::StagedFile> const chosen = chosenFiles(names, changes, files, cache.read(), root);
         std::set<OdString> const renamed = formerPaths(cache.read());
         count = stage(without(renamed, chosen), cache.write());
         entry->operation().files = filesToGo(chosen, files.reachable, root);
@@ -259,7 +247,9 @@ void removeFiles(std::vector<std::string> const& names)
     });
     entry->keep();
     departures.finish();
-    report("Removed " + counted(count, "file") + "; the next commit takes that.\n");
+    report(
+        count == 0 ? "Nothing new to remove: the next commit takes that already.\n"
+                   : "Removed " + counted(count, "file") + "; the next commit takes that.\n");
 }
 
 } // namespace tav

@@ -13,12 +13,12 @@
 
 namespace tav {
 
-WriteSession::WriteSession(common::RootPath const& root, std::string const& name, Recovery recovery)
-    : WriteSession(root, lockRepository(root, name), recovery)
+WriteSession::WriteSession(common::RootPath const& root, std::string const& name, Recovery recovery, Note note)
+    : WriteSession(root, lockRepository(root, name), recovery, note)
 {
 }
 
-WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Recovery recovery)
+WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Recovery recovery, Note note)
     : root_(root)
     , lock_(std::move(lock))
     , start_(commandStart(root))
@@ -32,6 +32,9 @@ WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Reco
         PendingOperation const pending = readJournal(database_);
         isCommit = std::holds_alternative<PendingCommit>(pending);
         recover(pending);
+        if (note == Note::bySession) {
+            noteRecovery();
+        }
     } catch (Failure const&) {
         if (recovery == Recovery::required) {
             throw;
@@ -49,14 +52,20 @@ void WriteSession::recover(PendingOperation const& pending)
 {
     if (auto const* const commit = std::get_if<PendingCommit>(&pending)) {
         recoveredCommit_ = finishCommit(root_, database_, *commit);
-        std::string const name =
-            std::to_string(recoveredCommit_->number) + " (" + recoveredCommit_->hash.left(12).ansi_str() + ")";
-        std::fputs(("tav: Completed commit " + name + ", which was interrupted.\n").c_str(), stderr);
     }
     // Before all its files are written, only the user can say whether they are still wanted.
     auto const* const checkout = std::get_if<PendingCheckout>(&pending);
     if (checkout && checkout->isWritten) {
         finishCheckout(root_, database_, *checkout);
+    }
+}
+
+void WriteSession::noteRecovery() const
+{
+    if (recoveredCommit_) {
+        std::string const name =
+            std::to_string(recoveredCommit_->number) + " (" + recoveredCommit_->hash.left(12).ansi_str() + ")";
+        std::fputs(("tav: Completed commit " + name + ", which was interrupted.\n").c_str(), stderr);
     }
 }
 

@@ -7,6 +7,8 @@
 
 #include "common/mu_common_versions.h"
 
+#include <gmock/gmock.h>
+
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
@@ -324,6 +326,27 @@ TEST_F(RmOnCommit, RemovesTheFilesOfAFolderUnlessOneHasChanges)
     EXPECT_TRUE(repo.has("c.dwg"));
 }
 
+TEST_F(RmOnCommit, NamesTheChangedFileThatAnExpressionMatches)
+{
+    commit({"plan.dwg", "note.txt"});
+    repo.write("plan.dwg", "changed");
+    EXPECT_EQ(tav({"rm", "lan"}), failed("tav: 'plan.dwg' has changes that are in no commit. Commit them first.\n"));
+    EXPECT_EQ(
+        tav({"rm", ".*"}), failed("tav: More that one file found with name .*. Type more of the path of the one you "
+                                  "mean:\n  note.txt\n  plan.dwg\n"));
+    EXPECT_TRUE(repo.has("note.txt"));
+}
+
+TEST_F(RmOnCommit, SaysThatARemovalIsStagedAlready)
+{
+    commit({"a.dwg", "plans/b.dwg"});
+    EXPECT_EQ(tav({"rm", "a.dwg"}), done("Removed 1 file; the next commit takes that.\n"));
+    EXPECT_EQ(tav({"mv", "plans", "old"}).code, 0);
+    Outcome const already = done("Nothing new to remove: the next commit takes that already.\n");
+    EXPECT_EQ(tav({"rm", "a.dwg"}), already);
+    EXPECT_EQ(tav({"rm", "plans"}), already);
+}
+
 TEST_F(RmOnCommit, StepsAroundWhatAKilledCommandLeft)
 {
     commit({"a.dwg", "b.dwg"});
@@ -332,6 +355,40 @@ TEST_F(RmOnCommit, StepsAroundWhatAKilledCommandLeft)
     EXPECT_EQ(repo.read(".tav/removed-0"), "left over");
     EXPECT_FALSE(repo.has(".tav/removed-1"));
     EXPECT_FALSE(repo.has(".tav/removed-2"));
+}
+
+using UnstageOnCommit = OnCommit;
+
+TEST_F(UnstageOnCommit, SaysWhatTheNextCommitTakesAllTheSame)
+{
+    commit({"a.dwg", "b.dwg", "c.dwg", "d.dwg"});
+    EXPECT_EQ(tav({"rm", "a.dwg"}).code, 0);
+    EXPECT_EQ(tav({"mv", "b.dwg", "moved.dwg"}).code, 0);
+    repo.write("c.dwg", "changed");
+    EXPECT_EQ(tav({"add", "c.dwg"}).code, 0);
+    remove("c.dwg");
+    repo.write("d.dwg", "changed");
+    EXPECT_EQ(tav({"add", "d.dwg"}).code, 0);
+    EXPECT_EQ(tav({"unstage", "d.dwg"}), done("Took 1 file out of the next commit.\n"));
+    EXPECT_EQ(
+        tav({"unstage", "--all"}),
+        done("Unstaged 3 files. The next commit takes these all the same, since files are gone (use 'tav restore NAME' "
+             "to bring one back):\n"
+             "        renamed:  b.dwg -> moved.dwg\n"
+             "        removed:  a.dwg\n"
+             "        removed:  c.dwg\n"));
+    EXPECT_THAT(status(), testing::HasSubstr("renamed:  b.dwg -> moved.dwg"));
+    EXPECT_THAT(status(), testing::HasSubstr("removed:  a.dwg\n        removed:  c.dwg"));
+}
+
+TEST_F(UnstageOnCommit, SaysNothingOfFilesThatWereNotNamed)
+{
+    commit({"a.dwg", "b.dwg"});
+    remove("a.dwg");
+    repo.add({"new.dwg"});
+    EXPECT_EQ(tav({"add", "new.dwg"}).code, 0);
+    remove("new.dwg");
+    EXPECT_EQ(tav({"unstage", "new.dwg"}), done("Took 1 file out of the next commit.\n"));
 }
 
 using MvOnCommit = OnCommit;
