@@ -89,6 +89,12 @@ std::string complaint(CLI::App const& app, CLI::ParseError const& error)
     return what;
 }
 
+bool isWithoutCommand(CLI::App const& app, CLI::ParseError const& error)
+{
+    bool const isMissing = error.get_exit_code() == static_cast<int>(CLI::ExitCodes::RequiredError);
+    return isMissing && app.get_subcommands().empty() && app.remaining().empty();
+}
+
 /// Runs the command, or prints the help that was asked for.
 void parse(CLI::App& app, std::vector<std::string> const& words)
 {
@@ -149,7 +155,11 @@ int runCommand(CLI::App& app, std::vector<std::string> const& words)
         }
         return kDone;
     } catch (CLI::ParseError const& error) {
-        printError(complaint(app, error), "Run '" + chosenCommand(app) + " --help' to see how it is used.");
+        if (isWithoutCommand(app, error)) {
+            printErrorText(app.help());
+        } else {
+            printError(complaint(app, error), "Run '" + chosenCommand(app) + " --help' to see how it is used.");
+        }
         return kMisused;
     } catch (Failure const& failure) {
         printError(failure.what, failure.next);

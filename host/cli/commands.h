@@ -13,6 +13,7 @@ namespace tav {
 struct InitOptions {
     std::string folder = ".";
     std::optional<std::string> server; ///< none: where it was, or in the folder for data
+    bool nested = false;               ///< also in a folder of another repository
 };
 void init(InitOptions const& options);
 

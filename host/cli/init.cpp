@@ -26,6 +26,20 @@ std::string absolute(std::string const& folder)
     return path.has_filename() ? path.string() : path.parent_path().string();
 }
 
+/// Of two repositories that have the same files, the outer one would commit what belongs to the inner one.
+void failIfInRepository(std::string const& folder)
+{
+    std::filesystem::path place = std::filesystem::weakly_canonical(absolute(folder));
+    while (place.has_relative_path()) {
+        place = place.parent_path();
+        if (common::RootPath::get(fromUtf8(place.string()), false).hasValue()) {
+            throw Failure(
+                "'" + folder + "' is inside of the repository in '" + place.string() + "', which keeps its files.",
+                "Add --nested to make a repository of its own all the same.");
+        }
+    }
+}
+
 /// The folder that the user named; empty when there is none.
 OdString namedServer(InitOptions const& options)
 {
@@ -87,6 +101,9 @@ void init(InitOptions const& options)
     OdString const path = fromUtf8(options.folder);
     OdString const server = namedServer(options); // What is wrong with it is said before anything is made.
     bool const existed = common::RootPath::get(path, false).hasValue();
+    if (!existed && !options.nested) {
+        failIfInRepository(options.folder);
+    }
     common::RootPath const root =
         valueOrFail(common::RootPath::get(path, true), "Check that the folder is one and that you may write there.");
     requireOwnFiles(root);

@@ -33,6 +33,11 @@ bool isInTav(OdString const& path)
     return (path + L"/").left(5) == OdString(L".tav/");
 }
 
+bool isBelow(OdString const& path, OdString const& folder)
+{
+    return path.left(folder.getLength() + 1) == folder + L"/";
+}
+
 /// Into a folder that exists, a file keeps its name.
 OdString targetOf(OdString const& from, std::string const& typed, common::RootPath const& root)
 {
@@ -165,6 +170,9 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     if (moves.empty()) {
         throw Failure(
             "'" + typedFrom + "' is not a file or folder of the repository.", "Run 'tav files' to see those.");
+    }
+    if (isBelow(to, from)) {
+        throw Failure("'" + typedFrom + "' cannot be moved into itself.", "Choose another place.");
     }
     if (isInTav(from)) {
         throw Failure("'" + typedFrom + "' belongs to the repository itself.", "It has to stay where it is.");

@@ -15,17 +15,6 @@ namespace tav {
 
 namespace {
 
-/// A byte of a name that is not valid UTF-8. A terminal of another character set may take it for a control character.
-bool isStrayByte(wchar_t c)
-{
-    return c >= 0xDC80 && c <= 0xDCFF;
-}
-
-bool cannotBeSeen(wchar_t c)
-{
-    return isControl(c) || isInvisible(c) || isStrayByte(c);
-}
-
 bool cannotBeSeenInALine(wchar_t c)
 {
     return c != L'\t' && cannotBeSeen(c);
@@ -40,13 +29,7 @@ std::string escaped(OdString const& text, bool (*mustBe)(wchar_t))
     OdString result;
     for (std::size_t i = 0; i < text.getLength(); ++i) {
         wchar_t const c = text.getAt(i);
-        bool const isByte = c <= 0xFF || isStrayByte(c);
-        if (mustBe(c)) {
-            auto const code = static_cast<unsigned>(c);
-            result += OdString().format(isByte ? L"\\x%02X" : L"\\u%04X", isByte ? code & 0xFF : code);
-        } else {
-            result += c;
-        }
+        result += mustBe(c) ? asEscape(c) : OdString(&c, 1);
     }
     return result.ansi_str();
 }
@@ -122,6 +105,11 @@ void printErrorDetail(std::string const& detail)
 {
     std::string const line = "  " + onOneLine(detail) + "\n";
     std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
+void printErrorText(std::string const& text)
+{
+    std::fwrite(text.data(), 1, text.size(), stderr);
 }
 
 bool flushOutput()

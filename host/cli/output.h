@@ -24,6 +24,8 @@ void printError(std::string const& what, std::string const& next);
 void printNote(std::string const& note);
 /// Prints a line of details that follows an error, indented.
 void printErrorDetail(std::string const& detail);
+/// Prints `text` on the error stream as it stands.
+void printErrorText(std::string const& text);
 /// Flushes what was printed; false when anything could not be written.
 bool flushOutput();
 

@@ -40,6 +40,7 @@ void addInit(CLI::App& app)
         ->add_option(
             "--server", options->server, "Where the history is kept; by default 'tav/server' in your folder for data")
         ->type_name("FOLDER");
+    command->add_flag("--nested", options->nested, "Make a repository of its own inside of another one");
     command->callback([options] { init(*options); });
 }
 
@@ -133,6 +134,14 @@ void addCommit(CLI::App& app)
     });
 }
 
+/// The parser's own check names the whole range of numbers.
+std::string isCount(std::string const& text)
+{
+    bool const hasDigits = !text.empty() && text.size() <= 18 && text.find_first_not_of("0123456789") == text.npos;
+    bool const isPositive = text.find_first_not_of('0') != text.npos;
+    return hasDigits && isPositive ? std::string() : "'" + text + "' is not a number of commits";
+}
+
 void addLog(CLI::App& app, std::optional<std::size_t> behindDashes)
 {
     CLI::App* const command = app.add_subcommand("log", "Show the history, newest first");
@@ -143,7 +152,7 @@ void addLog(CLI::App& app, std::optional<std::size_t> behindDashes)
         "The commit to begin with, by default where you are, and then files or folders whose history is shown");
     command->add_option("-n,--count", options->count, "Show so many commits at most; -5 is the same as -n 5")
         ->type_name("COUNT")
-        ->check(CLI::PositiveNumber);
+        ->check(isCount);
     command->add_option("--since", options->since, "Show commits of this date and later")->type_name("DATE");
     command->add_option("--until", options->until, "Show commits of this date and earlier")->type_name("DATE");
     command->add_option("--author", options->author, "Show commits of authors with this in their name")

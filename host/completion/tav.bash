@@ -61,7 +61,7 @@ _tav_offer_paths() { # LIST...
 
 _tav_options() { # COMMAND
     case $1 in
-        init) printf '%s\n' --server ;;
+        init) printf '%s\n' --nested --server ;;
         status) printf '%s\n' --ignored -s --short --json ;;
         add | unstage) printf '%s\n' --all ;;
         commit) printf '%s\n' -m --message -F --file -a --all --author --all-removed --without-removed ;;

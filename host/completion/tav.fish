@@ -96,6 +96,7 @@ __tav_command gc 'Remove what no commit needs from the storage' $commands
 __tav_command export 'Write the files of a commit into a folder of their own' $commands
 functions -e __tav_command
 
+complete -c tav -n '__fish_seen_subcommand_from init' -l nested -d 'Make a repository of its own inside of another one'
 complete -c tav -n '__fish_seen_subcommand_from init' -l server -x -a '(__fish_complete_directories)' -d 'Where the history is kept'
 complete -c tav -n '__fish_seen_subcommand_from init' -a '(__fish_complete_directories)'
 complete -c tav -n '__fish_seen_subcommand_from status' -l ignored -d 'Show the files that the ignore rules keep out, too'

@@ -62,6 +62,7 @@ Positionals:
 Options:
   -h,--help                   Show this help and do nothing else
   --server FOLDER             Where the history is kept; by default 'tav/server' in your folder for data
+  --nested                    Make a repository of its own inside of another one
 
 )";
 
@@ -198,7 +199,7 @@ TEST_P(Misuse, IsToldInOneLineAndChangesNothing)
 INSTANTIATE_TEST_SUITE_P(
     Cases, Misuse,
     testing::Values(
-        MisuseRow{"NoCommand", {}, "tav: A subcommand is required. Run 'tav --help' to see how it is used.\n"},
+        MisuseRow{"NoCommand", {}, kMainHelp}, MisuseRow{"NoCommandInAFolder", {"-C", "."}, kMainHelp},
         MisuseRow{
             "UnknownCommand",
             {"statsu", "--json"},
@@ -339,8 +340,8 @@ TEST_F(CommandLine, TakesNamesThatBeginWithAControlCharacterWhole)
         tav({"add", "\x01", "\x01[a]"}),
         failed("tav: No commit can keep these names. Nothing has been staged; rename the files, or leave them out with "
                "'tav ignore':\n"
-               "  The path '\\u0001' holds a control character or a line end.\n"
-               "  The path '\\u0001[a]' holds a control character or a line end.\n"));
+               "  The path '\\x01' holds a control character or a line end.\n"
+               "  The path '\\x01[a]' holds a control character or a line end.\n"));
 }
 
 TEST_F(CommandLine, FailsOutsideOfARepository)

@@ -52,9 +52,7 @@ TEST_F(CommitMessage, BeginsWithWhatWillBeCommitted)
 
 TEST_F(CommitMessage, ThatIsEmptyCommitsNothing)
 {
-    EXPECT_EQ(
-        commit("true"),
-        failed("tav: The message is empty. Say in a few words what has changed, and who did.\n"));
+    EXPECT_EQ(commit("true"), failed("tav: The message is empty. Say in a few words what has changed, and who did.\n"));
     EXPECT_EQ(values({"log"}, "number").size(), 0U);
     EXPECT_FALSE(repo.has(".tav/COMMIT_MESSAGE"));
 }

@@ -74,13 +74,29 @@ TEST_F(Init, LeavesABrokenStateToItsOwner)
     EXPECT_EQ(place.read(".tav/tav.state"), "broken");
 }
 
-TEST_F(Init, MakesARepositoryInsideOfAnother)
+TEST_F(Init, MakesARepositoryInsideOfAnotherWhenAskedTo)
 {
     place.makeFolder(".tav");
     place.makeFolder("annex");
-    EXPECT_EQ(tav({"init", "annex"}), done("Made a repository in 'annex'.\n"));
+    EXPECT_EQ(tav({"init", "--nested", "annex"}), done("Made a repository in 'annex'.\n"));
+    EXPECT_EQ(tav({"init", "annex"}), done("The repository in 'annex' was there already; it is complete.\n"));
     EXPECT_EQ(place.read("annex/.tav/tav.state"), kFreshState);
     EXPECT_FALSE(place.has(".tav/tav.state"));
+}
+
+TEST_F(Init, RefusesAFolderInsideOfARepository)
+{
+    place.makeFolder(".tav");
+    place.makeFolder("annex");
+    std::vector<std::string> const before = place.list();
+    for (std::string const folder : {"annex", "new/wing", "annex/../annex"}) {
+        EXPECT_EQ(
+            tav({"init", folder}),
+            failed(
+                "tav: '" + folder + "' is inside of the repository in '" + place.path() +
+                "', which keeps its files. Add --nested to make a repository of its own all the same.\n"));
+    }
+    EXPECT_EQ(place.list(), before);
 }
 
 TEST_F(Init, EscapesTheFolderOnATerminal)

@@ -123,6 +123,17 @@ TEST_F(Log, ShowsAsManyCommitsAsAreAskedFor)
     EXPECT_THAT(commits({"notes.txt", "-1"}), ElementsAre("2"));
 }
 
+TEST_F(Log, RefusesANumberOfCommitsThatIsNone)
+{
+    for (std::string const count : {"abc", "0", "-1", "1.5", "1234567890123456789"}) {
+        EXPECT_EQ(
+            tav({"log", "--count=" + count}), misused(
+                                                  "tav: --count: '" + count +
+                                                  "' is not a number of commits. Run 'tav log --help' to see how it is "
+                                                  "used.\n"));
+    }
+}
+
 TEST_F(Log, ShowsCommitsOfAnAuthor)
 {
     EXPECT_THAT(commits({"--author", "bob"}), ElementsAre("4"));
