@@ -101,7 +101,7 @@ void init(InitOptions const& options)
     OdString const path = fromUtf8(options.folder);
     OdString const server = namedServer(options); // What is wrong with it is said before anything is made.
     bool const existed = common::RootPath::get(path, false).hasValue();
-    if (!existed && !options.nested) {
+    if (!existed && !options.nested && !options.folder.empty()) {
         failIfInRepository(options.folder);
     }
     common::RootPath const root =

@@ -283,7 +283,9 @@ TEST_F(CommandLine, TakesNamesAndFoldersFromTheFolderOfTheOptionC)
 TEST_F(CommandLine, GoesOnFromTheFolderOfAnEarlierOptionC)
 {
     repo.makeFolder("a/b");
-    EXPECT_EQ(tavIn("/", {"-C", repo.path(), "-C", "a", "-C", "b", "init", "c"}), done("Made a repository in 'c'.\n"));
+    EXPECT_EQ(
+        tavIn("/", {"-C", repo.path(), "-C", "a", "-C", "b", "init", "--nested", "c"}),
+        done("Made a repository in 'c'.\n"));
     EXPECT_TRUE(repo.has("a/b/c/.tav"));
 }
 
@@ -318,7 +320,7 @@ TEST_F(CommandLine, TakesNamesInBracketsWhole)
     EXPECT_EQ(state(), stateWithAdded({"[old]/plan.dwg", "[a,b]", "{}", "%%", "[]"}));
     EXPECT_EQ(tav({"mv", "[a,b]", "[c]"}), done("Renamed '[a,b]' to '[c]'.\n"));
     EXPECT_EQ(tav({"unstage", "[c]", "[old]"}), done("Took 2 files out of the next commit.\n"));
-    EXPECT_EQ(tav({"init", "[d]"}), done("Made a repository in '[d]'.\n"));
+    EXPECT_EQ(tav({"init", "--nested", "[d]"}), done("Made a repository in '[d]'.\n"));
     EXPECT_EQ(tav({"-C", "[d]", "files"}), done(".tav/properties/ignore\n"));
     EXPECT_EQ(tav({"files", "[d]"}), done(".tav/properties/ignore\n"));
 }
