@@ -139,6 +139,15 @@ TEST_F(ServerFolder, OnAFullDiskKeepsWhatItHad)
     EXPECT_EQ(askAnother("fetch <id>", "[]"), before);
 }
 
+TEST_F(ServerFolder, GivesAnIdentifierOnce)
+{
+    std::string const repositories = ask("repositories", "");
+    EXPECT_EQ(
+        ask("init", R"({"id":")" + id() + R"(","name":"tunnel"})"),
+        "error: The server has a repository '<id>' already. Nothing has changed on the server.");
+    EXPECT_EQ(ask("repositories", ""), repositories);
+}
+
 TEST_F(ServerFolder, KeepsRepositoriesWithTheirNames)
 {
     std::string const second = init("bridge");
