@@ -3,6 +3,7 @@
 #include "host/client/connection.h"
 #include "host/client/rebuild.h"
 #include "host/errors/failure.h"
+#include "host/repository/identity.h"
 #include "host/repository/ignore_file.h"
 #include "host/repository/open.h"
 #include "host/repository/working_state.h"
@@ -54,12 +55,15 @@ OdString namedOrDefault(OdString const& server)
     return server.isEmpty() ? namedServerFolder(defaultServerFolder()) : server;
 }
 
-void chooseServer(LocalDatabase& database, OdString const& named, std::string const& folder, std::string const& name)
+void chooseServer(WriteSession& session, OdString const& named, std::string const& folder, std::string const& name)
 {
+    LocalDatabase& database = session.database();
     if (database.repositoryId().isEmpty()) {
         OdString const chosen = namedOrDefault(named);
         failIfInside(chosen, folder);
-        database.setServer(chosen, makeRepository(chosen, name));
+        OdString const id = makeRepository(chosen, name);
+        addIdentity(session.root(), id);
+        database.setServer(chosen, id);
     } else if (!named.isEmpty() && database.serverFolder() != named) {
         throw Failure(
             "The repository has its server already, in '" + database.serverFolder().ansi_str() + "'.",
@@ -116,7 +120,7 @@ void init(InitOptions const& options)
     std::string const found = LocalDatabase::isLost(root) ? rebuilt(root, folder, server) : std::string();
     LocalDatabase::make(root);
     WriteSession session(root, std::move(lock), Recovery::attempted);
-    chooseServer(session.database(), server, folder, name);
+    chooseServer(session, server, folder, name);
     enterProject(session.database(), folder, name);
     report(found);
     report(

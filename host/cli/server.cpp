@@ -3,6 +3,7 @@
 #include "host/client/history.h"
 #include "host/client/resend.h"
 #include "host/errors/failure.h"
+#include "host/repository/identity.h"
 #include "host/repository/open.h"
 #include "host/session/write_session.h"
 #include "host/text/plural.h"
@@ -86,7 +87,9 @@ void requireRepository(WriteSession& session, OdString const& server, ServerOpti
     }
     OdString const there = isToBeMade ? OdString() : repositoryWithHistory(database, server);
     std::string const name = std::filesystem::absolute(session.root().path().ansi_str()).filename().string();
-    database.setServer(server, there.isEmpty() ? makeRepository(server, name, database.repositoryId()) : there);
+    OdString const id = there.isEmpty() ? makeRepository(server, name, database.repositoryId()) : there;
+    addIdentity(session.root(), id);
+    database.setServer(server, id);
     addProject(session.root().path(), fromUtf8(name), database.repositoryId());
 }
 

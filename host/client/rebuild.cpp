@@ -2,6 +2,7 @@
 
 #include "host/client/history.h"
 #include "host/errors/failure.h"
+#include "host/repository/identity.h"
 #include "host/repository/working_state.h"
 #include "host/storage/local_storage.h"
 #include "host/user/projects.h"
@@ -59,6 +60,13 @@ OdString listedRepository(OdString const& folder)
     return listed == data.projects.end() ? OdString() : listed->second.cloud;
 }
 
+/// The repository that is noted for `folder`, here or in the list of projects; empty when none is.
+OdString ownRepository(common::RootPath const& root, OdString const& folder)
+{
+    std::vector<OdString> const noted = identities(root);
+    return noted.empty() ? listedRepository(folder) : noted.back();
+}
+
 /// The repositories that `here` may belong to, the best first: `listed`, or, where no list knows the folder, those
 /// that have any of it.
 std::vector<Candidate> candidatesOn(OdString const& server, OdString const& listed, Urls const& here)
@@ -84,7 +92,7 @@ Candidate findRepository(common::RootPath const& root, OdString const& folder, R
 {
     constexpr char const* kNameIt = "Name the folder of the right one with --server.";
     Urls const here = valueOrFail(LocalStorage(root).contents(), "Check the disk and your rights in '.tav'.");
-    OdString const listed = listedRepository(folder);
+    OdString const listed = ownRepository(root, folder);
     std::vector<Candidate> const candidates = candidatesOn(source.server, listed, here);
     std::string const server = "The server in '" + source.server.ansi_str() + "'";
     if (candidates.empty()) {

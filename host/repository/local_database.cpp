@@ -2,6 +2,7 @@
 
 #include "host/errors/failure.h"
 #include "host/history/last_changes.h"
+#include "host/repository/identity.h"
 #include "host/text/utf8.h"
 
 #include "platform/ut/Dir.h"
@@ -66,12 +67,12 @@ std::string pathToOpen(common::RootPath const& root)
 LocalDatabase LocalDatabase::make(common::RootPath const& root)
 {
     failIfLost(root);
-    return {root.dbPath().ansi_str(), Use::changing};
+    return {root.dbPath().ansi_str(), Use::changing, &root};
 }
 
 LocalDatabase LocalDatabase::makeAt(std::string const& path)
 {
-    return {path, Use::changing};
+    return {path, Use::changing, nullptr};
 }
 
 bool LocalDatabase::isLost(common::RootPath const& root)
@@ -84,15 +85,15 @@ bool LocalDatabase::isLost(common::RootPath const& root)
 
 LocalDatabase LocalDatabase::openForChanges(common::RootPath const& root)
 {
-    return {pathToOpen(root), Use::changing};
+    return {pathToOpen(root), Use::changing, &root};
 }
 
 LocalDatabase LocalDatabase::open(common::RootPath const& root)
 {
-    return {pathToOpen(root), Use::reading};
+    return {pathToOpen(root), Use::reading, &root};
 }
 
-LocalDatabase::LocalDatabase(std::string const& path, Use use)
+LocalDatabase::LocalDatabase(std::string const& path, Use use, common::RootPath const* folder)
     : database_(path, kAdviceForDamage)
     , commits_(database_, 1)
     , verifiedFiles_(database_)
@@ -104,6 +105,9 @@ LocalDatabase::LocalDatabase(std::string const& path, Use use)
     }
     if (version == 0 || (version < kVersion && use == Use::changing)) {
         migrate();
+    }
+    if (folder) {
+        requireIdentity(*folder, repositoryId());
     }
 }
 

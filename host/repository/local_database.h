@@ -76,7 +76,8 @@ public:
 private:
     enum class Use { reading, changing };
 
-    LocalDatabase(std::string const& path, Use use);
+    /// Throws `Failure` when the database belongs to another repository than `folder`, unless that is null.
+    LocalDatabase(std::string const& path, Use use, common::RootPath const* folder);
 
     void migrate();
     OdString value(char const* key) const;

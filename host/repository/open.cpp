@@ -92,6 +92,7 @@ void requireOwnFiles(common::RootPath const& root)
     }
     failIfLink(root.statePath().ansi_str(), "file");
     failIfLink(root.pathTo(L".tav/config").ansi_str(), "file");
+    failIfLink(root.pathTo(L".tav/identity").ansi_str(), "file");
     failIfLink(root.pathTo(L".tav/properties/ignore").ansi_str(), "file");
     for (wchar_t const* const end : {L"", L"-journal", L"-shm", L"-wal"}) { // A database in use has files beside it.
         std::string const file = (root.dbPath() + end).ansi_str();

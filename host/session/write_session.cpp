@@ -4,14 +4,32 @@
 #include "host/checkout/checkout.h"
 #include "host/commits/commit.h"
 #include "host/errors/failure.h"
+#include "host/repository/identity.h"
 #include "host/repository/journal.h"
+#include "host/storage/local_storage.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <string>
 #include <utility>
 #include <variant>
 
 namespace tav {
+
+namespace {
+
+/// Whether the contents of the current commit are here. Those of another repository are not.
+bool isOfThisFolder(LocalDatabase const& database, common::RootPath const& root)
+{
+    Tree const files = database.commits().files(database.currentCommit());
+    LocalStorage storage(root);
+    return !files.empty() && std::all_of(files.begin(), files.end(), [&](auto const& file) {
+        auto const isKept = storage.contains(file.second);
+        return isKept.hasValue() && isKept.value();
+    });
+}
+
+} // namespace
 
 WriteSession::WriteSession(common::RootPath const& root, std::string const& name, Recovery recovery, Note note)
     : WriteSession(root, lockRepository(root, name), recovery, note)
@@ -24,6 +42,7 @@ WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Reco
     , start_(commandStart(root))
     , database_(LocalDatabase::openForChanges(root))
 {
+    keepIdentity();
     if (recovery == Recovery::skipped) {
         return;
     }
@@ -45,6 +64,18 @@ WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Reco
                 "is staged as before.\n",
                 stderr);
         }
+    }
+}
+
+/// Folders of earlier versions have none. Without it the commands work as well, and some are to free space.
+void WriteSession::keepIdentity() const
+{
+    try {
+        if (identities(root_).empty() && isOfThisFolder(database_, root_)) {
+            addIdentity(root_, database_.repositoryId());
+        }
+    } catch (Failure const&) {
+        // The next session tries again.
     }
 }
 

@@ -49,6 +49,7 @@ public:
     void failIfBetweenCommits() const;
 
 private:
+    void keepIdentity() const;
     void recover(PendingOperation const& pending);
 
     common::RootPath root_;

@@ -28,8 +28,8 @@ TEST_F(Init, MakesTheCurrentFolderARepository)
     EXPECT_EQ(tav({"init"}), done("Made a repository in '.'.\n"));
     EXPECT_THAT(
         place.list(), ElementsAre(
-                          ".tav/", ".tav/properties/", ".tav/properties/ignore", ".tav/tav.db", ".tav/tav.lock",
-                          ".tav/tav.state", "plan.dwg"));
+                          ".tav/", ".tav/identity", ".tav/properties/", ".tav/properties/ignore", ".tav/tav.db",
+                          ".tav/tav.lock", ".tav/tav.state", "plan.dwg"));
     EXPECT_EQ(place.read(".tav/properties/ignore"), kDefaultRules);
     EXPECT_EQ(place.read(".tav/tav.state"), kFreshState);
     EXPECT_EQ(place.read("plan.dwg"), "plan");
@@ -97,6 +97,15 @@ TEST_F(Init, RefusesAFolderInsideOfARepository)
                 "', which keeps its files. Add --nested to make a repository of its own all the same.\n"));
     }
     EXPECT_EQ(place.list(), before);
+}
+
+TEST_F(Init, TakesAServerWhateverElseIsInItsFolder)
+{
+    support::TempFolder const server;
+    server.write("5f0c2a9d1b3e4c6f8a7b9d0e1f2a3b4c/plan.dwg", "somebody's");
+    EXPECT_EQ(tav({"init", "--server", server.path()}), done("Made a repository in '.'.\n"));
+    EXPECT_EQ(server.read("5f0c2a9d1b3e4c6f8a7b9d0e1f2a3b4c/plan.dwg"), "somebody's");
+    EXPECT_TRUE(server.has("server.db"));
 }
 
 TEST_F(Init, EscapesTheFolderOnATerminal)

@@ -197,11 +197,13 @@ TEST_F(ServerPlace, KeepsItsIdentifierOnAnotherServer)
 
 TEST_F(ServerPlace, IsFoundAgainUnderAnotherIdentifier)
 {
-    std::string const shown = tav({"server"}).out;
-    tav::Database(place.pathTo("repository/.tav/tav.db"))
-        .run("UPDATE settings SET value = '5f0c1d2e3b4a59687766554433221100' WHERE key = 'repository'");
+    std::string const first = place.read("repository/.tav/identity");
+    tav::Database(place.pathTo("server/server.db"))
+        .run("UPDATE repositories SET id = '5f0c1d2e3b4a59687766554433221100'");
     EXPECT_EQ(tav({"server", "--send"}).out.substr(0, 16), "Sent 0 commits.\n");
-    EXPECT_EQ(tav({"server"}).out, shown);
+    EXPECT_THAT(tav({"server"}).out, HasSubstr("5f0c1d2e3b4a59687766554433221100"));
+    EXPECT_EQ(place.read("repository/.tav/identity"), first + "5f0c1d2e3b4a59687766554433221100\n");
+    EXPECT_EQ(tav({"fetch"}).code, 0);
 }
 
 TEST_F(ServerPlace, SaysWhichCommitsNoNameLeadsToWhenOthersHaveMovedTheBranch)
@@ -390,6 +392,9 @@ TEST_F(WaitingCommit, IsSaidToBeGivenUpWhenTheServerRefusesIt)
 class LostDatabase : public ServerPlace {
 protected:
     void loseDatabase() const { fs::remove(place.pathTo("repository/.tav/tav.db")); }
+
+    /// What remains is a folder of an earlier version of tav.
+    void loseIdentity() const { fs::remove(place.pathTo("repository/.tav/identity")); }
 };
 
 TEST_F(LostDatabase, IsMadeAgainFromTheServer)
@@ -429,6 +434,54 @@ TEST_F(LostDatabase, ReplacesADamagedOneThatWasMovedAway)
         EXPECT_EQ(tav({"init", "--server", server()}).code, 0);
         EXPECT_EQ(history(), before);
     }
+}
+
+/// The database of another repository, which has no commit, in the place of the own one.
+class ForeignDatabase : public ServerPlace {
+protected:
+    ForeignDatabase()
+    {
+        place.makeFolder("other");
+        EXPECT_EQ(tav({"-C", place.pathTo("other"), "init", "--server", server()}).code, 0);
+        fs::copy_file(
+            place.pathTo("other/.tav/tav.db"), place.pathTo("repository/.tav/tav.db"),
+            fs::copy_options::overwrite_existing);
+    }
+};
+
+TEST_F(ForeignDatabase, IsRefusedByEveryCommand)
+{
+    std::vector<std::string> const before = place.list();
+    for (Arguments const& arguments :
+         {Arguments{"status"}, {"log"}, {"verify"}, {"gc"}, {"add", "--all"}, {"commit", "-m", "x"}, {"fetch"}}) {
+        EXPECT_EQ(
+            tav(arguments), failed(
+                                "tav: The database '" + place.pathTo("repository/.tav/tav.db") +
+                                "' belongs to another repository. Put the right one in its place, or move it away and "
+                                "run 'tav init', which makes it again from the server.\n"))
+            << arguments.front();
+    }
+    EXPECT_THAT(tav({"init"}).err, HasSubstr("' belongs to another repository."));
+    EXPECT_EQ(place.list(), before);
+}
+
+TEST_F(ForeignDatabase, IsReplacedByTheOwnOne)
+{
+    move("repository/.tav/tav.db", "foreign.db");
+    EXPECT_EQ(tav({"init", "--server", server()}).code, 0);
+    EXPECT_EQ(hashes(), "1 first\n2 second\n");
+    EXPECT_EQ(tav({"gc"}), done(kNothingToGc));
+}
+
+TEST_F(ForeignDatabase, IsNoticedInAFolderOfAnEarlierVersionFromTheNextCommandOn)
+{
+    move("repository/.tav/tav.db", "foreign.db");
+    EXPECT_EQ(tav({"init", "--server", server()}).code, 0);
+    fs::remove(place.pathTo("repository/.tav/identity"));
+    EXPECT_EQ(tav({"status"}).code, 0);
+    EXPECT_FALSE(place.has("repository/.tav/identity"));
+    EXPECT_EQ(tav({"unstage", "--all"}).code, 0);
+    EXPECT_TRUE(place.has("repository/.tav/identity"));
 }
 
 TEST_F(LostDatabase, IsThatOfTheRepositoryWhoseVersionsAreHere)
@@ -506,6 +559,7 @@ TEST_F(OtherServer, IsNotTakenForSomeVersionsInCommon)
 {
     commitFile("h.txt", "hello", "the same");
     loseDatabase();
+    loseIdentity();
     move("repository", "unlisted");
     Setting setting;
     setting.folder = place.pathTo("unlisted");
@@ -518,6 +572,7 @@ TEST_F(OtherServer, IsNotTakenForSomeVersionsInCommon)
 
 TEST_F(OtherServer, LosesNothingToTheDatabaseOfItsFolder)
 {
+    loseIdentity();
     fs::copy(
         place.pathTo("project/.tav/tav.db"), place.pathTo("repository/.tav/tav.db"),
         fs::copy_options::overwrite_existing);
@@ -528,6 +583,7 @@ TEST_F(OtherServer, LosesNothingToTheDatabaseOfItsFolder)
             "tav: Only leftovers are removed: 1 committed version that should be here cannot be found. Run 'tav "
             "verify' to see what is missing; if '.tav/tav.db' is of another folder, put the right one in its place, or "
             "move it away and run 'tav init'.\n"}));
+    EXPECT_FALSE(place.has("repository/.tav/identity"));
 }
 
 /// The server of the project was copied to "moved" after the first commits, and is used there since.
