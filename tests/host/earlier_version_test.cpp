@@ -21,18 +21,20 @@ namespace fs = std::filesystem;
 using Digests = std::map<std::string, std::string>;
 
 /// A folder in tests/golden: "repository" with its working files, "server", and in "versions" a line for each file of
-/// each commit, with the commit's number, the file's digest and its path.
+/// each commit, with the commit's number, the file's digest and its path. A later form, named after the version of
+/// 'tav.db', has only the files that it changed.
 class EarlierVersion : public testing::TestWithParam<char const*> {
 protected:
     EarlierVersion()
     {
-        fs::copy(golden(), place_.path(), fs::copy_options::recursive);
+        fs::copy(golden("version_1"), place_.path(), fs::copy_options::recursive);
+        fs::copy(golden(GetParam()), place_.path(), fs::copy_options::recursive | fs::copy_options::overwrite_existing);
         tav::Database database(place_.pathTo("repository/.tav/tav.db"));
         tav::Statement row = database.prepare("UPDATE settings SET value = ? WHERE key = 'server'");
         row.with(place_.widePathTo("server")).run();
     }
 
-    std::string golden() const { return std::string(TAV_GOLDEN) + "/" + GetParam(); }
+    static std::string golden(std::string const& name) { return std::string(TAV_GOLDEN) + "/" + name; }
 
     Outcome tav(Arguments const& arguments) const
     {
@@ -44,7 +46,7 @@ protected:
     std::map<std::string, Digests> expectedVersions() const
     {
         std::map<std::string, Digests> versions;
-        std::ifstream lines(golden() + "/versions");
+        std::ifstream lines(golden("version_1") + "/versions");
         for (std::string commit, digest, path; lines >> commit >> digest && std::getline(lines >> std::ws, path);) {
             versions[commit][path] = digest;
         }
@@ -108,9 +110,9 @@ TEST_P(EarlierVersion, GoesOn)
     EXPECT_EQ(exported("6").at("plan.dwg"), generateSha("drawn anew", 10).ansi_str());
 }
 
-INSTANTIATE_TEST_SUITE_P(EarlierVersions, EarlierVersion, testing::Values("version_1"), [](auto const& row) {
-    return std::string(row.param);
-});
+INSTANTIATE_TEST_SUITE_P(
+    EarlierVersions, EarlierVersion, testing::Values("version_1", "version_2", "version_4"),
+    [](auto const& row) { return std::string(row.param); });
 
 } // namespace
 } // namespace host_tests

@@ -397,6 +397,23 @@ void loseACommitOnTheServer(Scene const& scene)
     scene.place().write("now/repository/.tav/tav.db", current);
 }
 
+/// What the first version of tav kept in its database.
+void bringToTheFirstForm(Scene const& scene)
+{
+    tav::Database database(scene.folder() + "/.tav/tav.db");
+    std::string drops;
+    {
+        tav::Statement rows = database.prepare(
+            "SELECT type || ' ' || name FROM sqlite_master WHERE name NOT LIKE 'sqlite_%' AND name NOT IN "
+            "('commits', 'parents', 'changes', 'refs', 'settings', 'contents', 'contents_by_digest') AND tbl_name "
+            "NOT IN ('settings', 'contents') ORDER BY type");
+        while (rows.next()) {
+            drops += "DROP " + rows.text(0).ansi_str() + ";";
+        }
+    }
+    database.run((drops + "PRAGMA user_version = 1").c_str());
+}
+
 } // namespace
 
 std::vector<SceneRow> const& historyRows()
@@ -407,6 +424,12 @@ std::vector<SceneRow> const& historyRows()
          {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"},
          commitBesideOthers,
          false},
+        {"Switch",
+         {"switch", "side"},
+         [](Scene const& scene) {
+             require(scene.tav({"branch", "side", "1"}).code == 0, "make a branch");
+         }},
+        {"CheckoutInTheFirstForm", {"checkout", "1"}, bringToTheFirstForm},
         {"Send", {"server", "--send"}, loseACommitOnTheServer, false},
         {"Init",
          {"init", "--server", "../server"},

@@ -93,8 +93,8 @@ std::vector<SceneRow> const& sceneRows();
 /// The same for commands that can be undone.
 std::vector<SceneRow> const& undoRows();
 
-/// The same for commands that bring the history here and that of the server together. The two differ before them, which
-/// `verify` reports.
+/// The same for commands whose changes are in databases: they bring the history here and that of the server together,
+/// go to another branch, or bring the database to its present form.
 std::vector<SceneRow> const& historyRows();
 
 } // namespace host_tests
