@@ -7,6 +7,7 @@
 
 #include <utime.h>
 
+#include <algorithm>
 #include <map>
 #include <string>
 #include <utility>
@@ -18,20 +19,23 @@ namespace {
 /// One walk: what it lists, and where it puts it.
 class Walk {
 public:
-    Walk(CollectOptions const& options, NameFilter const& excluded, DirContents& contents)
+    Walk(
+        CollectOptions const& options, NameFilter const& excluded, DirContents& contents, std::vector<OdString>& unread)
         : options_(options)
         , excluded_(excluded)
         , contents_(contents)
+        , unread_(unread)
     {
     }
 
     void enter(OdString const& folder, OdString const& prefix) const
     {
         ut::Dir dir;
+        OdString const separator = ut::FileName::getPathSeparator();
         if (!dir.open(folder)) {
+            unread_.push_back(prefix.left(prefix.getLength() - std::min(prefix.getLength(), separator.getLength())));
             return;
         }
-        OdString const separator = ut::FileName::getPathSeparator();
         forEachAccepted(dir, ut::Dir::kFiles, [&](OdString const& name) { contents_.files.push_back(prefix + name); });
         forEachAccepted(dir, ut::Dir::kDirs, [&](OdString const& name) {
             if (options_.collectDirs) {
@@ -57,6 +61,7 @@ private:
     CollectOptions const& options_;
     NameFilter const& excluded_;
     DirContents& contents_;
+    std::vector<OdString>& unread_;
 };
 
 NameFilter namesOutsideTheRepository(RootPath const& root)
@@ -104,16 +109,23 @@ DirContents collectDirContents(OdString const& folder, CollectOptions const& opt
     DirContents contents;
     OdString const prefix = options.relativePaths ? OdString() : folder + ut::FileName::getPathSeparator();
     NameFilter const excluded(options.excludes);
-    Walk(options, excluded, contents).enter(folder, prefix);
+    std::vector<OdString> unread;
+    Walk(options, excluded, contents, unread).enter(folder, prefix);
     return contents;
 }
 
 Expected<std::vector<File>> collectRepoFiles(RootPath const& root)
 {
+    std::vector<OdString> unread;
+    return collectRepoFiles(root, unread);
+}
+
+Expected<std::vector<File>> collectRepoFiles(RootPath const& root, std::vector<OdString>& unread)
+{
     CollectOptions const options(true, false, false, {});
     NameFilter const excluded = namesOutsideTheRepository(root);
     DirContents contents;
-    Walk const walk(options, excluded, contents);
+    Walk const walk(options, excluded, contents, unread);
     walk.enter(root.path(), OdString::kEmpty);
 
     Expected<OdString> const properties = root.relativePathTo(root.propertiesPath());

@@ -54,6 +54,10 @@ MU_COMMON_EXPORT DirContents collectDirContents(OdString const& folder, CollectO
 /// and `OdError` for an ignore file that cannot be read (see `RepoIgnore`).
 MU_COMMON_EXPORT Expected<std::vector<File>> collectRepoFiles(RootPath const& root);
 
+/// The same. Adds to `unread` the folders that could not be opened, relative to the working folder and in the order of
+/// the walk: their files are missing from the list. Folders that do not exist, or no longer, are among them.
+MU_COMMON_EXPORT Expected<std::vector<File>> collectRepoFiles(RootPath const& root, std::vector<OdString>& unread);
+
 /// The drawings that have other versions in the conflict folder, in ascending order of their paths.
 MU_COMMON_EXPORT std::vector<std::unique_ptr<ConflictInfo>> collectConflictPaths(RootPath const& root);
 

@@ -11,6 +11,7 @@
 #include "common/mu_common_file_utils.h"
 
 #include <algorithm>
+#include <filesystem>
 #include <future>
 #include <iterator>
 #include <regex>
@@ -56,13 +57,51 @@ bool isStill(CommittedFile const& file, common::RootPath const& root)
     return file.sight.stamp && FolderView(root).look(file.path).stamp == file.sight.stamp;
 }
 
+/// A folder that cannot be examined is taken for there.
+bool exists(OdString const& folder, common::RootPath const& root)
+{
+    std::error_code error;
+    std::string const path = folder.isEmpty() ? root.path().ansi_str() : root.pathTo(folder).ansi_str();
+    return std::filesystem::symlink_status(path, error).type() != std::filesystem::file_type::not_found;
+}
+
+OdString folderOf(OdString const& path)
+{
+    return fromUtf8(std::filesystem::path(path.ansi_str()).parent_path().string());
+}
+
 } // namespace
 
-std::vector<common::File> scan(common::RootPath const& root)
+bool isBelow(Folders const& folders, OdString const& path)
+{
+    if (folders.count(OdString()) > 0) {
+        return true;
+    }
+    for (std::size_t i = 0; !folders.empty() && i < path.getLength(); ++i) {
+        if (path.getAt(i) == L'/' && folders.count(path.left(i)) > 0) {
+            return true;
+        }
+    }
+    return false;
+}
+
+bool isUnread(Presence presence, OdString const& path, Folders const& unreadable)
+{
+    return presence == Presence::isUnknown || (presence == Presence::isGone && isBelow(unreadable, path));
+}
+
+Scanned scan(common::RootPath const& root)
 {
     requireRules(root);
     try {
-        return valueOrFail(common::collectRepoFiles(root), "Check the path of the repository.");
+        std::vector<OdString> unread;
+        Scanned scanned{valueOrFail(common::collectRepoFiles(root, unread), "Check the path of the repository."), {}};
+        for (OdString const& folder : unread) {
+            if (exists(folder, root)) {
+                scanned.unreadable.insert(folder);
+            }
+        }
+        return scanned;
     } catch (std::regex_error const&) {
         throw Failure(
             "The ignore file has a rule that is not a valid regular expression.", "Correct '.tav/properties/ignore'.");
@@ -79,11 +118,13 @@ FolderMatch matchFolder(common::RootPath const& root, FileList committed, Verifi
     return match;
 }
 
-FolderMatch matchPaths(std::vector<common::File> scanned, FileList committed)
+FolderMatch matchPaths(Scanned found, FileList committed)
 {
+    std::vector<common::File>& scanned = found.files;
     auto const byPath = [](common::File const& a, common::File const& b) { return a.path < b.path; };
     sortScanned(scanned, byPath);
     FolderMatch match;
+    match.unreadable = std::move(found.unreadable);
     match.committed.reserve(committed.size());
     auto file = scanned.begin();
     for (ListedFile& listed : committed) {
@@ -117,6 +158,7 @@ void Examination::run()
 FolderChanges compare(common::RootPath const& root, FolderMatch match, VerifiedFileList* verified)
 {
     FolderChanges changes;
+    changes.unreadable = std::move(match.unreadable);
     for (CommittedFile& file : match.committed) {
         bool const isThere = file.sight.presence == Presence::isThere;
         OdString url = fromUtf8(file.url);
@@ -129,10 +171,17 @@ FolderChanges compare(common::RootPath const& root, FolderMatch match, VerifiedF
             changes.unchanged.push_back(std::move(version));
         } else if (isThere) {
             changes.modified.push_back({nullptr, {version.path}, version, 0});
+        } else if (isUnread(file.sight.presence, version.path, changes.unreadable)) {
+            changes.unread.push_back(std::move(version));
         } else if (file.sight.presence == Presence::isBehindLink) {
             changes.unreachable.push_back(std::move(version));
         } else {
             changes.removed.push_back({nullptr, std::move(version), 0});
+        }
+    }
+    for (common::VersionedFile const& file : changes.unread) {
+        if (!isBelow(changes.unreadable, file.path)) {
+            changes.unreadable.insert(folderOf(file.path));
         }
     }
     for (common::File& file : match.untracked) {
@@ -180,7 +229,8 @@ bool hasOtherContent(OdString const& path, OdString const& url, common::RootPath
 std::vector<OdString> ignoredFiles(common::RootPath const& root)
 {
     std::set<OdString> kept;
-    for (common::File& file : scan(root)) {
+    Scanned scanned = scan(root);
+    for (common::File& file : scanned.files) {
         kept.insert(std::move(file.path));
     }
     common::CollectOptions const everything(true, false, false, {});

@@ -11,13 +11,26 @@
 #include <atomic>
 #include <cstddef>
 #include <cstdint>
+#include <set>
 #include <string>
 #include <vector>
 
 namespace tav {
 
-/// The files that the repository keeps. Throws `Failure` when the ignore rules cannot be used.
-std::vector<common::File> scan(common::RootPath const& root);
+/// Folders relative to the working folder, which is the empty path.
+using Folders = std::set<OdString>;
+
+/// Whether `path` is below one of `folders`.
+bool isBelow(Folders const& folders, OdString const& path);
+
+/// What a scan has found.
+struct Scanned {
+    std::vector<common::File> files; ///< those that the repository keeps
+    Folders unreadable;              ///< the folders whose files are not known
+};
+
+/// Throws `Failure` when the ignore rules cannot be used.
+Scanned scan(common::RootPath const& root);
 
 /// A file of a commit, and what is known of the working file at the same path.
 struct CommittedFile {
@@ -31,6 +44,7 @@ struct CommittedFile {
 struct FolderMatch {
     std::vector<CommittedFile> committed;
     std::vector<common::File> untracked;
+    Folders unreadable; ///< the folders whose files are not known
 };
 
 /// Finds out which of the files `committed` are in the working folder, which of them are `known`, and which other files
@@ -38,7 +52,7 @@ struct FolderMatch {
 FolderMatch matchFolder(common::RootPath const& root, FileList committed, VerifiedFileList const& known);
 
 /// The same for files that have been `scanned` already; does not examine the committed ones.
-FolderMatch matchPaths(std::vector<common::File> scanned, FileList committed);
+FolderMatch matchPaths(Scanned scanned, FileList committed);
 
 /// Examines each file of a list, which takes longer than finding the files.
 class Examination {
@@ -66,7 +80,14 @@ struct FolderChanges : common::RepoChanges {
     /// Files of the commit in folders that links have replaced. A link may lead anywhere, so a scan does not follow it:
     /// files behind it are neither read nor treated as removed.
     std::vector<common::VersionedFile> unreachable;
+    /// Files of the commit that cannot be examined, or are missing in a folder that cannot be read. They do not count
+    /// as removed either.
+    std::vector<common::VersionedFile> unread;
+    Folders unreadable; ///< the folders of these files, and all others that cannot be read
 };
+
+/// Whether a file is one of the `unread`.
+bool isUnread(Presence presence, OdString const& path, Folders const& unreadable);
 
 /// How the working folder differs from the commit. A file that is known is not read. Files that were read and are
 /// unchanged are added to `verified`, unless it is null.

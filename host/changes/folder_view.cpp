@@ -20,7 +20,7 @@ std::int64_t nanoseconds(timespec const& time)
 
 Presence presenceAfterError()
 {
-    return errno == ENOENT || errno == ENOTDIR ? Presence::isGone : Presence::isThere;
+    return errno == ENOENT || errno == ENOTDIR ? Presence::isGone : Presence::isUnknown;
 }
 
 /// Whether files can be there where `name`, an entry of `folder`, could not be entered.

@@ -13,7 +13,8 @@ namespace tav {
 
 enum class Presence {
     isGone,       ///< nothing is there, or a folder
-    isThere,      ///< a file, or something that cannot be examined, which does not count as removed
+    isThere,      ///< a file, or something in its place
+    isUnknown,    ///< it cannot be examined, and does not count as removed
     isBehindLink, ///< one of its folders is now a link, and a scan does not follow links to folders
 };
 

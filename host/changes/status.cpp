@@ -53,9 +53,11 @@ std::vector<StagedEntry>
 stagedEntries(common::State const& state, FolderMatch const& match, common::RootPath const& root)
 {
     std::vector<StagedEntry> entries;
+    FolderView view(root);
     for (common::StagedFile const& file : state.stagedFiles) {
-        bool const isMissing =
-            file.change != common::FileChange::removed && !ut::FileName::fileExists(root.pathTo(file.path));
+        bool const isMissing = file.change != common::FileChange::removed &&
+                               !ut::FileName::fileExists(root.pathTo(file.path)) &&
+                               !isUnread(view.look(file.path).presence, file.path, match.unreadable);
         entries.push_back({file.path, file.change, previousPath(file.path, state, match), isMissing});
     }
     auto const byPath = [](StagedEntry const& a, StagedEntry const& b) { return a.path < b.path; };
@@ -180,6 +182,7 @@ Status statusOf(common::RootPath const& root, bool withIgnored)
     enterDoubts(renames, formerPathsOfMoves(renames, database, root), root, status);
     auto const pathOf = [](auto& file) -> OdString& { return file.path; };
     status.unreachable = takeSorted(changes.unreachable, left, pathOf);
+    status.unreadable.assign(changes.unreadable.begin(), changes.unreadable.end());
     if (withIgnored) {
         status.ignored = ignoredFiles(root);
         sortScanned(status.ignored, std::less<>());

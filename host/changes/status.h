@@ -34,12 +34,13 @@ struct Status {
     std::vector<OdString> removed;     ///< gone from the working folder; the next commit takes that without staging
     bool isRemovalDoubtful = false;    ///< the next commit takes `removed` only when an option says so
     std::vector<OdString> unreachable; ///< committed files in folders that links have replaced
+    std::vector<OdString> unreadable;  ///< folders that cannot be read; commits keep their files
     std::vector<OdString> ignored;     ///< filled in on request
 
     bool isClean() const
     {
         return conflicts.empty() && staged.empty() && modified.empty() && untracked.empty() && renamed.empty() &&
-               removed.empty() && unreachable.empty();
+               removed.empty() && unreachable.empty() && unreadable.empty();
     }
 };
 

@@ -62,7 +62,8 @@ std::map<OdString, OdString> repairFromFolder(
 {
     std::map<OdString, OdString> repaired;
     Wanted wanted = wantedOf(urls, database);
-    for (common::File const& file : scan(root)) {
+    Scanned const scanned = scan(root);
+    for (common::File const& file : scanned.files) {
         if (wanted.urls.empty()) {
             break;
         }

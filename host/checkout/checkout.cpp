@@ -59,6 +59,9 @@ Changed changedFiles(common::RootPath const& root, LocalDatabase& database, std:
     for (auto const& file : changes.modified) {
         changed.modified.emplace(file.committed.path, file.committed.storagePath);
     }
+    for (common::VersionedFile const& file : changes.unread) {
+        changed.modified.emplace(file.path, file.storagePath);
+    }
     for (auto const& file : changes.removed) {
         changed.removed.emplace(file.committed.path, file.committed.storagePath);
     }

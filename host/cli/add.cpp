@@ -69,6 +69,9 @@ bool isBehindLink(OdString const& path, FolderChanges const& changes, common::Ro
             "'" + name + "' is behind a link to a folder, which tav does not enter.",
             "Put the folder itself in the place of the link.");
     }
+    if (isBelow(changes.unreadable, path + L"/")) {
+        throw Failure("'" + name + "' is a folder that cannot be read, or in one.", "Check your rights to it.");
+    }
     for (auto const& file : changes.removed) {
         if (file.committed.path == path) {
             throw Failure("'" + name + "' has been removed.", "The next commit takes that without staging.");
@@ -116,6 +119,16 @@ std::size_t repair(std::vector<common::VersionedFile> const& files, common::Root
     return count;
 }
 
+void noteUnreadable(Folders const& folders)
+{
+    if (!folders.empty()) {
+        printNote("Nothing has been staged of these folders, which cannot be read. Check your rights to them:");
+    }
+    for (OdString const& folder : folders) {
+        printErrorDetail((folder.isEmpty() ? OdString(L".") : folder).ansi_str() + "/");
+    }
+}
+
 } // namespace
 
 void addFilesToStage(AddOptions const& options)
@@ -138,6 +151,9 @@ void addFilesToStage(AddOptions const& options)
         entry->write(cache.read());
     });
     entry->keep();
+    if (options.all) {
+        noteUnreadable(changes.unreadable);
+    }
     if (repaired > 0) {
         report("Repaired " + counted(repaired, "stored version") + ".\n");
     }

@@ -95,7 +95,7 @@ void listFiles(FilesOptions const& options)
         listCommittedFiles(options, root);
         return;
     }
-    std::vector<common::File> const files = scan(root);
+    std::vector<common::File> const files = scan(root).files;
     std::vector<Listed> list;
     if (options.hash) {
         list = digestAll(root, files);

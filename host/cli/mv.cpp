@@ -38,6 +38,18 @@ bool isBelow(OdString const& path, OdString const& folder)
     return path.left(folder.getLength() + 1) == folder + L"/";
 }
 
+/// The files of a folder that cannot be read would count as removed in their old place.
+void failIfUnreadable(OdString const& from, Folders const& unreadable)
+{
+    for (OdString const& folder : unreadable) {
+        if (folder == from || isBelow(folder, from)) {
+            throw Failure(
+                "The folder '" + folder.ansi_str() + "' cannot be read, so its files would not be renamed.",
+                "Check your rights to it.");
+        }
+    }
+}
+
 /// Into a folder that exists, a file keeps its name.
 OdString targetOf(OdString const& from, std::string const& typed, common::RootPath const& root)
 {
@@ -166,7 +178,8 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     common::RootPath const& root = session.root();
     OdString const from = pathInRepository(root, typedFrom);
     OdString const to = targetOf(from, typedTo, root);
-    std::vector<Move> const moves = movesOf(from, to, scan(root));
+    Scanned const scanned = scan(root);
+    std::vector<Move> const moves = movesOf(from, to, scanned.files);
     if (moves.empty()) {
         throw Failure(
             "'" + typedFrom + "' is not a file or folder of the repository.", "Run 'tav files' to see those.");
@@ -174,6 +187,7 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     if (isBelow(to, from)) {
         throw Failure("'" + typedFrom + "' cannot be moved into itself.", "Choose another place.");
     }
+    failIfUnreadable(from, scanned.unreadable);
     if (isInTav(from)) {
         throw Failure("'" + typedFrom + "' belongs to the repository itself.", "It has to stay where it is.");
     }

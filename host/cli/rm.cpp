@@ -41,6 +41,7 @@ namespace fs = std::filesystem;
 struct CommittedFiles {
     Tree reachable; ///< in the working folder, unless they are gone already
     Tree others;    ///< behind links: they are not touched
+    Tree unread;    ///< their folders cannot be read
     Tree changed;   ///< they hold what no commit has
 };
 
@@ -56,6 +57,9 @@ CommittedFiles committedFiles(FolderChanges const& changes)
     for (common::VersionedFile const& file : changes.unreachable) {
         files.others.emplace(file.path, file.storagePath);
     }
+    for (common::VersionedFile const& file : changes.unread) {
+        files.unread.emplace(file.path, file.storagePath);
+    }
     for (auto const& file : changes.modified) {
         files.changed.emplace(file.committed.path, file.committed.storagePath);
     }
@@ -65,7 +69,7 @@ CommittedFiles committedFiles(FolderChanges const& changes)
 NameFinder finderOf(CommittedFiles const& files, common::RootPath const& root)
 {
     std::vector<common::StagedFile> all;
-    for (Tree const* const tree : {&files.reachable, &files.others, &files.changed}) {
+    for (Tree const* const tree : {&files.reachable, &files.others, &files.unread, &files.changed}) {
         for (auto const& [path, url] : *tree) {
             all.emplace_back(path, common::FileChange::removed);
         }
@@ -92,6 +96,10 @@ std::vector<common::StagedFile> removableFiles(
     for (common::StagedFile const& file : found) { // A folder is removed only when no work in it would be lost.
         if (files.changed.count(file.path) > 0) {
             failForChanges(file.path.ansi_str());
+        }
+        if (files.unread.count(file.path) > 0) {
+            throw Failure(
+                "'" + file.path.ansi_str() + "' is in a folder that cannot be read.", "Check your rights to it.");
         }
     }
     return found;

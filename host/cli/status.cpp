@@ -76,6 +76,7 @@ void printDocument(Status const& status, bool withIgnored)
     object[L"removed"] = documentOf(status.removed);
     object[L"renamed"] = documentOf(status.renamed);
     object[L"unreachable"] = documentOf(status.unreachable);
+    object[L"unreadable"] = documentOf(status.unreadable);
     if (withIgnored) {
         object[L"ignored"] = documentOf(status.ignored);
     }
@@ -135,6 +136,16 @@ void printRenamed(Renames const& renames, bool isDoubtful)
     print("\n");
 }
 
+/// The working folder itself is the empty path.
+std::vector<OdString> asFolders(std::vector<OdString> const& paths)
+{
+    std::vector<OdString> folders;
+    for (OdString const& path : paths) {
+        folders.push_back((path.isEmpty() ? OdString(L".") : path) + L"/");
+    }
+    return folders;
+}
+
 void printForPeople(Status const& status)
 {
     print("On branch " + shown(status.branch) + "\n");
@@ -158,6 +169,9 @@ void printForPeople(Status const& status)
     printGroup(
         "Behind links to folders:", "tav does not enter these; the next commit keeps the files as they are", "",
         Colour::red, status.unreachable);
+    printGroup(
+        "Folders that cannot be read:", "their files are not known; the next commit keeps those that it has", "",
+        Colour::red, asFolders(status.unreadable));
     printGroup("New, not staged:", "use 'tav add NAME' or 'tav add --all' to stage", "", Colour::red, status.untracked);
     printGroup("Ignored:", "see 'tav ignore' for the rules", "", Colour::none, status.ignored);
     if (status.isClean()) {

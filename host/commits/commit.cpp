@@ -250,12 +250,20 @@ void checkNames(std::vector<PlannedFile> const& plan)
 }
 
 /// What is behind a link is not in the working folder, and no removal either.
-void failIfBehindLink(common::State const& state, common::RootPath const& root)
+void failIfUnreachable(common::State const& state, Folders const& unreadable, common::RootPath const& root)
 {
     FolderView view(root);
     for (common::StagedFile const& file : state.stagedFiles) {
-        bool const isTaken = file.change != common::FileChange::removed;
-        if (isTaken && view.look(file.path).presence == Presence::isBehindLink) {
+        if (file.change == common::FileChange::removed) {
+            continue;
+        }
+        Presence const presence = view.look(file.path).presence;
+        if (isUnread(presence, file.path, unreadable)) {
+            throw Failure(
+                quoted(file.path) + " is staged, but its folder cannot be read.",
+                "Check your rights to it, or run 'tav unstage' for the file.");
+        }
+        if (presence == Presence::isBehindLink) {
             throw Failure(
                 quoted(file.path) + " is staged, but a link has taken the place of its folder.",
                 "Put the folder itself in its place, or run 'tav unstage' for the file.");
@@ -418,7 +426,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     if (order.takesModified) {
         stageModified(changes, state); // In memory: a commit that fails has staged nothing.
     }
-    failIfBehindLink(state, root);
+    failIfUnreachable(state, changes.unreadable, root);
     Renames const renames = findRenames(changes, state, database, root);
     std::vector<PlannedFile> plan = planCommit(state, changes, renames, draft.files, root);
     planMissing(plan, state, formerPathsOfMoves(renames, database, root), order.missing, root);

@@ -332,6 +332,27 @@ TEST(CollectRepoFiles, FindsNothingInAnEmptyOrMissingFolder)
     EXPECT_THAT(missing.value(), IsEmpty());
 }
 
+TEST(CollectRepoFiles, NamesTheFoldersThatCannotBeOpened)
+{
+    TempRepository const repository;
+    repository.add({"a.txt", "plans/b.dwg", "plans/old/c.dwg"});
+    ASSERT_EQ(chmod(repository.path().c_str(), 0755), 0);
+    ASSERT_EQ(chmod(repository.pathTo("plans/old").c_str(), 0), 0);
+    std::string const found = support::asOrdinaryUser([&] {
+        std::vector<OdString> unread;
+        Expected<std::vector<common::File>> const files = common::collectRepoFiles(repository.root(), unread);
+        std::string text;
+        for (common::File const& file : files.value()) {
+            text += file.path.ansi_str() + " ";
+        }
+        for (OdString const& folder : unread) {
+            text += "-" + folder.ansi_str() + " ";
+        }
+        return text;
+    });
+    EXPECT_EQ(found, "a.txt plans/b.dwg -plans/old -.tav/properties ") << "no properties are there";
+}
+
 TEST(CollectRepoFiles, ListsNamesOutsideAscii)
 {
     TempRepository const repository;

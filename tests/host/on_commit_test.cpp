@@ -108,6 +108,8 @@ New, not staged:
     ],
     "unreachable" : [
     ],
+    "unreadable" : [
+    ],
     "untracked" : [
         "new.dwg"
     ]

@@ -33,6 +33,8 @@ TEST_F(Status, SaysThatNothingHasChanged)
     ],
     "unreachable" : [
     ],
+    "unreadable" : [
+    ],
     "untracked" : [
     ]
 }
@@ -187,6 +189,8 @@ TEST_F(StatusOfEverything, IsADocumentForPrograms)
         }
     ],
     "unreachable" : [
+    ],
+    "unreadable" : [
     ],
     "untracked" : [
         "a/z.dwg"
