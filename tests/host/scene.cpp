@@ -349,7 +349,7 @@ void storeWhatNobodyNeeds(Scene const& scene)
     {
         tav::LocalDatabase const database = tav::LocalDatabase::open(scene.root());
         tav::Tree const files = database.commits().files(database.currentCommit());
-        tav::LocalStorage storage(scene.root(), [&](OdString const& path) { return files.at(path); });
+        tav::LocalStorage storage(scene.root(), {[&](OdString const& path) { return files.at(path); }, {}, {}});
         require(storage.store(L"plan.dwg").hasValue(), "store a drawing");
         require(storage.store(L"note.txt").hasValue(), "store a text");
         require(storage.flush().hasValue(), "flush");
