@@ -38,7 +38,7 @@ std::vector<std::string> filesOfRemovals(common::RootPath const& root)
             }
         }
     } catch (StorageError const& error) {
-        throw Failure(error.what, "Check your rights to it.");
+        throw Failure(error.what, "Check your permissions for it.");
     }
     return files;
 }

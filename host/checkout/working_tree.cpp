@@ -25,7 +25,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr char const* kAgain = "What has been written is whole; correct that and run the command again.";
+constexpr char const* kAgain = "Everything written so far is complete; correct that and run the command again.";
 constexpr char const* kNothingYet = "Nothing has been written; correct that and run the command again.";
 constexpr std::uint64_t kBetweenFiles = 1000; ///< ns; the finest step that all file systems with fractions know
 
@@ -151,7 +151,7 @@ private:
         if (!digest && discard_ != Discard::everything) {
             throw Failure(
                 "'" + path.ansi_str() + "' cannot be read, and may hold changes that are in no commit.",
-                "Nothing has been written; check the disk and your rights to the file.");
+                "Nothing has been written; check the disk and your permissions for the file.");
         }
         OdString url = digest ? expectedUrlOf(path, *digest) : OdString();
         bool const isExpected = !url.isEmpty();
@@ -326,7 +326,7 @@ void requireUnchanged(os::Batch& batch, TreeUpdate const& update, OdString const
     os::FileMark now;
     requireDone(batch.mark(path.ansi_str(), now), path, next);
     if (!isSame(now, update.marks.at(path))) {
-        throw Failure("'" + path.ansi_str() + "' has been changed while this command was at work.", next);
+        throw Failure("'" + path.ansi_str() + "' changed while this command was running.", next);
     }
 }
 
@@ -341,7 +341,7 @@ void requireAllUnchanged(os::Batch& batch, TreeUpdate const& update)
 
 void placeAll(os::Batch& batch, TreeUpdate const& update, Restored const& restored)
 {
-    constexpr char const* kWhole = "What has been written is whole; run the command again.";
+    constexpr char const* kWhole = "Everything written so far is complete; run the command again.";
     for (auto const& [path, url] : update.removals) {
         requireUnchanged(batch, update, path, kWhole);
         requireDone(batch.remove(path.ansi_str()), path, kAgain);
@@ -422,7 +422,7 @@ void extract(LocalStorage& storage, Tree::value_type const& file, std::string co
     if (auto const done = storage.extract(url, target); !done.hasValue()) {
         bool const isDamaged = !storage.verify(url).hasValue();
         throw Failure(
-            "'" + path.ansi_str() + "' cannot be brought back: " + done.error().message.ansi_str(),
+            "'" + path.ansi_str() + "' cannot be restored: " + done.error().message.ansi_str(),
             isDamaged ? "Run 'tav verify' to see what is damaged." : "Check the free space.");
     }
 }

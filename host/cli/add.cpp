@@ -67,14 +67,14 @@ bool isBehindLink(OdString const& path, FolderChanges const& changes, common::Ro
     if (isBehindLink(path, changes, root)) {
         throw Failure(
             "'" + name + "' is behind a link to a folder, which tav does not enter.",
-            "Put the folder itself in the place of the link.");
+            "Replace the link with the folder itself.");
     }
     if (isBelow(changes.unreadable, path + L"/")) {
-        throw Failure("'" + name + "' is a folder that cannot be read, or in one.", "Check your rights to it.");
+        throw Failure("'" + name + "' is a folder that cannot be read, or in one.", "Check your permissions for it.");
     }
     for (auto const& file : changes.removed) {
         if (file.committed.path == path) {
-            throw Failure("'" + name + "' has been removed.", "The next commit takes that without staging.");
+            throw Failure("'" + name + "' has been removed.", "The next commit includes that without staging.");
         }
     }
     throw Failure("No changed file matches '" + name + "'.", "Run 'tav status --ignored' to see what there is.");
@@ -122,7 +122,7 @@ std::size_t repair(std::vector<common::VersionedFile> const& files, common::Root
 void noteUnreadable(Folders const& folders)
 {
     if (!folders.empty()) {
-        printNote("Nothing has been staged of these folders, which cannot be read. Check your rights to them:");
+        printNote("Nothing has been staged of these folders, which cannot be read. Check your permissions for them:");
     }
     for (OdString const& folder : folders) {
         printErrorDetail((folder.isEmpty() ? OdString(L".") : folder).ansi_str() + "/");

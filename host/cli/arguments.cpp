@@ -21,7 +21,7 @@ std::optional<CommitRecord> commitNamed(std::string const& word, LocalDatabase c
     if (commit && isFile(word)) {
         throw Failure(
             "'" + word + "' names commit " + std::to_string(commit->number) + ", and a file too.",
-            "Type it before '--' for the commit, and behind '--' for the file.");
+            "Type it before '--' for the commit, and after '--' for the file.");
     }
     return commit;
 }
@@ -31,7 +31,7 @@ void failIfTooMany(std::size_t count, std::size_t most)
     if (count > most) {
         throw Failure(
             "There are " + std::to_string(count) + " commits before '--'.",
-            "Name at most " + std::to_string(most) + "; names of files come behind '--'.");
+            "Name at most " + std::to_string(most) + "; names of files come after '--'.");
     }
 }
 

@@ -16,7 +16,7 @@ void printFile(std::string const& typed)
         return;
     }
     throw Failure(
-        "'" + typed + "' names no file of a commit.",
+        "'" + typed + "' does not name a file in a commit.",
         "Type a commit, a colon and a name, as in 'tav cat 12:roof.dwg'.");
 }
 

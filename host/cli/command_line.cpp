@@ -110,7 +110,7 @@ void parse(CLI::App& app, std::vector<std::string> const& words)
 void enterFolder(std::string const& folder)
 {
     if (chdir(folder.c_str()) == -1) {
-        throw Failure("The folder '" + folder + "' cannot be entered.", "Check its name and your rights to it.");
+        throw Failure("The folder '" + folder + "' cannot be entered.", "Check its name and your permissions for it.");
     }
 }
 

@@ -23,7 +23,7 @@ void checkText(std::string const& text, char const* what)
 {
     bool const isBlank = text.find_first_not_of(" \t\r\n") == std::string::npos;
     if (isBlank) {
-        throw Failure(std::string("The ") + what + " is empty.", "Say in a few words what has changed, and who did.");
+        throw Failure(std::string("The ") + what + " is empty.", "Say what has changed, and who made the change.");
     }
 }
 

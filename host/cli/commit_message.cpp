@@ -26,7 +26,7 @@ constexpr std::size_t kMostChanges = 1000; // More would only slow down the edit
 
 std::string comment(std::vector<std::string> const& changes)
 {
-    std::string text = "# Say what has changed, and why. Lines that begin with '#' are left out.\n"
+    std::string text = "# Say what has changed, and why. Lines that begin with '#' are ignored.\n"
                        "# Without a message, nothing is committed.\n#\n# This will be committed:\n";
     for (std::size_t i = 0; i < std::min(changes.size(), kMostChanges); ++i) {
         text += "#   " + changes[i] + "\n";

@@ -26,7 +26,7 @@ kutils::json::Object documentOf(Comparison const& comparison, DrawingVersion con
 std::string summary(Comparison const& comparison)
 {
     if (comparison.removed + comparison.added + comparison.recolored == 0) {
-        return "The pictures are alike; the drawings may differ in what the pictures do not show.\n";
+        return "The pictures are identical; the drawings may still differ.\n";
     }
     return "Pixels that differ: " + std::to_string(comparison.removed) + " removed, " +
            std::to_string(comparison.added) + " added, " + std::to_string(comparison.recolored) + " recolored.\n";

@@ -114,7 +114,7 @@ void noteOther(std::string const& key, Origin origin)
         printNote(
             "Here the value is '" + effective.value + "': " +
             (effective.origin == Origin::repository ? "this repository has its own."
-                                                    : "the environment comes before what is set."));
+                                                    : "the environment takes precedence."));
     }
 }
 

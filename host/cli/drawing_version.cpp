@@ -46,7 +46,7 @@ Image pictureOrFail(DrawingPicture found, std::string const& label)
 void failIfTooLong(std::uint64_t length, std::string const& label)
 {
     if (length > kLongestDrawing) {
-        throw Failure("'" + label + "' is longer than 512 MB.", "Its picture is not looked for.");
+        throw Failure("'" + label + "' is longer than 512 MB.", "Longer files are not searched for a picture.");
     }
 }
 

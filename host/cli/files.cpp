@@ -65,7 +65,7 @@ void failForUnread(std::vector<Listed> const& list)
     for (Listed const& file : list) {
         if (!file.digest) {
             ++unread;
-            printError("'" + file.path.ansi_str() + "' cannot be read.", "Check your rights to it.");
+            printError("'" + file.path.ansi_str() + "' cannot be read.", "Check your permissions for it.");
         }
     }
     if (unread > 0) {

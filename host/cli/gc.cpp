@@ -38,7 +38,7 @@ bool concernsServer(Failure const& failure)
 std::string learnWhatIsNeeded(WriteSession& session)
 {
     if (std::holds_alternative<PendingCommit>(readJournal(session.database()))) {
-        return "A commit waits for the server.";
+        return "A commit is waiting to be sent.";
     }
     try {
         Connection connection(session.database());
@@ -126,7 +126,8 @@ void collectGarbage()
     for (std::string const& file : files.kept) {
         printNote(
             "'" + file +
-            "' is left of a killed 'tav rm' and holds what no commit has. Keep it elsewhere or delete it.");
+            "' was left by an interrupted 'tav rm' and has content that is in no commit. Keep it elsewhere or delete "
+            "it.");
     }
 }
 

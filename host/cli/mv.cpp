@@ -45,7 +45,7 @@ void failIfUnreadable(OdString const& from, Folders const& unreadable)
         if (folder == from || isBelow(folder, from)) {
             throw Failure(
                 "The folder '" + folder.ansi_str() + "' cannot be read, so its files would not be renamed.",
-                "Check your rights to it.");
+                "Check your permissions for it.");
         }
     }
 }
@@ -189,7 +189,7 @@ void moveFiles(std::string const& typedFrom, std::string const& typedTo)
     }
     failIfUnreadable(from, scanned.unreadable);
     if (isInTav(from)) {
-        throw Failure("'" + typedFrom + "' belongs to the repository itself.", "It has to stay where it is.");
+        throw Failure("'" + typedFrom + "' belongs to the repository itself.", "It cannot be moved.");
     }
     checkTarget(to, root);
     checkFolders(to, root);

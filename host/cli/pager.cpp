@@ -36,7 +36,7 @@ std::string pagerCommand()
     }
     SettingEntry const pager = currentSettings().effective("pager");
     bool const isOff = pager.value.empty() || pager.value == "cat";
-    return isOff ? ""
+    return isOff                              ? ""
            : pager.origin == Origin::standard ? "command -v less >/dev/null && exec less || exec cat"
                                               : pager.value;
 }

@@ -99,7 +99,7 @@ std::vector<common::StagedFile> removableFiles(
         }
         if (files.unread.count(file.path) > 0) {
             throw Failure(
-                "'" + file.path.ansi_str() + "' is in a folder that cannot be read.", "Check your rights to it.");
+                "'" + file.path.ansi_str() + "' is in a folder that cannot be read.", "Check your permissions for it.");
         }
     }
     return found;

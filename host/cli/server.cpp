@@ -26,9 +26,9 @@ std::string described(HistoryComparison const& comparison)
     }
     if (comparison.unknownHere > 0) {
         return "It has " + countedThatAre(comparison.unknownHere, "commit") +
-               " not known here. 'tav fetch' learns them.\n";
+               " not known here. 'tav fetch' gets them.\n";
     }
-    return "It has the commits that are known here, and no other.\n";
+    return "It has exactly the commits known here.\n";
 }
 
 void showServer()

@@ -82,8 +82,8 @@ void addUnstage(CLI::App& app)
 {
     addNamesOrAll(
         *app.add_subcommand("unstage", "Take files out of the next commit; they stay as they are"),
-        "Paths of files or folders, or the end of a path that only one staged file matches",
-        "Take every staged file out", unstageFiles);
+        "Paths of files or folders, or the end of a path that only one staged file matches", "Unstage all files",
+        unstageFiles);
 }
 
 void addMv(CLI::App& app)
@@ -150,11 +150,11 @@ void addLog(CLI::App& app, std::optional<std::size_t> behindDashes)
     command->add_option(
         "NAME", options->arguments.words,
         "The commit to begin with, by default where you are, and then files or folders whose history is shown");
-    command->add_option("-n,--count", options->count, "Show so many commits at most; -5 is the same as -n 5")
+    command->add_option("-n,--count", options->count, "Show at most this many commits; -5 is the same as -n 5")
         ->type_name("COUNT")
         ->check(isCount);
-    command->add_option("--since", options->since, "Show commits of this date and later")->type_name("DATE");
-    command->add_option("--until", options->until, "Show commits of this date and earlier")->type_name("DATE");
+    command->add_option("--since", options->since, "Show commits made on this date or later")->type_name("DATE");
+    command->add_option("--until", options->until, "Show commits made on this date or earlier")->type_name("DATE");
     command->add_option("--author", options->author, "Show commits of authors with this in their name")
         ->type_name("TEXT");
     command->add_flag("--all", options->all, "Show the history of all branches and tags");
@@ -207,7 +207,7 @@ void addDiff(CLI::App& app, std::optional<std::size_t> behindDashes)
         "A commit to compare the working folder with, or two to compare; and paths of files or folders, or the end of "
         "a path, by default all");
     CLI::Option* const stat = command->add_flag("--stat", options->stat, "Show a line for each file and the total");
-    command->add_flag("--text", options->text, "Show the lines of texts however many there are")->excludes(stat);
+    command->add_flag("--text", options->text, "Show all lines of text files")->excludes(stat);
     addJson(*command, options->json);
     addExamples(
         *command, "  tav diff                      what you have changed\n"
@@ -273,7 +273,7 @@ void addCheckout(CLI::App& app)
 
 void addSwitch(CLI::App& app)
 {
-    CLI::App* const command = app.add_subcommand("switch", "Go on with the work on another branch");
+    CLI::App* const command = app.add_subcommand("switch", "Continue on another branch");
     auto const options = addCheckoutOptions(*command, "BRANCH", "Name of the branch");
     CLI::Option* const create = command->add_flag("-c,--create", options->isNew, "Create the branch");
     command->add_option("COMMIT", options->commit, "Where a new branch begins; by default where you are")
@@ -362,7 +362,7 @@ void addServer(CLI::App& app)
     CLI::App* const command = app.add_subcommand("server", "Show where the history is kept, or name its new place");
     auto const options = std::make_shared<ServerOptions>();
     command->add_option("FOLDER", options->folder, "Where the server is now, as in: tav server /mnt/office/tav");
-    command->add_flag("--send", options->send, "Send the commits that are known here and not there");
+    command->add_flag("--send", options->send, "Send the commits that the server does not have");
     command->callback([options] { server(*options); });
 }
 

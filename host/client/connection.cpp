@@ -74,7 +74,7 @@ std::unique_ptr<Server> connect(OdString const& folder, EmbeddedServer::Missing 
         throw Failure(
             "The server in '" + folder.ansi_str() + "' speaks version " + version.ansi_str() + ", this tav version " +
                 kVersion.ansi_str() + ".",
-            "Use the tav that belongs to the server.");
+            "Use a tav that supports that version.");
     }
     return server;
 }

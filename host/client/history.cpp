@@ -19,7 +19,7 @@ namespace tav {
 
 namespace {
 
-constexpr char const* kAskOwner = "The server is damaged, or is not a server of tav; ask its owner.";
+constexpr char const* kAskOwner = "The server is damaged, or is not a tav server; ask its owner.";
 
 constexpr char const* kSendThem =
     "An older copy of it may have been put back: run 'tav server --send' to send them again.";

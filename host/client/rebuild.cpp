@@ -121,7 +121,8 @@ void removeWithJournal(std::string const& path)
         std::error_code error;
         std::filesystem::remove(file, error);
         if (error) {
-            throw Failure("'" + file + "' cannot be removed: " + error.message() + ".", "Check your rights there.");
+            throw Failure(
+                "'" + file + "' cannot be removed: " + error.message() + ".", "Check your permissions there.");
         }
     }
 }

@@ -36,7 +36,7 @@ namespace tav {
 namespace {
 
 constexpr int kMostAttempts = 5; // at a file that somebody is writing
-constexpr char const* kAskOwner = "The server is damaged, or no server of tav; ask its owner.";
+constexpr char const* kAskOwner = "The server is damaged or is not a tav server; ask its owner.";
 
 using Previous = std::map<OdString, OdString>;
 
@@ -72,7 +72,7 @@ OdString storeSteady(Draft& draft, LocalStorage& storage, OdString const& path)
         return stored;
     }
     throw Failure(
-        quoted(path) + " is being written by another program all the time.",
+        quoted(path) + " keeps being changed by another program.",
         "Save and close it there, and run the command again.");
 }
 
@@ -163,7 +163,7 @@ sentNumber(NewCommit const& commit, OdString const& document, LocalDatabase& dat
             giveUpOperation(database);
         }
         if (isElsewhere) {
-            failure.next += " What was to be committed is staged as before.";
+            failure.next += " The files are still staged.";
         } else if (failure.code == static_cast<std::int32_t>(ServerError::hasMovedOn)) {
             failure.next += " With 'tav branch NAME' and 'tav switch NAME' you have a branch of your own.";
         }
@@ -261,12 +261,12 @@ void failIfUnreachable(common::State const& state, Folders const& unreadable, co
         if (isUnread(presence, file.path, unreadable)) {
             throw Failure(
                 quoted(file.path) + " is staged, but its folder cannot be read.",
-                "Check your rights to it, or run 'tav unstage' for the file.");
+                "Check your permissions for it, or run 'tav unstage' for the file.");
         }
         if (presence == Presence::isBehindLink) {
             throw Failure(
                 quoted(file.path) + " is staged, but a link has taken the place of its folder.",
-                "Put the folder itself in its place, or run 'tav unstage' for the file.");
+                "Replace the link with the folder itself, or run 'tav unstage' for the file.");
         }
     }
 }
@@ -279,7 +279,7 @@ void failIfBack(std::vector<PlannedFile> const& plan, common::State const& state
         bool const isNoticed = file.change == common::FileChange::removed && wanted.count(file.path) == 0;
         if (isNoticed && ut::FileName::fileExists(root.pathTo(file.path))) {
             throw Failure(
-                "'" + file.path.ansi_str() + "' was gone and is back: another program is saving it.",
+                "'" + file.path.ansi_str() + "' disappeared and came back; another program is probably saving it.",
                 "Nothing has been committed; run the command again.");
         }
     }
@@ -290,7 +290,7 @@ void requireSound(OdString const& text, std::string const& what)
     wchar_t const* const begin = text.c_str();
     wchar_t const* const end = begin + text.getLength();
     if (!isSound(text) || std::find(begin, end, L'\0') != end) {
-        throw Failure(what + " holds a NUL or half a character.", "Nothing has been committed; correct it.");
+        throw Failure(what + " contains a NUL or an unpaired surrogate.", "Nothing has been committed; correct it.");
     }
 }
 
@@ -305,7 +305,8 @@ void requireRecordable(NewCommit const& added)
             throw Failure(*fault, "Nothing has been committed; rename the file.");
         }
         if (!isContentUrl(file.url)) {
-            throw Failure("The last commit has no content of " + quoted(file.path) + ".", "Run 'tav verify'.");
+            throw Failure(
+                "The last commit does not record a content for " + quoted(file.path) + ".", "Run 'tav verify'.");
         }
     }
     if (auto const fault = whyNotTree(added.files)) {
@@ -347,7 +348,7 @@ void keepContents(Draft& draft, std::vector<PlannedFile> const& plan)
                      [&](OdString const& path) { return similarFiles(draft.files, path); }});
     storeAll(draft, plan, storage);
     if (draft.files == base) {
-        throw Failure("What is staged is as it was committed.", "Run 'tav unstage --all' to clear it.");
+        throw Failure("The staged files are the same as in the last commit.", "Run 'tav unstage --all' to clear it.");
     }
     readBack(draft, plan, storage);
 }

@@ -22,8 +22,7 @@ std::string kindOf(common::Reference const& reference)
 void requireFreeName(LocalDatabase const& database, OdString const& name)
 {
     if (auto const old = database.commits().reference(name)) {
-        throw Failure(
-            "There is a " + kindOf(*old) + " '" + name.ansi_str() + "' already.", "Choose another name.");
+        throw Failure("There is a " + kindOf(*old) + " '" + name.ansi_str() + "' already.", "Choose another name.");
     }
     requireReferenceName(name);
 }
@@ -91,8 +90,7 @@ void failIfOnlyWayToCommits(LocalDatabase const& database, common::Reference con
 {
     if (!isReachedFromOthers(database.commits(), reference)) {
         throw Failure(
-            "Only the " + kindOf(reference) + " '" + reference.name.ansi_str() +
-                "' leads to its last commits.",
+            "Only the " + kindOf(reference) + " '" + reference.name.ansi_str() + "' leads to its last commits.",
             "Create a tag there to keep them in the history, or delete it with --force.");
     }
 }

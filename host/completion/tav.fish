@@ -80,7 +80,7 @@ __tav_command preview 'Show the preview picture of a drawing' $commands
 __tav_command compare 'Show two versions of a drawing as pictures, and what differs' $commands
 __tav_command restore 'Bring files back as a commit has them' $commands
 __tav_command checkout 'Make the working folder what it was at a commit' $commands
-__tav_command switch 'Go on with the work on another branch' $commands
+__tav_command switch 'Continue on another branch' $commands
 __tav_command undo 'Take back the last command' $commands
 __tav_command redo "Do again what 'tav undo' has taken back" $commands
 __tav_command branch 'List the branches, or make one' $commands
@@ -104,7 +104,7 @@ complete -c tav -n '__fish_seen_subcommand_from status' -s s -l short -d 'Show t
 complete -c tav -n '__fish_seen_subcommand_from status' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from add' -l all -d 'Stage every changed and new file'
 complete -c tav -n '__fish_seen_subcommand_from add' -a '(__tav_paths modified untracked)'
-complete -c tav -n '__fish_seen_subcommand_from unstage' -l all -d 'Take every staged file out'
+complete -c tav -n '__fish_seen_subcommand_from unstage' -l all -d 'Unstage all files'
 complete -c tav -n '__fish_seen_subcommand_from unstage' -a '(__tav_paths staged)'
 complete -c tav -n '__fish_seen_subcommand_from mv' -F
 complete -c tav -n '__fish_seen_subcommand_from rm' -F
@@ -114,9 +114,9 @@ complete -c tav -n '__fish_seen_subcommand_from commit' -s a -l all -d 'Take cha
 complete -c tav -n '__fish_seen_subcommand_from commit' -l author -x -d 'Who made it'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l all-removed -d 'Remove files that are gone even when many are'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l without-removed -d 'Keep files that are gone in the repository'
-complete -c tav -n '__fish_seen_subcommand_from log' -s n -l count -x -d 'Show so many commits at most'
-complete -c tav -n '__fish_seen_subcommand_from log' -l since -x -d 'Show commits of this date and later'
-complete -c tav -n '__fish_seen_subcommand_from log' -l until -x -d 'Show commits of this date and earlier'
+complete -c tav -n '__fish_seen_subcommand_from log' -s n -l count -x -d 'Show at most this many commits'
+complete -c tav -n '__fish_seen_subcommand_from log' -l since -x -d 'Show commits made on this date or later'
+complete -c tav -n '__fish_seen_subcommand_from log' -l until -x -d 'Show commits made on this date or earlier'
 complete -c tav -n '__fish_seen_subcommand_from log' -l author -x -d 'Show commits of authors with this in their name'
 complete -c tav -n '__fish_seen_subcommand_from log' -l all -d 'Show the history of all branches and tags'
 complete -c tav -n '__fish_seen_subcommand_from log' -l oneline -d 'Show one line for each commit'
@@ -126,7 +126,7 @@ complete -c tav -n '__fish_seen_subcommand_from show' -l json -d 'Print a docume
 complete -c tav -n '__fish_seen_subcommand_from show' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from cat' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from diff' -l stat -d 'Show a line for each file and the total'
-complete -c tav -n '__fish_seen_subcommand_from diff' -l text -d 'Show the lines of texts however many there are'
+complete -c tav -n '__fish_seen_subcommand_from diff' -l text -d 'Show all lines of text files'
 complete -c tav -n '__fish_seen_subcommand_from diff' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from diff' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from diff' -a '(__tav_paths modified untracked removed staged renamed)'
@@ -164,7 +164,7 @@ complete -c tav -n '__fish_seen_subcommand_from branch' -l json -d 'Print a docu
 complete -c tav -n '__fish_seen_subcommand_from branch; and __tav_arguments 1 branch' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from tag' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from tag; and __tav_arguments 1 tag' -a '(__tav_references branch tag)'
-complete -c tav -n '__fish_seen_subcommand_from server' -l send -d 'Send the commits that are known here and not there'
+complete -c tav -n '__fish_seen_subcommand_from server' -l send -d 'Send the commits that the server does not have'
 complete -c tav -n '__fish_seen_subcommand_from server' -a '(__fish_complete_directories)'
 complete -c tav -n '__fish_seen_subcommand_from files' -l hash -d 'Show the SHA-256 digest of each file'
 complete -c tav -n '__fish_seen_subcommand_from files' -l long -d 'Show the last commit of each file'

@@ -202,7 +202,7 @@ constexpr std::array kRulesOfPaths = {
 
 constexpr std::array kRulesOfParts = {
     Rule{isEmptyPart, "has an empty part between its slashes"},
-    Rule{isDots, "has a part of nothing but dots and blanks, which may lead out of the working folder"},
+    Rule{isDots, "has a part that consists of dots and spaces, which may lead out of the working folder"},
     Rule{isLongPart, "has a part that is longer than 255 bytes"},
     Rule{isOwnFolder, "leads into the folder '.tav', which belongs to the repository"},
 };

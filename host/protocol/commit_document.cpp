@@ -192,7 +192,7 @@ void requireHash(NewCommit const& commit)
     OdString const hash = commitHash(commit.commit, commit.files);
     if (hash != commit.commit.hash) {
         throw Failure(
-            "'commits[0].hash' is " + quoted(commit.commit.hash) + ", but what is in the commit gives " + quoted(hash) +
+            "'commits[0].hash' is " + quoted(commit.commit.hash) + ", but the hash of this commit is " + quoted(hash) +
                 ".",
             kNothingChanged);
     }

@@ -72,7 +72,7 @@ OdString Part::soundText() const
     wchar_t const* const begin = content.c_str();
     bool const hasNul = std::find(begin, begin + content.getLength(), L'\0') != begin + content.getLength();
     if (hasNul || !isSound(content)) {
-        refuse("holds a NUL or half a character");
+        refuse("contains a NUL or an unpaired surrogate");
     }
     return content;
 }

@@ -64,7 +64,7 @@ OdString readUrl(Part const& part)
 {
     OdString url = part.text();
     if (!isContentUrl(url)) {
-        part.refuse("must name a content, such as 'po:' or 'tf:plan#' with a hash behind it");
+        part.refuse("must name a content, such as 'po:' or 'tf:plan#' followed by a hash");
     }
     return url;
 }
@@ -80,7 +80,7 @@ std::vector<OdString> readParents(Part const& part)
         parents.push_back(readHash(part[i]));
     }
     if (count == 2 && parents[0] == parents[1]) {
-        part.refuse("must not hold one parent twice");
+        part.refuse("must not list a parent twice");
     }
     return parents;
 }

@@ -18,7 +18,8 @@ void requireReadable(std::string const& folder)
     os::FolderReader const reader = os::openFolder(folder);
     if (!reader && errno != ENOENT) {
         std::string const why = std::generic_category().message(errno);
-        throw Failure("The conflict folder '" + folder + "' cannot be read: " + why + ".", "Check your rights to it.");
+        throw Failure(
+            "The conflict folder '" + folder + "' cannot be read: " + why + ".", "Check your permissions for it.");
     }
     while (dirent const* const entry = reader ? readdir(reader.get()) : nullptr) {
         std::string const name = entry->d_name;
@@ -48,7 +49,7 @@ void requireNoConflicts(common::RootPath const& root)
     }
     Failure failure(
         "These drawings are in conflict.",
-        "Put the version that is to stay in its place, remove the others from '.tav/conflict', and run the command "
+        "Put the version to keep in its place, remove the others from '.tav/conflict', and run the command "
         "again:");
     for (common::ConflictInfo const& conflict : conflicts) {
         failure.details.push_back(conflict.path.ansi_str());

@@ -25,7 +25,8 @@ std::string textOf(std::string const& path)
     std::string text;
     std::error_code const error = os::readFile(path, text);
     if (error && error != std::errc::no_such_file_or_directory) {
-        throw Failure("'" + path + "' cannot be read: " + error.message() + ".", "Check it and your rights to it.");
+        throw Failure(
+            "'" + path + "' cannot be read: " + error.message() + ".", "Check it and your permissions for it.");
     }
     return error ? std::string() : text;
 }
@@ -56,7 +57,7 @@ void addIdentity(common::RootPath const& root, OdString const& id)
     if (std::error_code const error = os::replaceFile(path, textOf(path) + id.ansi_str() + "\n")) {
         throw Failure(
             "'" + path + "' cannot be written: " + error.message() + ".",
-            "Check the free space and your rights there.");
+            "Check the free space and your permissions there.");
     }
 }
 

@@ -78,7 +78,7 @@ void requireRules(common::RootPath const& root)
     if (error && error != std::errc::no_such_file_or_directory && error != std::errc::not_a_directory) {
         throw Failure(
             "The ignore file '" + path + "' cannot be read: " + error.message() + ".",
-            "Check it and your rights to it.");
+            "Check it and your permissions for it.");
     }
 }
 

@@ -51,7 +51,7 @@ os::FileLock lockRepository(common::RootPath const& root, std::string const& nam
     if (error) {
         throw Failure(
             "The repository cannot be locked: " + error.message() + ".",
-            "Check your rights to '" + root.tavPath().ansi_str() + "'.");
+            "Check your permissions for '" + root.tavPath().ansi_str() + "'.");
     }
     return lock;
 }

@@ -42,7 +42,7 @@ common::RepoChanges asChanges(std::vector<common::StagedFile> const& staged)
 OdString pathInRepository(common::RootPath const& root, std::string const& typed)
 {
     if (typed.empty()) {
-        throw Failure("An empty name names no file.", "Type '.' for the folder that you are in.");
+        throw Failure("The name is empty.", "Type '.' for the folder that you are in.");
     }
     common::RootPath const absolute(fromUtf8(normalized((root.path() + L"/").ansi_str()).string()));
     OdString const path = fromUtf8(normalized(typed).string());

@@ -18,7 +18,7 @@ fs::path currentFolder()
     std::error_code error;
     fs::path current = fs::current_path(error);
     if (error) {
-        throw Failure("The current folder does not exist any more.", "Change to another folder and try again.");
+        throw Failure("The current folder no longer exists.", "Change to another folder and try again.");
     }
     return current;
 }
@@ -59,9 +59,7 @@ void failIfShared(std::string const& path)
     std::error_code error;
     bool const isFile = fs::is_regular_file(path, error);
     if (isFile && fs::hard_link_count(path, error) > 1 && !error) {
-        throw Failure(
-            "'" + path + "' has another name (a hard link), and what is written would show there too.",
-            "Put a copy in its place.");
+        throw Failure("'" + path + "' has another hard link, which would change too.", "Put a copy in its place.");
     }
 }
 

@@ -174,7 +174,7 @@ void requireExpected(std::optional<common::Reference> const& there, ReferenceCha
         throw Failure("There is a " + name + " already.", "Choose another name.");
     }
     throw withCode(
-        Failure("The " + name + " names another commit by now.", "Fetch what others have done, and try again."),
+        Failure("The " + name + " now names a different commit.", "Fetch what others have done, and try again."),
         ServerError::hasMovedOn);
 }
 
@@ -434,10 +434,10 @@ Verb const& verbOrFail(OdString const& name, OdString const& repository)
     auto const* const verb =
         std::find_if(kVerbs.begin(), kVerbs.end(), [&](Verb const& candidate) { return name == candidate.name; });
     if (verb == kVerbs.end()) {
-        throw Failure("The server knows no request " + quoted(name) + ".", kNothingChanged);
+        throw Failure("The server does not know the request " + quoted(name) + ".", kNothingChanged);
     }
     if (verb->namesRepository == repository.isEmpty()) {
-        std::string const fault = verb->namesRepository ? " must name a repository." : " concerns no repository.";
+        std::string const fault = verb->namesRepository ? " must name a repository." : " does not take a repository.";
         throw Failure("The request " + quoted(name) + fault, kNothingChanged);
     }
     return *verb;
@@ -488,7 +488,7 @@ Database& EmbeddedServer::openDatabase()
     if (auto const error = os::makeFolders(folder_, kFolderPermissions)) {
         throw Failure(
             "The folder '" + folder_ + "' cannot be made: " + error.message() + ".",
-            "Check your rights there, or name another folder for the server.");
+            "Check your permissions there, or name another folder for the server.");
     }
     Database database(folder_ + "/server.db");
     prepareTables(database);

@@ -60,7 +60,7 @@ WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Reco
         }
         if (isCommit && !database_.operations().running()) {
             std::fputs(
-                "tav: A commit that was interrupted has been given up, as the server refuses it. What it was to take "
+                "tav: A commit that was interrupted was abandoned because the server refused it. What it was to take "
                 "is staged as before.\n",
                 stderr);
         }

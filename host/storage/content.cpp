@@ -50,7 +50,7 @@ std::string_view Content::at(std::uint64_t offset, std::size_t count, Buffer& bu
     std::size_t done = 0;
     check(file_.readAt(offset, bytes, count, done), name_ + " cannot be read");
     if (done < count) {
-        throw StorageError(name_ + " has become shorter while it was read.");
+        throw StorageError(name_ + " became shorter while it was being read.");
     }
     return {bytes, count};
 }

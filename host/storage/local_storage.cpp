@@ -177,7 +177,7 @@ Expected<bool> LocalStorage::repair(OdString const& text, OdString const& path)
         }
         Content const content = open(path);
         if (digestOf(content) != url.digest) {
-            throw StorageError(quoted(path) + " has another content by now.");
+            throw StorageError(quoted(path) + " has changed since.");
         }
         storeAgain(path, content, url);
         batch_.flush();

@@ -50,7 +50,8 @@ std::string readShortFile(std::string const& path)
     error = error ? error : file.readAt(0, text.data(), text.size(), done);
     if (error) {
         throw Failure(
-            "The settings '" + path + "' cannot be read: " + error.message() + ".", "Check your rights to that file.");
+            "The settings '" + path + "' cannot be read: " + error.message() + ".",
+            "Check your permissions for that file.");
     }
     text.resize(done);
     return text;
@@ -100,7 +101,7 @@ void ConfigFile::save() const
     if (auto const error = os::replaceFile(path_, OdString(text.data(), text.size()).ansi_str() + "\n")) {
         throw Failure(
             "The settings '" + path_ + "' cannot be written: " + error.message() + ".",
-            "Check the free space and your rights there.");
+            "Check the free space and your permissions there.");
     }
 }
 

@@ -178,7 +178,7 @@ TEST_F(Add, FailsForPathsOutsideOfTheRepository)
 TEST_F(Add, FailsForAnEmptyName)
 {
     repo.add({"a.dwg"});
-    EXPECT_EQ(tav({"add", ""}), failed("tav: An empty name names no file. Type '.' for the folder that you are in.\n"));
+    EXPECT_EQ(tav({"add", ""}), failed("tav: The name is empty. Type '.' for the folder that you are in.\n"));
     EXPECT_EQ(state(), kFreshState);
 }
 
@@ -310,7 +310,7 @@ TEST_F(Add, FollowsNoLinksToFolders)
     EXPECT_EQ(tav({"add", "link"}), unknown("link"));
     EXPECT_EQ(
         tav({"add", "link/b.dwg"}), failed("tav: 'link/b.dwg' is behind a link to a folder, which tav does not enter. "
-                                           "Put the folder itself in the place of the link.\n"));
+                                           "Replace the link with the folder itself.\n"));
 }
 
 TEST_F(Add, CountsBothOfTwoCommandsAtTheSameTime)
@@ -403,8 +403,7 @@ TEST_F(Unstage, ChangesNothingWhenOneOfItsNamesIsBad)
                                                "Type the path of a file as 'tav status' "
                                                "shows it.\n"));
     EXPECT_EQ(
-        tav({"unstage", "a.dwg", ""}),
-        failed("tav: An empty name names no file. Type '.' for the folder that you are in.\n"));
+        tav({"unstage", "a.dwg", ""}), failed("tav: The name is empty. Type '.' for the folder that you are in.\n"));
     EXPECT_EQ(state(), before);
 }
 

@@ -239,7 +239,7 @@ TEST_F(Moving, CheckoutOfTheCurrentCommitSaysThatChangesStay)
     EXPECT_EQ(tav({"checkout", "2"}), done("Now at commit 2.\n1 changed file stays as it is.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "changed");
     tav({"add", "a.dwg"});
-    EXPECT_EQ(tav({"checkout", "2"}), done("Now at commit 2.\n1 staged file carried along.\n"));
+    EXPECT_EQ(tav({"checkout", "2"}), done("Now at commit 2.\n1 staged file remains staged.\n"));
 }
 
 TEST_F(Moving, ForcedCheckoutOfTheCurrentCommitBringsBackItsFiles)
@@ -247,7 +247,7 @@ TEST_F(Moving, ForcedCheckoutOfTheCurrentCommitBringsBackItsFiles)
     repo.write("a.dwg", "changed");
     tav({"mv", "c.dwg", "d.dwg"});
     EXPECT_EQ(
-        tav({"checkout", "2", "--force"}), done("Now at commit 2 (2 files written).\n1 staged file carried along.\n"));
+        tav({"checkout", "2", "--force"}), done("Now at commit 2 (2 files written).\n1 staged file remains staged.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "two");
     EXPECT_EQ(repo.read("c.dwg"), "two");
     EXPECT_THAT(status(), HasSubstr("new:      d.dwg")) << "no renaming any more";
@@ -298,7 +298,7 @@ TEST_F(Moving, SwitchCarriesStagedFilesAlongAndSaysSo)
     tav({"branch", "sketch"});
     tav({"restore", "a.dwg", "--from", "1"});
     tav({"add", "a.dwg"});
-    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file carried along.\n"));
+    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file remains staged.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "one");
     EXPECT_EQ(tav({"switch", "master"}).code, 0);
     EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
@@ -358,7 +358,7 @@ TEST_F(Moving, CommitWantsTheEndOfTheBranch)
         failed("tav: You are at an earlier commit, not at the end of the branch 'master'. Run 'tav branch NAME' and "
                "'tav switch NAME' to go on from here, or 'tav switch master' to go back to its end.\n"));
     EXPECT_EQ(tav({"branch", "sketch"}), done("Made the branch 'sketch' at commit 1.\n"));
-    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file carried along.\n"));
+    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file remains staged.\n"));
     EXPECT_EQ(tav({"commit", "-m", "another way"}).code, 0);
     EXPECT_EQ(tav({"branch"}), done("  master  (commit 2)\n* sketch  (commit 3)\n"));
     EXPECT_EQ(tav({"switch", "master"}).code, 0);
@@ -456,7 +456,7 @@ TEST_F(Moving, CheckoutStopsAtTheFirstSightOfAFileThatHasBeenChangedMeanwhile)
     auto const edit = [&] { repo.write("a.dwg", "edited"); };
     EXPECT_EQ(
         tavAfter([&] { StandIn::whenFlushed(edit); }, {"checkout", "1"}),
-        failed("tav: 'a.dwg' has been changed while this command was at work. Nothing has been written; run the "
+        failed("tav: 'a.dwg' changed while this command was running. Nothing has been written; run the "
                "command again.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "edited");
     EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "c.dwg"));
@@ -469,7 +469,7 @@ TEST_F(Moving, CheckoutLeavesAFileThatIsChangedWhileOthersTakeTheirPlaces)
     auto const edit = [&] { repo.write("a.dwg", "edited"); };
     EXPECT_EQ(
         tavAfter([&] { StandIn::whenRemoved("c.dwg", edit); }, {"checkout", "1"}),
-        failed("tav: 'a.dwg' has been changed while this command was at work. What has been written is whole; run the "
+        failed("tav: 'a.dwg' changed while this command was running. Everything written so far is complete; run the "
                "command again.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "edited");
     EXPECT_EQ(tav({"checkout", "1"}), failed(wouldBeLost("  a.dwg\n")));
@@ -484,7 +484,7 @@ TEST_F(Moving, RestoreLeavesAFileThatHasBeenMadeMeanwhile)
     auto const edit = [&] { repo.write("sub/b.txt", "mine"); };
     EXPECT_EQ(
         tavAfter([&] { StandIn::whenFlushed(edit); }, {"restore", "sub", "--from", "1"}),
-        failed("tav: 'sub/b.txt' has been changed while this command was at work. Nothing has been written; run the "
+        failed("tav: 'sub/b.txt' changed while this command was running. Nothing has been written; run the "
                "command again.\n"));
     EXPECT_EQ(repo.read("sub/b.txt"), "mine");
 }
@@ -515,7 +515,7 @@ TEST_F(Moving, CheckoutOnAFullDiskHasBegunNothing)
     EXPECT_EQ(
         tavAfter(StandIn::fillTheDisk, {"checkout", "1"}),
         failed(
-            "tav: 'a.dwg' cannot be brought back: '" + repo.pathTo(".tav/restoring/0") +
+            "tav: 'a.dwg' cannot be restored: '" + repo.pathTo(".tav/restoring/0") +
             "' cannot be written: No space left on device. Check the free space.\n"));
     EXPECT_EQ(tav({"status"}), done(std::string("On branch master\n\n") + kClean));
     EXPECT_THAT(filesOfTheUser(), ElementsAre("a.dwg", "c.dwg"));
@@ -686,7 +686,7 @@ TEST_F(Moving, EndsAtAnOpenConflict)
     for (Arguments const& command :
          {Arguments{"commit", "-m", "x"}, {"switch", "sketch"}, {"checkout", "1"}, {"checkout", "1", "--force"}}) {
         EXPECT_EQ(
-            tav(command), failed("tav: These drawings are in conflict. Put the version that is to stay in its place, "
+            tav(command), failed("tav: These drawings are in conflict. Put the version to keep in its place, "
                                  "remove the others from '.tav/conflict', and run the command again:\n"
                                  "  plans/roof.dwg\n"))
             << command.front();
@@ -703,7 +703,7 @@ TEST_F(Moving, EndsAtAConflictFolderThatCannotBeRead)
         EXPECT_EQ(
             tav(command), failed(
                               "tav: The conflict folder '" + repo.pathTo(".tav/conflict") +
-                              "' cannot be read: Not a directory. Check your rights to it.\n"));
+                              "' cannot be read: Not a directory. Check your permissions for it.\n"));
     }
 }
 

@@ -36,7 +36,7 @@ Subcommands:
   compare                     Show two versions of a drawing as pictures, and what differs
   restore                     Bring files back as a commit has them
   checkout, co                Make the working folder what it was at a commit
-  switch                      Go on with the work on another branch
+  switch                      Continue on another branch
   undo                        Take back the last command
   redo                        Do again what 'tav undo' has taken back
   branch                      List the branches, or make one
@@ -99,7 +99,7 @@ Positionals:
 
 Options:
   -h,--help                   Show this help and do nothing else
-  --all Excludes: NAME        Take every staged file out
+  --all Excludes: NAME        Unstage all files
 
 )";
 
@@ -293,10 +293,10 @@ TEST_F(CommandLine, FailsWhenTheFolderOfTheOptionCCannotBeEntered)
 {
     EXPECT_EQ(
         tav({"-C", "no\nwhere", "status"}),
-        failed("tav: The folder 'no where' cannot be entered. Check its name and your rights to it.\n"));
+        failed("tav: The folder 'no where' cannot be entered. Check its name and your permissions for it.\n"));
     EXPECT_EQ(
         tav({"-C", "", "status"}),
-        failed("tav: The folder '' cannot be entered. Check its name and your rights to it.\n"));
+        failed("tav: The folder '' cannot be entered. Check its name and your permissions for it.\n"));
 }
 
 TEST_F(CommandLine, TakesNamesThatReadLikeCommandsForNames)

@@ -42,7 +42,7 @@ TEST_F(CommitMessage, BeginsWithWhatWillBeCommitted)
 {
     commit("f() { cp \"$1\" seen; printf First >\"$1\"; }; f");
     EXPECT_EQ(
-        repo.read("seen"), "\n# Say what has changed, and why. Lines that begin with '#' are left out.\n"
+        repo.read("seen"), "\n# Say what has changed, and why. Lines that begin with '#' are ignored.\n"
                            "# Without a message, nothing is committed.\n"
                            "#\n"
                            "# This will be committed:\n"
@@ -52,7 +52,7 @@ TEST_F(CommitMessage, BeginsWithWhatWillBeCommitted)
 
 TEST_F(CommitMessage, ThatIsEmptyCommitsNothing)
 {
-    EXPECT_EQ(commit("true"), failed("tav: The message is empty. Say in a few words what has changed, and who did.\n"));
+    EXPECT_EQ(commit("true"), failed("tav: The message is empty. Say what has changed, and who made the change.\n"));
     EXPECT_EQ(values({"log"}, "number").size(), 0U);
     EXPECT_FALSE(repo.has(".tav/COMMIT_MESSAGE"));
 }

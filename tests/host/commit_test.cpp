@@ -168,7 +168,7 @@ TEST_F(Commit, RefusesStagedFilesThatAreAsTheyWereCommitted)
     repo.write("a.dwg", "one");
     EXPECT_EQ(
         tav({"commit", "-m", "again"}),
-        failed("tav: What is staged is as it was committed. Run 'tav unstage --all' to clear it.\n"));
+        failed("tav: The staged files are the same as in the last commit. Run 'tav unstage --all' to clear it.\n"));
     EXPECT_THAT(values({"log"}, "number"), ElementsAre("1"));
 }
 
@@ -261,7 +261,7 @@ TEST_F(Commit, RefusesAnEmptyMessage)
     EXPECT_EQ(tav({"commit"}).code, 2);
     EXPECT_EQ(
         tav({"commit", "-m", " \n"}),
-        failed("tav: The message is empty. Say in a few words what has changed, and who did.\n"));
+        failed("tav: The message is empty. Say what has changed, and who made the change.\n"));
 }
 
 TEST_F(Commit, WantsAServer)

@@ -174,7 +174,7 @@ TEST_F(Cat, SaysWhatIsNotThere)
         failed("tav: Commit 1 has no file 'новый.dwg'. Run 'tav files --at 1' to see its files.\n"));
     EXPECT_EQ(
         tav({"cat", "a.dwg"}),
-        failed("tav: 'a.dwg' names no file of a commit. Type a commit, a colon and a name, as in "
+        failed("tav: 'a.dwg' does not name a file in a commit. Type a commit, a colon and a name, as in "
                "'tav cat 12:roof.dwg'.\n"));
 }
 

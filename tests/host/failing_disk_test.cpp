@@ -169,7 +169,7 @@ New, not staged:
 TEST_F(WithoutRights, CannotChangeAnything)
 {
     std::string const refused = text(failed(
-        "tav: The repository cannot be locked: Permission denied. Check your rights to '" + repo.pathTo(".tav") +
+        "tav: The repository cannot be locked: Permission denied. Check your permissions for '" + repo.pathTo(".tav") +
         "'.\n"));
     for (Arguments const& arguments :
          {Arguments{"init", repo.path()},
@@ -220,8 +220,8 @@ TEST_F(WithoutRights, ReportsEveryFileThatCannotBeDigested)
     chmod(repo.pathTo("a.dwg").c_str(), 0);
     chmod(repo.pathTo("b\xff\n.dwg").c_str(), 0);
     chmod(repo.pathTo(".tav/properties/ignore").c_str(), 0444);
-    std::string const errors = "tav: 'a.dwg' cannot be read. Check your rights to it.\n"
-                               "tav: 'b\\xFF .dwg' cannot be read. Check your rights to it.\n"
+    std::string const errors = "tav: 'a.dwg' cannot be read. Check your permissions for it.\n"
+                               "tav: 'b\\xFF .dwg' cannot be read. Check your permissions for it.\n"
                                "tav: 2 of 4 files could not be read. Correct that and run the command again.\n";
     std::string const answer = asOrdinaryUser({"files", "--hash"});
     EXPECT_EQ(answer.substr(answer.find("--- err ---\n")), "--- err ---\n" + errors + "---");
@@ -246,7 +246,7 @@ TEST_F(WithoutRights, LeavesTheDigestOutOfADocumentWhereAFileCannotBeRead)
     }
 ]
 )",
-             "tav: 'a.dwg' cannot be read. Check your rights to it.\n"
+             "tav: 'a.dwg' cannot be read. Check your permissions for it.\n"
              "tav: 1 of 1 files could not be read. Correct that and run the "
              "command again.\n"}));
 }

@@ -102,7 +102,7 @@ TEST_F(Log, BeginsAtACommit)
     EXPECT_THAT(commits({"3", "--", "notes.txt"}), ElementsAre("2", "1"));
     EXPECT_EQ(
         tav({"log", "1", "2", "--"}),
-        failed("tav: There are 2 commits before '--'. Name at most 1; names of files come behind '--'.\n"));
+        failed("tav: There are 2 commits before '--'. Name at most 1; names of files come after '--'.\n"));
 }
 
 TEST_F(Log, RefusesAWordThatIsACommitAndAFile)
@@ -111,7 +111,7 @@ TEST_F(Log, RefusesAWordThatIsACommitAndAFile)
     commitAll("Adds a file with a number for a name");
     EXPECT_EQ(
         tav({"log", "2"}), failed("tav: '2' names commit 2, and a file too. Type it before '--' for the commit, and "
-                                  "behind '--' for the file.\n"));
+                                  "after '--' for the file.\n"));
     EXPECT_THAT(commits({"2", "--"}), ElementsAre("2", "1"));
     EXPECT_THAT(commits({"--", "2"}), ElementsAre("6"));
 }

@@ -274,15 +274,15 @@ TEST_F(Mv, FailsForPathsOutsideOfTheRepository)
 TEST_F(Mv, FailsForEmptyNames)
 {
     repo.add({"a.dwg"});
-    expectRefusal({"", "b.dwg"}, "An empty name names no file. Type '.' for the folder that you are in.");
-    expectRefusal({"a.dwg", ""}, "An empty name names no file. Type '.' for the folder that you are in.");
+    expectRefusal({"", "b.dwg"}, "The name is empty. Type '.' for the folder that you are in.");
+    expectRefusal({"a.dwg", ""}, "The name is empty. Type '.' for the folder that you are in.");
 }
 
 TEST_F(Mv, LeavesTheFilesOfTheRepositoryItselfWhereTheyAre)
 {
     repo.ignore("");
     for (std::string const name : {".tav", ".tav/properties", ".tav/properties/ignore"}) {
-        expectRefusal({name, "b"}, "'" + name + "' belongs to the repository itself. It has to stay where it is.");
+        expectRefusal({name, "b"}, "'" + name + "' belongs to the repository itself. It cannot be moved.");
     }
 }
 

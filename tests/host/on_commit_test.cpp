@@ -220,7 +220,7 @@ TEST_F(AddOnCommit, FailsForRemovedFiles)
     repo.add({"new.dwg"});
     EXPECT_EQ(
         tav({"add", "new.dwg", "r.dwg"}),
-        failed("tav: 'r.dwg' has been removed. The next commit takes that without staging.\n"));
+        failed("tav: 'r.dwg' has been removed. The next commit includes that without staging.\n"));
     EXPECT_EQ(state(), kFreshState);
 }
 
@@ -448,7 +448,7 @@ TEST_F(Rm, FailsForNamesOfNoCommittedFile)
     EXPECT_EQ(
         tav({"rm", "/x"}),
         failed("tav: '/x' is not located in the current repository. Name a file below '" + repo.path() + "'.\n"));
-    EXPECT_EQ(tav({"rm", ""}), failed("tav: An empty name names no file. Type '.' for the folder that you are in.\n"));
+    EXPECT_EQ(tav({"rm", ""}), failed("tav: The name is empty. Type '.' for the folder that you are in.\n"));
     EXPECT_EQ(
         tav({"rm", "("}), failed("tav: No file is named '(', and it is not a valid expression. Type the path "
                                  "of a file as 'tav status' "

@@ -116,7 +116,7 @@ TEST_F(PreviewTest, RefusesADrawingThatIsTooLongToBeHeld)
     std::filesystem::resize_file(repo.pathTo("plan.dwg"), (std::uintmax_t{1} << 29) + 1);
     EXPECT_EQ(
         tav({"preview", "plan.dwg", "-o", "out.png"}),
-        failed("tav: 'plan.dwg' is longer than 512 MB. Its picture is not looked for.\n"));
+        failed("tav: 'plan.dwg' is longer than 512 MB. Longer files are not searched for a picture.\n"));
 }
 
 TEST_F(PreviewTest, SaysWhyThereIsNoPicture)

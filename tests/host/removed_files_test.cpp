@@ -56,7 +56,8 @@ TEST_F(RemovedFiles, StayWhenNoCommitHasTheirContent)
     Outcome const outcome{
         0, kNothing,
         "tav: '" + repo.pathTo(".tav/removed-0") +
-            "' is left of a killed 'tav rm' and holds what no commit has. Keep it elsewhere or delete it.\n"};
+            "' was left by an interrupted 'tav rm' and has content that is in no commit. Keep it elsewhere or delete "
+            "it.\n"};
     EXPECT_EQ(tav({"gc"}), outcome);
     EXPECT_EQ(repo.read(".tav/removed-0"), "drawing of nobody else");
 }

@@ -77,7 +77,7 @@ protected:
 TEST_F(ServerPlace, IsShown)
 {
     EXPECT_THAT(tav({"server"}).out, StartsWith("The history is kept in '" + server() + "', as the repository "));
-    EXPECT_THAT(tav({"server"}).out, HasSubstr("\nIt has the commits that are known here, and no other.\n"));
+    EXPECT_THAT(tav({"server"}).out, HasSubstr("\nIt has exactly the commits known here.\n"));
 }
 
 TEST_F(ServerPlace, FollowsAMovedServer)
@@ -385,8 +385,8 @@ TEST_F(WaitingCommit, IsSaidToBeGivenUpWhenTheServerRefusesIt)
         .run("DELETE FROM refs; DELETE FROM changes; DELETE FROM parents; DELETE FROM commits;"
              "DELETE FROM repositories;");
     EXPECT_THAT(
-        tav({"gc"}).err, StartsWith("tav: A commit that was interrupted has been given up, as the server refuses it. "
-                                    "What it was to take is staged as before.\n"));
+        tav({"gc"}).err, StartsWith("tav: A commit that was interrupted was abandoned because the server refused it. "
+                                    "Its files are still staged.\n"));
 }
 
 class LostDatabase : public ServerPlace {

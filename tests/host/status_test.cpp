@@ -443,8 +443,7 @@ TEST_F(Status, FailsInAFolderThatIsGone)
         return 98;
     });
     EXPECT_EQ(
-        process.wait(),
-        failed("tav: The current folder does not exist any more. Change to another folder and try again.\n"));
+        process.wait(), failed("tav: The current folder no longer exists. Change to another folder and try again.\n"));
 }
 
 } // namespace

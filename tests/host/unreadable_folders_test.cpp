@@ -102,7 +102,7 @@ TEST_F(UnreadableFolder, KeepsItsFilesInACommitEvenWhenTheyAreMissingThere)
             }),
         text(Outcome{
             0, "Staged 1 file.\n",
-            "tav: Nothing has been staged of these folders, which cannot be read. Check your rights to them:\n"
+            "tav: Nothing has been staged of these folders, which cannot be read. Check your permissions for them:\n"
             "  plans/\n"}) +
             ".tav/properties/ignore\nnew.txt\nnote.txt\nplans/a.dwg\nplans/deep/b.dwg\n");
 }
@@ -119,8 +119,9 @@ TEST_F(UnreadableFolder, KeepsAStagedFileOutOfTheCommitUntilItCanBeRead)
                 said += text(tav({"commit", "-m", "second", "--author", "ann"}));
                 return said + tav({"status"}).out;
             }),
-        text(failed("tav: 'plans/a.dwg' is staged, but its folder cannot be read. Check your rights to it, or run 'tav "
-                    "unstage' for the file.\n")) +
+        text(failed(
+            "tav: 'plans/a.dwg' is staged, but its folder cannot be read. Check your permissions for it, or run 'tav "
+            "unstage' for the file.\n")) +
             "On branch master\n\nStaged for the next commit:\n  (use 'tav unstage NAME' to take a file out)\n"
             "        modified: plans/a.dwg\n\nFolders that cannot be read:\n  (their files are not known; the next "
             "commit keeps those that it has)\n        plans/\n\n");
@@ -136,9 +137,9 @@ TEST_F(UnreadableFolder, IsNeitherAddedNorRemovedNorRenamed)
                 said += text(tav({"rm", "plans/a.dwg"}));
                 return said + text(tav({"rm", "plans"}));
             }),
-        text(failed("tav: 'plans' is a folder that cannot be read, or in one. Check your rights to it.\n")) +
-            text(failed("tav: 'plans/a.dwg' is in a folder that cannot be read. Check your rights to it.\n")) +
-            text(failed("tav: 'plans/a.dwg' is in a folder that cannot be read. Check your rights to it.\n")));
+        text(failed("tav: 'plans' is a folder that cannot be read, or in one. Check your permissions for it.\n")) +
+            text(failed("tav: 'plans/a.dwg' is in a folder that cannot be read. Check your permissions for it.\n")) +
+            text(failed("tav: 'plans/a.dwg' is in a folder that cannot be read. Check your permissions for it.\n")));
     EXPECT_EQ(
         with(
             kAll,

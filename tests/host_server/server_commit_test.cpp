@@ -143,7 +143,7 @@ TEST_F(ServerCommit, LeavesABranchThatItIsNotExpectedToFind)
     EXPECT_EQ(send(commit('b', "a", {}, {"branch main b a"})), R"([{"commitNo":2,"hash":"<b>"}])");
     EXPECT_EQ(
         send(commit('c', "b", {}, {"branch main c a"})),
-        "error: The branch 'main' names another commit by now. Fetch what others have done, and try again.");
+        "error: The branch 'main' now names a different commit. Fetch what others have done, and try again.");
 }
 
 TEST_F(ServerCommit, RefusesAHashThatDoesNotFollowFromWhatIsInIt)
@@ -160,7 +160,7 @@ TEST_F(ServerCommit, RefusesAHashThatDoesNotFollowFromWhatIsInIt)
         std::string const document = replaced(good, what, with);
         server::renameCommit('z', document);
         EXPECT_EQ(
-            send(document), "error: 'commits[0].hash' is '<a>', but what is in the commit gives '<z>'. Nothing has "
+            send(document), "error: 'commits[0].hash' is '<a>', but the hash of this commit is '<z>'. Nothing has "
                             "changed on the server.")
             << what;
     }
@@ -264,7 +264,7 @@ INSTANTIATE_TEST_SUITE_P(
 std::string const kHash = " must be a hash of 64 lower-case hexadecimal digits.";
 std::string const kDate = "'commits[0].annotation.date' must be a time such as '2024-03-05T14:07:09Z'.";
 std::string const kUrl =
-    "'commits[0].files[0].storagePath' must name a content, such as 'po:' or 'tf:plan#' with a hash behind it.";
+    "'commits[0].files[0].storagePath' must name a content, such as 'po:' or 'tf:plan#' followed by a hash.";
 
 INSTANTIATE_TEST_SUITE_P(
     Content, ServerCommitRefusal,
@@ -275,15 +275,15 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"NoHashAsParent", "\"parentsHashes\":[", "\"parentsHashes\":[\"\"",
             "'commits[0].parentsHashes[0]'" + kHash},
         Row{"OneParentTwice", "\"parentsHashes\":[", "\"parentsHashes\":[\"<b>\",\"<b>\"",
-            "'commits[0].parentsHashes' must not hold one parent twice."},
+            "'commits[0].parentsHashes' must not list a parent twice."},
         Row{"ThreeParents", "\"parentsHashes\":[", "\"parentsHashes\":[\"<b>\",\"<c>\",\"<d>\"",
             "'commits[0].parentsHashes' must not hold more than 2 parents."},
         Row{"OwnParent", "\"parentsHashes\":[", "\"parentsHashes\":[\"<a>\"",
             "'commits[0]' must not be its own parent."},
         Row{"NulInAuthor", "\"ann\"", "\"a\\u0000\"",
-            "'commits[0].annotation.author' holds a NUL or half a character."},
+            "'commits[0].annotation.author' contains a NUL or an unpaired surrogate."},
         Row{"HalfACharacterInMessage", "moves", "\\uD83D",
-            "'commits[0].annotation.message' holds a NUL or half a character."},
+            "'commits[0].annotation.message' contains a NUL or an unpaired surrogate."},
         Row{"DateWithoutZone", "09Z", "09", kDate}, Row{"DateWithFraction", "09Z", "09.5Z", kDate},
         Row{"MonthZero", "-03-", "-00-", kDate}, Row{"MonthThirteen", "-03-", "-13-", kDate},
         Row{"DayZero", "-05T", "-00T", kDate}, Row{"NoLeapDay", "2024-03-05", "2023-02-29", kDate},

@@ -97,14 +97,14 @@ TEST_P(ServerRequest, IsRefusedWithAReason)
 INSTANTIATE_TEST_SUITE_P(
     Requests, ServerRequest,
     testing::Values(
-        Row{"Empty", "", "", "The server knows no request ''."},
-        Row{"Unknown", "delete <id>", "", "The server knows no request 'delete'."},
-        Row{"Capitals", "Version", "", "The server knows no request 'Version'."},
+        Row{"Empty", "", "", "The server does not know the request ''."},
+        Row{"Unknown", "delete <id>", "", "The server does not know the request 'delete'."},
+        Row{"Capitals", "Version", "", "The server does not know the request 'Version'."},
         Row{"UnknownRepository", "fetch 12", "[]", "The server has no repository '12'."},
         Row{"RepositoryAndMore", "fetch <id> 1", "[]", "The server has no repository '<id> 1'."},
         Row{"NoRepository", "fetch", "[]", "The request 'fetch' must name a repository."},
         Row{"EmptyRepository", "commit ", "{}", "The request 'commit' must name a repository."},
-        Row{"NeedlessRepository", "init <id>", "{}", "The request 'init' concerns no repository."},
+        Row{"NeedlessRepository", "init <id>", "{}", "The request 'init' does not take a repository."},
         Row{"InitOfNoJson", "init", "", "The document is not valid JSON."},
         Row{"InitOfAnArray", "init", "[]", "The document must be of type object, not array."},
         Row{"InitWithoutName", "init", "{}", "The document lacks the member 'name'."},

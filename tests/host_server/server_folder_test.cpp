@@ -89,7 +89,7 @@ TEST_F(ServerFolder, ThatIsAFileIsRefused)
     tav::EmbeddedServer server(folder().pathTo("file"));
     EXPECT_EQ(
         ask(server, "repositories", ""), "error: The folder '" + folder().pathTo("file") +
-                                             "' cannot be made: Not a directory. Check your rights there, or name "
+                                             "' cannot be made: Not a directory. Check your permissions there, or name "
                                              "another folder for the server.");
 }
 

@@ -47,7 +47,7 @@ TEST_F(ServerReferences, AreNotMovedByWhoDoesNotSayWhereTheyAre)
 TEST_F(ServerReferences, MoveOnlyFromWhereTheyAreExpectedAlsoWhenForced)
 {
     std::string const refusal =
-        "error: The branch 'main' names another commit by now. Fetch what others have done, and try again.";
+        "error: The branch 'main' now names a different commit. Fetch what others have done, and try again.";
     EXPECT_EQ(move(references({"branch main b c"})), refusal);
     EXPECT_EQ(force(references({"branch main b c"})), refusal);
     EXPECT_EQ(move(references({"branch other b a"})), replaced(refusal, "main", "other"));
@@ -115,7 +115,7 @@ TEST_F(ServerReferences, GoOnlyFromWhereTheyAreExpected)
     EXPECT_EQ(move(replaced(document, "MORE", R"("expected":"",)")), refusal);
     EXPECT_EQ(
         move(kRemoveMain),
-        "error: The branch 'main' names another commit by now. Fetch what others have done, and try again.");
+        "error: The branch 'main' now names a different commit. Fetch what others have done, and try again.");
 }
 
 TEST_F(ServerReferences, KeepTheirTypeAlsoWhenForced)

@@ -67,7 +67,7 @@ std::string const kControl = "holds a control character or a line end";
 std::string const kBackslash = "holds a backslash, which separates folders on other systems";
 std::string const kUnsound = "holds a character that no file name has";
 std::string const kEmptyPart = "has an empty part between its slashes";
-std::string const kDots = "has a part of nothing but dots and blanks, which may lead out of the working folder";
+std::string const kDots = "has a part that consists of dots and spaces, which may lead out of the working folder";
 std::string const kLongPart = "has a part that is longer than 255 bytes";
 std::string const kOwn = "leads into the folder '.tav', which belongs to the repository";
 

@@ -252,9 +252,8 @@ TEST_F(HardLink, OfTheDatabaseStopsAllCommands)
     giveSecondName(".tav/tav.db");
     std::string const before = elsewhere.read("other");
     repo.write("a.dwg", "changed");
-    std::string const complaint =
-        ".tav/tav.db' has another name (a hard link), and what is written would show there too. Put a copy in its "
-        "place.\n";
+    std::string const complaint = ".tav/tav.db' has another hard link, which would change too. Put a copy in its "
+                                  "place.\n";
     for (Arguments const& command : {Arguments{"status"}, {"log"}, {"add", "--all"}, {"commit", "-m", "x"}, {"gc"}}) {
         EXPECT_EQ(tav(command), failed("tav: '" + repo.pathTo("") + complaint)) << command.front();
     }

@@ -184,7 +184,7 @@ TEST_F(OddRepository, WhoseRulesMayNotBeReadOffersNothingForACommit)
     std::string const told = support::asOrdinaryUser([&] { return toldBy(tav({"status"})); });
     EXPECT_EQ(
         told, "1\ntav: The ignore file '" + repo.pathTo(".tav/properties/ignore") +
-                  "' cannot be read: Permission denied. Check it and your rights to it.\n");
+                  "' cannot be read: Permission denied. Check it and your permissions for it.\n");
     EXPECT_EQ(support::asOrdinaryUser([&] { return toldBy(tav({"log"})); }), "0\n");
 }
 

@@ -189,7 +189,7 @@ TEST_F(LocalStorage, RepairsAContentFromAFileThatHasItAndFromNoOther)
         EXPECT_FALSE(storage.repair(support::fromUtf8(url), support::fromUtf8(name)).value());
         repo.write(fileOf(url), "damaged");
         repo.write("other", "abd");
-        EXPECT_EQ(messageOf(storage.repair(support::fromUtf8(url), L"other")), "'other' has another content by now.");
+        EXPECT_EQ(messageOf(storage.repair(support::fromUtf8(url), L"other")), "'other' has changed since.");
         EXPECT_TRUE(storage.repair(support::fromUtf8(url), support::fromUtf8(name)).value());
         EXPECT_EQ(contentOf(url), "abc");
     }
@@ -307,7 +307,7 @@ TEST_F(LocalStorage, RefusesAFileThatBecomesShorterWhileItIsStored)
         EXPECT_EQ(truncate(path.c_str(), kSegment), 0);
         return RealCallsAfterwards::real.pread(file, buffer, count, offset);
     };
-    EXPECT_EQ(messageOf(newStorage().store(L"file")), "'file' has become shorter while it was read.");
+    EXPECT_EQ(messageOf(newStorage().store(L"file")), "'file' became shorter while it was being read.");
     EXPECT_THAT(files(), IsEmpty());
 }
 
