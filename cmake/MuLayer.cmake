@@ -1,7 +1,7 @@
 # Floors are the layers of docs/architecture.md: platform, json, common and host. Each folder is an object library.
 #
 # Include lines name the folder ("json/json_value.h"), so one include path at the top of the tree would show every
-# floor to every other. Instead each floor gets a tree that holds a link to its own folder and nothing else, and a
+# layer to every other. Instead each layer gets a tree that holds a link to its own folder and nothing else, and a
 # target sees the trees of the targets it links: an include that points up finds no file.
 
 add_library(mu_warnings INTERFACE)
@@ -9,7 +9,7 @@ target_compile_options(mu_warnings INTERFACE -Wall -Wextra -Wpedantic -Wconversi
 
 # mu_include_tree(<target> <scope> <path>...): lets target include the given files or folders by their full names.
 function(mu_include_tree target scope)
-    set(tree "${PROJECT_BINARY_DIR}/floors/${target}")
+    set(tree "${PROJECT_BINARY_DIR}/layers/${target}")
     foreach(path IN LISTS ARGN)
         get_filename_component(parent "${tree}/${path}" DIRECTORY)
         file(MAKE_DIRECTORY "${parent}")
@@ -20,17 +20,17 @@ function(mu_include_tree target scope)
     target_include_directories(${target} ${scope} "$<BUILD_INTERFACE:${tree}>")
 endfunction()
 
-# mu_floor(<target> <folder> SOURCES <file>... [LINK <target>...] [PRIVATE_LINK <target>...])
-function(mu_floor target folder)
-    cmake_parse_arguments(FLOOR "" "" "SOURCES;LINK;PRIVATE_LINK" ${ARGN})
-    add_library(${target} OBJECT ${FLOOR_SOURCES})
+# mu_layer(<target> <folder> SOURCES <file>... [LINK <target>...] [PRIVATE_LINK <target>...])
+function(mu_layer target folder)
+    cmake_parse_arguments(LAYER "" "" "SOURCES;LINK;PRIVATE_LINK" ${ARGN})
+    add_library(${target} OBJECT ${LAYER_SOURCES})
     mu_include_tree(${target} PUBLIC ${folder})
-    target_link_libraries(${target} PUBLIC ${FLOOR_LINK} PRIVATE ${FLOOR_PRIVATE_LINK} mu_warnings)
+    target_link_libraries(${target} PUBLIC ${LAYER_LINK} PRIVATE ${LAYER_PRIVATE_LINK} mu_warnings)
 endfunction()
 
-# mu_show_floors(<library> <floor>...): lets those who link the library include what lies on these floors.
-function(mu_show_floors library)
-    foreach(floor IN LISTS ARGN)
-        target_include_directories(${library} INTERFACE "$<BUILD_INTERFACE:${PROJECT_BINARY_DIR}/floors/${floor}>")
+# mu_show_layers(<library> <layer>...): lets those who link the library include what these layers contain.
+function(mu_show_layers library)
+    foreach(layer IN LISTS ARGN)
+        target_include_directories(${library} INTERFACE "$<BUILD_INTERFACE:${PROJECT_BINARY_DIR}/layers/${layer}>")
     endforeach()
 endfunction()
