@@ -1,4 +1,4 @@
-# Floors are the layers of docs/architecture.md: platform, json, common and host. Each folder is an object library.
+# The layers of docs/architecture.md: platform, json, common and host, each an object library.
 #
 # Include lines name the folder ("json/json_value.h"), so one include path at the top of the tree would show every
 # layer to every other. Instead each layer gets a tree that holds a link to its own folder and nothing else, and a
