@@ -411,7 +411,7 @@ void bringToTheFirstForm(Scene const& scene)
             drops += "DROP " + rows.text(0).ansi_str() + ";";
         }
     }
-    database.run((drops + "PRAGMA user_version = 1").c_str());
+    database.run(("PRAGMA foreign_keys = OFF; " + drops + "PRAGMA user_version = 1").c_str());
 }
 
 } // namespace
