@@ -109,7 +109,7 @@ CommitRecord commitToGoTo(LocalDatabase const& database, std::string const& type
 {
     if (isNamedThere(fromUtf8(name), database)) {
         throw Failure(
-            "'" + name + "' is known only to the server.", "Run 'tav fetch' to learn it, and then this command again.");
+            "'" + name + "' is known only to the server.", "Run 'tav fetch' to get it, and then this command again.");
     }
     throw Failure(
         "There is no branch '" + name + "'.",
@@ -131,11 +131,11 @@ void checkOut(CheckoutOptions const& options)
     CheckedOut const result = checkOutCommit(
         session.root(), session.database(), {commit.hash, branch}, typedCommand("checkout", {options.target}),
         discardOf(options), session.start());
-    report("Now at commit " + std::to_string(commit.number) + described(result, session.root()));
     auto const end = session.database().commits().reference(branch);
-    if (end && end->commitHash != commit.hash) {
-        report("To commit here, create a branch with 'tav switch -c NAME'.\n");
-    }
+    bool const isAtTheEnd = !end || end->commitHash == commit.hash;
+    report(
+        "Now at commit " + std::to_string(commit.number) + described(result, session.root()) +
+        (isAtTheEnd ? "" : "To commit here, create a branch with 'tav switch -c NAME'.\n"));
 }
 
 void switchBranch(CheckoutOptions const& options)

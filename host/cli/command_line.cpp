@@ -13,9 +13,11 @@
 #include <clocale>
 #include <csignal>
 #include <exception>
+#include <memory>
 #include <optional>
 #include <sstream>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace tav {
@@ -120,8 +122,34 @@ std::optional<std::size_t> wordsBehindDashes(std::vector<std::string> const& wor
     return dashes == words.end() ? std::nullopt : std::optional(static_cast<std::size_t>(words.end() - dashes) - 1);
 }
 
+/// Help that shows what the user types, and nothing of how it is read.
+class HelpFormatter final : public CLI::Formatter {
+public:
+    HelpFormatter()
+    {
+        label("Positionals", "Arguments");
+        label("SUBCOMMAND", "COMMAND");
+    }
+
+    /// Without the second blank line that a hidden group of options leaves.
+    std::string make_help(CLI::App const* app, std::string name, CLI::AppFormatMode mode) const override
+    {
+        return CLI::detail::find_and_replace(CLI::Formatter::make_help(app, std::move(name), mode), "\n\n\n", "\n\n");
+    }
+
+    std::string make_option_opts(CLI::Option const* option) const override
+    {
+        if (option->get_positional()) {
+            return option->get_expected_max() == CLI::detail::expected_max_vector_size ? "..." : "";
+        }
+        std::string const type = option->get_type_name(); // Behind a colon it has the names of the checks.
+        return option->get_type_size() == 0 ? "" : " " + type.substr(0, type.find(':'));
+    }
+};
+
 void prepareSyntax(CLI::App& app, std::optional<std::size_t> behindDashes)
 {
+    app.formatter(std::make_shared<HelpFormatter>()); // The commands inherit it when they are added.
     app.require_subcommand(1);
     app.set_help_flag("-h,--help", "Show this help and do nothing else");
     app.set_version_flag("--version", TAV_VERSION, "Show the version and do nothing else");
@@ -131,6 +159,7 @@ void prepareSyntax(CLI::App& app, std::optional<std::size_t> behindDashes)
     addCommands(app, behindDashes);
     takeMarksOff(app);
     for (CLI::App* const command : app.get_subcommands({})) {
+        command->group("Commands");
         takeMarksOff(*command);
     }
 }

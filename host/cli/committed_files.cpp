@@ -35,7 +35,7 @@ Commits lastCommits(std::vector<LastChange> const& files, std::vector<CommitReco
         }
     }
     if (found.size() != numbers.size()) {
-        throw Failure("The database lacks commits that changed files.", "Run 'tav fetch' to learn them.");
+        throw Failure("The database lacks commits that changed files.", "Run 'tav fetch' to get them.");
     }
     return found;
 }

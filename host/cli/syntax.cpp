@@ -34,8 +34,8 @@ void addInit(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("init", "Make a folder of drawings a repository, or complete one");
     auto const options = std::make_shared<InitOptions>();
-    command->add_option("FOLDER", options->folder, "The folder of your drawings; it is made when it is missing")
-        ->capture_default_str();
+    command->add_option(
+        "FOLDER", options->folder, "The folder of your drawings, by default this one; it is made when it is missing");
     command
         ->add_option(
             "--server", options->server, "Where the history is kept; by default 'tav/server' in your folder for data")
@@ -438,7 +438,7 @@ void addTerminalOptions(CLI::App& app, char const* group)
         ->check(CLI::IsMember({"auto", "always", "never"}))
         ->group(group);
     app.add_flag(
-           "--no-pager", [&options](std::int64_t) { options.hasPager = false; }, "Show long output at once")
+           "--no-pager", [&options](std::int64_t) { options.hasPager = false; }, "Do not use a pager")
         ->group(group);
     app.add_flag(
            "-q,--quiet",
@@ -446,9 +446,9 @@ void addTerminalOptions(CLI::App& app, char const* group)
                options.isQuiet = true;
                hideProgress();
            },
-           "Say nothing of what has been done")
+           "Do not report what was done")
         ->group(group);
-    app.add_flag("--yes", options.asksNothing, "Ask nothing: take the usual answer")->group(group);
+    app.add_flag("--yes", options.asksNothing, "Do not ask questions; take the default answer")->group(group);
 }
 
 } // namespace
@@ -475,7 +475,7 @@ void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
     addRedo(app);
     addBranch(app);
     addTag(app);
-    app.add_subcommand("fetch", "Learn the commits, branches and tags that the server has")->callback(fetch);
+    app.add_subcommand("fetch", "Get the commits, branches and tags that the server has")->callback(fetch);
     addServer(app);
     addFiles(app);
     addIgnore(app);

@@ -88,7 +88,7 @@ std::optional<Failure> differenceFromServer(LocalDatabase const& database)
     if (comparison.unknownHere > 0) {
         return Failure(
             "The server has " + countedThatAre(comparison.unknownHere, "commit") + " not known here.",
-            "Run 'tav fetch' to learn them.");
+            "Run 'tav fetch' to get them.");
     }
     return std::nullopt;
 }

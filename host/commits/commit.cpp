@@ -28,6 +28,7 @@
 
 #include <algorithm>
 #include <ctime>
+#include <filesystem>
 #include <set>
 #include <utility>
 
@@ -249,6 +250,23 @@ void checkNames(std::vector<PlannedFile> const& plan)
     }
 }
 
+/// A folder that nobody may read, or whose path is too long, stays so, and its files are kept. After another error the
+/// next look may find that they are gone.
+void failIfReadAgain(Folders const& unreadable, common::RootPath const& root)
+{
+    for (OdString const& folder : unreadable) {
+        std::error_code error;
+        std::filesystem::directory_iterator const entries(root.pathTo(folder).ansi_str(), error);
+        bool const stays = error == std::errc::permission_denied || error == std::errc::operation_not_permitted ||
+                           error == std::errc::filename_too_long;
+        if (!stays) {
+            throw Failure(
+                "The folder " + quoted(folder) + " could not be read" + (error ? ": " + error.message() : "") + ".",
+                "Nothing has been committed; run the command again.");
+        }
+    }
+}
+
 /// What is behind a link is not in the working folder, and no removal either.
 void failIfUnreachable(common::State const& state, Folders const& unreadable, common::RootPath const& root)
 {
@@ -427,6 +445,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     if (order.takesModified) {
         stageModified(changes, state); // In memory: a commit that fails has staged nothing.
     }
+    failIfReadAgain(changes.unreadable, root);
     failIfUnreachable(state, changes.unreadable, root);
     Renames const renames = findRenames(changes, state, database, root);
     std::vector<PlannedFile> plan = planCommit(state, changes, renames, draft.files, root);

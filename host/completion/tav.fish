@@ -56,9 +56,9 @@ complete -c tav -s h -l help -d 'Show this help and do nothing else'
 complete -c tav -n "not __fish_seen_subcommand_from $commands" -l version \
     -d 'Show the version and do nothing else'
 complete -c tav -n "not __fish_seen_subcommand_from $commands" -l color -x -a 'auto always never' -d 'When to use colours'
-complete -c tav -n "not __fish_seen_subcommand_from $commands" -l no-pager -d 'Show long output at once'
-complete -c tav -n "not __fish_seen_subcommand_from $commands" -s q -l quiet -d 'Say nothing of what has been done'
-complete -c tav -n "not __fish_seen_subcommand_from $commands" -l yes -d 'Ask nothing: take the usual answer'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -l no-pager -d 'Do not use a pager'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -s q -l quiet -d 'Do not report what was done'
+complete -c tav -n "not __fish_seen_subcommand_from $commands" -l yes -d 'Do not ask questions; take the default answer'
 complete -c tav -n "not __fish_seen_subcommand_from $commands" -s C -x -a '(__fish_complete_directories)' \
     -d 'Work as if started in FOLDER'
 
@@ -85,7 +85,7 @@ __tav_command undo 'Take back the last command' $commands
 __tav_command redo "Do again what 'tav undo' has taken back" $commands
 __tav_command branch 'List the branches, or make one' $commands
 __tav_command tag 'List the tags, or make one' $commands
-__tav_command fetch 'Learn the commits, branches and tags that the server has' $commands
+__tav_command fetch 'Get the commits, branches and tags that the server has' $commands
 __tav_command server 'Show where the history is kept, or name its new place' $commands
 __tav_command files 'List the files that the repository keeps' $commands
 __tav_command ignore 'Show the rules for names to ignore, or add one' $commands

@@ -60,8 +60,8 @@ WriteSession::WriteSession(common::RootPath const& root, os::FileLock lock, Reco
         }
         if (isCommit && !database_.operations().running()) {
             std::fputs(
-                "tav: A commit that was interrupted was abandoned because the server refused it. What it was to take "
-                "is staged as before.\n",
+                "tav: A commit that was interrupted was abandoned because the server refused it. Its files are "
+                "still staged.\n",
                 stderr);
         }
     }

@@ -11,6 +11,7 @@
 #include "json/json_writer.h"
 
 #include <cstdint>
+#include <filesystem>
 #include <utility>
 
 namespace tav {
@@ -32,13 +33,22 @@ std::string bytesOf(std::wstring const& text)
     return withoutPairs(OdString(text.data(), text.size())).ansi_str();
 }
 
+/// Who may not even look into the folder, as under sudo, has no settings there.
+bool isOutOfReach(std::string const& path)
+{
+    std::error_code error;
+    std::filesystem::file_status const status = std::filesystem::symlink_status(path, error);
+    return status.type() == std::filesystem::file_type::none && error == std::errc::permission_denied;
+}
+
 /// A file that somebody else wrote may be of any length.
 std::string readShortFile(std::string const& path)
 {
     os::OpenFile file;
     std::uint64_t length = 0;
     std::error_code error = file.openForReading(path);
-    if (error == std::errc::no_such_file_or_directory || error == std::errc::not_a_directory) {
+    bool const isMissing = error == std::errc::no_such_file_or_directory || error == std::errc::not_a_directory;
+    if (isMissing || (error && isOutOfReach(path))) {
         return "{}";
     }
     error = error ? error : file.length(length);

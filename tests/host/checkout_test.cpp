@@ -239,7 +239,7 @@ TEST_F(Moving, CheckoutOfTheCurrentCommitSaysThatChangesStay)
     EXPECT_EQ(tav({"checkout", "2"}), done("Now at commit 2.\n1 changed file stays as it is.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "changed");
     tav({"add", "a.dwg"});
-    EXPECT_EQ(tav({"checkout", "2"}), done("Now at commit 2.\n1 staged file remains staged.\n"));
+    EXPECT_EQ(tav({"checkout", "2"}), done("Now at commit 2.\n1 staged file carried along.\n"));
 }
 
 TEST_F(Moving, ForcedCheckoutOfTheCurrentCommitBringsBackItsFiles)
@@ -247,7 +247,7 @@ TEST_F(Moving, ForcedCheckoutOfTheCurrentCommitBringsBackItsFiles)
     repo.write("a.dwg", "changed");
     tav({"mv", "c.dwg", "d.dwg"});
     EXPECT_EQ(
-        tav({"checkout", "2", "--force"}), done("Now at commit 2 (2 files written).\n1 staged file remains staged.\n"));
+        tav({"checkout", "2", "--force"}), done("Now at commit 2 (2 files written).\n1 staged file carried along.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "two");
     EXPECT_EQ(repo.read("c.dwg"), "two");
     EXPECT_THAT(status(), HasSubstr("new:      d.dwg")) << "no renaming any more";
@@ -298,7 +298,7 @@ TEST_F(Moving, SwitchCarriesStagedFilesAlongAndSaysSo)
     tav({"branch", "sketch"});
     tav({"restore", "a.dwg", "--from", "1"});
     tav({"add", "a.dwg"});
-    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file remains staged.\n"));
+    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file carried along.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "one");
     EXPECT_EQ(tav({"switch", "master"}).code, 0);
     EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
@@ -358,7 +358,7 @@ TEST_F(Moving, CommitWantsTheEndOfTheBranch)
         failed("tav: You are at an earlier commit, not at the end of the branch 'master'. Run 'tav branch NAME' and "
                "'tav switch NAME' to go on from here, or 'tav switch master' to go back to its end.\n"));
     EXPECT_EQ(tav({"branch", "sketch"}), done("Made the branch 'sketch' at commit 1.\n"));
-    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file remains staged.\n"));
+    EXPECT_EQ(tav({"switch", "sketch"}), done("Now on branch sketch.\n1 staged file carried along.\n"));
     EXPECT_EQ(tav({"commit", "-m", "another way"}).code, 0);
     EXPECT_EQ(tav({"branch"}), done("  master  (commit 2)\n* sketch  (commit 3)\n"));
     EXPECT_EQ(tav({"switch", "master"}).code, 0);

@@ -13,14 +13,18 @@ struct HelpRow {
 };
 
 constexpr char const* kMainHelp = R"(Keeps the versions of a folder of drawings.
-Usage: tav [OPTIONS] SUBCOMMAND
+Usage: tav [OPTIONS] COMMAND
 
 Options:
   -h,--help                   Show this help and do nothing else
   --version                   Show the version and do nothing else
   -C FOLDER                   Work as if started in FOLDER
+  --color WHEN                When to use colours: auto, always or never
+  --no-pager                  Do not use a pager
+  -q,--quiet                  Do not report what was done
+  --yes                       Do not ask questions; take the default answer
 
-Subcommands:
+Commands:
   init                        Make a folder of drawings a repository, or complete one
   status, st                  Show what has changed and what is staged
   add                         Stage changed and new files for the next commit
@@ -39,9 +43,9 @@ Subcommands:
   switch                      Continue on another branch
   undo                        Take back the last command
   redo                        Do again what 'tav undo' has taken back
-  branch                      List the branches, or make one
-  tag                         List the tags, or make one
-  fetch                       Learn the commits, branches and tags that the server has
+  branch                      List the branches, or create, rename or delete one
+  tag                         List the tags, or create or delete one
+  fetch                       Get the commits, branches and tags that the server has
   server                      Show where the history is kept, or name its new place
   files                       List the files that the repository keeps
   ignore                      Show the rules for names to ignore, or add one
@@ -56,8 +60,8 @@ Subcommands:
 constexpr char const* kInitHelp = R"(Make a folder of drawings a repository, or complete one
 Usage: tav init [OPTIONS] [FOLDER]
 
-Positionals:
-  FOLDER TEXT=.               The folder of your drawings; it is made when it is missing
+Arguments:
+  FOLDER                      The folder of your drawings, by default this one; it is made when it is missing
 
 Options:
   -h,--help                   Show this help and do nothing else
@@ -80,35 +84,33 @@ Options:
 constexpr char const* kAddHelp = R"(Stage changed and new files for the next commit
 Usage: tav add [OPTIONS] [NAME...]
 
-Positionals:
-  NAME TEXT ... Excludes: --all
-                              Paths of files or folders, or the end of a path that only one changed file matches
+Arguments:
+  NAME...                     Paths of files or folders, or the end of a path that only one changed file matches
 
 Options:
   -h,--help                   Show this help and do nothing else
-  --all Excludes: NAME        Stage every changed and new file
+  --all                       Stage every changed and new file
 
 )";
 
 constexpr char const* kUnstageHelp = R"(Take files out of the next commit; they stay as they are
 Usage: tav unstage [OPTIONS] [NAME...]
 
-Positionals:
-  NAME TEXT ... Excludes: --all
-                              Paths of files or folders, or the end of a path that only one staged file matches
+Arguments:
+  NAME...                     Paths of files or folders, or the end of a path that only one staged file matches
 
 Options:
   -h,--help                   Show this help and do nothing else
-  --all Excludes: NAME        Unstage all files
+  --all                       Unstage all files
 
 )";
 
 constexpr char const* kMvHelp = R"(Rename a file or folder, and stage that
 Usage: tav mv [OPTIONS] OLD NEW
 
-Positionals:
-  OLD TEXT REQUIRED           Path of a file or folder of the repository
-  NEW TEXT REQUIRED           Its new path, or an existing folder to move it into
+Arguments:
+  OLD                         Path of a file or folder of the repository
+  NEW                         Its new path, or an existing folder to move it into
 
 Options:
   -h,--help                   Show this help and do nothing else
@@ -118,8 +120,8 @@ Options:
 constexpr char const* kRmHelp = R"(Remove committed files, and stage that
 Usage: tav rm [OPTIONS] NAME...
 
-Positionals:
-  NAME TEXT ... REQUIRED      Paths of files or folders, or the end of a path
+Arguments:
+  NAME...                     Paths of files or folders, or the end of a path
 
 Options:
   -h,--help                   Show this help and do nothing else
@@ -129,13 +131,13 @@ Options:
 constexpr char const* kFilesHelp = R"(List the files that the repository keeps
 Usage: tav files [OPTIONS] [FOLDER]
 
-Positionals:
-  FOLDER TEXT                 The folder of a repository; by default the one you are in
+Arguments:
+  FOLDER                      The folder of a repository; by default the one you are in
 
 Options:
   -h,--help                   Show this help and do nothing else
-  --hash Excludes: --long     Show the SHA-256 digest of each file, in the form of sha256sum
-  --long Excludes: --hash     Show the last commit of each file, its date and its author
+  --hash                      Show the SHA-256 digest of each file, in the form of sha256sum
+  --long                      Show the last commit of each file, its date and its author
   --at COMMIT                 List the files of a commit; --long does so with the current one
   --json                      Print a document for programs
 
@@ -149,9 +151,8 @@ Usage: tav ignore [OPTIONS]
 
 Options:
   -h,--help                   Show this help and do nothing else
-  --add PATTERN Excludes: --json
-                              A regular expression; files and folders whose whole name matches it are ignored
-  --json Excludes: --add      Print a document for programs
+  --add PATTERN               A regular expression; files and folders whose whole name matches it are ignored
+  --json                      Print a document for programs
 
 )";
 

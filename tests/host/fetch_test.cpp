@@ -79,10 +79,9 @@ TEST_F(OlderDatabase, LosesNothingToGc)
 TEST_F(OlderDatabase, IsNoticedByVerify)
 {
     EXPECT_EQ(
-        tav({"verify"}),
-        (Outcome{
-            1, "Read 2 stored versions; nothing is damaged.\n",
-            "tav: The server has 3 commits that are not known here. Run 'tav fetch' to learn them.\n"}));
+        tav({"verify"}), (Outcome{
+                             1, "Read 2 stored versions; nothing is damaged.\n",
+                             "tav: The server has 3 commits that are not known here. Run 'tav fetch' to get them.\n"}));
 }
 
 TEST_F(OlderDatabase, ClosesItsGapWithTheNextCommit)
@@ -242,7 +241,7 @@ TEST_F(TwoFolders, SayHowToGetABranchThatOnlyTheServerKnows)
     ASSERT_EQ(inOther({"branch", "side"}).code, 0);
     EXPECT_EQ(
         tav({"switch", "side"}),
-        failed("tav: 'side' is known only to the server. Run 'tav fetch' to learn it, and then this command again.\n"));
+        failed("tav: 'side' is known only to the server. Run 'tav fetch' to get it, and then this command again.\n"));
     EXPECT_EQ(tav({"fetch"}).code, 0);
     EXPECT_EQ(tav({"switch", "side"}), done("Now on branch side.\n"));
 }

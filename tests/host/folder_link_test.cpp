@@ -79,8 +79,8 @@ TEST_F(FolderLink, HasNothingToStage)
         EXPECT_EQ(
             tav({"add", name}), failed(
                                     "tav: '" + std::string(name) +
-                                    "' is behind a link to a folder, which tav does not enter. Put the folder "
-                                    "itself in the place of the link.\n"));
+                                    "' is behind a link to a folder, which tav does not enter. Replace the link "
+                                    "with the folder itself.\n"));
     }
     EXPECT_EQ(tav({"add", "--all"}), done("Nothing new to stage.\n"));
 }
@@ -90,9 +90,8 @@ TEST_F(FolderLink, EndsTheCommitOfAFileThatWasStagedBefore)
     repo.write("plans/a.dwg", "two");
     ASSERT_EQ(tav({"add", "plans/a.dwg"}).code, 0);
     moveAway();
-    Outcome const refused = failed(
-        "tav: 'plans/a.dwg' is staged, but a link has taken the place of its folder. Put the folder itself in its "
-        "place, or run 'tav unstage' for the file.\n");
+    Outcome const refused = failed("tav: 'plans/a.dwg' is staged, but a link has taken the place of its folder. "
+                                   "Replace the link with the folder itself, or run 'tav unstage' for the file.\n");
     EXPECT_EQ(tav({"commit", "-m", "second"}), refused);
     fs::remove_all(elsewhere.pathTo("plans"));
     EXPECT_EQ(tav({"commit", "-m", "second", "--all-removed"}), refused);

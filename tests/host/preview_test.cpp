@@ -163,8 +163,8 @@ TEST_F(PreviewTest, SaysThatTwoPicturesAreAlike)
 {
     EXPECT_EQ(
         tav({"compare", "plan.dwg", "1", "1", "-o", "out.png"}).out,
-        "plan.dwg (commit 1) and plan.dwg (commit 1). The pictures are alike; the drawings may differ in what the "
-        "pictures do not show.\nWrote the comparison to 'out.png'.\n");
+        "plan.dwg (commit 1) and plan.dwg (commit 1). The pictures are identical; the drawings may still "
+        "differ.\nWrote the comparison to 'out.png'.\n");
 }
 
 } // namespace

@@ -353,7 +353,7 @@ TEST_F(WaitingCommit, IsTakenBackWhereTheServerHasNoSuchRepository)
     tav::Database(place.pathTo("server/server.db"))
         .run("DELETE FROM refs; DELETE FROM changes; DELETE FROM parents; DELETE FROM commits;"
              "DELETE FROM repositories;");
-    EXPECT_THAT(tav({"switch", "side"}).err, HasSubstr("What was to be committed is staged as before."));
+    EXPECT_THAT(tav({"switch", "side"}).err, HasSubstr("The files are still staged."));
     EXPECT_EQ(tav({"log"}).err, "");
     EXPECT_THAT(tav({"status"}).out, HasSubstr("modified: note.txt"));
     EXPECT_EQ(tav({"server", "--send"}).code, 0);

@@ -149,8 +149,8 @@ TEST_F(UnreadableFolder, IsNeitherAddedNorRemovedNorRenamed)
                 chmod(place.pathTo("repository/plans/deep").c_str(), kAll);
                 return moved;
             }),
-        text(failed("tav: The folder 'plans/deep' cannot be read, so its files would not be renamed. Check your rights "
-                    "to it.\n")));
+        text(failed("tav: The folder 'plans/deep' cannot be read, so its files would not be renamed. Check your "
+                    "permissions for it.\n")));
 }
 
 /// Makes a folder in a folder, so often that no path leads to the last one.

@@ -98,7 +98,7 @@ TEST_F(ServerFolder, WithoutANameIsRefused)
     tav::EmbeddedServer server("");
     EXPECT_EQ(
         ask(server, "repositories", ""), "error: The folder '' cannot be made: No such file or directory. Check your "
-                                         "rights there, or name another folder for the server.");
+                                         "permissions there, or name another folder for the server.");
 }
 
 TEST_F(ServerFolder, ThatMayOnlyBeReadAnswersAndTakesNothing)
