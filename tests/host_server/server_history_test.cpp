@@ -94,15 +94,14 @@ INSTANTIATE_TEST_SUITE_P(
     Rows, HistoryPage,
     testing::Values(
         Row{"PathThatLeadsOut", "note.txt", "../note.txt",
-            "'commits[0].changes[0].path' cannot be recorded. The path '../note.txt' has a part of nothing but "
-            "dots and blanks, which may lead out of the working folder."},
+            "'commits[0].changes[0].path' cannot be recorded. The path '../note.txt' has a part that consists "
+            "of dots and spaces, which may lead out of the working folder."},
         Row{"PreviousPathThatLeadsOut", R"("previousPath":"plan.dwg")", R"("previousPath":"/plan.dwg")",
             "'commits[1].changes[2].previousPath' cannot be recorded. The path '/plan.dwg' is absolute; a recorded "
             "path "
             "is relative to the working folder."},
         Row{"Url", "po:<2>", "po:2",
-            "'commits[0].changes[0].storagePath' must name a content, such as 'po:' or 'tf:plan#' with a hash behind "
-            "it."},
+            "'commits[0].changes[0].storagePath' must name a content, such as 'po:' or 'tf:plan#' followed by a hash."},
         Row{"Hash", R"("hash":"<a>")", R"("hash":"a")",
             "'commits[0].hash' must be a hash of 64 lower-case hexadecimal digits."},
         Row{"PathTwice", "note.txt", "plan.dwg", "'commits[0].changes' must not hold the path 'plan.dwg' twice."},
