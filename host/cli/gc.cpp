@@ -74,36 +74,45 @@ std::string whyOnlyLeftovers(WriteSession& session, LocalStorage& storage)
     return doubt.empty() ? doubt : "the server does not say what its commits need. " + doubt;
 }
 
-/// A failure does not keep the rest from being cleaned: that may be what frees the space that was missing.
-void turnOver(WriteSession& session)
-{
-    TurnedOver const turned = turnOverObjects(session.root(), session.database());
-    if (turned.freed.contents > 0) {
-        print(
-            "Turned " + counted(turned.freed.contents, "stored version") + " into " +
-            (turned.freed.contents == 1 ? "a difference; " : "differences; ") + sizeText(turned.freed.bytes) +
-            " freed.\n");
-    }
-    if (turned.error) {
-        printNote("Not all stored versions were turned into differences: " + turned.error->message.ansi_str());
-    }
-}
+struct Cleaned {
+    TurnedOver turned;
+    Freed removed;
+};
 
 /// Leftovers go first: on a full disk nothing can be learned.
-Freed removeWhatNobodyNeeds(WriteSession& session, LocalStorage& storage)
+Cleaned removeWhatNobodyNeeds(WriteSession& session, LocalStorage& storage)
 {
     Freed const leftovers = valueOrFail(storage.removeLeftovers(), "Check your rights in '.tav'.");
     std::string const why = whyOnlyLeftovers(session, storage);
     if (!why.empty()) {
         printNote("Only leftovers are removed: " + why);
-        return leftovers;
+        return {{}, leftovers};
     }
-    turnOver(session);
+    TurnedOver const turned = turnOverObjects(session.root(), session.database());
     Contents const needed = contentsOf(session.root(), session.database());
     Freed const unneeded = valueOrFail(
         storage.keepOnly(setOf(needed.here), setOf(needed.elsewhere)),
         "Run 'tav verify' to see whether anything is damaged.");
-    return {leftovers.contents + unneeded.contents, leftovers.bytes + unneeded.bytes};
+    return {turned, {leftovers.contents + unneeded.contents, leftovers.bytes + unneeded.bytes}};
+}
+
+/// The rest has been cleaned nevertheless: that may be what frees the space that was missing.
+void failUnlessTurnedOver(TurnedOver const& turned)
+{
+    if (turned.error) {
+        throw Failure(
+            "Not all stored versions were turned into differences: " + turned.error->message.ansi_str(),
+            "Everything else is done; correct that and run 'tav gc' again.");
+    }
+}
+
+void reportTurnedOver(Freed const& freed)
+{
+    if (freed.contents > 0) {
+        report(
+            "Turned " + counted(freed.contents, "stored version") + " into " +
+            (freed.contents == 1 ? "a difference; " : "differences; ") + sizeText(freed.bytes) + " freed.\n");
+    }
 }
 
 } // namespace
@@ -113,11 +122,13 @@ void collectGarbage()
     WriteSession session(openRepository(""), "gc", Recovery::attempted);
     session.database().failIfDamaged();
     LocalStorage storage(session.root());
-    Freed const freed = removeWhatNobodyNeeds(session, storage);
+    Cleaned const cleaned = removeWhatNobodyNeeds(session, storage);
     RemovedFiles const files = cleanRemovedFiles(session.root(), session.database(), storage);
+    failUnlessTurnedOver(cleaned.turned);
+    reportTurnedOver(cleaned.turned.freed);
     report(
-        "Removed " + counted(freed.contents, "stored version") + " that no commit needs; " + sizeText(freed.bytes) +
-        " freed.\n");
+        "Removed " + counted(cleaned.removed.contents, "stored version") + " that no commit needs; " +
+        sizeText(cleaned.removed.bytes) + " freed.\n");
     if (files.freed.contents > 0) {
         report(
             "Removed " + counted(files.freed.contents, "file") + " that a killed 'tav rm' had left; " +

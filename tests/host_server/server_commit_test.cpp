@@ -297,8 +297,7 @@ INSTANTIATE_TEST_SUITE_P(
         Row{"StoreOutOfItsFolder", "po:<1>", "tf:../a#<1>", kUrl}, Row{"EmptyContent", "po:<1>", "", kUrl},
         Row{"UnsafePath", "\"plan.dwg\"", "\"../plan.dwg\"",
             "'commits[0].files[0].path' cannot be recorded. The path '../plan.dwg' has a part that consists of dots "
-            "and "
-            "spaces, which may lead out of the working folder."},
+            "and spaces, which may lead out of the working folder."},
         Row{"EmptyPath", "\"plan.dwg\"", "\"\"", "'commits[0].files[0].path' cannot be recorded. The path is empty."},
         Row{"UnsafePreviousPath", "old.dwg", ".tav/tav.state",
             "'commits[0].files[1].previousPath' cannot be recorded. The path '.tav/tav.state' leads into the folder "

@@ -94,8 +94,8 @@ INSTANTIATE_TEST_SUITE_P(
     Rows, HistoryPage,
     testing::Values(
         Row{"PathThatLeadsOut", "note.txt", "../note.txt",
-            "'commits[0].changes[0].path' cannot be recorded. The path '../note.txt' has a part that consists "
-            "of dots and spaces, which may lead out of the working folder."},
+            "'commits[0].changes[0].path' cannot be recorded. The path '../note.txt' has a part that consists of "
+            "dots and spaces, which may lead out of the working folder."},
         Row{"PreviousPathThatLeadsOut", R"("previousPath":"plan.dwg")", R"("previousPath":"/plan.dwg")",
             "'commits[1].changes[2].previousPath' cannot be recorded. The path '/plan.dwg' is absolute; a recorded "
             "path "
