@@ -109,6 +109,13 @@ std::vector<FileContents> replacedFiles(TreeUpdate const& update)
     return files;
 }
 
+std::string resultOf(std::size_t files, std::size_t written, std::int64_t commit)
+{
+    std::string const where = "as in commit " + std::to_string(commit);
+    return written == 0 ? "Nothing to restore: already " + where + ".\n"
+                        : counted(files, "file") + " " + where + ", " + std::to_string(written) + " written.\n";
+}
+
 } // namespace
 
 void restoreFiles(RestoreOptions const& options)
@@ -134,9 +141,7 @@ void restoreFiles(RestoreOptions const& options)
     });
     changeState(root, [&](common::Cache& cache) { enterFiles(files, base, updated.times, cache.write()); });
     keepVerified(updated.verified, session.database());
-    report(
-        counted(files.size(), "file") + " as in commit " + std::to_string(commit.number) + ", " +
-        std::to_string(update.writes.size()) + " written.\n");
+    report(resultOf(files.size(), update.writes.size(), commit.number));
 }
 
 } // namespace tav

@@ -399,6 +399,7 @@ TEST_F(Moving, RestoreBringsAnEarlierVersionBack)
     EXPECT_THAT(status(), HasSubstr("modified: a.dwg"));
     EXPECT_EQ(tav({"restore", "a.dwg"}), done("1 file as in commit 2, 1 written.\n"));
     EXPECT_EQ(repo.read("a.dwg"), "two");
+    EXPECT_EQ(tav({"restore", "a.dwg"}), done("Nothing to restore: already as in commit 2.\n"));
     EXPECT_EQ(status(), kClean);
 }
 
