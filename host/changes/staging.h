@@ -48,7 +48,7 @@ struct Move {
 };
 
 /// Records that files have moved, and stages them at their new paths. A file that had moved before keeps its first path
-/// as the former one; a file that is back at its first path is no longer a rename.
+/// as the earlier one; a file that is back at its first path is no longer a rename.
 void stageMoves(std::vector<Move> const& moves, common::State& state);
 
 } // namespace tav

@@ -190,7 +190,7 @@ void notePermissions(common::RootPath const& root, TreeUpdate const& update, std
     }
 }
 
-/// What the move does to the staged files: those that are as the commit has them are no changes any more.
+/// What the move does to the staged files: those that equal the files of the commit stop being changes.
 StagingChange settling(TreeUpdate const& whole, common::State const& state)
 {
     IndexUpdates files;

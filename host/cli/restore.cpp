@@ -74,7 +74,7 @@ void unstageRemovals(Tree const& files, common::State& state)
     unstage(removals, state);
 }
 
-/// Files that are now as the last commit has them are no changes any more.
+/// Files that equal those of the last commit stop being changes.
 void enterFiles(
     Tree const& files, Tree const& base, std::map<OdString, std::uint64_t> const& times, common::State& state)
 {

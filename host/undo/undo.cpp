@@ -47,7 +47,7 @@ std::vector<std::string> faults(Operation const& operation, LocalDatabase const&
 {
     std::vector<std::string> faults;
     if (!isAt(operation.before, database, state) && !isAt(operation.after, database, state)) {
-        faults.emplace_back("The working folder stands on another commit or branch by now.");
+        faults.emplace_back("The working folder is at another commit or branch now.");
     }
     if (!isOn(Side::before, operation.staging, state) && !isOn(Side::after, operation.staging, state)) {
         faults.emplace_back("Other files are staged by now.");
