@@ -142,7 +142,10 @@ struct FilesOptions {
 void listFiles(FilesOptions const& options);
 
 struct IgnoreOptions {
-    std::optional<std::string> rule; ///< to add; without it the rules are listed
+    std::optional<std::string> added;   ///< a rule or wildcard; without one of the three, the rules are listed
+    std::optional<std::string> removed; ///< the same
+    std::optional<std::string> name;    ///< which rule ignores it
+    bool dryRun = false;
     bool json = false;
 };
 void ignore(IgnoreOptions const& options);

@@ -2,23 +2,115 @@
 #include "host/cli/output.h"
 #include "host/errors/failure.h"
 #include "host/repository/ignore_file.h"
+#include "host/repository/ignore_pattern.h"
+#include "host/repository/ignore_reason.h"
+#include "host/repository/names.h"
 #include "host/repository/open.h"
 #include "host/session/write_session.h"
 #include "host/text/utf8.h"
 
+#include <algorithm>
+#include <optional>
 #include <string>
+#include <vector>
 
 namespace tav {
 
 namespace {
 
-void addRule(common::RootPath const& root, std::string const& rule)
+bool isInEffect(common::RootPath const& root, OdString const& rule)
 {
+    std::vector<OdString> const rules = ignoreRules(root);
+    return std::find(rules.begin(), rules.end(), rule) != rules.end();
+}
+
+bool add(common::RootPath const& root, OdString const& rule, bool dryRun)
+{
+    requireValidRule(rule);
+    if (dryRun) {
+        return !isInEffect(root, rule);
+    }
     WriteSession const session(root, "ignore", Recovery::attempted);
-    OdString const pattern = fromUtf8(rule);
-    report(
-        addIgnoreRule(root, pattern) ? "Names that match '" + shown(pattern) + "' are ignored from now on.\n"
-                                     : "The rule '" + shown(pattern) + "' was there already.\n");
+    return addIgnoreRule(root, rule);
+}
+
+void noteUselessRule(common::RootPath const& root, OdString const& rule)
+{
+    if (!matchesAnyName(root, rule)) {
+        bool const isPath = rule.ansi_str().find('/') != std::string::npos;
+        printNote(isPath ? "Rules are for single names, without '/'." : "No file or folder has such a name yet.");
+    }
+}
+
+void addRule(common::RootPath const& root, std::string const& typed, bool dryRun)
+{
+    OdString const rule = ruleFor(typed);
+    if (!add(root, rule, dryRun)) {
+        report("The rule '" + shown(rule) + "' was there already.\n");
+        return;
+    }
+    report("Names that match '" + shown(rule) + (dryRun ? "' would be ignored.\n" : "' are ignored from now on.\n"));
+    noteUselessRule(root, rule);
+}
+
+bool remove(common::RootPath const& root, OdString const& rule, bool dryRun)
+{
+    if (dryRun) {
+        return isInEffect(root, rule);
+    }
+    WriteSession const session(root, "ignore", Recovery::attempted);
+    return removeIgnoreRule(root, rule);
+}
+
+/// A rule as it stands in the file goes before what a wildcard means.
+void removeRule(common::RootPath const& root, std::string const& typed, bool dryRun)
+{
+    OdString const rule = isInEffect(root, fromUtf8(typed)) ? fromUtf8(typed) : ruleFor(typed);
+    if (!remove(root, rule, dryRun)) {
+        throw Failure("There is no rule '" + rule.ansi_str() + "'.", "Run 'tav ignore' to see the rules.");
+    }
+    report((dryRun ? "Would remove the rule '" : "Removed the rule '") + shown(rule) + "'.\n");
+}
+
+std::string sentence(IgnoreReason const& reason, common::RootPath const& root)
+{
+    std::string const name = "'" + shown(reason.name) + "'";
+    if (reason.rule.isEmpty()) {
+        return name + " is hidden: it begins with a dot.";
+    }
+    std::string const place = hasIgnoreFile(root)
+                                  ? "Rule " + std::to_string(reason.number) + " of '" + kIgnoreFile + "'"
+                                  : std::string("A rule that every repository begins with");
+    return place + " matches " + name + ": " + shown(reason.rule);
+}
+
+bool isCommitted(common::RootPath const& root, OdString const& path)
+{
+    LocalDatabase const database = LocalDatabase::open(root);
+    return database.commits().files(database.currentCommit()).count(path) > 0;
+}
+
+/// Rules are for new files: commits go on with those that they have.
+void explain(common::RootPath const& root, std::string const& typed, bool json)
+{
+    OdString const path = pathInRepository(root, typed);
+    std::optional<IgnoreReason> const reason = whyIgnored(root, path);
+    bool const isIgnored = reason && !isCommitted(root, path);
+    if (json) {
+        kutils::json::Object document;
+        document[L"path"] = jsonText(path);
+        document[L"ignored"] = isIgnored;
+        document[L"rule"] = jsonText(reason ? reason->rule : OdString());
+        printJson(std::move(document));
+    } else if (isIgnored) {
+        print(sentence(*reason, root) + "\n");
+    }
+    if (!reason) {
+        throw Failure("No rule ignores '" + path.ansi_str() + "'.", "Run 'tav ignore' to see the rules.");
+    }
+    if (!isIgnored) {
+        throw Failure("'" + path.ansi_str() + "' is committed, so it is not ignored.", sentence(*reason, root));
+    }
 }
 
 void listRules(common::RootPath const& root, bool json)
@@ -41,8 +133,12 @@ void listRules(common::RootPath const& root, bool json)
 void ignore(IgnoreOptions const& options)
 {
     common::RootPath const root = openRepository("");
-    if (options.rule) {
-        addRule(root, *options.rule);
+    if (options.added) {
+        addRule(root, *options.added, options.dryRun);
+    } else if (options.removed) {
+        removeRule(root, *options.removed, options.dryRun);
+    } else if (options.name) {
+        explain(root, *options.name, options.json);
     } else {
         listRules(root, options.json);
     }

@@ -386,12 +386,23 @@ void addFiles(CLI::App& app)
 
 void addIgnore(CLI::App& app)
 {
-    CLI::App* const command = app.add_subcommand("ignore", "Show the rules for names to ignore, or add one");
+    CLI::App* const command = app.add_subcommand("ignore", "Show, add or remove rules for names to ignore");
     auto const options = std::make_shared<IgnoreOptions>();
     CLI::Option* const add = command->add_option(
-        "--add", options->rule, "A regular expression; files and folders whose whole name matches it are ignored");
+        "--add", options->added,
+        "A wildcard like '*.plt', or a regular expression; files and folders whose whole name matches it are ignored");
+    CLI::Option* const remove = command->add_option("--remove", options->removed, "A rule, or the wildcard it is for");
     add->type_name("PATTERN");
-    command->add_flag("--json", options->json, "Print a document for programs")->excludes(add);
+    remove->type_name("PATTERN")->excludes(add);
+    command->add_option("--why", options->name, "Say which rule makes a file or folder ignored")
+        ->type_name("NAME")
+        ->excludes(add)
+        ->excludes(remove);
+    command->add_flag("--dry-run", options->dryRun, "Only show what --add or --remove would do")->excludes("--why");
+    command->add_flag("--json", options->json, "Print a document for programs")->excludes(add)->excludes(remove);
+    addExamples(
+        *command, "  tav ignore --add '*.plt'         ignore all plot files\n"
+                  "  tav ignore --why plans/roof.bak  say why a file is not listed");
     command->callback([options] { ignore(*options); });
 }
 

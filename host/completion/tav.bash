@@ -76,7 +76,7 @@ _tav_options() { # COMMAND
         tag) printf '%s\n' -d --delete --force --dry-run --json ;;
         server) printf '%s\n' --send ;;
         files) printf '%s\n' --hash --long --at --json ;;
-        ignore) printf '%s\n' --add --json ;;
+        ignore) printf '%s\n' --add --remove --why --dry-run --json ;;
         config) printf '%s\n' --list --unset --user --repository --json ;;
         diff) printf '%s\n' --stat --text --json ;;
         show | projects | verify) printf '%s\n' --json ;;
@@ -92,6 +92,8 @@ _tav_value() { # COMMAND OPTION
         :-C | init:--server) _tav_offer_files -d ;;
         preview:-o | preview:--output | compare:-o | compare:--output) _tav_offer_files -f ;;
         restore:--from | files:--at) _tav_offer < <(_tav_references branch tag) ;;
+        ignore:--remove) _tav_offer < <(_tav_ask ignore) ;;
+        ignore:--why) _tav_offer_files -f ;;
         commit:-m | commit:--message | commit:--author | log:-n | log:--count | undo:-n | undo:--count | ignore:--add) ;;
         log:--since | log:--until) _tav_offer_words today yesterday ;;
         log:--author) ;;
@@ -140,7 +142,7 @@ _tav() {
             log:-n | log:--count) ((++i)) ;;
             preview:-o | preview:--output | compare:-o | compare:--output) ((++i)) ;;
             log:--since | log:--until | log:--author) ((++i)) ;;
-            ignore:--add | restore:--from | files:--at | init:--server) ((++i)) ;;
+            ignore:--add | ignore:--remove | ignore:--why | restore:--from | files:--at | init:--server) ((++i)) ;;
             *:-*) ;;
             *) ((++number)) ;;
         esac

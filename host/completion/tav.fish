@@ -88,7 +88,7 @@ __tav_command tag 'List the tags, or make one' $commands
 __tav_command fetch 'Get the commits, branches and tags that the server has' $commands
 __tav_command server 'Show where the history is kept, or name its new place' $commands
 __tav_command files 'List the files that the repository keeps' $commands
-__tav_command ignore 'Show the rules for names to ignore, or add one' $commands
+__tav_command ignore 'Show, add or remove rules for names to ignore' $commands
 __tav_command config 'Show or change settings' $commands
 __tav_command projects 'List the repositories that you have made' $commands
 __tav_command verify 'Read every stored version and check it against its digest' $commands
@@ -171,7 +171,10 @@ complete -c tav -n '__fish_seen_subcommand_from files' -l long -d 'Show the last
 complete -c tav -n '__fish_seen_subcommand_from files' -l at -x -a '(__tav_references branch tag)' -d 'List the files of a commit'
 complete -c tav -n '__fish_seen_subcommand_from files' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from files' -a '(__fish_complete_directories)'
-complete -c tav -n '__fish_seen_subcommand_from ignore' -l add -x -d 'A regular expression for names'
+complete -c tav -n '__fish_seen_subcommand_from ignore' -l add -x -d 'A wildcard or regular expression for names'
+complete -c tav -n '__fish_seen_subcommand_from ignore' -l remove -x -a '(__tav_ask ignore)' -d 'A rule to remove'
+complete -c tav -n '__fish_seen_subcommand_from ignore' -l why -r -F -d 'Say which rule ignores a name'
+complete -c tav -n '__fish_seen_subcommand_from ignore' -l dry-run -d 'Only show what would be done'
 complete -c tav -n '__fish_seen_subcommand_from ignore' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from config' -l list -d 'List the settings in effect'
 complete -c tav -n '__fish_seen_subcommand_from config' -l unset -d 'Remove a setting'

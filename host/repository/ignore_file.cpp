@@ -16,22 +16,6 @@ namespace {
 
 constexpr char const* kCheckDisk = "Check the free space and your rights in '.tav'.";
 
-void checkRule(OdString const& rule)
-{
-    bool const holdsLineEnd =
-        rule != OdString(rule.c_str()) || rule.ansi_str().find_first_of("\r\n") != std::string::npos;
-    if (rule.isEmpty() || holdsLineEnd) {
-        throw Failure("A rule is one line that is not empty.", "Give one rule at a time.");
-    }
-    try {
-        common::RepoIgnore::compile(rule);
-    } catch (std::regex_error const&) {
-        throw Failure(
-            "'" + rule.ansi_str() + "' is not a valid regular expression.",
-            "Rules match whole names: write '^.*\\.tmp$' for all names that end in '.tmp'.");
-    }
-}
-
 OdString pathOf(common::RootPath const& root)
 {
     return root.propertiesPath() + ut::FileName::getPathSeparator() + L"ignore";
@@ -54,6 +38,33 @@ std::size_t endOfRules(OdString const& text)
     return text.getLength();
 }
 
+OdString withoutLineEnd(OdString const& line)
+{
+    std::size_t length = line.getLength();
+    while (length > 0 && (line.getAt(length - 1) == L'\n' || line.getAt(length - 1) == L'\r')) {
+        --length;
+    }
+    return line.left(length);
+}
+
+OdString withoutRule(OdString const& text, OdString const& rule)
+{
+    std::size_t const end = endOfRules(text);
+    OdString changed;
+    for (std::size_t begin = 0; begin < end;) {
+        std::size_t next = begin;
+        while (next < end && text.getAt(next) != L'\n') {
+            ++next;
+        }
+        OdString const line = text.mid(begin, next + 1 - begin);
+        if (withoutLineEnd(line) != rule) {
+            changed += line;
+        }
+        begin = next + 1;
+    }
+    return changed + text.mid(end);
+}
+
 OdString withRule(OdString const& text, OdString const& rule)
 {
     std::size_t const end = endOfRules(text);
@@ -66,6 +77,21 @@ OdString withRule(OdString const& text, OdString const& rule)
         changed += L'\n';
     }
     return changed + text.mid(end);
+}
+
+void writeRules(OdString const& path, OdString const& text)
+{
+    ut::TextFile file(path);
+    file.create();
+    file.addLine(text);
+    if (!file.write()) {
+        throw Failure("The ignore file '" + path.ansi_str() + "' cannot be written.", kCheckDisk);
+    }
+}
+
+bool contains(std::vector<OdString> const& rules, OdString const& rule)
+{
+    return std::find(rules.begin(), rules.end(), rule) != rules.end();
 }
 
 } // namespace
@@ -102,21 +128,45 @@ void makeIgnoreFile(common::RootPath const& root)
     valueOrFail(common::RepoIgnore::write(root), kCheckDisk);
 }
 
+bool hasIgnoreFile(common::RootPath const& root)
+{
+    return ut::FileName::fileExists(pathOf(root));
+}
+
+void requireValidRule(OdString const& rule)
+{
+    bool const holdsLineEnd =
+        rule != OdString(rule.c_str()) || rule.ansi_str().find_first_of("\r\n") != std::string::npos;
+    if (rule.isEmpty() || holdsLineEnd) {
+        throw Failure("A rule is one line that is not empty.", "Give one rule at a time.");
+    }
+    try {
+        common::RepoIgnore::compile(rule);
+    } catch (std::regex_error const&) {
+        throw Failure(
+            "'" + rule.ansi_str() + "' is not a valid regular expression.",
+            "Rules match whole names: write '^.*\\.tmp$' for all names that end in '.tmp'.");
+    }
+}
+
 bool addIgnoreRule(common::RootPath const& root, OdString const& rule)
 {
-    checkRule(rule);
+    requireValidRule(rule);
     makeIgnoreFile(root);
-    std::vector<OdString> const rules = ignoreRules(root);
-    if (std::find(rules.begin(), rules.end(), rule) != rules.end()) {
+    if (contains(ignoreRules(root), rule)) {
         return false;
     }
-    OdString const path = pathOf(root);
-    ut::TextFile file(path);
-    file.create();
-    file.addLine(withRule(ut::readEntireFile(path), rule));
-    if (!file.write()) {
-        throw Failure("The ignore file '" + path.ansi_str() + "' cannot be written.", kCheckDisk);
+    writeRules(pathOf(root), withRule(ut::readEntireFile(pathOf(root)), rule));
+    return true;
+}
+
+bool removeIgnoreRule(common::RootPath const& root, OdString const& rule)
+{
+    if (!contains(ignoreRules(root), rule)) {
+        return false;
     }
+    makeIgnoreFile(root);
+    writeRules(pathOf(root), withoutRule(ut::readEntireFile(pathOf(root)), rule));
     return true;
 }
 

@@ -48,7 +48,7 @@ Commands:
   fetch                       Get the commits, branches and tags that the server has
   server                      Show where the history is kept, or name its new place
   files                       List the files that the repository keeps
-  ignore                      Show the rules for names to ignore, or add one
+  ignore                      Show, add or remove rules for names to ignore
   config                      Show or change settings
   projects                    List the repositories that you have made
   verify                      Read every stored version and check it against its digest
@@ -146,14 +146,20 @@ Examples:
   tav files --at master~10    the files of an earlier commit
 )";
 
-constexpr char const* kIgnoreHelp = R"(Show the rules for names to ignore, or add one
+constexpr char const* kIgnoreHelp = R"(Show, add or remove rules for names to ignore
 Usage: tav ignore [OPTIONS]
 
 Options:
   -h,--help                   Show this help and do nothing else
-  --add PATTERN               A regular expression; files and folders whose whole name matches it are ignored
+  --add PATTERN               A wildcard like '*.plt', or a regular expression; files and folders whose whole name matches it are ignored
+  --remove PATTERN            A rule, or the wildcard it is for
+  --why NAME                  Say which rule makes a file or folder ignored
+  --dry-run                   Only show what --add or --remove would do
   --json                      Print a document for programs
 
+Examples:
+  tav ignore --add '*.plt'         ignore all plot files
+  tav ignore --why plans/roof.bak  say why a file is not listed
 )";
 
 class Help
@@ -400,7 +406,7 @@ INSTANTIATE_TEST_SUITE_P(
         FullDiskRow{"Unstage", {"unstage", "--all"}}, FullDiskRow{"Mv", {"mv", "a.dwg", "c.dwg"}},
         FullDiskRow{"Files", {"files"}}, FullDiskRow{"FilesWithDigests", {"files", "--hash"}},
         FullDiskRow{"FilesAsDocument", {"files", "--json"}}, FullDiskRow{"Ignore", {"ignore"}},
-        FullDiskRow{"IgnoreAdd", {"ignore", "--add", "x"}}),
+        FullDiskRow{"IgnoreAdd", {"ignore", "--add", "a*"}}),
     support::rowName);
 
 } // namespace

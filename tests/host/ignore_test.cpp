@@ -10,6 +10,14 @@ constexpr char const* kNoExpression =
     " is not a valid regular expression. Rules match whole names: write '^.*\\.tmp$' for all names that end in "
     "'.tmp'.\n";
 
+/// What is said when a rule is added that no name matches.
+Outcome addedForLater(std::string const& rule)
+{
+    return {
+        0, "Names that match '" + rule + "' are ignored from now on.\n",
+        "tav: No file or folder has such a name yet.\n"};
+}
+
 TEST_F(Ignore, ShowsTheDefaultRulesWhereThereIsNoFileOfThem)
 {
     EXPECT_EQ(tav({"ignore"}), done("^.*\\.bak$\n^.*\\.dwl$\n^.*\\.dwl2$\n"));
@@ -40,7 +48,7 @@ TEST_F(Ignore, EscapesRulesOnATerminalOnly)
 
 TEST_F(Ignore, AddsARuleToTheDefaultsWhereThereIsNoFile)
 {
-    EXPECT_EQ(tav({"ignore", "--add", "^old$"}), done("Names that match '^old$' are ignored from now on.\n"));
+    EXPECT_EQ(tav({"ignore", "--add", "^old$"}), addedForLater("^old$"));
     EXPECT_EQ(repo.read(".tav/properties/ignore"), "^.*\\.bak$\n^.*\\.dwl$\n^.*\\.dwl2$\n^old$");
 }
 
@@ -65,9 +73,7 @@ class IgnoreAdd
 TEST_P(IgnoreAdd, PutsTheRuleBehindThoseInEffect)
 {
     repo.ignore(GetParam().before);
-    EXPECT_EQ(
-        tav({"ignore", "--add=" + GetParam().rule}),
-        done("Names that match '" + GetParam().rule + "' are ignored from now on.\n"));
+    EXPECT_EQ(tav({"ignore", "--add=" + GetParam().rule}), addedForLater(GetParam().rule));
     EXPECT_EQ(repo.read(".tav/properties/ignore"), GetParam().after);
 }
 
@@ -118,7 +124,7 @@ INSTANTIATE_TEST_SUITE_P(
             "LineFeedAtTheEnd", "^b$\n", "tav: A rule is one line that is not empty. Give one rule at a time.\n"},
         RefusalRow{"CarriageReturn", "^b$\r", "tav: A rule is one line that is not empty. Give one rule at a time.\n"},
         RefusalRow{"OpenBracket", "[", std::string("tav: '['") + kNoExpression},
-        RefusalRow{"Wildcard", "*.tmp", std::string("tav: '*.tmp'") + kNoExpression},
+        RefusalRow{"WildcardWithClass", "*.[tT]mp", std::string("tav: '*.[tT]mp'") + kNoExpression},
         RefusalRow{"WithEscapes", "(\x1b\xff", std::string("tav: '(\\x1B\\xFF'") + kNoExpression},
         RefusalRow{
             "TooDeep", std::string(30000, '(') + std::string(30000, ')'),
@@ -154,10 +160,177 @@ TEST_F(Ignore, CountsBothOfTwoRulesAddedAtTheSameTime)
         repo.ignore("");
         Process first(setting(), {"ignore", "--add", "^first$"});
         Process second(setting(), {"ignore", "--add", "^second$"});
-        EXPECT_EQ(first.wait(), done("Names that match '^first$' are ignored from now on.\n"));
-        EXPECT_EQ(second.wait(), done("Names that match '^second$' are ignored from now on.\n"));
+        EXPECT_EQ(first.wait(), addedForLater("^first$"));
+        EXPECT_EQ(second.wait(), addedForLater("^second$"));
         EXPECT_EQ(repo.read(".tav/properties/ignore").size(), std::string("^first$\n^second$").size());
     }
+}
+
+struct WildcardRow {
+    char const* name;
+    std::string typed;
+    std::string rule;
+    std::vector<std::string> ignored;
+    std::vector<std::string> kept;
+};
+
+class IgnoreWildcard
+    : public TavTest
+    , public testing::WithParamInterface<WildcardRow> {};
+
+TEST_P(IgnoreWildcard, BecomesTheRuleThatMatchesTheSameNames)
+{
+    repo.ignore("");
+    for (std::string const& name : GetParam().ignored) {
+        repo.write(name, "");
+    }
+    std::string files;
+    for (std::string const& name : GetParam().kept) {
+        repo.write(name, "");
+        files += name + "\n";
+    }
+    EXPECT_EQ(
+        tav({"ignore", "--add=" + GetParam().typed}),
+        done("Names that match '" + GetParam().rule + "' are ignored from now on.\n"));
+    EXPECT_EQ(repo.read(".tav/properties/ignore"), GetParam().rule);
+    EXPECT_EQ(tav({"files"}), done(files + ".tav/properties/ignore\n"));
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Typed, IgnoreWildcard,
+    testing::Values(
+        WildcardRow{"Ending", "*.plt", "^.*\\.plt$", {"a.plt", "b/c d.plt", "'\".plt"}, {"a.plt.dwg", "aplt"}},
+        WildcardRow{"Beginning", "plot*", "^plot.*$", {"plot", "plot.dwg", "plots/a.dwg"}, {"a plot.dwg"}},
+        WildcardRow{
+            "OneCharacter",
+            "План ?.dwg",
+            "^План [^\\x80-\\xBF][\\x80-\\xBF]*\\.dwg$",
+            {"План 1.dwg", "План Б.dwg", "План 图.dwg"},
+            {"План .dwg", "План 12.dwg", "План ББ.dwg"}},
+        WildcardRow{
+            "CombiningAccent",
+            "e?tage.dwg",
+            "^e[^\\x80-\\xBF][\\x80-\\xBF]*tage\\.dwg$",
+            {"e\xCC\x81tage.dwg"},
+            {"\xC3\xA9tage.dwg"}},
+        WildcardRow{"LeadingDash", "-*", "^-.*$", {"-a.dwg"}, {"a-b.dwg"}},
+        WildcardRow{"QuotesAndSpaces", "a '\" *", "^a '\" .*$", {"a '\" b"}, {"a"}},
+        WildcardRow{"ExpressionWithoutAnchors", ".*plt", ".*plt", {"a.plt", "plt"}, {"a.plt.dwg"}}),
+    support::rowName);
+
+TEST_F(Ignore, NotesThatRulesAreForSingleNames)
+{
+    repo.add({"plans/a.plt"});
+    EXPECT_EQ(
+        tav({"ignore", "--add", "plans/*.plt"}),
+        (Outcome{
+            0, "Names that match '^plans/.*\\.plt$' are ignored from now on.\n",
+            "tav: Rules are for single names, without '/'.\n"}));
+}
+
+struct RemoveRow {
+    char const* name;
+    std::string before;
+    std::string typed;
+    std::string rule;
+    std::string after;
+};
+
+class IgnoreRemove
+    : public TavTest
+    , public testing::WithParamInterface<RemoveRow> {};
+
+TEST_P(IgnoreRemove, TakesTheRuleOutAndLeavesTheRest)
+{
+    repo.ignore(GetParam().before);
+    EXPECT_EQ(tav({"ignore", "--remove=" + GetParam().typed}), done("Removed the rule '" + GetParam().rule + "'.\n"));
+    EXPECT_EQ(repo.read(".tav/properties/ignore"), GetParam().after);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Files, IgnoreRemove,
+    testing::Values(
+        RemoveRow{"Only", "^a$", "^a$", "^a$", ""}, RemoveRow{"First", "^a$\n^b$\n", "^a$", "^a$", "^b$\n"},
+        RemoveRow{"Last", "^a$\n^b$", "^b$", "^b$", "^a$\n"},
+        RemoveRow{"Wildcard", "^.*\\.plt$\n^b$\n", "*.plt", "^.*\\.plt$", "^b$\n"},
+        RemoveRow{"Twice", "^a$\n^b$\n^a$\n", "^a$", "^a$", "^b$\n"},
+        RemoveRow{"OutOfEffect", "^a$\n\n^a$\n", "^a$", "^a$", "\n^a$\n"},
+        RemoveRow{"OtherLineEnds", "^a$\r\n^b$\r\n", "^a$", "^a$", "^b$\r\n"},
+        RemoveRow{"OtherScripts", "^План$\n^b$\n", "^План$", "^План$", "^b$\n"},
+        RemoveRow{"AsStoredBeforeWildcard", "colou?r\n^colou.*$\n", "colou?r", "colou?r", "^colou.*$\n"}),
+    support::rowName);
+
+TEST_F(Ignore, KeepsTheOtherDefaultsWhenOneIsRemoved)
+{
+    EXPECT_EQ(tav({"ignore", "--remove", "*.bak"}), done("Removed the rule '^.*\\.bak$'.\n"));
+    EXPECT_EQ(tav({"ignore"}), done("^.*\\.dwl$\n^.*\\.dwl2$\n"));
+}
+
+TEST_F(Ignore, FailsToRemoveWhatIsNotThere)
+{
+    std::string const message = "tav: There is no rule '^.*\\.plt$'. Run 'tav ignore' to see the rules.\n";
+    EXPECT_EQ(tav({"ignore", "--remove", "*.plt"}), failed(message));
+    EXPECT_EQ(tav({"ignore", "--remove", "*.plt", "--dry-run"}), failed(message));
+    EXPECT_FALSE(repo.has(".tav/properties"));
+}
+
+TEST_F(Ignore, ChangesNothingOnADryRun)
+{
+    repo.add({"a.plt"});
+    EXPECT_EQ(
+        tav({"ignore", "--add", "*.plt", "--dry-run"}), done("Names that match '^.*\\.plt$' would be ignored.\n"));
+    EXPECT_EQ(tav({"ignore", "--add", "^.*\\.bak$", "--dry-run"}), done("The rule '^.*\\.bak$' was there already.\n"));
+    EXPECT_EQ(tav({"ignore", "--remove", "*.bak", "--dry-run"}), done("Would remove the rule '^.*\\.bak$'.\n"));
+    EXPECT_FALSE(repo.has(".tav/properties"));
+    EXPECT_FALSE(repo.has(".tav/tav.lock"));
+}
+
+TEST_F(Ignore, NamesTheRuleThatIgnoresAFile)
+{
+    EXPECT_EQ(
+        tav({"ignore", "--why", "План.bak"}),
+        done("A rule that every repository begins with matches 'План.bak': ^.*\\.bak$\n"));
+    repo.ignore("^a$\n^old$\n");
+    EXPECT_EQ(
+        tavIn(repo.pathTo(".tav"), {"ignore", "--why", "../x/old/b.dwg"}),
+        done("Rule 2 of '.tav/properties/ignore' matches 'old': ^old$\n"));
+    EXPECT_EQ(tav({"ignore", "--why", "x/.git/b.dwg"}), done("'.git' is hidden: it begins with a dot.\n"));
+    EXPECT_EQ(
+        tav({"ignore", "--why", "x/a", "--json"}),
+        done("{\n    \"ignored\" : true,\n    \"path\" : \"x/a\",\n    \"rule\" : \"^a$\"\n}\n"));
+}
+
+TEST_F(Ignore, SaysThatNoRuleIgnoresAFile)
+{
+    EXPECT_EQ(
+        tav({"ignore", "--why", "plan.dwg"}),
+        failed("tav: No rule ignores 'plan.dwg'. Run 'tav ignore' to see the rules.\n"));
+    EXPECT_EQ(
+        tav({"ignore", "--why", ".tav/properties/ignore"}),
+        failed("tav: No rule ignores '.tav/properties/ignore'. Run 'tav ignore' to see the rules.\n"));
+}
+
+TEST_F(Ignore, RefusesANameThatIsTooLongForARule)
+{
+    repo.ignore("^(a)\\1*$\n");
+    std::string const name(100000, 'a');
+    EXPECT_EQ(
+        tav({"ignore", "--why", name}),
+        failed("tav: '" + name + "' is longer than a name can be. Type the path of a file.\n"));
+}
+
+TEST_F(Ignore, SaysThatACommittedFileIsNotIgnored)
+{
+    repo.add({"a.plt"});
+    tav({"init"});
+    tav({"add", "--all"});
+    tav({"commit", "-m", "First"});
+    tav({"ignore", "--add", "*.plt"});
+    std::string const why = "tav: 'a.plt' is committed, so it is not ignored. Rule 4 of '.tav/properties/ignore' "
+                            "matches 'a.plt': ^.*\\.plt$\n";
+    EXPECT_EQ(tav({"ignore", "--why", "a.plt"}), failed(why));
+    repo.write("a.plt", "changed");
+    EXPECT_EQ(tav({"status", "-s"}).out.find(" M a.plt") != std::string::npos, true);
 }
 
 } // namespace
