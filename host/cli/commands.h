@@ -46,6 +46,8 @@ struct CommitOptions {
     std::string author;         ///< empty: the user on this machine
     bool allRemoved = false;
     bool withoutRemoved = false;
+    bool amends = false;       ///< the current commit is replaced
+    bool keepsMessage = false; ///< of the commit that is replaced
 };
 void makeCommit(CommitOptions const& options);
 

@@ -39,20 +39,35 @@ std::string askForName(std::string const& usual)
     return name;
 }
 
-std::string authorOf(CommitOptions const& options)
+using Replaced = std::optional<CommitRecord>;
+
+Replaced replacedBy(CommitOptions const& options, common::RootPath const& root)
 {
-    if (!options.author.empty()) {
-        return options.author;
+    if (!options.amends) {
+        return std::nullopt;
+    }
+    LocalDatabase const database = LocalDatabase::open(root);
+    Replaced commit = database.commits().find(database.currentCommit());
+    if (!commit) {
+        throw Failure("There is no commit yet that could be replaced.", "Make one with 'tav commit'.");
+    }
+    return commit;
+}
+
+std::string authorOf(CommitOptions const& options, Replaced const& replaced)
+{
+    if (!options.author.empty() || replaced) {
+        return options.author.empty() ? replaced->author.ansi_str() : options.author;
     }
     SettingEntry const name = currentSettings().effective("user.name");
     return name.origin == Origin::standard && canAsk() ? askForName(name.value) : name.value;
 }
 
-void printCommit(CommitRecord const& commit, char const* verb)
+void printCommit(CommitRecord const& commit, char const* verb, Replaced const& replaced = {})
 {
     report(
-        std::string(verb) + " commit " + std::to_string(commit.number) + " (" + commit.hash.left(12).ansi_str() +
-        ").\n");
+        std::string(verb) + " commit " + std::to_string(commit.number) + " (" + commit.hash.left(12).ansi_str() + ")" +
+        (replaced ? ", which replaces commit " + std::to_string(replaced->number) : "") + ".\n");
 }
 
 Missing missingFilesOf(CommitOptions const& options)
@@ -82,7 +97,8 @@ std::vector<std::string> changesOf(Status const& status, bool takesModified)
 }
 
 /// None where there is nothing to commit: then nobody needs to write.
-std::optional<std::string> messageOf(CommitOptions const& options, common::RootPath const& root)
+std::optional<std::string>
+messageOf(CommitOptions const& options, Replaced const& replaced, common::RootPath const& root)
 {
     if (options.message) {
         return options.message;
@@ -90,20 +106,25 @@ std::optional<std::string> messageOf(CommitOptions const& options, common::RootP
     if (!options.messageFile.empty()) {
         return readMessage(options.messageFile);
     }
+    std::string const former = replaced ? replaced->message.ansi_str() : std::string();
+    if (options.keepsMessage) {
+        return former;
+    }
     std::vector<std::string> const changes = changesOf(statusOf(root, false), options.takesModified);
-    return changes.empty() ? std::nullopt : std::optional(editMessage(root, changes));
+    return changes.empty() && !replaced ? std::nullopt : std::optional(editMessage(root, changes, former));
 }
 
 bool isEdited(CommitOptions const& options)
 {
-    return !options.message && options.messageFile.empty();
+    return !options.message && options.messageFile.empty() && !options.keepsMessage;
 }
 
 /// Whether the order is the one that was interrupted: repeating it makes no second commit.
 bool isRepeated(CommitOrder const& order, WriteSession const& session)
 {
-    return session.recoveredCommit() && session.recoveredCommit()->message == order.message &&
-           session.recoveredCommit()->author == order.author;
+    std::optional<CommitRecord> const& recovered = session.recoveredCommit();
+    return recovered && recovered->message == order.message && recovered->author == order.author &&
+           (!order.replaced || recovered->parents == order.replaced->parents);
 }
 
 void carryOut(CommitOrder const& order, common::RootPath const& root)
@@ -116,7 +137,11 @@ void carryOut(CommitOrder const& order, common::RootPath const& root)
     session.noteRecovery();
     session.failIfBetweenCommits();
     Committed const committed = commit(session.root(), session.database(), order, session.start());
-    printCommit(committed.commit, committed.isNew ? "Made" : "Nothing has changed since");
+    if (committed.isNew) {
+        printCommit(committed.commit, "Made", order.replaced);
+    } else {
+        printCommit(committed.commit, "Nothing has changed since");
+    }
 }
 
 } // namespace
@@ -124,18 +149,22 @@ void carryOut(CommitOrder const& order, common::RootPath const& root)
 void makeCommit(CommitOptions const& options)
 {
     common::RootPath const root = openRepository("");
-    auto const message = messageOf(options, root);
+    Replaced const replaced = replacedBy(options, root);
+    auto const message = messageOf(options, replaced, root);
     if (message) {
         checkText(*message, "message");
     }
     CommitOrder const order{
-        fromUtf8(authorOf(options)), fromUtf8(message.value_or("")), missingFilesOf(options), options.takesModified};
+        fromUtf8(authorOf(options, replaced)), fromUtf8(message.value_or("")), missingFilesOf(options),
+        options.takesModified, replaced};
     checkText(order.author.ansi_str(), "author");
     try {
         carryOut(order, root);
     } catch (Failure& failure) {
         if (message && isEdited(options)) {
-            failure.details.push_back("Your message is kept: tav commit -F '" + messagePath(root) + "'");
+            failure.details.push_back(
+                std::string("Your message is kept: tav commit ") + (options.amends ? "--amend " : "") + "-F '" +
+                messagePath(root) + "'");
         }
         throw;
     }

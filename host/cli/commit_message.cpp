@@ -27,7 +27,8 @@ constexpr std::size_t kMostChanges = 1000; // More would only slow down the edit
 std::string comment(std::vector<std::string> const& changes)
 {
     std::string text = "# Say what has changed, and why. Lines that begin with '#' are ignored.\n"
-                       "# Without a message, nothing is committed.\n#\n# This will be committed:\n";
+                       "# Without a message, nothing is committed.\n";
+    text += changes.empty() ? "" : "#\n# This will be committed:\n";
     for (std::size_t i = 0; i < std::min(changes.size(), kMostChanges); ++i) {
         text += "#   " + changes[i] + "\n";
     }
@@ -107,12 +108,13 @@ void removeMessage(common::RootPath const& root)
     fs::remove(messagePath(root), ignored); // The commit is made, and the next message begins with what is left.
 }
 
-std::string editMessage(common::RootPath const& root, std::vector<std::string> const& changes)
+std::string
+editMessage(common::RootPath const& root, std::vector<std::string> const& changes, std::string const& former)
 {
     std::string const path = messagePath(root);
     std::string const kept = readKept(path);
     removeMessage(root);
-    write(path, kept + "\n" + comment(changes));
+    write(path, (kept.empty() ? former : kept) + "\n" + comment(changes));
     std::string const editor = currentSettings().value("editor");
     if (runProgram({"sh", "-c", editor + " \"$@\"", editor, path}) != 0) {
         throw Failure(

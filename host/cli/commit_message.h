@@ -14,10 +14,11 @@ std::string readMessage(std::string const& path);
 /// Whether there is a terminal for an editor.
 bool canEdit();
 
-/// Lets the user write a message in ".tav/COMMIT_MESSAGE", which begins with what was written for a commit that failed
-/// and shows `changes` as comment. Returns it without comments and without blank lines around it; it is in that file
-/// too. Throws `Failure` when the editor fails.
-std::string editMessage(common::RootPath const& root, std::vector<std::string> const& changes);
+/// Lets the user write a message in ".tav/COMMIT_MESSAGE", which begins with what was written for a commit that failed,
+/// else with `former`, and shows `changes` as comment. Returns it without comments and without blank lines around it;
+/// it is in that file too. Throws `Failure` when the editor fails.
+std::string
+editMessage(common::RootPath const& root, std::vector<std::string> const& changes, std::string const& former);
 
 /// The path of that file, and its end when the commit has been made.
 std::string messagePath(common::RootPath const& root);

@@ -121,12 +121,19 @@ void addCommit(CLI::App& app)
             "--without-removed", options->withoutRemoved,
             "Keep files that are gone in the repository unless 'tav rm' has removed them")
         ->excludes(all);
+    CLI::Option* const amend = command->add_flag(
+        "--amend", options->amends, "Replace the last commit by one that also has what is staged now");
+    command->add_flag("--no-edit", options->keepsMessage, "Keep the message of the commit that is replaced")
+        ->needs(amend)
+        ->excludes(message)
+        ->excludes(command->get_option("--file"));
     addExamples(
         *command, "  tav commit -m 'Moves the north facade'\n"
                   "  tav commit                 write the message in an editor\n"
-                  "  tav commit -am 'Moves it'  take all changed files");
+                  "  tav commit -am 'Moves it'  take all changed files\n"
+                  "  tav commit --amend         correct the last commit or its message");
     command->callback([options] {
-        if (!options->message && options->messageFile.empty() && !canEdit()) {
+        if (!options->message && options->messageFile.empty() && !options->keepsMessage && !canEdit()) {
             throw CLI::ParseError(
                 "There is no terminal for an editor. Give a message with -m", CLI::ExitCodes::RequiredError);
         }

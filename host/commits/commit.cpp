@@ -5,6 +5,7 @@
 #include "host/changes/staging.h"
 #include "host/client/connection.h"
 #include "host/client/history.h"
+#include "host/commits/joined_renames.h"
 #include "host/commits/similar_files.h"
 #include "host/errors/failure.h"
 #include "host/history/commit_hash.h"
@@ -47,7 +48,7 @@ struct Draft {
     LocalDatabase& database;
     std::uint64_t start;
     Tree files;        ///< of the new commit, in the end
-    Previous previous; ///< paths of renamed files before
+    Previous previous; ///< paths of files that have been renamed since the current commit
     PendingCommit pending;
     VerifiedFileList verified = {}; ///< all files that were read
 };
@@ -118,18 +119,28 @@ void readBack(Draft& draft, std::vector<PlannedFile> const& plan, LocalStorage& 
     }
 }
 
+std::vector<OdString> parentsOf(CommitOrder const& order, LocalDatabase const& database)
+{
+    if (order.replaced) {
+        return order.replaced->parents;
+    }
+    OdString const parent = database.currentCommit();
+    return parent.isEmpty() ? std::vector<OdString>() : std::vector{parent};
+}
+
 NewCommit newCommit(Draft const& draft, CommitOrder const& order, OdString const& branch)
 {
     NewCommit added;
     added.commit.author = order.author;
     added.commit.message = order.message;
     added.commit.date = std::time(nullptr);
-    if (OdString const parent = draft.database.currentCommit(); !parent.isEmpty()) {
-        added.commit.parents.push_back(parent);
-    }
+    added.commit.parents = parentsOf(order, draft.database);
+    Previous const previous =
+        order.replaced ? joinedRenames(draft.previous, draft.files, draft.database.commits(), *order.replaced)
+                       : draft.previous;
     for (auto const& [path, url] : draft.files) {
-        auto const rename = draft.previous.find(path);
-        added.files.push_back({path, url, rename == draft.previous.end() ? OdString::kEmpty : rename->second});
+        auto const rename = previous.find(path);
+        added.files.push_back({path, url, rename == previous.end() ? OdString::kEmpty : rename->second});
     }
     added.commit.hash = commitHash(added.commit, added.files);
     auto const end = draft.database.commits().reference(branch);
@@ -231,6 +242,26 @@ std::optional<CommitRecord> lastCommitIfOf(CommitOrder const& order, LocalDataba
     auto last = database.commits().find(database.currentCommit());
     bool const isSame = last && last->author == order.author && last->message == order.message;
     return isSame ? last : std::nullopt;
+}
+
+/// The user has seen the commit before the lock was taken.
+void requireReplacedIsCurrent(CommitOrder const& order, LocalDatabase const& database)
+{
+    if (order.replaced && order.replaced->hash != database.currentCommit()) {
+        throw Failure(
+            "Commit " + std::to_string(order.replaced->number) + " is not the current one any more.",
+            "Nothing has been committed; look at 'tav log', and run the command again.");
+    }
+}
+
+void failIfNothingIsLeft(Draft const& draft, CommitRecord const& replaced)
+{
+    Tree const before = replaced.parents.empty() ? Tree() : draft.database.commits().files(replaced.parents.front());
+    if (replaced.parents.size() < 2 && draft.files == before) {
+        throw Failure(
+            "Commit " + std::to_string(replaced.number) + " would change nothing any more.",
+            "Nothing has been committed; take the commit back with 'tav undo'.");
+    }
 }
 
 /// The state file may come from anywhere.
@@ -346,7 +377,7 @@ Operation operationOf(Draft const& draft, common::State const& staging, CommitOr
 {
     Operation operation;
     operation.kind = Kind::commit;
-    operation.command = L"commit -m " + order.message;
+    operation.command = (order.replaced ? L"commit --amend -m " : L"commit -m ") + order.message;
     operation.phase = Phase::running;
     operation.before = {draft.database.currentCommit(), staging.head};
     operation.after = {hash, staging.head};
@@ -440,6 +471,7 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     Connection server(database); // Without one there is nothing to begin.
     fetchHistory(root, database, server, Compared::theEnd);
     failIfNotAtTheEnd(database, state.head);
+    requireReplacedIsCurrent(order, database);
     Draft draft{root, database, start, database.commits().files(database.currentCommit()), {}, {}};
     FolderChanges const changes = compareWithBase(draft);
     if (order.takesModified) {
@@ -454,7 +486,9 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
         if (auto const last = lastCommitIfOf(order, database)) {
             return {*last, false};
         }
-        failForNothing(changes, root);
+        if (!order.replaced) {
+            failForNothing(changes, root);
+        }
     }
     checkNames(plan);
     for (PlannedFile const& file : plan) {
@@ -462,7 +496,12 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
             draft.previous.emplace(file.path, file.previousPath);
         }
     }
-    keepContents(draft, plan);
+    if (!plan.empty()) {
+        keepContents(draft, plan);
+    }
+    if (order.replaced) {
+        failIfNothingIsLeft(draft, *order.replaced);
+    }
     failIfBack(plan, state, root);
     NewCommit added = newCommit(draft, order, state.head);
     draft.pending.document = commitInfoDocument(added);

@@ -5,6 +5,7 @@
 #include "host/repository/journal.h"
 
 #include <cstdint>
+#include <optional>
 
 namespace tav {
 
@@ -12,7 +13,8 @@ struct CommitOrder {
     OdString author;
     OdString message;
     Missing missing = Missing::areRemoved;
-    bool takesModified = false; ///< changed files are taken without being staged; new ones are not
+    bool takesModified = false;                ///< changed files are taken without being staged; new ones are not
+    std::optional<CommitRecord> replaced = {}; ///< the commit whose place the new one takes: the current one
 };
 
 struct Committed {

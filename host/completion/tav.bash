@@ -64,7 +64,10 @@ _tav_options() { # COMMAND
         init) printf '%s\n' --nested --server ;;
         status) printf '%s\n' --ignored -s --short --json ;;
         add | unstage) printf '%s\n' --all ;;
-        commit) printf '%s\n' -m --message -F --file -a --all --author --all-removed --without-removed ;;
+        commit)
+            printf '%s\n' -m --message -F --file -a --all --amend --no-edit --author --all-removed \
+                --without-removed
+            ;;
         log) printf '%s\n' -n --count --since --until --author --all --oneline --json ;;
         preview | compare) printf '%s\n' -o --output --json ;;
         restore) printf '%s\n' --from --force ;;

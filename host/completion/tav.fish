@@ -111,6 +111,8 @@ complete -c tav -n '__fish_seen_subcommand_from rm' -F
 complete -c tav -n '__fish_seen_subcommand_from commit' -s m -l message -x -d 'What has changed, and why'
 complete -c tav -n '__fish_seen_subcommand_from commit' -s F -l file -r -F -d 'Take the message from a file'
 complete -c tav -n '__fish_seen_subcommand_from commit' -s a -l all -d 'Take changed files without staging'
+complete -c tav -n '__fish_seen_subcommand_from commit' -l amend -d 'Replace the last commit'
+complete -c tav -n '__fish_seen_subcommand_from commit' -l no-edit -d 'Keep the message of the commit that is replaced'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l author -x -d 'Who made it'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l all-removed -d 'Remove files that are gone even when many are'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l without-removed -d 'Keep files that are gone in the repository'

@@ -113,14 +113,27 @@ Repository repositoryOrFail(Database const& database, OdString const& id)
     return {row.integer(0), id, row.text(1)};
 }
 
-void requireParents(CommitTables const& tables, CommitRecord const& commit)
+/// Whether all references that there are move with the commit, and are known to whoever moves them.
+bool movesAll(NewCommit const& added, CommitTables const& tables)
 {
-    for (OdString const& parent : commit.parents) {
+    auto const isMoved = [&](common::Reference const& there) {
+        auto const isIt = [&](ReferenceChange const& change) {
+            return change.reference.name == there.name && change.expected == there.commitHash;
+        };
+        return std::any_of(added.references.begin(), added.references.end(), isIt);
+    };
+    auto const references = tables.references();
+    return std::all_of(references.begin(), references.end(), isMoved);
+}
+
+void requireParents(CommitTables const& tables, NewCommit const& added)
+{
+    for (OdString const& parent : added.commit.parents) {
         if (!tables.find(parent)) {
             throw Failure("The server does not have the parent commit " + quoted(parent) + ".", kNothingChanged);
         }
     }
-    if (commit.parents.empty() && !tables.references().empty()) {
+    if (added.commit.parents.empty() && !movesAll(added, tables)) {
         throw withCode(
             Failure("The repository has commits already; one without a parent would not follow them.", kFetchFirst),
             ServerError::hasMovedOn);
@@ -134,7 +147,7 @@ bool addUnlessThere(CommitTables& tables, NewCommit& added)
         added.commit.number = there->number;
         return false;
     }
-    requireParents(tables, added.commit);
+    requireParents(tables, added);
     added.commit.number = tables.lastNumber() + 1;
     tables.add(added.commit, added.files);
     return true;

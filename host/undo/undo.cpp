@@ -187,8 +187,10 @@ Turned turnCommit(common::RootPath const& root, LocalDatabase& database, Operati
         "references", referenceChanges({{branch, positionOn(otherThan(to), operation).commit}}));
     changeState(root, [&](common::Cache& cache) {
         bringStagingTo(to, operation, cache.write());
-        for (FileRecord const& change : database.commits().changes(operation.after.commit)) {
-            cache.write().index.erase(change.path);
+        for (OdString const& commit : {operation.before.commit, operation.after.commit}) { // One may replace the other.
+            for (FileRecord const& change : database.commits().changes(commit)) {
+                cache.write().index.erase(change.path);
+            }
         }
     });
     WriteTransaction transaction(database.database());

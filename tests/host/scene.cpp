@@ -449,7 +449,8 @@ std::vector<SceneRow> const& undoRows()
         {"Restore", {"restore", "plan.dwg", "note.txt", "old/gone.dwg", "--from", "1", "--force"}, editNote},
         {"Checkout", {"checkout", "1"}, stageNewFile},
         {"CheckoutByForce", {"checkout", "1", "--force"}, editNote},
-        {"Commit", {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"}, changeFiles}};
+        {"Commit", {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"}, changeFiles},
+        {"Amend", {"commit", "--amend", "-m", "more", "--all-removed"}, changeFiles}};
     return rows;
 }
 
@@ -462,6 +463,7 @@ std::vector<SceneRow> const& sceneRows()
 {
     static std::vector<SceneRow> const rows = {
         {"Commit", {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"}, changeFiles},
+        {"Amend", {"commit", "--amend", "-m", "more", "--all-removed"}, changeFiles},
         {"Restore", {"restore", "plan.dwg", "note.txt", "old/gone.dwg", "--from", "1"}, [](Scene const&) {}},
         {"Checkout", {"checkout", "1"}, stageNewFile},
         {"Gc", {"gc"}, storeWhatNobodyNeeds}};

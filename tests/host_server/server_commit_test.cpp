@@ -101,6 +101,18 @@ TEST_F(ServerCommit, MayBeginAnewWhenTheFirstOneHasBeenTakenBack)
     EXPECT_EQ(send(commit('b', "", {"plan 1"}, {"branch main b -"})), R"([{"commitNo":2,"hash":"<b>"}])");
 }
 
+TEST_F(ServerCommit, MayReplaceTheFirstOneWhereItsBranchIsTheOnlyReference)
+{
+    send(commit('a', "", {}, {"branch main a"}));
+    EXPECT_EQ(send(commit('b', "", {"plan 1"}, {"branch main b a"})), R"([{"commitNo":2,"hash":"<b>"}])");
+    EXPECT_EQ(references(), server::references({"branch main b"}));
+    ask("references <id>", R"([{"commitHash":"<a>","name":"v1","refType":"tag"}])");
+    EXPECT_EQ(
+        send(commit('c', "", {"plan 3"}, {"branch main c b"})),
+        "error: The repository has commits already; one without a parent would not follow them. Merge what others "
+        "have done, or send it as a branch of its own.");
+}
+
 TEST_F(ServerCommit, RefusesAnUnknownParent)
 {
     EXPECT_EQ(
