@@ -24,18 +24,19 @@ void ContentWriter::writeObject(StorageUrl const& url, Content const& content, D
     std::string const path = layout_.fileOf(url);
     bool const replaces = exists(path);
     std::string const incoming = layout_.incomingFileOf(url.digest);
-    writeObjectTo(incoming, url, content, replaces ? Digest{} : base); // Others may build on a damaged one.
+    bool const isDelta = !replaces && base != Digest{}; // Others may build on a damaged one.
+    writeObjectTo(incoming, url, content, isDelta ? loadBase({{}, base}) : std::nullopt);
     batch_.addObject(path, incoming, replaces);
 }
 
 void ContentWriter::writeObjectTo(
-    std::string const& path, StorageUrl const& url, Content const& content, Digest const& base) const
+    std::string const& path, StorageUrl const& url, Content const& content,
+    std::optional<KnownContent> const& base) const
 {
-    std::optional<KnownContent> const known = base == Digest{} ? std::nullopt : loadBase({{}, base});
     [[maybe_unused]] std::error_code ignored = os::removeUnflushed(path); // Mostly missing.
     try {
         RecordFile file = RecordFile::create(path, "The object " + quoted(url.text()));
-        file.append(content, url.digest, known ? &*known : nullptr, segmentLog_);
+        file.append(content, url.digest, base ? &*base : nullptr, segmentLog_);
     } catch (...) {
         ignored = os::removeUnflushed(path);
         throw;

@@ -29,8 +29,9 @@ public:
     /// of an object is another object, or all zeros for none.
     void write(StorageUrl const& url, Content const& content, Digest const& base);
     /// Writes the object to the new file `path`, on `base` if that makes it smaller.
-    void
-    writeObjectTo(std::string const& path, StorageUrl const& url, Content const& content, Digest const& base) const;
+    void writeObjectTo(
+        std::string const& path, StorageUrl const& url, Content const& content,
+        std::optional<KnownContent> const& base) const;
 
 private:
     void writeObject(StorageUrl const& url, Content const& content, Digest const& base);

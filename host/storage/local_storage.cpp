@@ -80,6 +80,20 @@ Content openContent(std::string const& path, std::string const& name, std::uint6
     return {std::move(bytes), count};
 }
 
+/// What `load` returns; null when that is damaged. What the system refuses may work next time, so it is thrown.
+template <class Load>
+std::shared_ptr<Content const> unlessDamaged(Load const& load)
+{
+    try {
+        return load();
+    } catch (StorageError const& error) {
+        if (error.code != 0) {
+            throw;
+        }
+        return nullptr;
+    }
+}
+
 } // namespace
 
 LocalStorage::LocalStorage(common::RootPath root, Versions versions, unsigned segmentLog)
@@ -158,7 +172,10 @@ bool LocalStorage::isSimilar(Content const& content, StorageUrl const& url)
         Link const link = reader_.find(url);
         return canBeCompared(link.record().length) && link.file->entries().size() <= kMostRecordsToJoin &&
                resembles(content, *reader_.load(url));
-    } catch (StorageError const&) {
+    } catch (StorageError const& error) {
+        if (bases_ && error.code != 0) { // Turning over comes back for it; a commit goes on without.
+            throw;
+        }
         return false;
     }
 }
@@ -193,12 +210,16 @@ Expected<Freed> LocalStorage::turnOver(OdString const& text, OdString const& pat
         if (!bases_) {
             bases_.emplace(layout_);
         }
-        if (!url.isObject() || !bases_->isWhole(url.digest) || !reader_.isReadable(url)) {
+        if (!url.isObject() || !bases_->isWhole(url.digest)) {
             return Freed();
         }
-        std::shared_ptr<Content const> const content = reader_.load(url);
-        std::optional<Digest> const base = newBaseFor(url, path, *content);
-        return base ? replaceObject(url, *content, *base) : Freed();
+        auto const content = unlessDamaged([&] {
+            reader_.read(url, [](std::string_view) {}); // Its own file, even if the content is remembered.
+            return reader_.load(url);
+        });
+        auto const base = content ? newBaseFor(url, path, *content) : std::nullopt;
+        auto const baseContent = base ? unlessDamaged([&] { return reader_.load({{}, *base}); }) : nullptr;
+        return baseContent ? replaceObject(url, *content, {*base, baseContent}) : Freed();
     });
 }
 
@@ -218,7 +239,7 @@ std::optional<Digest> LocalStorage::newBaseFor(StorageUrl const& url, OdString c
     return chain.size() + above <= longest ? chain.front() : chain.back();
 }
 
-Freed LocalStorage::replaceObject(StorageUrl const& url, Content const& content, Digest const& base)
+Freed LocalStorage::replaceObject(StorageUrl const& url, Content const& content, KnownContent const& base)
 {
     std::string const path = layout_.fileOf(url);
     std::string const incoming = layout_.incomingFileOf(url.digest);

@@ -124,7 +124,7 @@ private:
     std::optional<StorageUrl> similarContent(OdString const& path, Content const& content, bool isObject);
     bool isSimilar(Content const& content, StorageUrl const& url);
     std::optional<Digest> newBaseFor(StorageUrl const& url, OdString const& path, Content const& content);
-    Freed replaceObject(StorageUrl const& url, Content const& content, Digest const& base);
+    Freed replaceObject(StorageUrl const& url, Content const& content, KnownContent const& base);
 
     common::RootPath root_;
     Versions versions_;

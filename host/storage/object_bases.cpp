@@ -11,13 +11,17 @@ namespace tav {
 
 namespace {
 
+/// None for a damaged object.
 std::optional<Record> recordOf(StorageLayout const& layout, Digest const& digest)
 {
     try {
         RecordFile const file = RecordFile::openForReading(layout.fileOf({{}, digest}), "An object");
         std::optional<std::size_t> const index = file.find(digest);
         return index ? std::optional(file.entries()[*index].record) : std::nullopt;
-    } catch (StorageError const&) {
+    } catch (StorageError const& error) {
+        if (error.code != 0) {
+            throw;
+        }
         return std::nullopt;
     }
 }

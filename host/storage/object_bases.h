@@ -15,10 +15,10 @@ namespace tav {
 /// What the headers of all objects say, read once.
 class ObjectBases {
 public:
-    /// Throws `StorageError` when the folder cannot be read.
+    /// Throws `StorageError` when the system refuses to read the folder or a header.
     explicit ObjectBases(StorageLayout const& layout);
 
-    /// An object whose header cannot be read: what it builds on is not known. None when there is no such object among
+    /// An object whose header is damaged: what it builds on is not known. None when there is no such object among
     /// `objects`.
     std::optional<Digest> firstUnknown(std::set<Digest> const& objects) const;
     bool isWhole(Digest const& digest) const; ///< false also when it is unknown

@@ -114,6 +114,13 @@ std::string commitsIn(tav::Database const& database)
            rowsOf(database, "refs", "name || ' ' || type || ' ' || number");
 }
 
+/// For an object, which may be whole or a difference.
+std::string lengthOfObject(std::string const& path)
+{
+    bool const isObject = path.find("/objects/") != std::string::npos && fs::is_regular_file(path);
+    return isObject ? ": " + std::to_string(fs::file_size(path)) + " bytes" : "";
+}
+
 /// The verified files that have the recorded stamp and another content than the recorded one.
 std::string falseRecords(common::RootPath const& root)
 {
@@ -240,7 +247,7 @@ std::string Scene::situation() const
             continue;
         }
         bool const isInside = name.rfind("now/repository/.tav/", 0) == 0 || name.rfind("now/server/", 0) == 0;
-        text += isInside ? name + "\n" : "";
+        text += isInside ? name + lengthOfObject(place_.pathTo(name)) + "\n" : "";
     }
     return text + withoutTimes(place_.read("now/repository/.tav/tav.state")) + rows;
 }
@@ -414,6 +421,30 @@ void bringToTheFirstForm(Scene const& scene)
     database.run(("PRAGMA foreign_keys = OFF; " + drops + "PRAGMA user_version = 1").c_str());
 }
 
+/// Stores a file whole, as earlier versions of tav stored every object.
+void storeWhole(Scene const& scene, OdString const& path)
+{
+    tav::LocalStorage storage(scene.root());
+    require(storage.store(path).hasValue(), "store a file");
+    require(storage.flush().hasValue(), "flush");
+}
+
+/// Three versions of a drawing and its copy, in a store of the first version of tav.
+void makeAnOldStore(Scene const& scene)
+{
+    for (unsigned i = 1; i <= 3; ++i) {
+        scene.write("SHEET.DWG", edited(drawing(4, 5000), i));
+        storeWhole(scene, L"SHEET.DWG");
+        require(scene.tav({"add", "--all"}).code == 0, "stage");
+        require(scene.tav({"commit", "-m", "sheet", "--author", "ann@studio"}).code == 0, "commit");
+    }
+    scene.write("SHEET 2.DWG", edited(drawing(4, 5000), 9));
+    storeWhole(scene, L"SHEET 2.DWG");
+    require(scene.tav({"add", "--all"}).code == 0, "stage");
+    require(scene.tav({"commit", "-m", "copy", "--author", "ann@studio"}).code == 0, "commit");
+    bringToTheFirstForm(scene);
+}
+
 } // namespace
 
 std::vector<SceneRow> const& historyRows()
@@ -466,7 +497,8 @@ std::vector<SceneRow> const& sceneRows()
         {"Amend", {"commit", "--amend", "-m", "more", "--all-removed"}, changeFiles},
         {"Restore", {"restore", "plan.dwg", "note.txt", "old/gone.dwg", "--from", "1"}, [](Scene const&) {}},
         {"Checkout", {"checkout", "1"}, stageNewFile},
-        {"Gc", {"gc"}, storeWhatNobodyNeeds}};
+        {"Gc", {"gc"}, storeWhatNobodyNeeds},
+        {"GcOfAnOldStore", {"gc"}, makeAnOldStore}};
     return rows;
 }
 

@@ -58,8 +58,8 @@ public:
 
     Files files() const;
     /// What a command is to bring about, in lines: contents, the names of everything in ".tav" and the folder of the
-    /// server, the state and the history, without what differs from run to run. Folders of the working folder do not
-    /// count when they are empty.
+    /// server, the lengths of objects, the state and the history, without what differs from run to run. Folders of the
+    /// working folder do not count when they are empty.
     std::string situation() const;
 
     /// What a user has: contents, what is staged and renamed, the references, and where the folder stands.
