@@ -10,8 +10,9 @@
 #include "json/json_reader.h"
 
 #include <algorithm>
+#include <cstddef>
 #include <filesystem>
-#include <regex>
+#include <string_view>
 #include <utility>
 
 namespace tav {
@@ -31,6 +32,21 @@ OdString withoutControls(OdString const& name)
     return clean;
 }
 
+bool isAsciiLetter(char character)
+{
+    return (character >= 'a' && character <= 'z') || (character >= 'A' && character <= 'Z');
+}
+
+bool isUrl(std::string const& typed)
+{
+    auto const isSchemeCharacter = [](char character) {
+        return isAsciiLetter(character) || std::string_view("0123456789+.-").find(character) != std::string_view::npos;
+    };
+    std::size_t const scheme = typed.find("://");
+    return scheme != std::string::npos && isAsciiLetter(typed.front()) &&
+           std::all_of(typed.begin(), typed.begin() + static_cast<std::ptrdiff_t>(scheme), isSchemeCharacter);
+}
+
 } // namespace
 
 std::string defaultServerFolder()
@@ -40,8 +56,7 @@ std::string defaultServerFolder()
 
 OdString namedServerFolder(std::string const& typed)
 {
-    static std::regex const url("[A-Za-z][A-Za-z0-9+.-]*://.*");
-    if (std::regex_match(typed, url)) {
+    if (isUrl(typed)) {
         throw Failure("'" + typed + "' is a URL, and servers are reached through folders only.", "Name a folder.");
     }
     std::filesystem::path const path = std::filesystem::absolute(typed).lexically_normal();
