@@ -156,9 +156,10 @@ std::optional<StorageUrl> LocalStorage::similarContent(OdString const& path, Con
     if (!versions_.similar || !canBeCompared(content.length()) || !content.isInMemory()) {
         return std::nullopt;
     }
+    std::optional<Samples> samples; // made when there is something to compare with
     for (OdString const& text : versions_.similar(path)) {
         std::optional<StorageUrl> const url = parseUrl(text);
-        if (url && url->isObject() == isObject && isSimilar(content, *url)) {
+        if (url && url->isObject() == isObject && isSimilar(samples ? *samples : samples.emplace(content), *url)) {
             return url;
         }
     }
@@ -166,12 +167,12 @@ std::optional<StorageUrl> LocalStorage::similarContent(OdString const& path, Con
 }
 
 /// Also whether it can be read.
-bool LocalStorage::isSimilar(Content const& content, StorageUrl const& url)
+bool LocalStorage::isSimilar(Samples& samples, StorageUrl const& url)
 {
     try {
         Link const link = reader_.find(url);
         return canBeCompared(link.record().length) && link.file->entries().size() <= kMostRecordsToJoin &&
-               resembles(content, *reader_.load(url));
+               samples.resemble(*reader_.load(url));
     } catch (StorageError const& error) {
         if (bases_ && error.code != 0) { // Turning over comes back for it; a commit goes on without.
             throw;

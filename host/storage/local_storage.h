@@ -46,6 +46,8 @@
 
 namespace tav {
 
+class Samples;
+
 /// See above.
 class LocalStorage {
 public:
@@ -122,7 +124,7 @@ private:
     OdString storeNew(OdString const& path, Content const& content, Digest const& digest);
     std::optional<StorageUrl> baseFor(OdString const& path, Content const& content, bool isObject);
     std::optional<StorageUrl> similarContent(OdString const& path, Content const& content, bool isObject);
-    bool isSimilar(Content const& content, StorageUrl const& url);
+    bool isSimilar(Samples& samples, StorageUrl const& url);
     std::optional<Digest> newBaseFor(StorageUrl const& url, OdString const& path, Content const& content);
     Freed replaceObject(StorageUrl const& url, Content const& content, KnownContent const& base);
 
