@@ -16,21 +16,22 @@ target_link_libraries(mu_test_headers PRIVATE GTest::gmock_main mu_warnings)
 target_precompile_headers(mu_test_headers PRIVATE <gmock/gmock.h> <gtest/gtest.h> <string> <vector>)
 mu_test_options(mu_test_headers)
 
-# mu_test(<name> SOURCES <file>... [LINK <target>...] [SLOW <pattern>...]): one test program. ctest runs what a pattern of
-# SLOW names, as --gtest_filter takes it, test by test with the label `slow`, and all other tests in one process: to
-# start a process takes longer than most tests.
+# mu_test(<name> SOURCES <file>... [LINK <target>...] [SLOW <pattern>...] [STARTS_PROGRAMS]): one test program. ctest
+# runs what a pattern of SLOW names, as --gtest_filter takes it, test by test with the label `slow`, and all other tests
+# in one process: to start a process takes longer than most tests.
 #
 # Under the sanitizers a program runs in shards, so that two cores are busy to the end. Of a program that is slow as a
-# whole all shards but the first have the label: without them every eighth test is still checked.
+# whole all shards but the first have the label: without them every eighth test is still checked. STARTS_PROGRAMS says
+# that most tests run tav, which takes ten times as long to start then: the second half of the shards has the label.
 function(mu_test name)
-    cmake_parse_arguments(TEST "" "" "SOURCES;LINK;SLOW" ${ARGN})
+    cmake_parse_arguments(TEST "STARTS_PROGRAMS" "" "SOURCES;LINK;SLOW" ${ARGN})
     add_executable(${name} ${TEST_SOURCES})
     target_link_libraries(${name} PRIVATE mu_test_support ${TEST_LINK} GTest::gmock_main mu_warnings)
     mu_test_options(${name})
     target_precompile_headers(${name} REUSE_FROM mu_test_headers)
     list(JOIN TEST_SLOW ":" slow)
     if(MU_COMMON_SANITIZE)
-        mu_test_in_shards(${name} "${slow}")
+        mu_test_in_shards(${name} "${slow}" ${TEST_STARTS_PROGRAMS})
         return()
     endif()
     if(NOT slow STREQUAL "*")
@@ -46,10 +47,14 @@ function(mu_test name)
     endif()
 endfunction()
 
-function(mu_test_in_shards name slow)
+function(mu_test_in_shards name slow starts_programs)
     set(shards 4)
+    set(checked 4)
     if(slow STREQUAL "*")
         set(shards 8)
+        set(checked 1)
+    elseif(starts_programs)
+        set(checked 2)
     endif()
     math(EXPR last "${shards} - 1")
     foreach(shard RANGE ${last})
@@ -57,7 +62,7 @@ function(mu_test_in_shards name slow)
         set_tests_properties(${name}.${shard} PROPERTIES
             TIMEOUT 600
             ENVIRONMENT "GTEST_TOTAL_SHARDS=${shards};GTEST_SHARD_INDEX=${shard}")
-        if(slow STREQUAL "*" AND shard GREATER 0)
+        if(NOT shard LESS checked)
             set_tests_properties(${name}.${shard} PROPERTIES LABELS slow)
         endif()
     endforeach()
