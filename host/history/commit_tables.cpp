@@ -1,6 +1,7 @@
 #include "host/history/commit_tables.h"
 
 #include "host/errors/failure.h"
+#include "host/history/tree.h"
 #include "host/text/utf8.h"
 
 #include <algorithm>
@@ -53,26 +54,6 @@ CREATE TABLE refs (
 std::string const kChangeColumns = "SELECT number, path, url, previous_path FROM changes WHERE repository = ? ";
 
 constexpr char const* kCommitColumns = "SELECT number, hash, author, message, date FROM commits ";
-
-/// What turns the files of the parent into `files`.
-std::vector<FileRecord> changesBetween(Tree parent, std::vector<FileRecord> const& files)
-{
-    std::vector<FileRecord> changes;
-    for (FileRecord const& file : files) {
-        auto const before = parent.find(file.path);
-        bool const isSame = before != parent.end() && before->second == file.url && file.previousPath.isEmpty();
-        if (!isSame) {
-            changes.push_back(file);
-        }
-        if (before != parent.end()) {
-            parent.erase(before);
-        }
-    }
-    for (auto const& [path, url] : parent) {
-        changes.push_back({path, OdString(), OdString()});
-    }
-    return changes;
-}
 
 bool isBefore(ListedFile const& a, ListedFile const& b)
 {

@@ -46,4 +46,23 @@ std::optional<std::string> whyNotTree(std::vector<FileRecord> const& files)
     return std::nullopt;
 }
 
+std::vector<FileRecord> changesBetween(Tree parent, std::vector<FileRecord> const& files)
+{
+    std::vector<FileRecord> changes;
+    for (FileRecord const& file : files) {
+        auto const before = parent.find(file.path);
+        bool const isSame = before != parent.end() && before->second == file.url && file.previousPath.isEmpty();
+        if (!isSame) {
+            changes.push_back(file);
+        }
+        if (before != parent.end()) {
+            parent.erase(before);
+        }
+    }
+    for (auto const& [path, url] : parent) {
+        changes.push_back({path, OdString(), OdString()});
+    }
+    return changes;
+}
+
 } // namespace tav

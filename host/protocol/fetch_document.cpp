@@ -1,12 +1,9 @@
 #include "host/protocol/fetch_document.h"
 
-#include "host/protocol/document.h"
 #include "host/text/json_text.h"
 
 #include "common/mu_common_json_keys.h"
-#include "json/json_writer.h"
 
-#include <cstddef>
 #include <map>
 #include <utility>
 
@@ -19,65 +16,6 @@ using kutils::json::Object;
 using kutils::json::Value;
 
 namespace keys = common::json;
-
-constexpr std::size_t kMostTrees = 8;
-
-/// Puts the files of commits together, one commit after the other, from those of their parents.
-class Trees {
-public:
-    Trees(CommitTables const& tables, std::vector<CommitRecord> const& commits) : tables_(tables)
-    {
-        for (CommitRecord const& commit : commits) {
-            if (!commit.parents.empty()) {
-                ++waiting_[commit.parents.front()];
-            }
-        }
-    }
-
-    /// The files of the next commit, which made `changes`.
-    Tree next(CommitRecord const& commit, std::vector<FileRecord> const& changes)
-    {
-        Tree tree = commit.parents.empty() ? Tree() : filesOfParent(commit.parents.front());
-        for (FileRecord const& change : changes) {
-            if (change.url.isEmpty()) {
-                tree.erase(change.path);
-            } else {
-                tree.insert_or_assign(change.path, change.url);
-            }
-        }
-        keepForChildren(commit.hash, tree);
-        return tree;
-    }
-
-private:
-    Tree filesOfParent(OdString const& parent)
-    {
-        auto const kept = kept_.find(parent);
-        bool const isLast = --waiting_[parent] == 0;
-        if (kept == kept_.end()) {
-            Tree tree = tables_.files(parent);
-            keepForChildren(parent, tree);
-            return tree;
-        }
-        return isLast ? std::move(kept_.extract(kept).mapped()) : kept->second;
-    }
-
-    void keepForChildren(OdString const& hash, Tree const& tree)
-    {
-        auto const waiting = waiting_.find(hash);
-        if (waiting == waiting_.end() || waiting->second == 0) {
-            return;
-        }
-        if (kept_.size() == kMostTrees) {
-            kept_.erase(kept_.begin()); // Any will do: what is missed is read again.
-        }
-        kept_.emplace(hash, tree);
-    }
-
-    CommitTables const& tables_;
-    std::map<OdString, int> waiting_; ///< commits to come whose first parent it is
-    std::map<OdString, Tree> kept_;
-};
 
 std::map<OdString, OdString> renamesIn(std::vector<FileRecord> const& changes)
 {
@@ -131,20 +69,6 @@ Object commitDocument(CommitRecord const& commit, Array files)
     return document;
 }
 
-std::wstring commitsText(CommitTables const& tables, std::int64_t known)
-{
-    std::vector<CommitRecord> const commits = tables.after(known);
-    Trees trees(tables, commits);
-    std::wstring text;
-    for (CommitRecord const& commit : commits) {
-        std::vector<FileRecord> const changes = tables.changes(commit.hash);
-        Array files = filesDocument(trees.next(commit, changes), renamesIn(changes));
-        text += text.empty() ? L"" : L",";
-        text += kutils::json::write_string(commitDocument(commit, std::move(files)), false);
-    }
-    return text;
-}
-
 } // namespace
 
 Value referencesDocument(std::vector<common::Reference> const& references)
@@ -170,13 +94,9 @@ Value repositoryDocument(OdString const& id, OdString const& name)
     return object;
 }
 
-OdString fetchDocument(Value const& repository, CommitTables const& tables, std::int64_t known)
+OdString wholeCommitText(ChangedCommit const& commit, Tree const& tree)
 {
-    // References first: should another process add a commit meanwhile, the commits that they name are still all here.
-    std::wstring const references = kutils::json::write_string(referencesDocument(tables.references()), false);
-    std::wstring text = L"{\"commits\":[" + commitsText(tables, known) + L"],\"references\":" + references;
-    text += L",\"repository\":" + kutils::json::write_string(repository, false) + L"}";
-    return OdString(text.data(), text.size());
+    return compactText(commitDocument(commit.commit, filesDocument(tree, renamesIn(commit.changes))));
 }
 
 } // namespace tav

@@ -1,7 +1,7 @@
 /// What the server sends.
 #pragma once
 
-#include "host/history/commit_tables.h"
+#include "host/protocol/history_document.h"
 
 #include "json/json_value.h"
 
@@ -13,8 +13,7 @@ kutils::json::Value referencesDocument(std::vector<common::Reference> const& ref
 /// A repository-data document.
 kutils::json::Value repositoryDocument(OdString const& id, OdString const& name);
 
-/// The text of a fetch document with all commits behind the number `known`, each with all its files. It is written
-/// commit by commit: as values it would take many times the room.
-OdString fetchDocument(kutils::json::Value const& repository, CommitTables const& tables, std::int64_t known);
+/// A commit of a fetch document, with all of its files.
+OdString wholeCommitText(ChangedCommit const& commit, Tree const& tree);
 
 } // namespace tav

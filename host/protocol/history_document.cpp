@@ -6,7 +6,6 @@
 #include "host/text/json_text.h"
 
 #include "common/mu_common_json_keys.h"
-#include "json/json_writer.h"
 
 #include <set>
 #include <utility>
@@ -102,21 +101,9 @@ ChangedCommit readCommit(Part const& part)
 
 } // namespace
 
-OdString historyPage(CommitTables const& tables, std::int64_t known, std::size_t mostChanges)
+OdString changedCommitText(ChangedCommit const& commit)
 {
-    std::wstring text;
-    std::size_t count = 0;
-    while (auto const commit = tables.find(++known)) {
-        std::vector<FileRecord> const changes = tables.changes(commit->hash);
-        count += changes.size() + 1; // A commit without changes takes room too.
-        if (!text.empty() && count > mostChanges) {
-            break;
-        }
-        text += text.empty() ? L"" : L",";
-        text += kutils::json::write_string(commitDocument(*commit, changes), false);
-    }
-    text = L"{\"commits\":[" + text + L"]}";
-    return OdString(text.data(), text.size());
+    return compactText(commitDocument(commit.commit, commit.changes));
 }
 
 std::vector<ChangedCommit> readHistoryPage(OdString const& document)

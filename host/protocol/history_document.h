@@ -13,9 +13,8 @@ struct ChangedCommit {
     std::vector<FileRecord> changes;
 };
 
-/// The text of a history page: the commits behind the number `known`, in ascending order, as many as `mostChanges` lets
-/// in and at least one; none when there are no more.
-OdString historyPage(CommitTables const& tables, std::int64_t known, std::size_t mostChanges);
+/// A commit of a history page.
+OdString changedCommitText(ChangedCommit const& commit);
 
 /// Reads a page. Throws `Failure` for one in which a path, hash or URL is not clean, or whose numbers do not ascend.
 std::vector<ChangedCommit> readHistoryPage(OdString const& document);

@@ -2,16 +2,17 @@
 #pragma once
 
 #include "host/protocol/server.h"
+#include "host/server/core.h"
+#include "host/server/sqlite_history.h"
 
-#include "host/history/commit_tables.h"
-
-#include <optional>
+#include <memory>
 #include <string>
 
 namespace tav {
 
-/// Keeps its repositories in the file "server.db" of a folder. Several processes, also on several machines, may have
-/// servers on one folder: a request changes all or nothing, and the others wait for it. One thread for each object.
+/// The core of a server in this process, over a folder with the file "server.db". Several processes, also on several
+/// machines, may have servers on one folder: a request changes all or nothing, and the others wait for it. One thread
+/// for each object.
 class EmbeddedServer final : public Server {
 public:
     /// What becomes of a server that is not there. One that has been moved away must not be mistaken for a new one.
@@ -23,12 +24,18 @@ public:
     Expected<OdString> request(OdString const& verb, OdString const& document) override;
 
 private:
-    OdString answer(OdString const& verb, OdString const& document);
-    Database& openDatabase();
+    struct Opened {
+        explicit Opened(std::string const& folder) : history(folder + "/server.db"), core(history) {}
+
+        SqliteHistory history;
+        ServerCore core;
+    };
+
+    ServerCore& core();
 
     std::string folder_;
     Missing missing_;
-    std::optional<Database> database_;
+    std::unique_ptr<Opened> opened_;
 };
 
 } // namespace tav

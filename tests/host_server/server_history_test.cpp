@@ -3,6 +3,7 @@
 
 #include "host/errors/failure.h"
 #include "host/protocol/history_document.h"
+#include "host/server/history_answers.h"
 
 #include <gtest/gtest.h>
 
@@ -54,11 +55,11 @@ TEST_F(ServerHistory, NumbersBeginWithTheOneThatTheClientSends)
 
 TEST_F(ServerHistory, ComesInPages)
 {
-    tav::Database database(serverFolder() + "/server.db");
-    tav::CommitTables const tables(database, 1);
+    tav::SqliteHistory store(serverFolder() + "/server.db");
+    auto const history = store.read(server::wideText(id()));
     auto const numbersIn = [&](std::int64_t from, std::size_t most) {
         std::vector<std::int64_t> numbers;
-        for (tav::ChangedCommit const& next : tav::readHistoryPage(tav::historyPage(tables, from, most))) {
+        for (tav::ChangedCommit const& next : tav::readHistoryPage(tav::historyPage(*history, from, most))) {
             numbers.push_back(next.commit.number);
         }
         return numbers;
