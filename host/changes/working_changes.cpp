@@ -1,6 +1,5 @@
 #include "host/changes/working_changes.h"
 
-#include "host/changes/changes.h"
 #include "host/changes/renames.h"
 #include "host/repository/working_state.h"
 
@@ -48,8 +47,7 @@ void joinRenamed(Renames const& renames, ByPath& all)
 
 } // namespace
 
-std::vector<WorkingChange>
-workingChanges(common::RootPath const& root, LocalDatabase const& database, OdString const& commit)
+WorkingChanges workingChanges(common::RootPath const& root, LocalDatabase const& database, OdString const& commit)
 {
     auto const cache = readState(root);
     FolderChanges const changes =
@@ -57,11 +55,11 @@ workingChanges(common::RootPath const& root, LocalDatabase const& database, OdSt
     ByPath all = plainChanges(changes);
     joinRenamed(cache->read().renames, all);
     joinRenamed(findRenames(changes, cache->read(), database, root), all);
-    std::vector<WorkingChange> list;
+    WorkingChanges found{{}, changes.unreadable};
     for (auto& [path, change] : all) {
-        list.push_back(std::move(change));
+        found.files.push_back(std::move(change));
     }
-    return list;
+    return found;
 }
 
 } // namespace tav

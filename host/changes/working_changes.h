@@ -1,7 +1,7 @@
 /// What differs in the working folder, as commands show it.
 #pragma once
 
-#include "host/repository/local_database.h"
+#include "host/changes/changes.h"
 
 #include "common/mu_common_repo_files.h"
 
@@ -16,9 +16,12 @@ struct WorkingChange {
     OdString oldUrl;       ///< of the committed content; empty for a new file
 };
 
-/// Changes relative to the commit of that hash, in the order of paths. A renamed file, including one staged by 'tav
-/// mv', is one change.
-std::vector<WorkingChange>
-workingChanges(common::RootPath const& root, LocalDatabase const& database, OdString const& commit);
+struct WorkingChanges {
+    std::vector<WorkingChange> files; ///< in the order of paths
+    Folders unreadable;               ///< whose changes are not known
+};
+
+/// Changes relative to the commit of that hash. A renamed file, including one staged by 'tav mv', is one change.
+WorkingChanges workingChanges(common::RootPath const& root, LocalDatabase const& database, OdString const& commit);
 
 } // namespace tav

@@ -46,15 +46,14 @@ struct Changed {
     Tree removed;
 };
 
-Changed changedFiles(common::RootPath const& root, LocalDatabase& database, std::uint64_t start)
+/// Files that were read and are unchanged are added to `verified`.
+Changed changedFiles(common::RootPath const& root, LocalDatabase const& database, VerifiedFileList& verified)
 {
     FolderMatch match = matchPaths({}, database.commits().fileList(database.currentCommit()));
     VerifiedFileList const known = database.verifiedFiles();
     Examination(match.committed, known, root).run();
     dropKnown(match);
-    VerifiedFileList verified;
     FolderChanges const changes = compare(root, std::move(match), &verified);
-    keepVerified(settledFiles(std::move(verified), start), database);
     Changed changed;
     for (auto const& file : changes.modified) {
         changed.modified.emplace(file.committed.path, file.committed.storagePath);
@@ -236,7 +235,9 @@ CheckedOut checkOutCommit(
     Tree const to = database.commits().files(destination.commit);
     Tree current = database.commits().files(here.commit);
     Course course{updateBetween(current, from, to), {}, {destination.commit, destination.branch, false, begun}};
-    Changed const changed = changedFiles(root, database, start);
+    VerifiedFileList verified;
+    Changed const changed = changedFiles(root, database, verified);
+    keepVerified(settledFiles(std::move(verified), start), database);
     if (discard == Discard::everything) {
         addChanged(changed, course.whole);
     }
@@ -259,6 +260,23 @@ CheckedOut checkOutCommit(
         root, database, storage, course, start, [&] { beginMove(std::move(operation), course.move, database); });
     moved.kept = unsaved;
     return moved;
+}
+
+PlannedCheckout
+planCheckout(common::RootPath const& root, LocalDatabase const& database, OdString const& target, Discard discard)
+{
+    requireNoConflicts(root);
+    TreeUpdate update = updateBetween(
+        database.commits().files(database.currentCommit()), filesOf(begunCheckouts(database), database),
+        database.commits().files(target));
+    if (discard == Discard::everything) {
+        VerifiedFileList verified;
+        addChanged(changedFiles(root, database, verified), update);
+    }
+    LocalStorage storage(root);
+    std::vector<OdString> discarded =
+        planUpdate(root, database, storage, claimedPaths(readState(root)->read()), discard, update);
+    return {std::move(update), std::move(discarded)};
 }
 
 CheckedOut turnMove(

@@ -26,6 +26,17 @@ CheckedOut checkOutCommit(
     common::RootPath const& root, LocalDatabase& database, Position const& destination, OdString const& command,
     Discard discard, std::uint64_t start);
 
+/// What a checkout would do.
+struct PlannedCheckout {
+    TreeUpdate update;
+    std::vector<OdString> discarded; ///< files whose contents are in no commit and would be overwritten
+};
+
+/// What `checkOutCommit` would do for the commit `target`. Throws `Failure` as that does. Changes nothing, and needs no
+/// lock.
+PlannedCheckout
+planCheckout(common::RootPath const& root, LocalDatabase const& database, OdString const& target, Discard discard);
+
 /// Takes a move back (`Phase::undoing`) or does it again (`Phase::redoing`), with all that was not committed then.
 /// Likewise; what is discarded goes into the log. The operation has its details.
 CheckedOut turnMove(

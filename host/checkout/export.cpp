@@ -9,6 +9,9 @@
 
 #include "platform/os/os_batch.h"
 #include "platform/os/os_files.h"
+#include "platform/os/os_open_file.h"
+
+#include <unistd.h>
 
 #include <filesystem>
 #include <iterator>
@@ -83,6 +86,16 @@ void exportTo(std::string const& target, LocalStorage& storage, Tree const& file
     }
 }
 
+std::error_code flushNew(std::string const& path)
+{
+    os::OpenFile file;
+    if (std::error_code const error = file.openForChanging(path)) {
+        return error;
+    }
+    std::error_code const error = file.flush();
+    return error ? error : os::flushFolder(fs::path(path).parent_path().string());
+}
+
 } // namespace
 
 std::size_t
@@ -101,6 +114,22 @@ exportFiles(common::RootPath const& root, LocalDatabase const& database, Tree co
         throw;
     }
     return written.size();
+}
+
+void exportFile(
+    common::RootPath const& root, LocalDatabase const& database, Tree::value_type const& file,
+    std::string const& target, bool replaces)
+{
+    LocalStorage storage(root);
+    requireHere({file}, database, storage);
+    std::string const place =
+        replaces ? fs::path(target).parent_path().string() + "/.tav-export-" + std::to_string(getpid()) : target;
+    extract(storage, file, place);
+    if (std::error_code const error = replaces ? os::replaceFileBy(target, place) : flushNew(place)) {
+        std::error_code ignored;
+        fs::remove(place, ignored);
+        throw Failure("'" + target + "' cannot be written: " + error.message() + ".", "Name another file.");
+    }
 }
 
 } // namespace tav

@@ -4,7 +4,18 @@
 
 #include "platform/os/os_move.h"
 
+#include <filesystem>
+
 namespace tav {
+
+namespace {
+
+[[noreturn]] void failForExisting(std::string const& path)
+{
+    throw Failure("'" + path + "' exists already.", "Choose another name, or move that one away first.");
+}
+
+} // namespace
 
 FileMoves::~FileMoves()
 {
@@ -15,6 +26,15 @@ FileMoves::~FileMoves()
         } catch (...) {
             // Nobody is left to tell; the file lies whole under its new name.
         }
+    }
+}
+
+void FileMoves::requireFree(std::string const& to) const
+{
+    std::string const full = top_ + "/" + to;
+    std::error_code ignored;
+    if (std::filesystem::exists(std::filesystem::symlink_status(full, ignored))) {
+        failForExisting(full);
     }
 }
 
@@ -38,7 +58,7 @@ void FileMoves::move(std::string const& from, std::string const& to)
     std::string const fullFrom = top_ + "/" + from;
     std::string const fullTo = top_ + "/" + to;
     if (error == std::errc::file_exists) {
-        throw Failure("'" + fullTo + "' exists already.", "Choose another name, or move that one away first.");
+        failForExisting(fullTo);
     }
     throw Failure(
         "'" + fullFrom + "' cannot be moved to '" + fullTo + "': " + error.message() + ".",

@@ -16,6 +16,8 @@ public:
     FileMoves& operator=(FileMoves const&) = delete;
     ~FileMoves();
 
+    /// Throws `Failure` when `to` exists.
+    void requireFree(std::string const& to) const;
     /// Throws `Failure` when `to` exists or the system refuses.
     void move(std::string const& from, std::string const& to);
     void keep() { done_.clear(); }

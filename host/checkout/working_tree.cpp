@@ -468,6 +468,16 @@ void checkUpdate(
     }
 }
 
+std::vector<OdString> planUpdate(
+    common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
+    std::set<OdString> const& staged, Discard discard, TreeUpdate& update)
+{
+    Check check(root, database, staged, discard, update);
+    check.run();
+    requireHere(update.writes, database, storage);
+    return check.discarded();
+}
+
 /// The files whose unexpected contents go, with these in place of what was expected.
 std::vector<FileContents> discardedFiles(TreeUpdate const& update, Side to)
 {

@@ -54,6 +54,12 @@ void checkUpdate(
     common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
     std::set<OdString> const& staged, Discard discard, TreeUpdate& update);
 
+/// The same without storing anything, for a command that only shows what it would do. Returns the files whose contents
+/// are in no commit and would be overwritten.
+std::vector<OdString> planUpdate(
+    common::RootPath const& root, LocalDatabase const& database, LocalStorage& storage,
+    std::set<OdString> const& staged, Discard discard, TreeUpdate& update);
+
 /// The files of a checked update whose unexpected contents will be overwritten, for the log of an operation that goes
 /// to the side `to`: their present contents are those of the other side.
 std::vector<FileContents> discardedFiles(TreeUpdate const& update, Side to);

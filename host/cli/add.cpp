@@ -6,6 +6,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/cli/typed_command.h"
+#include "host/cli/unreadable_folders.h"
 #include "host/errors/failure.h"
 #include "host/repository/log_entry.h"
 #include "host/repository/names.h"
@@ -119,16 +120,6 @@ std::size_t repair(std::vector<common::VersionedFile> const& files, common::Root
     return count;
 }
 
-void noteUnreadable(Folders const& folders)
-{
-    if (!folders.empty()) {
-        printNote("Nothing has been staged of these folders, which cannot be read. Check your permissions for them:");
-    }
-    for (OdString const& folder : folders) {
-        printErrorDetail((folder.isEmpty() ? OdString(L".") : folder).ansi_str() + "/");
-    }
-}
-
 } // namespace
 
 void addFilesToStage(AddOptions const& options)
@@ -152,7 +143,9 @@ void addFilesToStage(AddOptions const& options)
     });
     entry->keep();
     if (options.all) {
-        noteUnreadable(changes.unreadable);
+        noteUnreadable(
+            "Nothing has been staged of these folders, which cannot be read. Check your permissions for them:",
+            changes.unreadable);
     }
     if (repaired > 0) {
         report("Repaired " + counted(repaired, "stored version") + ".\n");

@@ -86,27 +86,47 @@ void make(ReferenceOptions const& options, Kind const& kind)
         std::to_string(commit.number) + ".\n");
 }
 
-void remove(ReferenceOptions const& options, Kind const& kind)
+/// The one to delete, if it may be.
+common::Reference findRemovable(
+    ReferenceOptions const& options, Kind const& kind, common::RootPath const& root, LocalDatabase const& database)
 {
-    WriteSession session(openRepository(""), kind.name);
-    LocalDatabase& database = session.database();
     common::Reference const reference = findReference(database, fromUtf8(*options.name), kind.type);
-    std::string const name = shown(reference.name);
-    if (kind.type == common::EType::branch && reference.name == readState(session.root())->read().head) {
-        throw Failure("You are on the branch '" + name + "'.", "Run 'tav switch' to go to another branch first.");
+    if (kind.type == common::EType::branch && reference.name == readState(root)->read().head) {
+        throw Failure(
+            "You are on the branch '" + reference.name.ansi_str() + "'.",
+            "Run 'tav switch' to go to another branch first.");
     }
     if (!options.force) {
         failIfOnlyWayToCommits(database, reference);
     }
+    return reference;
+}
+
+std::string described(common::Reference const& reference, Kind const& kind, LocalDatabase const& database)
+{
     auto const commit = database.commits().find(reference.commitHash);
     std::string const number = commit ? std::to_string(commit->number) : reference.commitHash.ansi_str();
-    std::string const what = std::string(kind.name) + " '" + name + "', which was at commit " + number;
+    return std::string(kind.name) + " '" + shown(reference.name) + "', which was at commit " + number + ".\n";
+}
+
+void previewRemoval(ReferenceOptions const& options, Kind const& kind)
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    print("Would delete the " + described(findRemovable(options, kind, root, database), kind, database));
+}
+
+void remove(ReferenceOptions const& options, Kind const& kind)
+{
     if (options.dryRun) {
-        print("Would delete the " + what + ".\n");
+        previewRemoval(options, kind);
         return;
     }
-    removeReference(database, reference);
-    report("Deleted the " + what + ".\n");
+    WriteSession session(openRepository(""), kind.name);
+    common::Reference const reference = findRemovable(options, kind, session.root(), session.database());
+    std::string const what = described(reference, kind, session.database());
+    removeReference(session.database(), reference);
+    report("Deleted the " + what);
 }
 
 void rename(ReferenceOptions const& options)

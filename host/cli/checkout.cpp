@@ -1,6 +1,7 @@
 #include "host/checkout/checkout.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/planned_update.h"
 #include "host/cli/typed_command.h"
 #include "host/client/history.h"
 #include "host/commits/commit_names.h"
@@ -14,6 +15,7 @@
 #include "host/text/utf8.h"
 
 #include <filesystem>
+#include <optional>
 #include <string>
 
 namespace tav {
@@ -116,14 +118,82 @@ CommitRecord commitToGoTo(LocalDatabase const& database, std::string const& type
         "Run 'tav branch' to see those that there are, or 'tav switch -c NAME' to create one.");
 }
 
+common::Reference branchToGoTo(LocalDatabase const& database, std::string const& typed)
+{
+    auto const branch = database.commits().reference(fromUtf8(typed));
+    if (branch && branch->type == common::EType::tag) {
+        throw Failure("'" + typed + "' is a tag.", "Use 'tav checkout " + typed + "' to go there.");
+    }
+    if (!branch) {
+        failForUnknownBranch(typed, database);
+    }
+    return *branch;
+}
+
+std::optional<common::Reference> branchIfAny(LocalDatabase const& database, std::string const& typed)
+{
+    auto reference = database.commits().reference(fromUtf8(typed));
+    return reference && reference->type == common::EType::branch ? reference : std::nullopt;
+}
+
+void preview(
+    std::string const& what, OdString const& commit, CheckoutOptions const& options, common::RootPath const& root,
+    LocalDatabase const& database)
+{
+    PlannedCheckout const planned = planCheckout(root, database, commit, discardOf(options));
+    print("Would go to " + what + ".\n");
+    printPlan(planned.update, planned.discarded);
+}
+
+void previewCheckout(CheckoutOptions const& options)
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    if (auto const branch = branchIfAny(database, options.target)) {
+        preview("branch " + shown(branch->name), branch->commitHash, options, root, database);
+        return;
+    }
+    CommitRecord const commit = commitToGoTo(database, options.target);
+    preview("commit " + std::to_string(commit.number), commit.hash, options, root, database);
+}
+
+/// Only the server knows all names that are taken.
+void previewNewBranch(CheckoutOptions const& options, common::RootPath const& root, LocalDatabase const& database)
+{
+    OdString const name = fromUtf8(options.target);
+    requireReferenceName(name);
+    if (auto const taken = database.commits().reference(name)) {
+        std::string const kind = taken->type == common::EType::tag ? "tag" : "branch";
+        throw Failure("There is a " + kind + " '" + options.target + "' already.", "Choose another name.");
+    }
+    bool const isFirst = options.commit.empty() && database.currentCommit().isEmpty();
+    OdString const commit = isFirst ? OdString() : findCommit(database, options.commit).hash;
+    preview("the new branch " + shown(name), commit, options, root, database);
+}
+
+void previewSwitch(CheckoutOptions const& options)
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    if (options.isNew) {
+        previewNewBranch(options, root, database);
+        return;
+    }
+    common::Reference const branch = branchToGoTo(database, options.target);
+    preview("branch " + shown(branch.name), branch.commitHash, options, root, database);
+}
+
 } // namespace
 
 void checkOut(CheckoutOptions const& options)
 {
+    if (options.dryRun) {
+        previewCheckout(options);
+        return;
+    }
     WriteSession session(openRepository(""), "checkout");
-    auto const reference = session.database().commits().reference(fromUtf8(options.target));
-    if (reference && reference->type == common::EType::branch) {
-        goTo(session, *reference, typedCommand("checkout", {options.target}), options);
+    if (auto const branch = branchIfAny(session.database(), options.target)) {
+        goTo(session, *branch, typedCommand("checkout", {options.target}), options);
         return;
     }
     CommitRecord const commit = commitToGoTo(session.database(), options.target);
@@ -140,19 +210,16 @@ void checkOut(CheckoutOptions const& options)
 
 void switchBranch(CheckoutOptions const& options)
 {
+    if (options.dryRun) {
+        previewSwitch(options);
+        return;
+    }
     WriteSession session(openRepository(""), "switch");
     if (options.isNew) {
         switchToNew(session, options);
         return;
     }
-    auto const branch = session.database().commits().reference(fromUtf8(options.target));
-    if (branch && branch->type == common::EType::tag) {
-        throw Failure("'" + options.target + "' is a tag.", "Use 'tav checkout " + options.target + "' to go there.");
-    }
-    if (!branch) {
-        failForUnknownBranch(options.target, session.database());
-    }
-    goTo(session, *branch, typedCommand("switch", {options.target}), options);
+    goTo(session, branchToGoTo(session.database(), options.target), typedCommand("switch", {options.target}), options);
 }
 
 } // namespace tav

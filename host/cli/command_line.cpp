@@ -1,5 +1,6 @@
 #include "host/cli/command_line.h"
 
+#include "host/cli/moved_project.h"
 #include "host/cli/output.h"
 #include "host/cli/syntax.h"
 #include "host/errors/failure.h"
@@ -102,6 +103,7 @@ void parse(CLI::App& app, std::vector<std::string> const& words)
 {
     try {
         app.parse(markedArguments(words));
+        followMovedProject();
     } catch (CLI::Success const& wish) {
         std::ostringstream help;
         app.exit(wish, help, help);

@@ -36,8 +36,18 @@ struct UnstageOptions {
 };
 void unstageFiles(UnstageOptions const& options);
 
-void moveFiles(std::string const& typedFrom, std::string const& typedTo);
-void removeFiles(std::vector<std::string> const& names);
+struct MvOptions {
+    std::string from;
+    std::string to; ///< a path, or a folder to move it into
+    bool dryRun = false;
+};
+void moveFiles(MvOptions const& options);
+
+struct RmOptions {
+    std::vector<std::string> names;
+    bool dryRun = false;
+};
+void removeFiles(RmOptions const& options);
 
 struct CommitOptions {
     std::optional<std::string> message;
@@ -72,6 +82,12 @@ void showCommit(ShowOptions const& options);
 /// "COMMIT:NAME"
 void printFile(std::string const& typed);
 
+struct OpenOptions {
+    std::string name; ///< "COMMIT:NAME", or the name of a file of the current commit
+    bool printsPath = false;
+};
+void openFile(OpenOptions const& options);
+
 struct DiffOptions {
     WordList arguments; ///< up to two commits, and names; no name: all files
     bool stat = false;
@@ -92,14 +108,17 @@ struct CompareOptions {
     std::string before = "HEAD"; ///< a commit
     std::string after;           ///< a commit; empty: the working folder
     std::string file;            ///< to write; empty: shown in the terminal
+    bool open = false;           ///< shown by a program instead
     bool json = false;
 };
 void compareDrawing(CompareOptions const& options);
 
 struct RestoreOptions {
     std::vector<std::string> names;
-    std::string commit; ///< empty: where the user is
+    std::string commit;                ///< empty: where the user is
+    std::optional<std::string> target; ///< where one file is written instead of its own path
     bool force = false;
+    bool dryRun = false;
 };
 void restoreFiles(RestoreOptions const& options);
 
@@ -108,6 +127,7 @@ struct CheckoutOptions {
     std::string commit; ///< where a new branch begins; empty: where the user is
     bool isNew = false; ///< the branch is created
     bool force = false;
+    bool dryRun = false;
 };
 void checkOut(CheckoutOptions const& options);
 void switchBranch(CheckoutOptions const& options);
@@ -170,9 +190,14 @@ struct ConfigOptions {
 };
 void config(ConfigOptions const& options);
 
-void listProjects(bool json);
+struct ProjectsOptions {
+    std::optional<std::string> forgotten; ///< name or path of one that goes off the list; without it, they are listed
+    bool json = false;
+};
+void projects(ProjectsOptions const& options);
+
 void verifyAll(bool json);
-void collectGarbage();
+void collectGarbage(bool dryRun);
 void exportCommit(std::string const& typed, std::string const& target);
 
 } // namespace tav

@@ -6,6 +6,7 @@
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
 #include "host/cli/pager.h"
+#include "host/cli/unreadable_folders.h"
 #include "host/errors/failure.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
@@ -94,7 +95,9 @@ differences(std::vector<CommitRecord> const& commits, common::RootPath const& ro
     }
     OdString const base = commits.empty() ? database.currentCommit() : commits[0].hash;
     std::vector<CommittedChange> changes;
-    for (WorkingChange const& change : workingChanges(root, database, base)) {
+    WorkingChanges const found = workingChanges(root, database, base);
+    noteUnreadable(kChangesNotKnown, found.unreadable);
+    for (WorkingChange const& change : found.files) {
         changes.push_back({change.path, change.change, change.previousPath, OdString(), change.oldUrl});
     }
     return changes;

@@ -115,10 +115,29 @@ void reportTurnedOver(Freed const& freed)
     }
 }
 
+/// Without asking the server: it may know of commits that need some of these.
+void preview()
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    Contents const needed = contentsOf(root, database);
+    std::set<OdString> unneeded = valueOrFail(LocalStorage(root).contents(), "Check your rights in '.tav'.");
+    for (std::vector<OdString> const* const urls : {&needed.here, &needed.elsewhere}) {
+        for (OdString const& url : *urls) {
+            unneeded.erase(url);
+        }
+    }
+    print("Would remove at most " + counted(unneeded.size(), "stored version") + ".\n");
+}
+
 } // namespace
 
-void collectGarbage()
+void collectGarbage(bool dryRun)
 {
+    if (dryRun) {
+        preview();
+        return;
+    }
     WriteSession session(openRepository(""), "gc", Recovery::attempted);
     session.database().failIfDamaged();
     LocalStorage storage(session.root());

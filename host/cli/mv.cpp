@@ -170,33 +170,61 @@ std::vector<common::StagedFile> changedAndBack(
     return changed;
 }
 
-} // namespace
+/// What a command is to move, after everything that can be checked before.
+struct Planned {
+    OdString from;
+    OdString to;
+    std::vector<Move> moves;
+};
 
-void moveFiles(std::string const& typedFrom, std::string const& typedTo)
+Planned plan(MvOptions const& options, common::RootPath const& root)
 {
-    WriteSession session(openRepository(""), "mv", Recovery::attempted);
-    common::RootPath const& root = session.root();
-    OdString const from = pathInRepository(root, typedFrom);
-    OdString const to = targetOf(from, typedTo, root);
+    OdString const from = pathInRepository(root, options.from);
+    OdString const to = targetOf(from, options.to, root);
     Scanned const scanned = scan(root);
-    std::vector<Move> const moves = movesOf(from, to, scanned.files);
+    std::vector<Move> moves = movesOf(from, to, scanned.files);
     if (moves.empty()) {
         throw Failure(
-            "'" + typedFrom + "' is not a file or folder of the repository.", "Run 'tav files' to see those.");
+            "'" + options.from + "' is not a file or folder of the repository.", "Run 'tav files' to see those.");
     }
     if (isBelow(to, from)) {
-        throw Failure("'" + typedFrom + "' cannot be moved into itself.", "Choose another place.");
+        throw Failure("'" + options.from + "' cannot be moved into itself.", "Choose another place.");
     }
     failIfUnreadable(from, scanned.unreadable);
     if (isInTav(from)) {
-        throw Failure("'" + typedFrom + "' belongs to the repository itself.", "It cannot be moved.");
+        throw Failure("'" + options.from + "' belongs to the repository itself.", "It cannot be moved.");
     }
     checkTarget(to, root);
     checkFolders(to, root);
+    return {from, to, std::move(moves)};
+}
+
+void preview(MvOptions const& options)
+{
+    common::RootPath const root = openRepository("");
+    Planned const planned = plan(options, root);
+    FileMoves(root.path().ansi_str()).requireFree(planned.to.ansi_str());
+    print("Would rename '" + shown(planned.from) + "' to '" + shown(planned.to) + "'.\n");
+}
+
+} // namespace
+
+void moveFiles(MvOptions const& options)
+{
+    if (options.dryRun) {
+        preview(options);
+        return;
+    }
+    WriteSession session(openRepository(""), "mv", Recovery::attempted);
+    common::RootPath const& root = session.root();
+    Planned const planned = plan(options, root);
+    OdString const& from = planned.from;
+    OdString const& to = planned.to;
+    std::vector<Move> const& moves = planned.moves;
     std::optional<LogEntry> entry; // Goes last: after a failure the file is back by then.
     FileMoves onDisk(root.path().ansi_str());
     changeState(root, [&](common::Cache& cache) {
-        entry.emplace(session.database(), typedCommand("mv", {typedFrom, typedTo}), cache.read());
+        entry.emplace(session.database(), typedCommand("mv", {options.from, options.to}), cache.read());
         entry->operation().kind = Kind::rename;
         entry->operation().movedFrom = from;
         entry->operation().movedTo = to;

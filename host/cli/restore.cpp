@@ -1,113 +1,23 @@
-#include "host/changes/changes.h"
-#include "host/changes/staging.h"
-#include "host/checkout/working_tree.h"
+#include "host/checkout/export.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/restored_files.h"
 #include "host/cli/typed_command.h"
-#include "host/commits/commit_names.h"
 #include "host/errors/failure.h"
-#include "host/repository/log_entry.h"
-#include "host/repository/names.h"
 #include "host/repository/open.h"
-#include "host/repository/working_state.h"
-#include "host/session/write_session.h"
 #include "host/text/plural.h"
+#include "host/text/utf8.h"
 
-#include "platform/ut/FileName.h"
-
-#include <iterator>
-#include <set>
+#include <filesystem>
+#include <optional>
 #include <string>
-#include <vector>
+#include <utility>
 
 namespace tav {
 
 namespace {
 
-Tree chosenFiles(
-    RestoreOptions const& options, Tree const& files, CommitRecord const& commit, common::RootPath const& root)
-{
-    std::vector<common::StagedFile> all;
-    for (auto const& [path, url] : files) {
-        all.emplace_back(path, common::FileChange::added);
-    }
-    NameFinder const finder(all, root);
-    Tree chosen;
-    for (std::string const& name : options.names) {
-        std::vector<common::StagedFile> const found = finder.find(name);
-        if (found.empty()) {
-            throw Failure(
-                "No file of commit " + std::to_string(commit.number) + " matches '" + name + "'.",
-                "Name another one with --from, or run 'tav log' to see the commits.");
-        }
-        for (common::StagedFile const& file : found) {
-            chosen.emplace(file.path, files.at(file.path));
-        }
-    }
-    return chosen;
-}
-
-/// The files whose present content is staged.
-std::set<OdString> stagedContents(common::State const& state, common::RootPath const& root)
-{
-    std::set<OdString> paths;
-    for (common::StagedFile const& file : state.stagedFiles) {
-        if (file.change != common::FileChange::removed && ut::FileName::fileExists(root.pathTo(file.path))) {
-            paths.insert(file.path);
-        }
-    }
-    return paths;
-}
-
-/// Who brings a file back does not want to remove or rename it any more.
-void unstageRemovals(Tree const& files, common::State& state)
-{
-    for (auto rename = state.renames.begin(); rename != state.renames.end();) {
-        rename = files.count(rename->second) > 0 ? state.renames.erase(rename) : std::next(rename);
-    }
-    std::vector<common::StagedFile> removals;
-    for (common::StagedFile const& file : state.stagedFiles) {
-        if (file.change == common::FileChange::removed && files.count(file.path) > 0) {
-            removals.push_back(file);
-        }
-    }
-    unstage(removals, state);
-}
-
-/// Files that equal those of the last commit stop being changes.
-void enterFiles(
-    Tree const& files, Tree const& base, std::map<OdString, std::uint64_t> const& times, common::State& state)
-{
-    unstageRemovals(files, state);
-    std::vector<common::StagedFile> unchanged;
-    for (auto const& [path, url] : files) {
-        auto const committed = base.find(path);
-        auto const time = times.find(path);
-        if (committed == base.end() || committed->second != url) {
-            state.index.erase(path);
-            continue;
-        }
-        if (time != times.end()) {
-            state.index.insert_or_assign(path, common::IndexData{time->second, false});
-        }
-        unchanged.emplace_back(path, common::FileChange::modified);
-    }
-    unstage(unchanged, state);
-}
-
-/// What is written over what. A file that could not be read cannot be brought back.
-std::vector<FileContents> replacedFiles(TreeUpdate const& update)
-{
-    std::vector<FileContents> files;
-    for (auto const& [path, url] : update.writes) {
-        auto const before = update.others.find(path);
-        bool const isKnown = before != update.others.end();
-        if (isKnown || !update.marks.at(path).isThere) {
-            files.push_back({path, isKnown ? before->second : OdString(), url});
-        }
-    }
-    return files;
-}
+namespace fs = std::filesystem;
 
 std::string resultOf(std::size_t files, std::size_t written, std::int64_t commit)
 {
@@ -116,32 +26,110 @@ std::string resultOf(std::size_t files, std::size_t written, std::int64_t commit
                         : counted(files, "file") + " " + where + ", " + std::to_string(written) + " written.\n";
 }
 
+void restore(RestoreOptions const& options)
+{
+    Discard const discard = options.force ? Discard::everything : Discard::copies;
+    if (options.dryRun) {
+        common::RootPath const root = openRepository("");
+        LocalDatabase const database = LocalDatabase::open(root);
+        previewRestored(findRestoredFiles(options.commit, options.names, root, database), discard, root, database);
+        return;
+    }
+    WriteSession session(openRepository(""), "restore", Recovery::attempted);
+    RestoredFiles const restored = findRestoredFiles(options.commit, options.names, session.root(), session.database());
+    std::size_t const written = writeRestored(restored, discard, typedCommand("restore", options.names), session);
+    report(resultOf(restored.files.size(), written, restored.commit.number));
+}
+
+/// Into a folder that exists, a file keeps its name. Links to folders are followed to where they lead.
+std::string targetOf(std::string const& typed, OdString const& path)
+{
+    fs::path const target = fs::is_directory(typed) ? typed / fs::path(path.ansi_str()).filename() : fs::path(typed);
+    fs::path const folder = fs::weakly_canonical(fs::absolute(target).parent_path());
+    if (!target.has_filename()) {
+        throw Failure("There is no folder '" + typed + "'.", "Make it first.");
+    }
+    return (folder / target.filename()).string();
+}
+
+/// The path of `target` in the repository; none when it is elsewhere.
+std::optional<OdString> pathInside(std::string const& target, common::RootPath const& root)
+{
+    std::string const top = fs::canonical(root.path().ansi_str()).string() + "/";
+    return target.compare(0, top.size(), top) == 0 ? std::optional(fromUtf8(target.substr(top.size()))) : std::nullopt;
+}
+
+/// One file, and another place for it.
+struct Copy {
+    RestoredFiles restored;
+    std::string target; ///< full path, in bytes
+};
+
+Copy findCopy(RestoreOptions const& options, common::RootPath const& root, LocalDatabase const& database)
+{
+    RestoredFiles restored = findRestoredFiles(options.commit, options.names, root, database);
+    if (restored.files.size() != 1) {
+        throw Failure(
+            "--to takes one file, and these are " + std::to_string(restored.files.size()) + ".",
+            "Use 'tav export' for the files of a commit.");
+    }
+    std::string const target = targetOf(*options.target, restored.files.begin()->first);
+    if (!options.force && fs::exists(fs::symlink_status(target))) {
+        throw Failure("'" + target + "' is there already.", "Name another path, or overwrite it with --force.");
+    }
+    return {std::move(restored), target};
+}
+
+std::string described(Copy const& copy)
+{
+    return "'" + shown(copy.restored.files.begin()->first) + "' of commit " +
+           std::to_string(copy.restored.commit.number) + " to '" + shown(fromUtf8(copy.target)) + "'.\n";
+}
+
+void copyInside(Copy const& copy, OdString const& path, RestoreOptions const& options, common::RootPath const& root)
+{
+    RestoredFiles const restored{copy.restored.commit, {{path, copy.restored.files.begin()->second}}};
+    Discard const discard = options.force ? Discard::everything : Discard::nothing;
+    if (options.dryRun) {
+        previewRestored(restored, discard, root, LocalDatabase::open(root));
+        return;
+    }
+    WriteSession session(root, "restore", Recovery::attempted);
+    writeRestored(
+        restored, discard, typedCommand("restore", {options.names.front(), "--to", path.ansi_str()}), session);
+    report("Wrote " + described(copy));
+}
+
+void copyOutside(Copy const& copy, RestoreOptions const& options, common::RootPath const& root)
+{
+    if (options.dryRun) {
+        print("Would write " + described(copy));
+        return;
+    }
+    exportFile(root, LocalDatabase::open(root), *copy.restored.files.begin(), copy.target, options.force);
+    report("Wrote " + described(copy));
+}
+
+void restoreTo(RestoreOptions const& options)
+{
+    common::RootPath const root = openRepository("");
+    Copy const copy = findCopy(options, root, LocalDatabase::open(root));
+    if (auto const path = pathInside(copy.target, root)) {
+        copyInside(copy, *path, options, root);
+    } else {
+        copyOutside(copy, options, root);
+    }
+}
+
 } // namespace
 
 void restoreFiles(RestoreOptions const& options)
 {
-    WriteSession session(openRepository(""), "restore", Recovery::attempted);
-    common::RootPath const& root = session.root();
-    CommitRecord const commit = findCommit(session.database(), options.commit);
-    Tree const files = chosenFiles(options, session.database().commits().files(commit.hash), commit, root);
-    Tree const base = session.database().commits().files(session.database().currentCommit());
-    TreeUpdate update;
-    update.writes = files;
-    LocalStorage storage(root);
-    checkUpdate(
-        root, session.database(), storage, stagedContents(readState(root)->read(), root),
-        options.force ? Discard::everything : Discard::copies, update);
-    common::State after = readState(root)->read();
-    LogEntry entry(session.database(), typedCommand("restore", options.names), after);
-    enterFiles(files, base, {}, after);
-    entry.operation().files = replacedFiles(update);
-    Updated const updated = carryOut(root, storage, update, session.start(), [&] {
-        entry.write(after);
-        entry.keep(); // What is written from here on stays.
-    });
-    changeState(root, [&](common::Cache& cache) { enterFiles(files, base, updated.times, cache.write()); });
-    keepVerified(updated.verified, session.database());
-    report(resultOf(files.size(), update.writes.size(), commit.number));
+    if (options.target) {
+        restoreTo(options);
+    } else {
+        restore(options);
+    }
 }
 
 } // namespace tav

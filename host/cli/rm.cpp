@@ -6,6 +6,7 @@
 #include "host/checkout/permissions.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/planned_update.h"
 #include "host/cli/typed_command.h"
 #include "host/errors/failure.h"
 #include "host/history/tracked_path.h"
@@ -24,6 +25,7 @@
 #include <optional>
 #include <set>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace tav {
@@ -229,24 +231,53 @@ filesToGo(std::vector<common::StagedFile> const& chosen, Tree const& reachable, 
     return files;
 }
 
+struct Removal {
+    std::vector<common::StagedFile> chosen;
+    std::vector<FileContents> files; ///< those of them that are in the folder
+};
+
+Removal planRemoval(
+    std::vector<std::string> const& names, common::State const& state, LocalDatabase const& database,
+    common::RootPath const& root)
+{
+    FolderChanges const changes = compare(root, matchFolder(root, lastCommitFiles(root), database.verifiedFiles()));
+    CommittedFiles const files = committedFiles(changes);
+    std::vector<common::StagedFile> chosen = chosenFiles(names, changes, files, state, root);
+    std::vector<FileContents> toGo = filesToGo(chosen, files.reachable, root);
+    return {std::move(chosen), std::move(toGo)};
+}
+
+void preview(std::vector<std::string> const& names)
+{
+    common::RootPath const root = openRepository("");
+    LocalDatabase const database = LocalDatabase::open(root);
+    TreeUpdate update;
+    for (FileContents const& file : planRemoval(names, readState(root)->read(), database, root).files) {
+        checkPath(file.path, root);
+        update.removals.emplace(file.path, file.before);
+    }
+    printPlan(update, {});
+}
+
 } // namespace
 
-void removeFiles(std::vector<std::string> const& names)
+void removeFiles(RmOptions const& options)
 {
+    if (options.dryRun) {
+        preview(options.names);
+        return;
+    }
     WriteSession session(openRepository(""), "rm", Recovery::attempted);
     common::RootPath const& root = session.root();
     std::optional<LogEntry> entry; // Goes last: after a failure the files are back by then.
     Departures departures(root);
     std::size_t count = 0;
     changeState(root, [&](common::Cache& cache) {
-        entry.emplace(session.database(), typedCommand("rm", names), cache.read());
-        FolderChanges const changes =
-            compare(root, matchFolder(root, lastCommitFiles(root), session.database().verifiedFiles()));
-        CommittedFiles const files = committedFiles(changes);
-        std::vector<common::StagedFile> const chosen = chosenFiles(names, changes, files, cache.read(), root);
+        entry.emplace(session.database(), typedCommand("rm", options.names), cache.read());
+        Removal removal = planRemoval(options.names, cache.read(), session.database(), root);
         std::set<OdString> const renamed = formerPaths(cache.read());
-        count = stage(without(renamed, chosen), cache.write());
-        entry->operation().files = filesToGo(chosen, files.reachable, root);
+        count = stage(without(renamed, std::move(removal.chosen)), cache.write());
+        entry->operation().files = std::move(removal.files);
         entry->write(cache.read());
         for (FileContents const& file : entry->operation().files) {
             bool const isTaken = departures.take(file.path, file.before);

@@ -2,6 +2,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
 #include "host/cli/status_lines.h"
+#include "host/cli/unreadable_folders.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
 
@@ -196,6 +197,7 @@ std::string stagedLetters(StagedEntry const& entry)
 /// Two letters and a path in a line, as git does: what is staged, and what is different from that in the folder.
 void printShort(Status const& status)
 {
+    noteUnreadable(kChangesNotKnown, Folders(status.unreadable.begin(), status.unreadable.end()));
     for (StagedEntry const& entry : status.staged) {
         printShort(stagedLetters(entry), entry.path, entry.previousPath);
     }

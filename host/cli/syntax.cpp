@@ -89,18 +89,20 @@ void addUnstage(CLI::App& app)
 void addMv(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("mv", "Rename a file or folder, and stage that");
-    auto const names = std::make_shared<std::pair<std::string, std::string>>();
-    command->add_option("OLD", names->first, "Path of a file or folder of the repository")->required();
-    command->add_option("NEW", names->second, "Its new path, or an existing folder to move it into")->required();
-    command->callback([names] { moveFiles(names->first, names->second); });
+    auto const options = std::make_shared<MvOptions>();
+    command->add_option("OLD", options->from, "Path of a file or folder of the repository")->required();
+    command->add_option("NEW", options->to, "Its new path, or an existing folder to move it into")->required();
+    command->add_flag("--dry-run", options->dryRun, "Only show what would be renamed");
+    command->callback([options] { moveFiles(*options); });
 }
 
 void addRm(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("rm", "Remove committed files, and stage that");
-    auto const names = std::make_shared<std::vector<std::string>>();
-    command->add_option("NAME", *names, "Paths of files or folders, or the end of a path")->required();
-    command->callback([names] { removeFiles(*names); });
+    auto const options = std::make_shared<RmOptions>();
+    command->add_option("NAME", options->names, "Paths of files or folders, or the end of a path")->required();
+    command->add_flag("--dry-run", options->dryRun, "Only show what would be removed");
+    command->callback([options] { removeFiles(*options); });
 }
 
 void addCommit(CLI::App& app)
@@ -203,6 +205,20 @@ void addCat(CLI::App& app)
     command->callback([name] { printFile(*name); });
 }
 
+void addOpen(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("open", "Open a read-only copy of a file as a commit has it");
+    auto const options = std::make_shared<OpenOptions>();
+    command
+        ->add_option(
+            "COMMIT:NAME", options->name,
+            "A commit and the path of a file; without a commit and the colon, as the current one has it")
+        ->required();
+    command->add_flag("--print", options->printsPath, "Print the path of the copy, and open nothing");
+    addExamples(*command, "  tav open 12:plans/roof.dwg");
+    command->callback([options] { openFile(*options); });
+}
+
 void addDiff(CLI::App& app, std::optional<std::size_t> behindDashes)
 {
     CLI::App* const command =
@@ -244,7 +260,9 @@ void addCompare(CLI::App& app)
     command->add_option("AFTER", options->after, "The commit of the second version; by default the working folder");
     CLI::Option* const file =
         command->add_option("-o,--output", options->file, "Write the picture to this PNG file")->type_name("FILE");
+    command->add_flag("--open", options->open, "Open the picture with the program of your desktop")->excludes(file);
     command->add_flag("--json", options->json, "Print a document for programs")->needs(file);
+    addExamples(*command, "  tav compare plans/roof.dwg 12 --open    what has changed since commit 12");
     command->callback([options] { compareDrawing(*options); });
 }
 
@@ -258,7 +276,13 @@ void addRestore(CLI::App& app)
             "--from", options->commit,
             "Number, hash, branch or tag, HEAD~2 or master@{yesterday}; by default where you are")
         ->type_name("COMMIT");
-    command->add_flag("--force", options->force, "Overwrite uncommitted changes");
+    command->add_option("--to", options->target, "Write one file to this path, and leave the file itself as it is")
+        ->type_name("PATH");
+    command->add_flag("--force", options->force, "Overwrite uncommitted changes, or with --to an existing file");
+    command->add_flag("--dry-run", options->dryRun, "Only show what would be written");
+    addExamples(
+        *command, "  tav restore plans/roof.dwg                         discard what you have changed\n"
+                  "  tav restore --from 12 --to old-roof.dwg roof.dwg    compare with an earlier version");
     command->callback([options] { restoreFiles(*options); });
 }
 
@@ -267,6 +291,7 @@ std::shared_ptr<CheckoutOptions> addCheckoutOptions(CLI::App& command, char cons
     auto const options = std::make_shared<CheckoutOptions>();
     command.add_option(name, options->target, description)->required();
     command.add_flag("--force", options->force, "Overwrite files with uncommitted changes");
+    command.add_flag("--dry-run", options->dryRun, "Only show which files would be written and removed");
     return options;
 }
 
@@ -431,11 +456,31 @@ void addConfig(CLI::App& app)
     command->callback([options] { config(*options); });
 }
 
+void addProjects(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("projects", "List the repositories that you have made");
+    auto const options = std::make_shared<ProjectsOptions>();
+    CLI::Option* const forget = command->add_option(
+        "--forget", options->forgotten, "Take one off the list, by its name or path; its folder and history stay");
+    forget->type_name("PROJECT");
+    command->add_flag("--json", options->json, "Print a document for programs")->excludes(forget);
+    addExamples(*command, "  tav projects --forget /home/ann/old-bridge");
+    command->callback([options] { projects(*options); });
+}
+
 void addOnlyJson(CLI::App& command, void (*run)(bool json))
 {
     auto const json = std::make_shared<bool>(false);
     addJson(command, *json);
     command.callback([json, run] { run(*json); });
+}
+
+void addGc(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("gc", "Remove what no commit needs from the storage");
+    auto const dryRun = std::make_shared<bool>(false);
+    command->add_flag("--dry-run", *dryRun, "Only show how much would be removed, as far as it is known here");
+    command->callback([dryRun] { collectGarbage(*dryRun); });
 }
 
 void addExport(CLI::App& app)
@@ -483,6 +528,7 @@ void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
     addLog(app, behindDashes);
     addShow(app);
     addCat(app);
+    addOpen(app);
     addDiff(app, behindDashes);
     addPreview(app);
     addCompare(app);
@@ -498,9 +544,9 @@ void addCommands(CLI::App& app, std::optional<std::size_t> behindDashes)
     addFiles(app);
     addIgnore(app);
     addConfig(app);
-    addOnlyJson(*app.add_subcommand("projects", "List the repositories that you have made"), listProjects);
+    addProjects(app);
     addOnlyJson(*app.add_subcommand("verify", "Read every stored version and check it against its digest"), verifyAll);
-    app.add_subcommand("gc", "Remove what no commit needs from the storage")->callback(collectGarbage);
+    addGc(app);
     addExport(app);
     addTerminalOptions(app, "Options");
     for (CLI::App* const command : app.get_subcommands({})) {

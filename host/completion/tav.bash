@@ -69,12 +69,15 @@ _tav_options() { # COMMAND
                 --without-removed
             ;;
         log) printf '%s\n' -n --count --since --until --author --all --oneline --json ;;
-        preview | compare) printf '%s\n' -o --output --json ;;
-        restore) printf '%s\n' --from --force ;;
+        preview) printf '%s\n' -o --output --json ;;
+        compare) printf '%s\n' -o --output --open --json ;;
+        open) printf '%s\n' --print ;;
+        rm | mv | gc) printf '%s\n' --dry-run ;;
+        restore) printf '%s\n' --from --to --force --dry-run ;;
         undo) printf '%s\n' --list -n --count --dry-run --force --json ;;
         redo) printf '%s\n' --dry-run --force --json ;;
-        checkout) printf '%s\n' --force ;;
-        switch) printf '%s\n' -c --create --force ;;
+        checkout) printf '%s\n' --force --dry-run ;;
+        switch) printf '%s\n' -c --create --force --dry-run ;;
         branch) printf '%s\n' -d --delete --force --dry-run -m --move --json ;;
         tag) printf '%s\n' -d --delete --force --dry-run --json ;;
         server) printf '%s\n' --send ;;
@@ -82,7 +85,8 @@ _tav_options() { # COMMAND
         ignore) printf '%s\n' --add --remove --why --dry-run --json ;;
         config) printf '%s\n' --list --unset --user --repository --json ;;
         diff) printf '%s\n' --stat --text --json ;;
-        show | projects | verify) printf '%s\n' --json ;;
+        projects) printf '%s\n' --forget --json ;;
+        show | verify) printf '%s\n' --json ;;
     esac
     printf '%s\n' -h --help
 }
@@ -96,7 +100,8 @@ _tav_value() { # COMMAND OPTION
         preview:-o | preview:--output | compare:-o | compare:--output) _tav_offer_files -f ;;
         restore:--from | files:--at) _tav_offer < <(_tav_references branch tag) ;;
         ignore:--remove) _tav_offer < <(_tav_ask ignore) ;;
-        ignore:--why) _tav_offer_files -f ;;
+        ignore:--why | restore:--to) _tav_offer_files -f ;;
+        projects:--forget) _tav_offer < <(_tav_ask projects --json | _tav_texts path) ;;
         commit:-m | commit:--message | commit:--author | log:-n | log:--count | undo:-n | undo:--count | ignore:--add) ;;
         log:--since | log:--until) _tav_offer_words today yesterday ;;
         log:--author) ;;
@@ -124,12 +129,12 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
             _tav_offer_files -f
             (($2 > 1)) || _tav_offer < <(_tav_references branch tag)
             ;;
-        show:1 | cat:1 | compare:[23] | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
+        show:1 | cat:1 | open:1 | compare:[23] | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
     esac
 }
 
 _tav() {
-    local commands='init status add unstage mv rm commit log show cat diff preview compare restore checkout switch undo redo
+    local commands='init status add unstage mv rm commit log show cat open diff preview compare restore checkout switch undo redo
         branch tag fetch server files ignore config projects verify gc export'
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
     local command='' folder='' number=1 word i
@@ -145,7 +150,7 @@ _tav() {
             log:-n | log:--count) ((++i)) ;;
             preview:-o | preview:--output | compare:-o | compare:--output) ((++i)) ;;
             log:--since | log:--until | log:--author) ((++i)) ;;
-            ignore:--add | ignore:--remove | ignore:--why | restore:--from | files:--at | init:--server) ((++i)) ;;
+            ignore:--add | ignore:--remove | ignore:--why | restore:--from | restore:--to | projects:--forget | files:--at | init:--server) ((++i)) ;;
             *:-*) ;;
             *) ((++number)) ;;
         esac

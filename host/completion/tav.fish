@@ -1,6 +1,6 @@
 # Completion of tav for fish: commands, options, files, branches and tags.
 
-set -l commands init status add unstage mv rm commit log show cat diff preview compare restore checkout switch undo redo \
+set -l commands init status add unstage mv rm commit log show cat open diff preview compare restore checkout switch undo redo \
     branch tag fetch server files ignore config projects verify gc export
 
 # Runs tav on the repository that the line names with -C, for what it knows.
@@ -75,6 +75,7 @@ __tav_command commit 'Keep what is staged, removed and renamed as a new commit' 
 __tav_command log 'Show the history, newest first' $commands
 __tav_command show 'Show a commit and what it changed, or a file of it' $commands
 __tav_command cat 'Print a file as a commit has it' $commands
+__tav_command open 'Open a read-only copy of a file as a commit has it' $commands
 __tav_command diff 'Show what is different from the last commit, or between commits' $commands
 __tav_command preview 'Show the preview picture of a drawing' $commands
 __tav_command compare 'Show two versions of a drawing as pictures, and what differs' $commands
@@ -106,7 +107,9 @@ complete -c tav -n '__fish_seen_subcommand_from add' -l all -d 'Stage every chan
 complete -c tav -n '__fish_seen_subcommand_from add' -a '(__tav_paths modified untracked)'
 complete -c tav -n '__fish_seen_subcommand_from unstage' -l all -d 'Unstage all files'
 complete -c tav -n '__fish_seen_subcommand_from unstage' -a '(__tav_paths staged)'
+complete -c tav -n '__fish_seen_subcommand_from mv' -l dry-run -d 'Only show what would be renamed'
 complete -c tav -n '__fish_seen_subcommand_from mv' -F
+complete -c tav -n '__fish_seen_subcommand_from rm' -l dry-run -d 'Only show what would be removed'
 complete -c tav -n '__fish_seen_subcommand_from rm' -F
 complete -c tav -n '__fish_seen_subcommand_from commit' -s m -l message -x -d 'What has changed, and why'
 complete -c tav -n '__fish_seen_subcommand_from commit' -s F -l file -r -F -d 'Take the message from a file'
@@ -127,6 +130,8 @@ complete -c tav -n '__fish_seen_subcommand_from log' -F -a '(__tav_references br
 complete -c tav -n '__fish_seen_subcommand_from show' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from show' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from cat' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from open' -l print -d 'Print the path of the copy, and open nothing'
+complete -c tav -n '__fish_seen_subcommand_from open' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from diff' -l stat -d 'Show a line for each file and the total'
 complete -c tav -n '__fish_seen_subcommand_from diff' -l text -d 'Show all lines of text files'
 complete -c tav -n '__fish_seen_subcommand_from diff' -a '(__tav_references branch tag)'
@@ -136,14 +141,19 @@ complete -c tav -n '__fish_seen_subcommand_from preview' -s o -l output -r -F -d
 complete -c tav -n '__fish_seen_subcommand_from preview' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from preview' -F
 complete -c tav -n '__fish_seen_subcommand_from compare' -s o -l output -r -F -d 'Write the picture to this PNG file'
+complete -c tav -n '__fish_seen_subcommand_from compare' -l open -d 'Open the picture with the program of your desktop'
 complete -c tav -n '__fish_seen_subcommand_from compare' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from compare' -F
 complete -c tav -n '__fish_seen_subcommand_from compare' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from restore' -l from -x -a '(__tav_references branch tag)' -d 'The commit to take them from'
+complete -c tav -n '__fish_seen_subcommand_from restore' -l to -r -F -d 'Write one file to this path'
+complete -c tav -n '__fish_seen_subcommand_from restore' -l dry-run -d 'Only show what would be written'
 complete -c tav -n '__fish_seen_subcommand_from restore' -l force -d 'Overwrite uncommitted changes'
 complete -c tav -n '__fish_seen_subcommand_from restore' -F -a '(__tav_paths modified removed)'
+complete -c tav -n '__fish_seen_subcommand_from checkout' -l dry-run -d 'Only show what would be done'
 complete -c tav -n '__fish_seen_subcommand_from checkout' -l force -d 'Overwrite files with uncommitted changes'
 complete -c tav -n '__fish_seen_subcommand_from checkout' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from switch' -l dry-run -d 'Only show what would be done'
 complete -c tav -n '__fish_seen_subcommand_from switch' -l force -d 'Overwrite files with uncommitted changes'
 complete -c tav -n '__fish_seen_subcommand_from switch' -a '(__tav_references branch)'
 complete -c tav -n '__fish_seen_subcommand_from undo' -l list -d 'List the commands that can be taken back'
@@ -184,7 +194,9 @@ complete -c tav -n '__fish_seen_subcommand_from config' -l user -d 'For all your
 complete -c tav -n '__fish_seen_subcommand_from config' -l repository -d 'For this repository only'
 complete -c tav -n '__fish_seen_subcommand_from config' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from config; and __tav_arguments 0 config' -a 'color editor log.date open.program pager user.name'
+complete -c tav -n '__fish_seen_subcommand_from projects' -l forget -x -a '(__fish_complete_directories)' -d 'Take one off the list'
 complete -c tav -n '__fish_seen_subcommand_from projects' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from verify' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from gc' -l dry-run -d 'Only show how much would be removed'
 complete -c tav -n '__fish_seen_subcommand_from export; and __tav_arguments 0 export' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from export; and __tav_arguments 1 export' -a '(__fish_complete_directories)'

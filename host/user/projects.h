@@ -12,4 +12,14 @@ common::ConfigData readProjects();
 /// loses what another has added. Throws `Failure`.
 void addProject(OdString const& path, OdString const& name, OdString const& id);
 
+/// Takes the repository in the working folder `path` off the list. Nothing else is changed. Throws `Failure`.
+void forgetProject(OdString const& path);
+
+/// Gives the repository that the list has in `from` the path `to`, unless the list has changed meanwhile. Throws
+/// `Failure`.
+void moveProject(OdString const& from, OdString const& to);
+
+/// Whether there is a list: reading it makes the folder for it.
+bool hasProjects();
+
 } // namespace tav

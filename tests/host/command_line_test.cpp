@@ -35,6 +35,7 @@ Commands:
   log                         Show the history, newest first
   show                        Show a commit and what it changed, or a file of it
   cat                         Print a file as a commit has it
+  open                        Open a read-only copy of a file as a commit has it
   diff                        Show what is different from the last commit, or between commits
   preview                     Show the preview picture of a drawing
   compare                     Show two versions of a drawing as pictures, and what differs
@@ -114,6 +115,7 @@ Arguments:
 
 Options:
   -h,--help                   Show this help and do nothing else
+  --dry-run                   Only show what would be renamed
 
 )";
 
@@ -125,6 +127,7 @@ Arguments:
 
 Options:
   -h,--help                   Show this help and do nothing else
+  --dry-run                   Only show what would be removed
 
 )";
 

@@ -88,6 +88,23 @@ TEST_F(UnreadableFolder, IsInTheDocumentOfStatus)
         std::string::npos);
 }
 
+TEST_F(UnreadableFolder, IsNotedBesideWhatHasChanged)
+{
+    std::string const note = "tav: These folders cannot be read, so changes in them are not known. Check your "
+                             "permissions for them:\n  plans/\n";
+    for (Arguments const& arguments : {Arguments{"status", "-s"}, {"diff"}, {"diff", "--json"}, {"diff", "1"}}) {
+        Outcome const expected = {0, arguments.back() == "--json" ? "[\n]\n" : "", note};
+        EXPECT_EQ(with(kNone, [&] { return text(tav(arguments)); }), text(expected));
+    }
+    EXPECT_EQ(
+        with(
+            kAll,
+            [&] {
+                return text(tav({"status", "-s"})) + text(tav({"diff"}));
+            }),
+        text(done("")) + text(done("")));
+}
+
 TEST_F(UnreadableFolder, KeepsItsFilesInACommitEvenWhenTheyAreMissingThere)
 {
     EXPECT_EQ(
