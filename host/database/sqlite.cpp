@@ -4,6 +4,7 @@
 
 #include <sqlite3.h>
 
+#include <cerrno>
 #include <utility>
 
 namespace tav {
@@ -15,6 +16,17 @@ sqlite3* opened(std::string const& path, int flags, int& code)
     sqlite3* handle = nullptr;
     code = sqlite3_open_v2(path.c_str(), &handle, flags, nullptr);
     return handle;
+}
+
+/// What a caller may want to tell apart, as the system calls it.
+std::int32_t systemCodeOf(int code)
+{
+    switch (code & 0xFF) {
+    case SQLITE_BUSY:
+    case SQLITE_LOCKED: return EBUSY;
+    case SQLITE_FULL: return ENOSPC;
+    default: return 0;
+    }
 }
 
 } // namespace
@@ -173,7 +185,9 @@ std::string Database::adviceFor(int code) const
 
 void Database::fail(int code) const
 {
-    throw Failure("The database '" + path_ + "' cannot be used: " + sqlite3_errstr(code) + ".", adviceFor(code));
+    Failure failure("The database '" + path_ + "' cannot be used: " + sqlite3_errstr(code) + ".", adviceFor(code));
+    failure.code = systemCodeOf(code);
+    throw failure;
 }
 
 // A savepoint, unlike a transaction, may stand inside of a change.

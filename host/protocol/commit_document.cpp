@@ -1,11 +1,11 @@
 #include "host/protocol/commit_document.h"
 
-#include "host/errors/failure.h"
 #include "host/history/commit_hash.h"
 #include "host/history/reference_name.h"
 #include "host/history/tree.h"
 #include "host/protocol/document.h"
 #include "host/protocol/members.h"
+#include "host/protocol/refusal.h"
 #include "host/protocol/timestamp.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
@@ -191,7 +191,8 @@ void requireHash(NewCommit const& commit)
 {
     OdString const hash = commitHash(commit.commit, commit.files);
     if (hash != commit.commit.hash) {
-        throw Failure(
+        throw refusal(
+            ServerError::wrongHash,
             "'commits[0].hash' is " + quoted(commit.commit.hash) + ", but the hash of this commit is " + quoted(hash) +
                 ".",
             kNothingChanged);

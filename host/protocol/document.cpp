@@ -1,6 +1,6 @@
 #include "host/protocol/document.h"
 
-#include "host/errors/failure.h"
+#include "host/protocol/refusal.h"
 #include "host/text/characters.h"
 
 #include "common/mu_common_json.h"
@@ -27,7 +27,7 @@ Value parsed(OdString const& text)
 {
     Value value;
     if (!kutils::json::read_string(value, text)) {
-        throw Failure("The document is not valid JSON.", kNothingChanged);
+        throw refusal(ServerError::badDocument, "The document is not valid JSON.", kNothingChanged);
     }
     return value;
 }
@@ -84,10 +84,18 @@ std::int64_t Part::integer() const
     return isTooLarge ? std::numeric_limits<std::int64_t>::max() : value_->get_int64();
 }
 
+bool Part::truth() const
+{
+    require(Value_type::boolean);
+    return value_->get_bool();
+}
+
 void Part::refuse(std::string const& why) const
 {
     std::string const where = place();
-    throw Failure((where.empty() ? "The document" : "'" + where + "'") + " " + why + ".", kNothingChanged);
+    throw refusal(
+        ServerError::badDocument, (where.empty() ? "The document" : "'" + where + "'") + " " + why + ".",
+        kNothingChanged);
 }
 
 void Part::require(Value_type type) const

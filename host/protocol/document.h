@@ -37,6 +37,7 @@ public:
     /// A text that survives conversion to bytes and back, and contains no NUL.
     OdString soundText() const;
     std::int64_t integer() const;
+    bool truth() const;
 
     /// Throws `Failure`: "'commits[0].hash' <why>." with a next step that says that nothing has changed.
     [[noreturn]] void refuse(std::string const& why) const;

@@ -1,11 +1,17 @@
 #include "host/server/core.h"
 
 #include "host/history/tree.h"
+#include "host/protocol/content_document.h"
 #include "host/protocol/document.h"
 #include "host/protocol/fetch_document.h"
 #include "host/protocol/refusal.h"
+#include "host/server/content_cleaning.h"
+#include "host/server/content_requests.h"
 #include "host/server/history_answers.h"
 #include "host/server/reference_rules.h"
+#include "host/server/uploads.h"
+#include "host/storage/storage_error.h"
+#include "host/storage/storage_url.h"
 #include "host/text/characters.h"
 #include "host/text/json_text.h"
 #include "host/text/utf8.h"
@@ -14,6 +20,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cerrno>
 #include <exception>
 #include <iomanip>
 #include <new>
@@ -35,6 +42,7 @@ constexpr wchar_t const* kCommandVersion = L"1";
 constexpr std::size_t kChangesOfAPage = 10'000;
 
 struct Request {
+    Stores& stores;
     HistoryStore& history;
     Repository repository; ///< as far as the request names one
     OdString const& document;
@@ -57,6 +65,7 @@ OdString answerVersion(Request const&)
 {
     Object version;
     version[L"commandVersion"] = kCommandVersion;
+    version[L"features"] = Array{L"contents"};
     return compactText(version);
 }
 
@@ -77,7 +86,9 @@ OdString answerInit(Request const& request)
     NewRepository const wanted = readNewRepository(request.document);
     Repository const added{wanted.id.isEmpty() ? newIdentifier() : wanted.id, wanted.name};
     if (!request.history.add(added)) {
-        throw Failure("The server has a repository " + quoted(added.id) + " already.", kNothingChanged);
+        throw refusal(
+            ServerError::referenceExists, "The server has a repository " + quoted(added.id) + " already.",
+            kNothingChanged);
     }
     Object answer;
     answer[L"id"] = jsonText(added.id);
@@ -102,6 +113,17 @@ std::vector<FileRecord> changesOf(Request const& request, NewCommit const& added
     return changesBetween(parents.empty() ? Tree() : history->files(parents.front()), added.files);
 }
 
+std::vector<Digest> digestsOf(std::vector<FileRecord> const& changes)
+{
+    std::vector<Digest> digests;
+    for (FileRecord const& change : changes) {
+        if (!change.url.isEmpty()) {
+            digests.push_back(*digestOf(change.url));
+        }
+    }
+    return digests;
+}
+
 /// Adds the commit unless an earlier request, whose answer may have been lost, has done so. Returns whether it did.
 bool addUnlessThere(HistoryTransaction& history, NewCommit& added, std::vector<FileRecord> const& changes)
 {
@@ -113,6 +135,7 @@ bool addUnlessThere(HistoryTransaction& history, NewCommit& added, std::vector<F
     requireParents(history, added);
     commit.number = history.lastNumber() + 1;
     history.add(commit, changes);
+    history.await(history.name(digestsOf(changes)));
     return true;
 }
 
@@ -183,6 +206,36 @@ OdString answerHistory(Request const& request)
     return historyPage(*request.history.read(request.repository.id), known, kChangesOfAPage);
 }
 
+OdString answerMissing(Request const& request)
+{
+    return missingAnswer(missingOf(request.stores, request.repository.id, readOffer(request.document)));
+}
+
+OdString answerUpload(Request const& request)
+{
+    return uploadsAnswer(beginUploads(request.stores, request.repository.id, readAnnouncement(request.document)));
+}
+
+OdString answerFinish(Request const& request)
+{
+    finishUploads(request.stores, request.repository.id, readSentUploads(request.document));
+    return doneAnswer();
+}
+
+OdString answerLocate(Request const& request)
+{
+    return locatedAnswer(located(request.stores, request.repository.id, readWanted(request.document)));
+}
+
+OdString answerClean(Request const& request)
+{
+    Freed const freed = cleanContents(request.stores, request.repository.id);
+    Object answer;
+    answer[L"bytes"] = freed.bytes;
+    answer[L"contents"] = static_cast<std::uint64_t>(freed.contents);
+    return compactText(answer);
+}
+
 template <Force force>
 OdString answerCommit(Request const& request)
 {
@@ -212,6 +265,11 @@ constexpr std::array kVerbs = {
     Verb{L"fetch", true, answerFetch},
     Verb{L"numbers", true, answerNumbers},
     Verb{L"history", true, answerHistory},
+    Verb{L"missing", true, answerMissing},
+    Verb{L"upload", true, answerUpload},
+    Verb{L"finish", true, answerFinish},
+    Verb{L"locate", true, answerLocate},
+    Verb{L"clean", true, answerClean},
 };
 
 /// The verb and, behind its first blank, the repository; that is empty when there is none.
@@ -227,11 +285,12 @@ Verb const& verbOrFail(OdString const& name, OdString const& repository)
     auto const* const verb =
         std::find_if(kVerbs.begin(), kVerbs.end(), [&](Verb const& candidate) { return name == candidate.name; });
     if (verb == kVerbs.end()) {
-        throw Failure("The server does not know the request " + quoted(name) + ".", kNothingChanged);
+        throw refusal(
+            ServerError::badDocument, "The server does not know the request " + quoted(name) + ".", kNothingChanged);
     }
     if (verb->namesRepository == repository.isEmpty()) {
         std::string const fault = verb->namesRepository ? " must name a repository." : " does not take a repository.";
-        throw Failure("The request " + quoted(name) + fault, kNothingChanged);
+        throw refusal(ServerError::badDocument, "The request " + quoted(name) + fault, kNothingChanged);
     }
     return *verb;
 }
@@ -245,9 +304,21 @@ Repository repositoryOrFail(HistoryStore& history, OdString const& id)
     return *found;
 }
 
-ErrorMessage messageOf(std::string const& text)
+ErrorMessage messageOf(std::string const& text, std::int32_t code = 0)
 {
-    return ErrorMessage(fromUtf8(text));
+    ErrorMessage message(fromUtf8(text));
+    message.code = code;
+    return message;
+}
+
+/// What is out of reach has one code, whatever the system calls it.
+std::int32_t codeOf(std::int32_t code)
+{
+    switch (code) {
+    case ENOSPC: return static_cast<std::int32_t>(ServerError::diskFull);
+    case EBUSY: return static_cast<std::int32_t>(ServerError::busy);
+    default: return code;
+    }
 }
 
 } // namespace
@@ -256,18 +327,37 @@ OdString ServerCore::answer(OdString const& request, OdString const& document)
 {
     auto const [name, id] = splitRequest(request);
     Verb const& verb = verbOrFail(name, id);
-    Repository const repository = verb.namesRepository ? repositoryOrFail(history_, id) : Repository();
-    return verb.answer({history_, repository, document});
+    Repository const repository = verb.namesRepository ? repositoryOrFail(stores_.history, id) : Repository();
+    return verb.answer({stores_, stores_.history, repository, document});
 }
 
-Expected<OdString> answered(std::function<OdString()> const& work)
+void ServerCore::send(
+    OdString const& repository, UploadName const& upload, std::uint64_t offset, std::string_view bytes)
+{
+    repositoryOrFail(stores_.history, repository);
+    continueUpload(stores_, repository, upload, offset, bytes);
+}
+
+void ServerCore::receive(
+    OdString const& repository, OdString const& record, std::uint64_t offset,
+    std::function<bool(std::string_view)> const& sink)
+{
+    repositoryOrFail(stores_.history, repository);
+    auto const digest = digestFromHex(record.ansi_str());
+    if (!digest) {
+        throw refusal(ServerError::badDocument, quoted(record) + " is not the digest of a record.", kNothingChanged);
+    }
+    sendRecord(stores_, repository, *digest, offset, sink);
+}
+
+ErrorMessage errorOf(std::exception_ptr const& thrown)
 {
     try {
-        return work();
+        std::rethrow_exception(thrown);
     } catch (Failure const& failure) {
-        ErrorMessage message = messageOf(failure.what + " " + failure.next);
-        message.code = failure.code;
-        return message;
+        return messageOf(failure.what + " " + failure.next, codeOf(failure.code));
+    } catch (StorageError const& error) {
+        return messageOf(error.what + " " + kNothingChanged, codeOf(error.code));
     } catch (std::bad_alloc const&) {
         return messageOf(std::string("There is not enough memory for the request. ") + kNothingChanged);
     } catch (std::exception const& error) {

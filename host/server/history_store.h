@@ -5,6 +5,7 @@
 #pragma once
 
 #include "host/history/commit_tables.h"
+#include "host/text/digest.h"
 
 #include <cstdint>
 #include <memory>
@@ -16,6 +17,33 @@ namespace tav {
 struct Repository {
     OdString id;
     OdString name; ///< for people; several may have the same
+};
+
+/// A content that a repository has. Its bytes are a record file of the content store.
+struct StoredContent {
+    Digest digest{};
+    std::int64_t id = 0;      ///< of its file
+    Digest record{};          ///< of the bytes of the file
+    Digest base{};            ///< of the content that the record builds on; all zeros: on none
+    std::int64_t chain = 0;   ///< at most so many differences lead to it
+    std::uint64_t length = 0; ///< of the content
+    std::uint64_t recordLength = 0;
+    bool isNamed = false;    ///< by a commit: then it is kept for ever
+    bool isDamaged = false;  ///< its file could not be read
+    std::int64_t leased = 0; ///< kept until then in any case, in seconds since 1970-01-01T00:00:00Z
+
+    bool isWhole() const { return base == Digest{}; }
+};
+
+/// A record on its way from a working folder.
+struct Upload {
+    std::int64_t id = 0; ///< which no other upload has, nor will have; and of the file that it becomes
+    OdString folder;     ///< that sends it
+    Digest record{};
+    Digest digest{};
+    Digest base{};
+    std::uint64_t recordLength = 0;
+    std::int64_t touched = 0; ///< when some of it came last, or up to a day earlier
 };
 
 /// One repository as it was at one moment, whatever others change meanwhile. They may have to wait, so it is not held
@@ -51,6 +79,20 @@ public:
 
     /// Up to which number commits have been handed out.
     virtual std::int64_t delivered() const = 0;
+
+    virtual std::optional<StoredContent> content(Digest const& digest) const = 0;
+    virtual std::optional<StoredContent> contentOfRecord(Digest const& record) const = 0;
+    /// Contents that no commit names, that no other one builds on, and whose lease has ended at `now`; `most` at most.
+    virtual std::vector<StoredContent> unneeded(std::int64_t now, std::size_t most) const = 0;
+    /// Whether commits name the content and no working folder has sent it yet.
+    virtual bool isAwaited(Digest const& digest) const = 0;
+
+    virtual std::optional<Upload> upload(std::int64_t id) const = 0;
+    virtual std::optional<Upload> upload(OdString const& folder, Digest const& record) const = 0;
+    /// The uploads of which nothing has come since `time`.
+    virtual std::vector<Upload> uploadsBefore(std::int64_t time) const = 0;
+    /// Whether a content or an upload has the number `id`.
+    virtual bool isUsed(std::int64_t id) const = 0;
 };
 
 /// Makes changes one: all of them are kept when `commit` returns, and none when it is not called or a crash comes
@@ -64,6 +106,21 @@ public:
     virtual void set(common::Reference const& reference) = 0;
     /// Removes the reference of that name, if there is one.
     virtual void removeReference(OdString const& name) = 0;
+
+    /// Adds a content, or replaces what is known of it.
+    virtual void set(StoredContent const& content) = 0;
+    virtual void removeContent(Digest const& digest) = 0;
+    /// Keeps those of the contents that are there until `time`.
+    virtual void lease(std::vector<Digest> const& contents, std::int64_t time) = 0;
+    /// Keeps those of the contents that are there for ever, and returns the others, each once.
+    virtual std::vector<Digest> name(std::vector<Digest> const& contents) = 0;
+    virtual void await(std::vector<Digest> const& contents) = 0;
+    virtual void removeAwaited(Digest const& digest) = 0;
+
+    /// Adds an upload and returns its new number.
+    virtual std::int64_t add(Upload const& upload) = 0;
+    virtual void touch(std::int64_t upload, std::int64_t now) = 0;
+    virtual void removeUpload(std::int64_t id) = 0;
 
     virtual void commit() = 0;
 };
@@ -84,6 +141,9 @@ public:
     /// The repository `id`, which there is.
     virtual std::unique_ptr<HistorySnapshot> read(OdString const& id) = 0;
     virtual std::unique_ptr<HistoryTransaction> write(OdString const& id) = 0;
+
+    /// Whether any repository has an upload of that number.
+    virtual bool hasUpload(std::int64_t id) = 0;
 
     /// Notes that commits up to `number` are handed out. It is no error when that cannot be noted.
     virtual void noteDelivered(OdString const& id, std::int64_t number) = 0;

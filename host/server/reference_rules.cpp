@@ -18,14 +18,18 @@ void requireSameType(common::Reference const& there, common::Reference const& wa
 {
     if (there.type != wanted.type) {
         std::string const kind = there.type == common::EType::tag ? "a tag" : "a branch";
-        throw Failure(quoted(wanted.name) + " is the name of " + kind + " already.", "Choose another name.");
+        throw refusal(
+            ServerError::referenceExists, quoted(wanted.name) + " is the name of " + kind + " already.",
+            "Choose another name.");
     }
 }
 
 void requireForward(HistorySnapshot const& history, common::Reference const& there, common::Reference const& wanted)
 {
     if (wanted.type == common::EType::tag) {
-        throw Failure("The tag " + quoted(wanted.name) + " names another commit already.", "Choose another name.");
+        throw refusal(
+            ServerError::referenceExists, "The tag " + quoted(wanted.name) + " names another commit already.",
+            "Choose another name.");
     }
     if (!history.isBefore(there.commitHash, wanted.commitHash)) {
         throw refusal(
@@ -44,7 +48,7 @@ void requireExpected(std::optional<common::Reference> const& there, ReferenceCha
     std::string const kind = change.reference.type == common::EType::tag ? "tag " : "branch ";
     std::string const name = kind + quoted(change.reference.name);
     if (change.expected->isEmpty()) {
-        throw Failure("There is a " + name + " already.", "Choose another name.");
+        throw refusal(ServerError::referenceExists, "There is a " + name + " already.", "Choose another name.");
     }
     throw refusal(
         ServerError::hasMovedOn, "The " + name + " now names a different commit.",
@@ -79,7 +83,8 @@ void requireLeavable(HistorySnapshot const& history, common::Reference const& th
         reasons += (reasons.empty() ? "" : ", and ") + reason;
     }
     if (!reasons.empty()) {
-        throw Failure(
+        throw refusal(
+            ServerError::inUse,
             "Commit " + std::to_string(left.front().number) + " cannot be taken back: " + reasons + ".",
             "Make another commit that puts things right.");
     }
@@ -122,7 +127,8 @@ void setReference(HistoryTransaction& history, ReferenceChange const& change, Fo
         return;
     }
     if (!history.find(wanted.commitHash)) {
-        throw Failure(
+        throw refusal(
+            ServerError::noReference,
             "The server does not have the commit " + quoted(wanted.commitHash) + " of " + quoted(wanted.name) + ".",
             kNothingChanged);
     }
@@ -152,7 +158,9 @@ void requireParents(HistorySnapshot const& history, NewCommit const& added)
 {
     for (OdString const& parent : added.commit.parents) {
         if (!history.find(parent)) {
-            throw Failure("The server does not have the parent commit " + quoted(parent) + ".", kNothingChanged);
+            throw refusal(
+                ServerError::noReference, "The server does not have the parent commit " + quoted(parent) + ".",
+                kNothingChanged);
         }
     }
     if (added.commit.parents.empty() && !movesAll(added, history)) {

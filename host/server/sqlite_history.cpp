@@ -1,6 +1,7 @@
 #include "host/server/sqlite_history.h"
 
 #include "host/errors/failure.h"
+#include "host/server/content_tables.h"
 #include "host/text/characters.h"
 
 #include <utility>
@@ -9,8 +10,9 @@ namespace tav {
 
 namespace {
 
-constexpr std::int64_t kTablesVersion = 2;
+constexpr std::int64_t kTablesVersion = 3;
 constexpr std::int64_t kFirstWithDelivered = 2;
+constexpr std::int64_t kFirstWithContents = 3;
 
 /// Up to which number commits have been handed out, of each repository: nobody but who made them has those behind it.
 constexpr char const* kDelivered = "CREATE TABLE delivered (repository INTEGER PRIMARY KEY, number INTEGER NOT NULL)";
@@ -20,6 +22,7 @@ void createTables(Database& database)
     database.run(kDelivered);
     database.run("CREATE TABLE repositories (key INTEGER PRIMARY KEY, id TEXT NOT NULL UNIQUE, name TEXT NOT NULL)");
     CommitTables::create(database);
+    ContentTables::create(database);
     database.setVersion(kTablesVersion);
 }
 
@@ -40,12 +43,18 @@ void prepareTables(Database& database)
     }
 }
 
-/// An earlier tav handed out all that there was. Part of a `WriteTransaction` of the caller.
+/// Part of a `WriteTransaction` of the caller.
 void upgrade(Database& database)
 {
-    if (database.version() < kFirstWithDelivered) {
+    std::int64_t const version = database.version();
+    if (version < kFirstWithDelivered) { // An earlier tav handed out all that there was.
         database.run(kDelivered);
         database.run("INSERT INTO delivered SELECT repository, max(number) FROM commits GROUP BY repository");
+    }
+    if (version < kFirstWithContents) {
+        ContentTables::create(database);
+    }
+    if (version < kTablesVersion) {
         database.setVersion(kTablesVersion);
     }
 }
@@ -54,7 +63,13 @@ void upgrade(Database& database)
 template <class Interface>
 class Reading : public Interface {
 public:
-    Reading(Database& database, std::int64_t key) : database_(database), key_(key), tables_(database, key) {}
+    Reading(Database& database, std::int64_t key)
+        : database_(database)
+        , key_(key)
+        , tables_(database, key)
+        , contents_(database, key)
+    {
+    }
 
     std::optional<CommitRecord> find(OdString const& hash) const override { return tables_.find(hash); }
     std::optional<CommitRecord> find(std::int64_t number) const override { return tables_.find(number); }
@@ -83,13 +98,44 @@ public:
         return row.with(key_).next() ? row.integer(0) : 0;
     }
 
+    std::optional<StoredContent> content(Digest const& digest) const override
+    {
+        return hasContents() ? contents_.content(digest) : std::nullopt;
+    }
+    std::optional<StoredContent> contentOfRecord(Digest const& record) const override
+    {
+        return hasContents() ? contents_.contentOfRecord(record) : std::nullopt;
+    }
+    std::vector<StoredContent> unneeded(std::int64_t now, std::size_t most) const override
+    {
+        return hasContents() ? contents_.unneeded(now, most) : std::vector<StoredContent>();
+    }
+    bool isAwaited(Digest const& digest) const override { return hasContents() && contents_.isAwaited(digest); }
+    std::optional<Upload> upload(std::int64_t id) const override
+    {
+        return hasContents() ? contents_.upload(id) : std::nullopt;
+    }
+    std::optional<Upload> upload(OdString const& folder, Digest const& record) const override
+    {
+        return hasContents() ? contents_.upload(folder, record) : std::nullopt;
+    }
+    std::vector<Upload> uploadsBefore(std::int64_t time) const override
+    {
+        return hasContents() ? contents_.uploadsBefore(time) : std::vector<Upload>();
+    }
+    bool isUsed(std::int64_t id) const override { return hasContents() && contents_.isUsed(id); }
+
 protected:
     CommitTables& tables() { return tables_; }
+    ContentTables& contents() { return contents_; }
 
 private:
+    bool hasContents() const { return database_.version() >= kFirstWithContents; }
+
     Database& database_;
     std::int64_t key_;
     CommitTables tables_;
+    ContentTables contents_;
 };
 
 class Snapshot final : public Reading<HistorySnapshot> {
@@ -113,6 +159,17 @@ public:
     }
     void set(common::Reference const& reference) override { tables().set(reference); }
     void removeReference(OdString const& name) override { tables().removeReference(name); }
+
+    void set(StoredContent const& content) override { contents().set(content); }
+    void removeContent(Digest const& digest) override { contents().removeContent(digest); }
+    void lease(std::vector<Digest> const& digests, std::int64_t time) override { contents().lease(digests, time); }
+    std::vector<Digest> name(std::vector<Digest> const& digests) override { return contents().name(digests); }
+    void await(std::vector<Digest> const& digests) override { contents().await(digests); }
+    void removeAwaited(Digest const& digest) override { contents().removeAwaited(digest); }
+    std::int64_t add(Upload const& upload) override { return contents().add(upload); }
+    void touch(std::int64_t upload, std::int64_t now) override { contents().touch(upload, now); }
+    void removeUpload(std::int64_t id) override { contents().removeUpload(id); }
+
     void commit() override { transaction_.commit(); }
 
 private:
@@ -162,6 +219,11 @@ std::unique_ptr<HistorySnapshot> SqliteHistory::read(OdString const& id)
 std::unique_ptr<HistoryTransaction> SqliteHistory::write(OdString const& id)
 {
     return std::make_unique<Transaction>(database_, keyOf(id));
+}
+
+bool SqliteHistory::hasUpload(std::int64_t id)
+{
+    return database_.version() >= kFirstWithContents && ContentTables::hasUpload(database_, id);
 }
 
 // No commit is lost when it is not noted, so it is no reason to hand nothing out.

@@ -24,6 +24,7 @@ public:
     bool add(Repository const& repository) override;
     std::unique_ptr<HistorySnapshot> read(OdString const& id) override;
     std::unique_ptr<HistoryTransaction> write(OdString const& id) override;
+    bool hasUpload(std::int64_t id) override;
     void noteDelivered(OdString const& id, std::int64_t number) override;
 
 private:

@@ -50,7 +50,7 @@ TEST_F(ServerFolder, OfAnEarlierVersionCountsAllCommitsAsHandedOut)
     ask("commit <id>", commit('b', "a", {}, {"branch main b"}));
     {
         tav::Database database(databasePath());
-        database.run("DROP TABLE delivered");
+        database.run("DROP TABLE delivered; DROP TABLE contents; DROP TABLE awaited; DROP TABLE uploads");
         database.setVersion(1);
     }
     EXPECT_EQ(askAnother("references <id>", "[]"), server::references({"branch main b"}));
@@ -67,7 +67,7 @@ TEST_F(ServerFolder, OfAnEarlierVersionCountsAllCommitsAsHandedOut)
 
 TEST_F(ServerFolder, OfANewerVersionIsRefused)
 {
-    tav::Database(databasePath()).setVersion(3);
+    tav::Database(databasePath()).setVersion(4);
     EXPECT_EQ(
         askAnother("repositories", ""),
         "error: The database '" + databasePath() +
