@@ -7,6 +7,7 @@
 #include <charconv>
 #include <map>
 #include <string_view>
+#include <unordered_map>
 #include <unordered_set>
 
 namespace tav {
@@ -111,21 +112,23 @@ void LastChanges::keep(std::int64_t commit, std::vector<LastChange> const& files
 std::vector<LastChange> LastChanges::readAll(std::vector<std::int64_t> const& line) const
 {
     std::unordered_set<std::int64_t> const numbers(line.begin(), line.end());
+    // In the order of the table: the index of paths has no URLs, and to look up each of them took twice as long.
     Statement rows =
-        database_->prepare("SELECT path, number, url = '' FROM changes WHERE repository = ? ORDER BY path, number");
+        database_->prepare("SELECT path, number, url = '' FROM changes WHERE repository = ? ORDER BY number, path");
     rows.with(kRepository);
-    std::vector<LastChange> files;
+    std::unordered_map<std::string, std::int64_t> last; // 0: the file has gone.
     while (rows.next()) {
-        if (numbers.count(rows.integer(1)) == 0) {
-            continue;
-        }
-        if (!files.empty() && files.back().path == rows.bytes(0)) {
-            files.pop_back();
-        }
-        if (rows.integer(2) == 0) {
-            files.push_back({std::string(rows.bytes(0)), rows.integer(1)});
+        if (numbers.count(rows.integer(1)) > 0) {
+            last[std::string(rows.bytes(0))] = rows.integer(2) == 0 ? rows.integer(1) : 0;
         }
     }
+    std::vector<LastChange> files;
+    for (auto const& [path, number] : last) {
+        if (number != 0) {
+            files.push_back({path, number});
+        }
+    }
+    std::sort(files.begin(), files.end(), [](auto const& a, auto const& b) { return a.path < b.path; });
     return files;
 }
 
