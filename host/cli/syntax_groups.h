@@ -1,0 +1,30 @@
+/// The commands in groups, in the order of the help. Each group is a source of its own, because the templates of CLI11
+/// take long to compile.
+#pragma once
+
+#include <CLI/CLI.hpp>
+
+#include <cstddef>
+#include <optional>
+#include <string>
+
+namespace tav {
+
+void addChangeCommands(CLI::App& app); ///< work in the folder, up to its commit
+/// Looking at versions. `behindDashes` is that of `addCommands`.
+void addHistoryCommands(CLI::App& app, std::optional<std::size_t> behindDashes);
+void addReferenceCommands(CLI::App& app); ///< going to versions, branches and tags, and back
+void addSetupCommands(CLI::App& app);     ///< the repository as a whole
+
+inline void addJson(CLI::App& command, bool& json)
+{
+    command.add_flag("--json", json, "Print a document for programs");
+}
+
+/// The examples of a command, below its help.
+inline void addExamples(CLI::App& command, char const* examples)
+{
+    command.footer(std::string("Examples:\n") + examples);
+}
+
+} // namespace tav
