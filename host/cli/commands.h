@@ -61,6 +61,19 @@ struct CommitOptions {
 };
 void makeCommit(CommitOptions const& options);
 
+struct RevertOptions {
+    std::string commit;
+    std::optional<std::string> message; ///< none: one that names the commit
+};
+void revertCommit(RevertOptions const& options);
+
+struct StashOptions {
+    std::vector<std::string> words; ///< what to do, and with which stash or which files; none: put everything aside
+    std::string message;
+    bool json = false;
+};
+void stash(StashOptions const& options);
+
 struct LogOptions {
     WordList arguments; ///< the commit to begin with, and names
     std::string since;

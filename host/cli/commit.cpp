@@ -1,11 +1,10 @@
 #include "host/commits/commit.h"
 #include "host/changes/status.h"
 #include "host/cli/commands.h"
+#include "host/cli/commit_author.h"
 #include "host/cli/commit_message.h"
-#include "host/cli/current_settings.h"
 #include "host/cli/output.h"
 #include "host/cli/status_lines.h"
-#include "host/cli/terminal.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
 #include "host/session/write_session.h"
@@ -25,18 +24,6 @@ void checkText(std::string const& text, char const* what)
     if (isBlank) {
         throw Failure(std::string("The ") + what + " is empty.", "Say what has changed, and who made the change.");
     }
-}
-
-/// The first commit of a user is the time to learn the name; it is asked for once.
-std::string askForName(std::string const& usual)
-{
-    auto const answer = ask("Your name for commits [" + usual + "]:");
-    if (!answer) {
-        return usual;
-    }
-    std::string const name = answer->empty() ? usual : *answer;
-    saveSetting("user.name", name, Origin::user);
-    return name;
 }
 
 using Replaced = std::optional<CommitRecord>;
@@ -59,8 +46,7 @@ std::string authorOf(CommitOptions const& options, Replaced const& replaced)
     if (!options.author.empty() || replaced) {
         return options.author.empty() ? replaced->author.ansi_str() : options.author;
     }
-    SettingEntry const name = currentSettings().effective("user.name");
-    return name.origin == Origin::standard && canAsk() ? askForName(name.value) : name.value;
+    return commitAuthor();
 }
 
 void printCommit(CommitRecord const& commit, char const* verb, Replaced const& replaced = {})

@@ -125,6 +125,38 @@ void addCommit(CLI::App& app)
     });
 }
 
+void addRevert(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("revert", "Make a commit that does the opposite of another one");
+    auto const options = std::make_shared<RevertOptions>();
+    command->add_option("COMMIT", options->commit, "Number, hash, branch or tag, HEAD~2 or master@{yesterday}")
+        ->required();
+    command->add_option("-m,--message", options->message, "By default the message names the commit");
+    addExamples(*command, "  tav revert 12    take back what commit 12 has changed");
+    command->callback([options] { revertCommit(*options); });
+}
+
+void addStash(CLI::App& app)
+{
+    CLI::App* const command = app.add_subcommand("stash", "Put unfinished work aside, and bring it back");
+    command->alias("shelve");
+    auto const options = std::make_shared<StashOptions>();
+    command->add_option(
+        "NAME", options->words,
+        "Files or folders to put aside, by default everything; or one of: list, show [N], pop [N], apply [N], drop "
+        "[N], "
+        "push [NAME ...]");
+    command->add_option("-m,--message", options->message, "What the work is");
+    addJson(*command, options->json);
+    addExamples(
+        *command, "  tav stash -m 'half a roof'    put all changes aside\n"
+                  "  tav stash list                show what has been put aside\n"
+                  "  tav stash pop                 bring the last one back\n"
+                  "  tav stash apply 2             bring stash 2 back, and keep it\n"
+                  "  tav stash drop 2              throw it away");
+    command->callback([options] { stash(*options); });
+}
+
 } // namespace
 
 void addChangeCommands(CLI::App& app)
@@ -136,6 +168,8 @@ void addChangeCommands(CLI::App& app)
     addMv(app);
     addRm(app);
     addCommit(app);
+    addRevert(app);
+    addStash(app);
 }
 
 } // namespace tav

@@ -31,12 +31,13 @@ struct Damage {
     OdString store;   ///< path of the file that is damaged
 };
 
-/// Of a content that only the log of operations names there is no commit.
+/// Of a content that only the log of operations or a stash names there is no commit.
 FileVersion fileAt(OdString const& url, LocalDatabase const& database)
 {
     FileVersion file = database.commits().firstFileAt(url);
     if (file.commit == 0) {
         file.path = database.operations().pathAt(url);
+        file.path = file.path.isEmpty() && database.hasShelves() ? database.shelves().pathAt(url) : file.path;
     }
     return file;
 }
@@ -44,7 +45,7 @@ FileVersion fileAt(OdString const& url, LocalDatabase const& database)
 std::string ownerOf(FileVersion const& file)
 {
     return "for '" + file.path.ansi_str() + "' " +
-           (file.commit == 0 ? "of the commands to undo" : "of commit " + std::to_string(file.commit));
+           (file.commit == 0 ? "of the commands to undo or the stash" : "of commit " + std::to_string(file.commit));
 }
 
 std::vector<Damage>

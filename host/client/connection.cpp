@@ -142,12 +142,14 @@ Connection::Connection(OdString const& serverFolder, OdString repository)
 OdString Connection::request(char const* verb, OdString const& document)
 {
     auto const answer = server_->request(OdString(verb, CP_UTF_8) + L" " + repository_, document);
-    bool const isUnknown =
-        !answer.hasValue() && answer.error().code == static_cast<std::int32_t>(ServerError::noRepository);
+    auto const kind = static_cast<ServerError>(answer.hasValue() ? 0 : answer.error().code);
     return valueOrFail(
-        answer, isUnknown ? "The folder of the server is '" + folder_.ansi_str() +
-                                "'. Run 'tav server FOLDER' with the one that has it, or add --send to make it there."
-                          : "Your working folder is as it was.");
+        answer, kind == ServerError::noRepository
+                    ? "The folder of the server is '" + folder_.ansi_str() +
+                          "'. Run 'tav server FOLDER' with the one that has it, or add --send to make it there."
+                : kind == ServerError::inUse
+                    ? "'tav revert' makes one that does the opposite. Your working folder is as it was."
+                    : "Your working folder is as it was.");
 }
 
 } // namespace tav

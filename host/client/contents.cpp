@@ -4,6 +4,7 @@
 #include "host/text/characters.h"
 
 #include <algorithm>
+#include <set>
 
 namespace tav {
 
@@ -19,6 +20,16 @@ bool isHere(OdString const& url, LocalDatabase const& database, LocalStorage& st
     return !isKept.hasValue() || isKept.value(); // One that cannot be looked for is not given up.
 }
 
+/// What undoing may bring back, and what has been put aside; no commit has most of it.
+std::set<OdString> urlsOfWork(LocalDatabase const& database)
+{
+    std::set<OdString> urls;
+    auto const add = [&](std::vector<OdString> const& more) { urls.insert(more.begin(), more.end()); };
+    add(database.hasOperations() ? database.operations().urls() : std::vector<OdString>());
+    add(database.hasShelves() ? database.shelves().urls() : std::vector<OdString>());
+    return urls;
+}
+
 } // namespace
 
 Contents contentsOf(common::RootPath const& root, LocalDatabase const& database)
@@ -26,7 +37,7 @@ Contents contentsOf(common::RootPath const& root, LocalDatabase const& database)
     Contents contents;
     LocalStorage storage(root);
     std::vector<OdString> const committed = database.commits().urls();
-    for (OdString const& url : database.hasOperations() ? database.operations().urls() : std::vector<OdString>()) {
+    for (OdString const& url : urlsOfWork(database)) {
         if (!std::binary_search(committed.begin(), committed.end(), url)) {
             contents.here.push_back(url);
         }

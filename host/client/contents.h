@@ -10,7 +10,8 @@
 
 namespace tav {
 
-/// The URLs of all files of all known commits, and of those that operations may have to bring back, each once.
+/// The URLs of all files of all known commits, of those that operations may have to bring back, and of those that have
+/// been put aside, each once.
 struct Contents {
     std::vector<OdString> here;      ///< kept here; only reading them shows whether they are intact
     std::vector<OdString> elsewhere; ///< of commits that were made in other folders, where their contents are

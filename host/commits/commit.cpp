@@ -264,6 +264,18 @@ void failIfNothingIsLeft(Draft const& draft, CommitRecord const& replaced)
     }
 }
 
+/// A file whose former path is left alone has not been renamed by the commit.
+void leaveOthers(std::set<OdString> const& only, std::vector<PlannedFile>& plan)
+{
+    auto const isOther = [&](PlannedFile const& file) { return only.count(file.path) == 0; };
+    plan.erase(std::remove_if(plan.begin(), plan.end(), isOther), plan.end());
+    for (PlannedFile& file : plan) {
+        if (only.count(file.previousPath) == 0) {
+            file.previousPath = OdString::kEmpty;
+        }
+    }
+}
+
 /// The state file may come from anywhere.
 void checkNames(std::vector<PlannedFile> const& plan)
 {
@@ -463,14 +475,19 @@ finish(common::RootPath const& root, LocalDatabase& database, PendingCommit cons
 
 } // namespace
 
-Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start)
+void requireCommittable(common::RootPath const& root, LocalDatabase& database)
 {
     requireNoConflicts(root);
-    auto const cache = readState(root);
-    common::State state = cache->read();
     Connection server(database); // Without one there is nothing to begin.
     fetchHistory(root, database, server, Compared::theEnd);
-    failIfNotAtTheEnd(database, state.head);
+    failIfNotAtTheEnd(database, readState(root)->read().head);
+}
+
+Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOrder const& order, std::uint64_t start)
+{
+    requireCommittable(root, database);
+    auto const cache = readState(root);
+    common::State state = cache->read();
     requireReplacedIsCurrent(order, database);
     Draft draft{root, database, start, database.commits().files(database.currentCommit()), {}, {}};
     FolderChanges const changes = compareWithBase(draft);
@@ -481,6 +498,9 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     failIfUnreachable(state, changes.unreadable, root);
     Renames const renames = findRenames(changes, state, database, root);
     std::vector<PlannedFile> plan = planCommit(state, changes, renames, draft.files, root);
+    if (!order.only.empty()) {
+        leaveOthers(order.only, plan);
+    }
     planMissing(plan, state, formerPathsOfMoves(renames, database, root), order.missing, root);
     if (plan.empty()) {
         if (auto const last = lastCommitIfOf(order, database)) {

@@ -6,6 +6,7 @@
 
 #include <cstdint>
 #include <optional>
+#include <set>
 
 namespace tav {
 
@@ -15,12 +16,16 @@ struct CommitOrder {
     Missing missing = Missing::areRemoved;
     bool takesModified = false;                ///< changed files are taken without being staged; new ones are not
     std::optional<CommitRecord> replaced = {}; ///< the commit whose place the new one takes: the current one
+    std::set<OdString> only = {};              ///< what has changed at other paths stays; none: everything is taken
 };
 
 struct Committed {
     CommitRecord commit;
     bool isNew; ///< false: the order repeats the last commit, and there is nothing else to commit
 };
+
+/// Gets the commits that others have made. Throws `Failure` when no commit can be made here now.
+void requireCommittable(common::RootPath const& root, LocalDatabase& database);
 
 /// Commits what is staged, what has been renamed, and, as far as the order says so, the removal of missing files.
 /// Contents are stored, flushed and read back before the commit is sent to the server. If the process is killed at any

@@ -75,6 +75,8 @@ _tav_options() { # COMMAND
         rm | mv | gc) printf '%s\n' --dry-run ;;
         restore) printf '%s\n' --from --to --force --dry-run ;;
         undo) printf '%s\n' --list -n --count --dry-run --force --json ;;
+        revert) printf '%s\n' -m --message ;;
+        stash) printf '%s\n' -m --message --json ;;
         redo) printf '%s\n' --dry-run --force --json ;;
         checkout) printf '%s\n' --force --dry-run ;;
         switch) printf '%s\n' -c --create --force --dry-run ;;
@@ -102,7 +104,8 @@ _tav_value() { # COMMAND OPTION
         ignore:--remove) _tav_offer < <(_tav_ask ignore) ;;
         ignore:--why | restore:--to) _tav_offer_files -f ;;
         projects:--forget) _tav_offer < <(_tav_ask projects --json | _tav_texts path) ;;
-        commit:-m | commit:--message | commit:--author | log:-n | log:--count | undo:-n | undo:--count | ignore:--add) ;;
+        commit:-m | commit:--message | revert:-m | revert:--message | stash:-m | stash:--message) ;;
+        commit:--author | log:-n | log:--count | undo:-n | undo:--count | ignore:--add) ;;
         log:--since | log:--until) _tav_offer_words today yesterday ;;
         log:--author) ;;
         *) return 1 ;;
@@ -113,6 +116,10 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
     case $1:$2 in
         add:*) _tav_offer_paths modified untracked ;;
         unstage:*) _tav_offer_paths staged ;;
+        stash:*)
+            (($2 > 1)) || _tav_offer_words push list show pop apply drop
+            _tav_offer_paths modified untracked removed staged
+            ;;
         diff:*)
             _tav_offer_paths modified untracked removed staged renamed
             _tav_offer < <(_tav_references branch tag)
@@ -129,12 +136,12 @@ _tav_argument() { # COMMAND NUMBER, which begins with 1
             _tav_offer_files -f
             (($2 > 1)) || _tav_offer < <(_tav_references branch tag)
             ;;
-        show:1 | cat:1 | open:1 | compare:[23] | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
+        show:1 | cat:1 | open:1 | revert:1 | compare:[23] | checkout:1 | export:1 | branch:2 | tag:2) _tav_offer < <(_tav_references branch tag) ;;
     esac
 }
 
 _tav() {
-    local commands='init status add unstage mv rm commit log show cat open diff preview compare restore checkout switch undo redo
+    local commands='init status add unstage mv rm commit revert stash log show cat open diff preview compare restore checkout switch undo redo
         branch tag fetch server files ignore config projects verify gc export'
     local current=${COMP_WORDS[COMP_CWORD]} previous=${COMP_WORDS[COMP_CWORD - 1]}
     local command='' folder='' number=1 word i
@@ -146,6 +153,7 @@ _tav() {
             :-C) ((++i == COMP_CWORD)) || folder=${COMP_WORDS[i]//[\\\"\']/} ;;
             :-*) ;;
             :*) command=$word ;;
+            revert:-m | revert:--message | stash:-m | stash:--message) ((++i)) ;;
             commit:-m | commit:--message | commit:-F | commit:--file | commit:--author) ((++i)) ;;
             log:-n | log:--count) ((++i)) ;;
             preview:-o | preview:--output | compare:-o | compare:--output) ((++i)) ;;

@@ -1,6 +1,6 @@
 # Completion of tav for fish: commands, options, files, branches and tags.
 
-set -l commands init status add unstage mv rm commit log show cat open diff preview compare restore checkout switch undo redo \
+set -l commands init status add unstage mv rm commit revert stash log show cat open diff preview compare restore checkout switch undo redo \
     branch tag fetch server files ignore config projects verify gc export
 
 # Runs tav on the repository that the line names with -C, for what it knows.
@@ -72,6 +72,8 @@ __tav_command unstage 'Take files out of the next commit' $commands
 __tav_command mv 'Rename a file or folder, and stage that' $commands
 __tav_command rm 'Remove committed files, and stage that' $commands
 __tav_command commit 'Keep what is staged, removed and renamed as a new commit' $commands
+__tav_command revert 'Make a commit that does the opposite of another one' $commands
+__tav_command stash 'Put unfinished work aside, and bring it back' $commands
 __tav_command log 'Show the history, newest first' $commands
 __tav_command show 'Show a commit and what it changed, or a file of it' $commands
 __tav_command cat 'Print a file as a commit has it' $commands
@@ -119,6 +121,12 @@ complete -c tav -n '__fish_seen_subcommand_from commit' -l no-edit -d 'Keep the 
 complete -c tav -n '__fish_seen_subcommand_from commit' -l author -x -d 'Who made it'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l all-removed -d 'Remove files that are gone even when many are'
 complete -c tav -n '__fish_seen_subcommand_from commit' -l without-removed -d 'Keep files that are gone in the repository'
+complete -c tav -n '__fish_seen_subcommand_from revert' -s m -l message -x -d 'The message'
+complete -c tav -n '__fish_seen_subcommand_from revert' -a '(__tav_references branch tag)'
+complete -c tav -n '__fish_seen_subcommand_from stash' -s m -l message -x -d 'What the work is'
+complete -c tav -n '__fish_seen_subcommand_from stash' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from stash; and __tav_arguments 0 stash' -a 'push list show pop apply drop'
+complete -c tav -n '__fish_seen_subcommand_from stash' -a '(__tav_paths modified untracked removed staged)'
 complete -c tav -n '__fish_seen_subcommand_from log' -s n -l count -x -d 'Show at most this many commits'
 complete -c tav -n '__fish_seen_subcommand_from log' -l since -x -d 'Show commits made on this date or later'
 complete -c tav -n '__fish_seen_subcommand_from log' -l until -x -d 'Show commits made on this date or earlier'

@@ -37,11 +37,13 @@ void allowBasesOfObjects(Database& /*unused*/) {}
 /// Each makes the next version out of the one before; a new file is version 0. Steps are added and never changed: files
 /// that earlier versions of tav made have to pass them all.
 constexpr std::array kSteps = {makeFirstTables,     VerifiedFiles::create, CommitTables::createIndex,
-                               LastChanges::create, allowBasesOfObjects,   Operations::create};
+                               LastChanges::create, allowBasesOfObjects,   Operations::create,
+                               Shelves::create};
 
 constexpr std::int64_t kVersion = kSteps.size();
 constexpr std::int64_t kFirstWithVerifiedFiles = 2;
 constexpr std::int64_t kFirstWithOperations = 6;
+constexpr std::int64_t kFirstWithShelves = 7;
 constexpr char const* kAdviceForDamage =
     "Put a copy of it from a backup in its place, or move it away and run 'tav init', which makes it again from the "
     "server.";
@@ -98,6 +100,7 @@ LocalDatabase::LocalDatabase(std::string const& path, Use use, common::RootPath 
     , commits_(database_, 1)
     , verifiedFiles_(database_)
     , operations_(database_)
+    , shelves_(database_)
 {
     std::int64_t const version = database_.version();
     if (version > kVersion) {
@@ -134,6 +137,11 @@ void LocalDatabase::addVerified(VerifiedFileList const& files)
 bool LocalDatabase::hasOperations() const
 {
     return database_.version() >= kFirstWithOperations;
+}
+
+bool LocalDatabase::hasShelves() const
+{
+    return database_.version() >= kFirstWithShelves;
 }
 
 PendingOperation LocalDatabase::pendingOperation() const

@@ -3,6 +3,7 @@
 
 #include "host/history/commit_tables.h"
 #include "host/repository/operations.h"
+#include "host/repository/shelves.h"
 #include "host/repository/verified_files.h"
 
 #include "common/mu_common_repo_prop.h"
@@ -60,6 +61,10 @@ public:
     bool hasOperations() const;
     Operations& operations() { return operations_; }
     Operations const& operations() const { return operations_; }
+    /// Whether work can have been put aside: databases of earlier versions have no place for it.
+    bool hasShelves() const;
+    Shelves& shelves() { return shelves_; }
+    Shelves const& shelves() const { return shelves_; }
     /// The pending operation, also of a database that an earlier version made.
     PendingOperation pendingOperation() const;
 
@@ -87,6 +92,7 @@ private:
     CommitTables commits_;
     VerifiedFiles verifiedFiles_;
     Operations operations_;
+    Shelves shelves_;
 };
 
 } // namespace tav

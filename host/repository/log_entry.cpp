@@ -25,11 +25,11 @@ LogEntry::~LogEntry()
     }
 }
 
-void LogEntry::write(common::State const& after)
+void LogEntry::write(common::State const& after, std::function<void(std::int64_t id)> const& add)
 {
     operation_.staging = stagingChange(before_, after);
     bool const isEmptyEntry =
-        isEmpty(operation_.staging) && operation_.files.empty() && operation_.kind != Kind::rename;
+        isEmpty(operation_.staging) && operation_.files.empty() && operation_.kind != Kind::rename && !add;
     if (isEmptyEntry) {
         return;
     }
@@ -38,6 +38,9 @@ void LogEntry::write(common::State const& after)
         operation_.id = database_.operations().add(operation_);
     } else {
         database_.operations().setStaging(operation_.id, operation_.staging);
+    }
+    if (add) {
+        add(operation_.id);
     }
     transaction.commit();
 }

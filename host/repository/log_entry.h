@@ -5,6 +5,9 @@
 
 #include "common/mu_common_state.h"
 
+#include <cstdint>
+#include <functional>
+
 namespace tav {
 
 /// The entry of a command that changes files of the working folder or what is staged. It is taken out again when it
@@ -21,8 +24,9 @@ public:
     Operation& operation() { return operation_; }
 
     /// Writes the entry, with what is staged in `after`, before the command changes anything on the disk; a second time
-    /// when it is known only then what is staged. Where nothing changes, nothing is written.
-    void write(common::State const& after);
+    /// when it is known only then what is staged. Where nothing changes, nothing is written, unless there is something
+    /// that belongs to the entry: `add` gets its number, as a part of the same transaction.
+    void write(common::State const& after, std::function<void(std::int64_t id)> const& add = {});
     void keep() { operation_.id = 0; }
 
 private:

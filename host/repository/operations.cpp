@@ -2,6 +2,7 @@
 
 #include "host/errors/failure.h"
 #include "host/repository/earlier_journal.h"
+#include "host/repository/shelves.h"
 
 #include <ctime>
 #include <string>
@@ -219,6 +220,7 @@ void Operations::setPhase(std::int64_t id, Phase phase)
 
 void Operations::remove(std::int64_t id)
 {
+    Shelves::forget(id, *database_);
     for (char const* const table : {"operation_files", "operation_staging", "operation_renames"}) {
         removeFrom(table, id);
     }

@@ -191,7 +191,7 @@ TEST_F(Amend, LeavesACommitThatATagNames)
     EXPECT_EQ(
         tav({"commit", "--amend", "-m", "another"}),
         failed("tav: Commit 2 cannot be taken back: 'tender' has it. Make another commit that puts things right. "
-               "Your working folder is as it was.\n"));
+               "'tav revert' makes one that does the opposite. Your working folder is as it was.\n"));
     EXPECT_THAT(numbers(), ElementsAre("2", "1"));
     EXPECT_EQ(state(), before);
 }
@@ -205,7 +205,7 @@ TEST_F(Amend, LeavesACommitThatAnotherFolderHas)
     EXPECT_EQ(
         tav({"commit", "--amend", "-m", "another"}),
         failed("tav: Commit 3 cannot be taken back: it may be in other working folders. Make another commit that puts "
-               "things right. Your working folder is as it was.\n"));
+               "things right. 'tav revert' makes one that does the opposite. Your working folder is as it was.\n"));
     EXPECT_THAT(numbers(), ElementsAre("3", "2", "1"));
 }
 

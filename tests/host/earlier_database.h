@@ -12,8 +12,8 @@ inline void makeSecondVersion(std::string const& path, OdString const& noted)
 {
     tav::Database database(path);
     for (char const* const table :
-         {"operation_files", "operation_staging", "operation_renames", "operations", "pending_begun",
-          "pending_contents", "pending_files"}) {
+         {"shelf_renames", "shelf_staging", "shelf_files", "shelves", "operation_files", "operation_staging",
+          "operation_renames", "operations", "pending_begun", "pending_contents", "pending_files"}) {
         database.run(("DROP TABLE " + std::string(table)).c_str());
     }
     database.run("DROP INDEX changes_by_path; DROP TABLE last_changes");

@@ -68,7 +68,7 @@ TEST_F(LocalDatabase, IsBroughtToThisVersionForWhoChangesIt)
 {
     makeFirstVersion();
     tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
-    EXPECT_EQ(version(), 6);
+    EXPECT_EQ(version(), 7);
     database.addVerified({verified("a.dwg")});
     EXPECT_THAT(tav::LocalDatabase::open(repo.root()).verifiedFiles(), ElementsAre(verified("a.dwg")));
 }
@@ -123,7 +123,7 @@ TEST_F(LocalDatabase, TakesOverACheckoutThatTheSecondVersionHasNoted)
 
 TEST_F(LocalDatabase, IsRefusedWhenANewerVersionMadeIt)
 {
-    tav::Database(path).setVersion(7);
+    tav::Database(path).setVersion(8);
     try {
         tav::LocalDatabase::open(repo.root());
         FAIL() << "no failure";

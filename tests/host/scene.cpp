@@ -267,6 +267,9 @@ std::string Scene::work() const
         text += "renamed " + previous.ansi_str() + " " + path.ansi_str() + "\n";
     }
     tav::LocalDatabase const local = tav::LocalDatabase::open(root());
+    for (tav::Shelf const& shelf : local.shelves().all()) {
+        text += "put aside " + std::to_string(shelf.id) + "\n";
+    }
     tav::Database const server(place_.pathTo("now/server/server.db"));
     std::string const refs = "name || ' ' || type || ' ' || number";
     return text + "at " + local.currentCommit().ansi_str() + "\n" + rowsOf(server, "refs", refs) +
@@ -339,6 +342,12 @@ void changeFiles(Scene const& scene)
     scene.write("more/added.txt", "added");
     fs::remove_all(scene.folder() + "/new");
     require(scene.tav({"add", "--all"}).code == 0, "stage");
+}
+
+void putAside(Scene const& scene)
+{
+    changeFiles(scene);
+    require(scene.tav({"stash"}).code == 0, "put the changes aside");
 }
 
 /// What is staged where the two commits agree is carried along.
@@ -481,7 +490,11 @@ std::vector<SceneRow> const& undoRows()
         {"Checkout", {"checkout", "1"}, stageNewFile},
         {"CheckoutByForce", {"checkout", "1", "--force"}, editNote},
         {"Commit", {"commit", "-m", "third", "--author", "ann@studio", "--all-removed"}, changeFiles},
-        {"Amend", {"commit", "--amend", "-m", "more", "--all-removed"}, changeFiles}};
+        {"Amend", {"commit", "--amend", "-m", "more", "--all-removed"}, changeFiles},
+        {"Revert", {"revert", "2"}, stageNewFile},
+        {"Stash", {"stash", "-m", "more"}, changeFiles},
+        {"StashPop", {"stash", "pop"}, putAside},
+        {"StashDrop", {"stash", "drop"}, putAside}};
     return rows;
 }
 

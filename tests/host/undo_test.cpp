@@ -173,8 +173,9 @@ TEST_F(Undo, LeavesACommitThatATagNames)
     EXPECT_EQ(commitAll("second").code, 0);
     working({"tag", "as built"});
     EXPECT_EQ(
-        tav({"undo"}), failed("tav: Commit 2 cannot be taken back: 'as built' has it. Make another commit that puts "
-                              "things right. Your working folder is as it was.\n"));
+        tav({"undo"}),
+        failed("tav: Commit 2 cannot be taken back: 'as built' has it. Make another commit that puts "
+               "things right. 'tav revert' makes one that does the opposite. Your working folder is as it was.\n"));
     EXPECT_EQ(status(), kClean);
 }
 
@@ -196,6 +197,21 @@ TEST_F(Undo, ShowsWhatItWouldDoAndDoesNothing)
     EXPECT_THAT(working({"undo", "--dry-run"}), HasSubstr("        write:  plan.dwg\n"));
     EXPECT_FALSE(repo.has("plan.dwg"));
     EXPECT_THAT(states(), ElementsAre("done", "done", "done"));
+}
+
+TEST_F(Undo, RefusesWhereTheFolderStandsElsewhere)
+{
+    repo.write("plan.dwg", "two");
+    EXPECT_EQ(commitAll("second").code, 0);
+    working({"branch", "вариант"});
+    std::string const onMaster = state();
+    std::string const onVariant = std::regex_replace(onMaster, std::regex("master"), "вариант");
+    repo.write(".tav/tav.state", onVariant); // As an editor may do.
+    EXPECT_EQ(
+        tav({"undo"}), failed("tav: 'commit -m second' cannot be taken back. Nothing has changed; see 'tav undo "
+                              "--list':\n  The working folder is at another commit or branch now.\n"));
+    EXPECT_EQ(state(), onVariant);
+    EXPECT_THAT(values({"log"}, "number"), ElementsAre("2", "1"));
 }
 
 TEST_F(Undo, RefusesWhereTheStagedFilesAreOthers)
