@@ -210,7 +210,12 @@ struct ProjectsOptions {
 void projects(ProjectsOptions const& options);
 
 void verifyAll(bool json);
-void collectGarbage(bool dryRun);
+
+struct GcOptions {
+    bool dryRun = false;
+    bool dropsUndo = false; ///< forgets what could be undone
+};
+void collectGarbage(GcOptions const& options);
 void exportCommit(std::string const& typed, std::string const& target);
 
 } // namespace tav

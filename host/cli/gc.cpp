@@ -14,6 +14,9 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <cstdint>
+#include <limits>
+#include <optional>
 #include <set>
 #include <string>
 #include <variant>
@@ -115,6 +118,27 @@ void reportTurnedOver(Freed const& freed)
     }
 }
 
+void requireConsent()
+{
+    auto const answer = canAsk() ? ask("Forget all that 'tav undo' could take back? [y/N]") : "y";
+    if (answer != "y" && answer != "Y") {
+        throw Failure("Nothing has been forgotten.", "Answer 'y' to do it.");
+    }
+}
+
+/// The operation that is under way is still to be completed.
+void dropLog(LocalDatabase& database)
+{
+    WriteTransaction transaction(database.database());
+    for (Operation const& operation : database.operations().latest(std::numeric_limits<std::int32_t>::max())) {
+        Phase const phase = operation.phase;
+        if (phase == Phase::done || phase == Phase::undone || phase == Phase::superseded) {
+            database.operations().remove(operation.id);
+        }
+    }
+    transaction.commit();
+}
+
 /// Without asking the server: it may know of commits that need some of these.
 void preview()
 {
@@ -132,14 +156,20 @@ void preview()
 
 } // namespace
 
-void collectGarbage(bool dryRun)
+void collectGarbage(GcOptions const& options)
 {
-    if (dryRun) {
+    if (options.dryRun) {
         preview();
         return;
     }
+    if (options.dropsUndo) {
+        requireConsent();
+    }
     WriteSession session(openRepository(""), "gc", Recovery::attempted);
     session.database().failIfDamaged();
+    if (options.dropsUndo) {
+        dropLog(session.database());
+    }
     LocalStorage storage(session.root());
     Cleaned const cleaned = removeWhatNobodyNeeds(session, storage);
     RemovedFiles const files = cleanRemovedFiles(session.root(), session.database(), storage);

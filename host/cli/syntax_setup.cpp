@@ -101,9 +101,12 @@ void addOnlyJson(CLI::App& command, void (*run)(bool json))
 void addGc(CLI::App& app)
 {
     CLI::App* const command = app.add_subcommand("gc", "Remove what no commit needs from the storage");
-    auto const dryRun = std::make_shared<bool>(false);
-    command->add_flag("--dry-run", *dryRun, "Only show how much would be removed, as far as it is known here");
-    command->callback([dryRun] { collectGarbage(*dryRun); });
+    auto const options = std::make_shared<GcOptions>();
+    CLI::Option* const dryRun = command->add_flag(
+        "--dry-run", options->dryRun, "Only show how much would be removed, as far as it is known here");
+    command->add_flag("--drop-undo", options->dropsUndo, "Forget what 'tav undo' could take back, and free that too")
+        ->excludes(dryRun);
+    command->callback([options] { collectGarbage(*options); });
 }
 
 void addExport(CLI::App& app)

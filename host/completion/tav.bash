@@ -72,7 +72,8 @@ _tav_options() { # COMMAND
         preview) printf '%s\n' -o --output --json ;;
         compare) printf '%s\n' -o --output --open --json ;;
         open) printf '%s\n' --print ;;
-        rm | mv | gc) printf '%s\n' --dry-run ;;
+        rm | mv) printf '%s\n' --dry-run ;;
+        gc) printf '%s\n' --dry-run --drop-undo ;;
         restore) printf '%s\n' --from --to --force --dry-run ;;
         undo) printf '%s\n' --list -n --count --dry-run --force --json ;;
         revert) printf '%s\n' -m --message ;;

@@ -205,6 +205,7 @@ complete -c tav -n '__fish_seen_subcommand_from config; and __tav_arguments 0 co
 complete -c tav -n '__fish_seen_subcommand_from projects' -l forget -x -a '(__fish_complete_directories)' -d 'Take one off the list'
 complete -c tav -n '__fish_seen_subcommand_from projects' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from verify' -l json -d 'Print a document for programs'
+complete -c tav -n '__fish_seen_subcommand_from gc' -l drop-undo -d 'Forget what could be taken back'
 complete -c tav -n '__fish_seen_subcommand_from gc' -l dry-run -d 'Only show how much would be removed'
 complete -c tav -n '__fish_seen_subcommand_from export; and __tav_arguments 0 export' -a '(__tav_references branch tag)'
 complete -c tav -n '__fish_seen_subcommand_from export; and __tav_arguments 1 export' -a '(__fish_complete_directories)'

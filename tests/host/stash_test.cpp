@@ -106,6 +106,19 @@ TEST_F(Stash, ThatIsDroppedComesBackWithUndo)
     expectAsBefore();
 }
 
+TEST_F(Stash, StaysWhenTheLogIsForgotten)
+{
+    working({"stash"});
+    working({"gc", "--drop-undo"});
+    working({"stash", "pop"});
+    expectAsBefore();
+    working({"stash"});
+    working({"stash", "drop"});
+    working({"gc", "--drop-undo"});
+    EXPECT_THAT(ids(), IsEmpty());
+    EXPECT_THAT(working({"verify"}), HasSubstr("Read 5 stored versions"));
+}
+
 TEST_F(Stash, TakesOnlyTheNamedFiles)
 {
     EXPECT_EQ(

@@ -191,6 +191,28 @@ TEST_F(Undo, HasNothingToDoAgainAfterAnotherCommand)
     EXPECT_THAT(states(), ElementsAre("done", "superseded", "done", "done"));
 }
 
+TEST_F(Undo, IsForgottenOnRequestAndItsContentsGo)
+{
+    repo.write("plan.dwg", "unsaved");
+    working({"restore", "plan.dwg", "--force"});
+    EXPECT_EQ(working({"gc"}), "Removed 0 stored versions that no commit needs; 0 bytes freed.\n");
+    EXPECT_THAT(working({"gc", "--drop-undo"}), HasSubstr("Removed 1 stored version that no commit needs; "));
+    EXPECT_EQ(tav({"undo"}), failed("tav: There is nothing to undo. See 'tav undo --list'.\n"));
+    EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Undo, IsForgottenAtATerminalOnlyByAYes)
+{
+    Setting terminal = setting();
+    terminal.isOnTerminal = true;
+    terminal.input = "n\n";
+    EXPECT_EQ(run(terminal, {"gc", "--drop-undo"}).code, 1);
+    EXPECT_EQ(commands().size(), 2U);
+    terminal.input = "y\n";
+    EXPECT_EQ(run(terminal, {"gc", "--drop-undo"}).code, 0);
+    EXPECT_EQ(commands().size(), 0U);
+}
+
 TEST_F(Undo, ShowsWhatItWouldDoAndDoesNothing)
 {
     working({"rm", "plan.dwg"});
