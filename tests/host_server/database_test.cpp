@@ -106,6 +106,38 @@ TEST_F(DatabaseTest, ReadsInsideOfAWriteTransaction)
     EXPECT_EQ(notes(database), "1 one;");
 }
 
+TEST_F(DatabaseTest, HasSmallPagesUnlessTheFileHasOthersAlready)
+{
+    auto const pageSize = [](tav::Database const& from) {
+        tav::Statement row = from.prepare("PRAGMA page_size");
+        return row.next() ? row.integer(0) : 0;
+    };
+    EXPECT_EQ(pageSize(database), 2048);
+    std::string const earlier = folder.pathTo("earlier.db");
+    {
+        tav::Database other(earlier);
+        other.run("PRAGMA page_size = 4096; CREATE TABLE notes (number INTEGER)");
+    }
+    EXPECT_EQ(pageSize(tav::Database(earlier)), 4096);
+}
+
+TEST_F(DatabaseTest, IsInTheFileWithExactlyThatName)
+{
+    for (char const* const name : {"50%25.db", "a?mode=ro&vfs=x.db", "a#b.db", "//slashes.db", "ä b.db"}) {
+        tav::Database(folder.pathTo(name)).run("CREATE TABLE notes (number INTEGER)");
+        EXPECT_GT(folder.read(name).size(), 0u) << name;
+    }
+}
+
+TEST_F(DatabaseTest, KeepsWholeSectorsOfTheDiskInItsJournal)
+{
+    tav::WriteTransaction const transaction(database);
+    add(1, L"one");
+    std::string const header = folder.read("notes.db-journal").substr(0, 28);
+    ASSERT_EQ(header.size(), 28u);
+    EXPECT_EQ(header.substr(20, 4), std::string("\0\0\x10\0", 4)) << "the length of a sector, 4096 bytes";
+}
+
 TEST_F(DatabaseTest, KeepsWhatWasCommitted)
 {
     tav::WriteTransaction transaction(database);
