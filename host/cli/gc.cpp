@@ -104,7 +104,7 @@ void failUnlessTurnedOver(TurnedOver const& turned)
 {
     if (turned.error) {
         throw Failure(
-            "Not all stored versions were turned into differences: " + turned.error->message.ansi_str(),
+            "Not all versions were stored in less space: " + turned.error->message.ansi_str(),
             "Everything else is done; correct that and run 'tav gc' again.");
     }
 }
@@ -113,8 +113,7 @@ void reportTurnedOver(Freed const& freed)
 {
     if (freed.contents > 0) {
         report(
-            "Turned " + counted(freed.contents, "stored version") + " into " +
-            (freed.contents == 1 ? "a difference; " : "differences; ") + sizeText(freed.bytes) + " freed.\n");
+            "Stored " + counted(freed.contents, "version") + " in less space; " + sizeText(freed.bytes) + " freed.\n");
     }
 }
 

@@ -30,13 +30,13 @@ void ContentWriter::writeObject(StorageUrl const& url, Content const& content, D
 }
 
 void ContentWriter::writeObjectTo(
-    std::string const& path, StorageUrl const& url, Content const& content,
-    std::optional<KnownContent> const& base) const
+    std::string const& path, StorageUrl const& url, Content const& content, std::optional<KnownContent> const& base,
+    Effort effort) const
 {
     [[maybe_unused]] std::error_code ignored = os::removeUnflushed(path); // Mostly missing.
     try {
         RecordFile file = RecordFile::create(path, "The object " + quoted(url.text()));
-        file.append(content, url.digest, base ? &*base : nullptr, segmentLog_);
+        file.append(content, url.digest, base ? &*base : nullptr, segmentLog_, effort);
     } catch (...) {
         ignored = os::removeUnflushed(path);
         throw;

@@ -30,8 +30,8 @@ public:
     void write(StorageUrl const& url, Content const& content, Digest const& base);
     /// Writes the object to the new file `path`, on `base` if that makes it smaller.
     void writeObjectTo(
-        std::string const& path, StorageUrl const& url, Content const& content,
-        std::optional<KnownContent> const& base) const;
+        std::string const& path, StorageUrl const& url, Content const& content, std::optional<KnownContent> const& base,
+        Effort effort = Effort::quick) const;
 
 private:
     void writeObject(StorageUrl const& url, Content const& content, Digest const& base);

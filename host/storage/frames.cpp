@@ -14,7 +14,8 @@ namespace tav {
 
 namespace {
 
-constexpr int kLevel = 3;
+constexpr int kQuickLevel = 3;
+constexpr int kThoroughLevel = 19;
 constexpr int kSmallestWindowLog = 10;    // that zstd accepts
 constexpr std::size_t kClearlySmall = 16; // a frame of at most this fraction of its segment
 constexpr std::size_t kDescriptor = 4;    // offset of the frame header descriptor; zstd ignores one of its bits
@@ -76,7 +77,9 @@ void requireWorked(std::size_t result)
 /// Compresses segments one after the other, with memory that serves for all.
 class SegmentCompressor {
 public:
-    SegmentCompressor() : context_(ZSTD_createCCtx(), ZSTD_freeCCtx)
+    explicit SegmentCompressor(Effort effort)
+        : level_(effort == Effort::quick ? kQuickLevel : kThoroughLevel)
+        , context_(ZSTD_createCCtx(), ZSTD_freeCCtx)
     {
         if (!context_) {
             throw std::bad_alloc();
@@ -102,7 +105,7 @@ private:
         std::size_t const room = ZSTD_compressBound(segment.size());
         char* const frame = buffer.reserve(room);
         requireWorked(ZSTD_CCtx_reset(context_.get(), ZSTD_reset_session_and_parameters));
-        set(ZSTD_c_compressionLevel, kLevel);
+        set(ZSTD_c_compressionLevel, level_);
         if (!prefix.empty()) {
             set(ZSTD_c_windowLog, windowLogFor(prefix.size() + segment.size()));
             set(ZSTD_c_enableLongDistanceMatching, 1);
@@ -118,6 +121,7 @@ private:
         requireWorked(ZSTD_CCtx_setParameter(context_.get(), parameter, value));
     }
 
+    int level_;
     Compressor context_;
     Buffer first_;
     Buffer second_;
@@ -225,11 +229,12 @@ Digest digestOf(Content const& content)
     return finish(digest);
 }
 
-Compressed
-compress(Content const& content, Digest const& digest, Content const* base, unsigned segmentLog, Sink const& sink)
+Compressed compress(
+    Content const& content, Digest const& digest, Content const* base, unsigned segmentLog, Effort effort,
+    Sink const& sink)
 {
     std::uint64_t const segmentLength = std::uint64_t{1} << segmentLog;
-    SegmentCompressor compressor;
+    SegmentCompressor compressor(effort);
     common::ContentDigest seen;
     Buffer segmentBuffer;
     Buffer prefixBuffer;

@@ -80,6 +80,12 @@ Content openContent(std::string const& path, std::string const& name, std::uint6
     return {std::move(bytes), count};
 }
 
+/// Packed contents do not get smaller, and long ones take minutes.
+bool isWorthEffort(Record const& record)
+{
+    return canBeCompared(record.length) && record.framesLength < record.length / 4 * 3;
+}
+
 /// What `load` returns; null when that is damaged. What the system refuses may work next time, so it is thrown.
 template <class Load>
 std::shared_ptr<Content const> unlessDamaged(Load const& load)
@@ -211,17 +217,28 @@ Expected<Freed> LocalStorage::turnOver(OdString const& text, OdString const& pat
         if (!bases_) {
             bases_.emplace(layout_);
         }
-        if (!url.isObject() || !bases_->isWhole(url.digest)) {
-            return Freed();
-        }
-        auto const content = unlessDamaged([&] {
-            reader_.read(url, [](std::string_view) {}); // Its own file, even if the content is remembered.
-            return reader_.load(url);
-        });
-        auto const base = content ? newBaseFor(url, path, *content) : std::nullopt;
-        auto const baseContent = base ? unlessDamaged([&] { return reader_.load({{}, *base}); }) : nullptr;
-        return baseContent ? replaceObject(url, *content, {*base, baseContent}) : Freed();
+        return url.isObject() && bases_->isWhole(url.digest) ? reduceObject(url, path) : Freed();
     });
+}
+
+Freed LocalStorage::reduceObject(StorageUrl const& url, OdString const& path)
+{
+    auto const content = unlessDamaged([&] {
+        reader_.read(url, [](std::string_view) {}); // Its own file, even if the content is remembered.
+        return reader_.load(url);
+    });
+    if (!content) {
+        return {};
+    }
+    std::optional<Digest> const base = newBaseFor(url, path, *content);
+    if (auto const baseContent = base ? unlessDamaged([&] { return reader_.load({{}, *base}); }) : nullptr) {
+        Freed const freed = replaceObject(url, *content, KnownContent{*base, baseContent}, Effort::quick);
+        if (freed.bytes > 0) {
+            return freed;
+        }
+    }
+    bool const isPromising = isWorthEffort(reader_.find(url).record());
+    return isPromising ? replaceObject(url, *content, std::nullopt, Effort::thorough) : Freed();
 }
 
 /// What the object can build on without a circle and without making the chain of another one too long.
@@ -240,12 +257,13 @@ std::optional<Digest> LocalStorage::newBaseFor(StorageUrl const& url, OdString c
     return chain.size() + above <= longest ? chain.front() : chain.back();
 }
 
-Freed LocalStorage::replaceObject(StorageUrl const& url, Content const& content, KnownContent const& base)
+Freed LocalStorage::replaceObject(
+    StorageUrl const& url, Content const& content, std::optional<KnownContent> const& base, Effort effort)
 {
     std::string const path = layout_.fileOf(url);
     std::string const incoming = layout_.incomingFileOf(url.digest);
     makeFolders(layout_.incomingFolder());
-    writer_.writeObjectTo(incoming, url, content, base);
+    writer_.writeObjectTo(incoming, url, content, base, effort);
     try {
         RecordFile const written = RecordFile::openForReading(incoming, "The object " + quoted(url.text()));
         std::uint64_t const before = reader_.find(url).file->length();

@@ -101,7 +101,8 @@ public:
     WriteOutcome extract(OdString const& url, std::string const& path) const;
 
     /// Stores the object at `url`, a version of the file `path`, as the difference to the version before it or to a
-    /// similar content, if it is whole and that is smaller. Returns what became free. The new form is written beside
+    /// similar content, or else compresses it more thoroughly, if it is whole and that is smaller. Returns what became
+    /// free. The new form is written beside
     /// the old one, flushed, read back, and renamed over it; call `flush` at the end. After an error the object is
     /// unchanged. Meant for one pass over all objects, older versions first: which objects build on which is read only
     /// once.
@@ -126,7 +127,9 @@ private:
     std::optional<StorageUrl> similarContent(OdString const& path, Content const& content, bool isObject);
     bool isSimilar(Samples& samples, StorageUrl const& url);
     std::optional<Digest> newBaseFor(StorageUrl const& url, OdString const& path, Content const& content);
-    Freed replaceObject(StorageUrl const& url, Content const& content, KnownContent const& base);
+    Freed reduceObject(StorageUrl const& url, OdString const& path);
+    Freed replaceObject(
+        StorageUrl const& url, Content const& content, std::optional<KnownContent> const& base, Effort effort);
 
     common::RootPath root_;
     Versions versions_;

@@ -197,14 +197,15 @@ void RecordFile::write(std::uint64_t offset, std::string_view bytes) const
 
 // The header last: without it, the frames are not a record.
 Record RecordFile::writeRecord(
-    Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog) const
+    Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog, Effort effort) const
 {
     std::uint64_t offset = end() + kHeaderLength;
     Content const* const baseContent = base != nullptr ? base->content.get() : nullptr;
-    Compressed const compressed = compress(content, digest, baseContent, segmentLog, [&](std::string_view frame) {
-        write(offset, frame);
-        offset += frame.size();
-    });
+    Compressed const compressed =
+        compress(content, digest, baseContent, segmentLog, effort, [&](std::string_view frame) {
+            write(offset, frame);
+            offset += frame.size();
+        });
     Record const record{
         digest, compressed.usesBase ? base->digest : Digest{}, content.length(), compressed.framesLength, segmentLog};
     write(end(), headerOf(record));
@@ -229,9 +230,10 @@ void RecordFile::appendRecord(Write const& write)
     }
 }
 
-void RecordFile::append(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog)
+void RecordFile::append(
+    Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog, Effort effort)
 {
-    appendRecord([&] { return writeRecord(content, digest, base, segmentLog); });
+    appendRecord([&] { return writeRecord(content, digest, base, segmentLog, effort); });
 }
 
 void RecordFile::appendFrom(RecordFile const& other, std::size_t index)

@@ -68,7 +68,9 @@ public:
 
     /// Appends `content`, as a delta to `base` if that is not null and makes it smaller. A failure leaves the file
     /// unchanged, as far as the disk permits. Throws when the digest of the content is not `digest`.
-    void append(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog);
+    void append(
+        Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog,
+        Effort effort = Effort::quick);
     /// Appends the record `index` of `other` unchanged.
     void appendFrom(RecordFile const& other, std::size_t index);
     /// Waits until the file is safe on the disk.
@@ -84,8 +86,9 @@ private:
     bool isZero(std::uint64_t offset) const;
     std::size_t readUpTo(std::uint64_t offset, char* buffer, std::size_t count) const;
     void write(std::uint64_t offset, std::string_view bytes) const;
-    Record
-    writeRecord(Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog) const;
+    Record writeRecord(
+        Content const& content, Digest const& digest, KnownContent const* base, unsigned segmentLog,
+        Effort effort) const;
     template <class Write>
     void appendRecord(Write const& write);
 

@@ -247,6 +247,22 @@ TEST_F(TurningOver, LeavesWhatDoesNotGetSmaller)
     EXPECT_THAT(files(), testing::Not(testing::Contains(testing::HasSubstr("incoming/"))));
 }
 
+TEST_F(TurningOver, CompressesMoreThoroughlyWhatStaysWhole)
+{
+    std::string text;
+    for (int i = 0; i < 3000; ++i) {
+        text += "  0\nLINE\n  5\n" + std::to_string(i * 7919 % 4099) + "\n 10\n" + std::to_string(i * 104729 % 9973);
+    }
+    std::string const url = commit("plan.dxf", text);
+    std::size_t const before = repo.read(fileOf(url)).size();
+    auto const freed = newStorage().turnOver(support::fromUtf8(url), L"plan.dxf");
+    ASSERT_TRUE(freed.hasValue()) << messageOf(freed);
+    EXPECT_EQ(repo.read(fileOf(url)).size() + freed.value().bytes, before);
+    EXPECT_LT(repo.read(fileOf(url)).size(), before * 9 / 10);
+    EXPECT_EQ(contentOf(url), text);
+    EXPECT_TRUE(objectOf(url).isWhole());
+}
+
 TEST_F(TurningOver, MakesNoCircle)
 {
     commitVersions(3);
