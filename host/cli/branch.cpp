@@ -1,5 +1,6 @@
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/planned_update.h"
 #include "host/commits/commit_names.h"
 #include "host/commits/references.h"
 #include "host/errors/failure.h"
@@ -113,6 +114,7 @@ void previewRemoval(ReferenceOptions const& options, Kind const& kind)
 {
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
+    notePending(root, database);
     print("Would delete the " + described(findRemovable(options, kind, root, database), kind, database));
 }
 

@@ -140,6 +140,7 @@ void preview(
     std::string const& what, OdString const& commit, CheckoutOptions const& options, common::RootPath const& root,
     LocalDatabase const& database)
 {
+    notePending(root, database);
     PlannedCheckout const planned = planCheckout(root, database, commit, discardOf(options));
     print("Would go to " + what + ".\n");
     printPlan(planned.update, planned.discarded);

@@ -2,6 +2,7 @@
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
 #include "host/cli/output.h"
+#include "host/cli/planned_update.h"
 #include "host/client/contents.h"
 #include "host/client/history.h"
 #include "host/commits/turn_over.h"
@@ -143,6 +144,7 @@ void preview()
 {
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
+    notePending(root, database);
     Contents const needed = contentsOf(root, database);
     std::set<OdString> unneeded = valueOrFail(LocalStorage(root).contents(), "Check your rights in '.tav'.");
     for (std::vector<OdString> const* const urls : {&needed.here, &needed.elsewhere}) {

@@ -4,6 +4,7 @@
 #include "host/checkout/file_moves.h"
 #include "host/cli/commands.h"
 #include "host/cli/output.h"
+#include "host/cli/planned_update.h"
 #include "host/cli/typed_command.h"
 #include "host/errors/failure.h"
 #include "host/repository/log_entry.h"
@@ -202,6 +203,7 @@ Planned plan(MvOptions const& options, common::RootPath const& root)
 void preview(MvOptions const& options)
 {
     common::RootPath const root = openRepository("");
+    notePending(root, LocalDatabase::open(root));
     Planned const planned = plan(options, root);
     FileMoves(root.path().ansi_str()).requireFree(planned.to.ansi_str());
     print("Would rename '" + shown(planned.from) + "' to '" + shown(planned.to) + "'.\n");

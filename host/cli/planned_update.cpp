@@ -1,6 +1,7 @@
 #include "host/cli/planned_update.h"
 
 #include "host/cli/output.h"
+#include "host/repository/journal.h"
 
 #include <set>
 #include <string>
@@ -17,6 +18,14 @@ void printFiles(char const* label, Tree const& files, std::set<OdString> const& 
 }
 
 } // namespace
+
+void notePending(common::RootPath const& root, LocalDatabase const& database)
+{
+    std::string const notice = pendingNotice(root, database);
+    if (!notice.empty()) {
+        printNote(notice);
+    }
+}
 
 void printPlan(TreeUpdate const& update, std::vector<OdString> const& discarded)
 {

@@ -140,6 +140,7 @@ writeRestored(RestoredFiles const& restored, Discard discard, OdString const& co
 void previewRestored(
     RestoredFiles const& restored, Discard discard, common::RootPath const& root, LocalDatabase const& database)
 {
+    notePending(root, database);
     TreeUpdate update;
     update.writes = restored.files;
     LocalStorage storage(root);

@@ -251,6 +251,7 @@ void preview(std::vector<std::string> const& names)
 {
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
+    notePending(root, database);
     TreeUpdate update;
     for (FileContents const& file : planRemoval(names, readState(root)->read(), database, root).files) {
         checkPath(file.path, root);

@@ -2,6 +2,8 @@
 #include "tests/host/history_test.h"
 #include "tests/support/rows.h"
 
+#include "host/repository/journal.h"
+
 #include "platform/os/os_lock.h"
 
 #include <chrono>
@@ -149,6 +151,36 @@ INSTANTIATE_TEST_SUITE_P(
         RefusedRow{"SwitchToATakenName", {"switch", "-c", "south"}},
         RefusedRow{"SwitchToABadName", {"switch", "-c", "12"}},
         RefusedRow{"BranchOfTheFolder", {"branch", "-d", "master"}}),
+    support::rowName);
+
+class PendingDryRun
+    : public HistoryTest
+    , public testing::WithParamInterface<RefusedRow> {};
+
+TEST_P(PendingDryRun, SaysThatACommitIsCompletedFirst)
+{
+    repo.write("a.dwg", "one");
+    commitAll("first");
+    tav({"branch", "draft"});
+    {
+        tav::LocalDatabase database = tav::LocalDatabase::openForChanges(repo.root());
+        tav::Operation commit;
+        commit.kind = tav::Kind::commit;
+        commit.phase = tav::Phase::running;
+        tav::beginCommit(commit, {L"{}", {}, {}}, database);
+    }
+    Outcome const outcome = tav(GetParam().arguments);
+    EXPECT_EQ(outcome.code, 0);
+    EXPECT_EQ(outcome.err, "tav: A commit was interrupted. The next command that changes something completes it.\n");
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Commands, PendingDryRun,
+    testing::Values(
+        RefusedRow{"Rm", {"rm", "--dry-run", "a.dwg"}}, RefusedRow{"Mv", {"mv", "--dry-run", "a.dwg", "b.dwg"}},
+        RefusedRow{"Restore", {"restore", "--dry-run", "a.dwg"}},
+        RefusedRow{"Switch", {"switch", "--dry-run", "draft"}}, RefusedRow{"Gc", {"gc", "--dry-run"}},
+        RefusedRow{"Branch", {"branch", "-d", "--dry-run", "draft"}}),
     support::rowName);
 
 } // namespace
