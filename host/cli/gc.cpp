@@ -1,6 +1,7 @@
 #include "host/checkout/removed_files.h"
 #include "host/cli/commands.h"
 #include "host/cli/commit_output.h"
+#include "host/cli/current_settings.h"
 #include "host/cli/output.h"
 #include "host/cli/planned_update.h"
 #include "host/client/contents.h"
@@ -12,6 +13,8 @@
 #include "host/session/write_session.h"
 #include "host/storage/local_storage.h"
 #include "host/text/plural.h"
+#include "host/text/size.h"
+#include "host/undo/log_size.h"
 
 #include <algorithm>
 #include <cstddef>
@@ -139,6 +142,14 @@ void dropLog(LocalDatabase& database)
     transaction.commit();
 }
 
+void keepLogWithinItsSize(LocalDatabase& database, LocalStorage const& storage)
+{
+    std::uint64_t const most = parseSize(currentSettings().value("undo.size")).value();
+    if (std::size_t const forgotten = limitLog(database, storage, most)) {
+        report("Forgot the " + counted(forgotten, "oldest command") + " that 'tav undo' could take back.\n");
+    }
+}
+
 /// Without asking the server: it may know of commits that need some of these.
 void preview()
 {
@@ -168,10 +179,12 @@ void collectGarbage(GcOptions const& options)
     }
     WriteSession session(openRepository(""), "gc", Recovery::attempted);
     session.database().failIfDamaged();
+    LocalStorage storage(session.root());
     if (options.dropsUndo) {
         dropLog(session.database());
+    } else {
+        keepLogWithinItsSize(session.database(), storage);
     }
-    LocalStorage storage(session.root());
     Cleaned const cleaned = removeWhatNobodyNeeds(session, storage);
     RemovedFiles const files = cleanRemovedFiles(session.root(), session.database(), storage);
     failUnlessTurnedOver(cleaned.turned);

@@ -201,7 +201,7 @@ complete -c tav -n '__fish_seen_subcommand_from config' -l unset -d 'Remove a se
 complete -c tav -n '__fish_seen_subcommand_from config' -l user -d 'For all your repositories'
 complete -c tav -n '__fish_seen_subcommand_from config' -l repository -d 'For this repository only'
 complete -c tav -n '__fish_seen_subcommand_from config' -l json -d 'Print a document for programs'
-complete -c tav -n '__fish_seen_subcommand_from config; and __tav_arguments 0 config' -a 'color editor log.date open.program pager user.name'
+complete -c tav -n '__fish_seen_subcommand_from config; and __tav_arguments 0 config' -a 'color editor log.date open.program pager undo.size user.name'
 complete -c tav -n '__fish_seen_subcommand_from projects' -l forget -x -a '(__fish_complete_directories)' -d 'Take one off the list'
 complete -c tav -n '__fish_seen_subcommand_from projects' -l json -d 'Print a document for programs'
 complete -c tav -n '__fish_seen_subcommand_from verify' -l json -d 'Print a document for programs'

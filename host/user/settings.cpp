@@ -2,6 +2,7 @@
 
 #include "host/errors/failure.h"
 #include "host/text/characters.h"
+#include "host/text/size.h"
 #include "host/text/utf8.h"
 #include "host/user/config_lock.h"
 #include "host/user/user_folders.h"
@@ -20,9 +21,10 @@ using Words = std::vector<char const*>;
 
 struct Kind {
     char const* key;
-    Words values;                   ///< that it can have; none: any text of one line
-    bool isProgram = false;         ///< never taken from a repository
-    bool mayBeEmpty = false;        ///< which then means something
+    Words values;            ///< that it can have; none: any text of one line
+    bool isProgram = false;  ///< never taken from a repository
+    bool mayBeEmpty = false; ///< which then means something
+    bool isSize = false;
     char const* variable = nullptr; ///< of the environment, which comes before all files
     Words lateVariables = {};       ///< of the environment, which come behind them
 };
@@ -31,10 +33,11 @@ std::vector<Kind> const& kinds()
 {
     static std::vector<Kind> const all = {
         {"color", {"auto", "always", "never"}},
-        {"editor", {}, true, false, "TAV_EDITOR", {"VISUAL", "EDITOR"}},
+        {"editor", {}, true, false, false, "TAV_EDITOR", {"VISUAL", "EDITOR"}},
         {"log.date", {"both", "relative", "absolute"}},
         {"open.program", {}, true},
-        {"pager", {}, true, true, "TAV_PAGER", {"PAGER"}},
+        {"pager", {}, true, true, false, "TAV_PAGER", {"PAGER"}},
+        {"undo.size", {}, false, false, true},
         {"user.name", {}},
     };
     return all;
@@ -53,6 +56,7 @@ std::string standardValue(std::string const& key)
            : key == "log.date"     ? "both"
            : key == "open.program" ? "xdg-open"
            : key == "pager"        ? "less"
+           : key == "undo.size"    ? "1 GB"
                                    : userName();
 }
 
@@ -88,6 +92,9 @@ std::optional<std::string> whyNotValue(Kind const& kind, std::string const& valu
     bool const isListed = std::find(kind.values.begin(), kind.values.end(), value) != kind.values.end();
     if (!kind.values.empty()) {
         return isListed ? std::nullopt : std::optional(listOf(kind.values));
+    }
+    if (kind.isSize) {
+        return parseSize(value) ? std::nullopt : std::optional<std::string>("a size like '500 MB'");
     }
     bool const isGood = isOneLine(value) && (!isBlank(value) || (value.empty() && kind.mayBeEmpty));
     return isGood ? std::nullopt : std::optional<std::string>("a line of text that is not empty");

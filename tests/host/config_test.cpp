@@ -79,9 +79,19 @@ TEST_F(Config, ListsEachSettingWithItsOrigin)
                                                 "log.date = relative  (repository)\n"
                                                 "open.program = xdg-open  (default)\n"
                                                 "pager =   (environment)\n"
+                                                "undo.size = 1 GB  (default)\n"
                                                 "user.name = Ann  (user)\n"));
     EXPECT_EQ(config({"--list", "--repository"}), done("log.date = relative  (repository)\n"));
     EXPECT_EQ(config({"--list", "--user"}), done("user.name = Ann  (user)\n"));
+}
+
+TEST_F(Config, TakesSizesWithTheirUnits)
+{
+    EXPECT_EQ(config({"undo.size", "20 MB"}).code, 0);
+    EXPECT_EQ(config({"undo.size"}), done("20 MB\n"));
+    EXPECT_EQ(
+        config({"undo.size", "much"}),
+        failed("tav: 'much' is not a value of 'undo.size'. Give a size like '500 MB'.\n"));
 }
 
 TEST_F(Config, HasADocument)

@@ -11,6 +11,7 @@ namespace fs = std::filesystem;
 
 using testing::ElementsAre;
 using testing::HasSubstr;
+using testing::StartsWith;
 
 class Undo : public HistoryTest {
 protected:
@@ -199,6 +200,33 @@ TEST_F(Undo, IsForgottenOnRequestAndItsContentsGo)
     EXPECT_THAT(working({"gc", "--drop-undo"}), HasSubstr("Removed 1 stored version that no commit needs; "));
     EXPECT_EQ(tav({"undo"}), failed("tav: There is nothing to undo. See 'tav undo --list'.\n"));
     EXPECT_EQ(status(), kClean);
+}
+
+TEST_F(Undo, KeepsContentsUpToTheSizeThatIsSet)
+{
+    for (std::string const content : {"12345", "67890", "abcde"}) {
+        repo.write("plan.dwg", content);
+        working({"restore", "plan.dwg", "--force"});
+    }
+    working({"config", "undo.size", "15"});
+    EXPECT_EQ(working({"gc"}), "Removed 0 stored versions that no commit needs; 0 bytes freed.\n");
+    working({"config", "undo.size", "14"});
+    EXPECT_THAT(
+        working({"gc"}), StartsWith("Forgot the 3 oldest commands that 'tav undo' could take back.\n"
+                                    "Removed 1 stored version that no commit needs; "));
+    EXPECT_EQ(commands().size(), 2U);
+    working({"undo"});
+    EXPECT_EQ(repo.read("plan.dwg"), "abcde");
+}
+
+TEST_F(Undo, KeepsTheNewestHoweverLittleRoomThereIs)
+{
+    repo.write("plan.dwg", "unsaved");
+    working({"restore", "plan.dwg", "--force"});
+    working({"config", "undo.size", "0"});
+    working({"gc"});
+    working({"undo"});
+    EXPECT_EQ(repo.read("plan.dwg"), "unsaved");
 }
 
 TEST_F(Undo, IsForgottenAtATerminalOnlyByAYes)
