@@ -85,21 +85,24 @@ PictureCache cache()
     return {userFolder("XDG_CACHE_HOME", ".cache") + "/tav/pictures", kCacheSize};
 }
 
+std::string nameInCache(OdString const& url)
+{
+    auto const digest = digestOf(url);
+    return digest ? hexOf(*digest) : std::string();
+}
+
 /// The picture of a stored content, which never changes: it is decoded once.
 DrawingPicture storedPicture(common::RootPath const& root, OdString const& url, std::string const& label)
 {
     PictureCache const kept = cache();
-    auto const digest = digestOf(url);
-    std::string const name = digest ? hexOf(*digest) : std::string();
+    std::string const name = nameInCache(url);
     if (auto const png = kept.find(name); png && !png->empty()) {
         if (auto image = decodePng(*png, kMostPixels)) {
             return {std::move(image), ""};
         }
     }
     DrawingPicture found = pictureIn(contentOf(root, url, label));
-    if (found.image) {
-        kept.keep(name, encodePng(*found.image));
-    }
+    kept.keep(name, found.image ? encodePng(*found.image) : std::string());
     return found;
 }
 
@@ -149,6 +152,13 @@ DrawingVersion drawingVersion(
     auto const [path, url] = fileOf(database.commits().files(record.hash), typed, record, root);
     std::string const label = shown(path) + " (commit " + std::to_string(record.number) + ")";
     return {path, label, pictureOrFail(storedPicture(root, url, label), label)};
+}
+
+std::optional<Image> storedPictureIfAny(common::RootPath const& root, OdString const& url)
+{
+    auto const kept = cache().find(nameInCache(url));
+    bool const isKnownToHaveNone = kept && kept->empty();
+    return isKnownToHaveNone ? std::nullopt : storedPicture(root, url, url.ansi_str()).image;
 }
 
 void writePicture(Image const& image, std::string const& file)

@@ -4,6 +4,7 @@
 #include "host/pictures/image.h"
 #include "host/repository/local_database.h"
 
+#include <optional>
 #include <string>
 
 namespace tav {
@@ -20,6 +21,9 @@ struct DrawingVersion {
 /// there is no such file, and when it has no picture.
 DrawingVersion drawingVersion(
     common::RootPath const& root, LocalDatabase const& database, std::string const& typed, std::string const& commit);
+
+/// The picture of the content at `url`, none when it has none. Throws `Failure` when it cannot be read.
+std::optional<Image> storedPictureIfAny(common::RootPath const& root, OdString const& url);
 
 /// Writes `image` as a PNG file. Throws `Failure`; a file that is not a PNG file is not overwritten.
 void writePicture(Image const& image, std::string const& file);

@@ -3,6 +3,7 @@
 #include "host/cli/current_settings.h"
 #include "host/cli/output.h"
 #include "host/cli/pager.h"
+#include "host/cli/small_pictures.h"
 #include "host/errors/failure.h"
 #include "host/history/ancestry.h"
 #include "host/history/file_history.h"
@@ -17,6 +18,7 @@
 #include <ctime>
 #include <limits>
 #include <map>
+#include <optional>
 #include <string>
 
 namespace tav {
@@ -227,7 +229,8 @@ DateForm dateForm()
     return form == "relative" ? DateForm::relative : form == "absolute" ? DateForm::absolute : DateForm::both;
 }
 
-std::string lines(Entry const& entry, Names const& names, std::int64_t now, DateForm form)
+std::string
+lines(Entry const& entry, Names const& names, std::int64_t now, DateForm form, SmallPictures const* pictures)
 {
     std::string const indent(std::to_string(entry.commit.number).size() + 2, ' ');
     OdString const author = authorName(entry.commit);
@@ -236,16 +239,26 @@ std::string lines(Entry const& entry, Names const& names, std::int64_t now, Date
     text += shownDate(entry.commit.date, now, form) + "\n";
     for (FileEvent const& file : entry.files) {
         text += indent + changeLine(file.change, file.path, file.previousPath) + "\n";
+        text += pictures ? pictures->textFor(file.url, file.path) : std::string();
     }
     return text;
 }
 
-void printForPeople(std::vector<Entry> const& entries, Names const& names, bool oneline)
+bool haveFewDrawings(std::vector<Entry> const& entries)
+{
+    std::size_t count = 0;
+    for (Entry const& entry : entries) {
+        count += entry.files.size();
+    }
+    return count > 0 && count <= kMostSmallPictures;
+}
+
+void printForPeople(std::vector<Entry> const& entries, Names const& names, bool oneline, SmallPictures const* pictures)
 {
     std::int64_t const now = std::time(nullptr);
     DateForm const form = dateForm();
     for (Entry const& entry : entries) {
-        print(oneline ? titleLine(entry.commit, names) : lines(entry, names, now, form));
+        print(oneline ? titleLine(entry.commit, names) : lines(entry, names, now, form, pictures));
     }
 }
 
@@ -253,18 +266,23 @@ void printForPeople(std::vector<Entry> const& entries, Names const& names, bool 
 
 void showLog(LogOptions const& options)
 {
-    Pager const pager;
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
     if (std::string const notice = pendingNotice(root, database); !notice.empty()) {
         printNote(notice);
     }
     std::vector<Entry> const entries = findEntries(options, root, database);
+    SmallPictures const pictures(root);
+    bool const showsPictures = pictures.canBeShown() && !options.oneline && !options.json && haveFewDrawings(entries);
+    std::optional<Pager> pager;
+    if (!showsPictures) {
+        pager.emplace();
+    }
     if (options.json) {
         printDocument(entries, namesByHash(database), database);
         return;
     }
-    printForPeople(entries, namesByHash(database), options.oneline);
+    printForPeople(entries, namesByHash(database), options.oneline, showsPictures ? &pictures : nullptr);
     if (database.commits().lastNumber() == 0) {
         print("There is no commit yet.\n");
     }

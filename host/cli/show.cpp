@@ -3,12 +3,14 @@
 #include "host/cli/content_output.h"
 #include "host/cli/output.h"
 #include "host/cli/pager.h"
+#include "host/cli/small_pictures.h"
 #include "host/commits/commit_names.h"
 #include "host/errors/failure.h"
 #include "host/repository/open.h"
 #include "host/storage/storage_url.h"
 #include "host/text/utf8.h"
 
+#include <optional>
 #include <sstream>
 #include <string>
 
@@ -76,7 +78,8 @@ std::string sizesOf(CommittedChange const& change, LocalDatabase const& database
 }
 
 void printForPeople(
-    CommitRecord const& commit, std::vector<CommittedChange> const& changes, LocalDatabase const& database)
+    CommitRecord const& commit, std::vector<CommittedChange> const& changes, LocalDatabase const& database,
+    SmallPictures const* pictures)
 {
     print("Commit " + std::to_string(commit.number) + namesOf(commit, database) + "\n");
     print("Hash:   " + commit.hash.ansi_str() + "\n");
@@ -86,7 +89,7 @@ void printForPeople(
     for (CommittedChange const& change : changes) {
         print(
             "        " + changeLine(change.change, change.path, change.previousPath) + sizesOf(change, database) +
-            "\n");
+            "\n" + (pictures ? pictures->textFor(change.url, change.path) : std::string()));
     }
 }
 
@@ -102,17 +105,23 @@ fileToShow(ShowOptions const& options, LocalDatabase const& database, common::Ro
 
 void showCommit(ShowOptions const& options)
 {
-    Pager const pager;
     common::RootPath const root = openRepository("");
     LocalDatabase const database = LocalDatabase::open(root);
     if (auto const file = fileToShow(options, database, root)) {
+        Pager const pager;
         printContent(*file, root);
         return;
     }
     CommitRecord const commit = findCommit(database, options.commit);
     std::vector<CommittedChange> const changes = committedChanges(database.commits(), commit);
+    SmallPictures const pictures(root);
+    bool const showsPictures = pictures.canBeShown() && !options.json && changes.size() <= kMostSmallPictures;
+    std::optional<Pager> pager;
+    if (!showsPictures) {
+        pager.emplace();
+    }
     if (!options.json) {
-        printForPeople(commit, changes, database);
+        printForPeople(commit, changes, database, showsPictures ? &pictures : nullptr);
         return;
     }
     kutils::json::Object document = documentOf(commit);

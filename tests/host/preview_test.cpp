@@ -141,6 +141,46 @@ TEST_F(PreviewTest, IsShownInATerminalThatIsKnownToShowPictures)
     EXPECT_THAT(outcome.out, testing::HasSubstr("\x1b_G"));
 }
 
+TEST_F(PreviewTest, IsShownInTheHistoryOfADrawingAndInACommit)
+{
+    std::vector<std::string> const kitty = {"TERM=xterm-kitty", "KITTY_WINDOW_ID=1", "PAGER=cat -v"};
+    auto const pictures = [&](Arguments const& arguments) {
+        std::string const out = tavOnTerminal(arguments, kitty).out;
+        std::size_t count = 0;
+        for (std::size_t i = out.find("\x1b_G"); i != std::string::npos; i = out.find("\x1b_G", i + 1)) {
+            ++count;
+        }
+        return count;
+    };
+    EXPECT_EQ(pictures({"log", "plan.dwg"}), 2U);
+    EXPECT_EQ(pictures({"log", "-1", "plan.dwg"}), 1U);
+    EXPECT_EQ(pictures({"show", "1"}), 1U);
+    EXPECT_EQ(pictures({"log"}), 0U);
+    EXPECT_EQ(pictures({"log", "--oneline", "plan.dwg"}), 0U);
+    EXPECT_EQ(pictures({"log", "--json", "plan.dwg"}), 0U);
+}
+
+TEST_F(PreviewTest, IsLeftOutOfListsWhereItCannotBeShown)
+{
+    EXPECT_EQ(tav({"show", "1"}).out.find('\x1b'), std::string::npos);
+    EXPECT_EQ(
+        tavOnTerminal({"log", "plan.dwg"}, {"TERM=xterm", "PAGER=", "NO_COLOR=1"}).out.find("\x1b_G"),
+        std::string::npos);
+}
+
+TEST_F(PreviewTest, IsLeftOutOfListsForDrawingsWithoutOneAndForOtherFiles)
+{
+    commit("bare.dwg", "AC1032 without a picture");
+    commit("notes.txt", "text");
+    for (char const* const name : {"bare.dwg", "notes.txt"}) {
+        for (int i = 0; i < 2; ++i) { // The second time it is known.
+            Outcome const outcome = tavOnTerminal({"log", name}, {"TERM=xterm-kitty", "KITTY_WINDOW_ID=1"});
+            EXPECT_EQ(outcome.code, 0);
+            EXPECT_EQ(outcome.out.find("\x1b_G"), std::string::npos);
+        }
+    }
+}
+
 TEST_F(PreviewTest, ComparesTheWorkingFolderWithTheLastCommit)
 {
     repo.write("plan.dwg", drawingWith(4));
