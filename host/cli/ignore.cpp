@@ -6,11 +6,15 @@
 #include "host/repository/ignore_reason.h"
 #include "host/repository/names.h"
 #include "host/repository/open.h"
+#include "host/repository/working_state.h"
 #include "host/session/write_session.h"
+#include "host/text/plural.h"
 #include "host/text/utf8.h"
 
 #include <algorithm>
 #include <optional>
+#include <regex>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -34,23 +38,67 @@ bool add(common::RootPath const& root, OdString const& rule, bool dryRun)
     return addIgnoreRule(root, rule);
 }
 
-void noteUselessRule(common::RootPath const& root, OdString const& rule)
+bool isMatch(std::string const& name, OdString const& rule)
+{
+    try {
+        return std::regex_match(name, common::RepoIgnore::compile(rule));
+    } catch (std::regex_error const&) {
+        return false;
+    }
+}
+
+/// A name that exists is meant as it is, whatever it would match as an expression.
+OdString newRuleFor(std::string const& typed, common::RootPath const& root)
+{
+    OdString const rule = ruleFor(typed);
+    return isMatch(typed, rule) || !isAnyName(root, typed) ? rule : ruleForName(typed);
+}
+
+void failForPath(std::string const& typed)
+{
+    if (typed.find('/') != std::string::npos) {
+        throw Failure(
+            "'" + typed + "' has a '/', and rules are for single names.",
+            "Give the name of the file or folder alone, as in 'tav ignore --add old' for a folder 'plans/old'.");
+    }
+}
+
+std::vector<OdString> controlledFiles(common::RootPath const& root)
+{
+    std::set<OdString> paths;
+    LocalDatabase const database = LocalDatabase::open(root);
+    for (auto const& [path, url] : database.commits().files(database.currentCommit())) {
+        paths.insert(path);
+    }
+    auto const state = readState(root);
+    for (common::StagedFile const& file : state->read().stagedFiles) {
+        paths.insert(file.path);
+    }
+    return {paths.begin(), paths.end()};
+}
+
+void noteEffect(common::RootPath const& root, OdString const& rule)
 {
     if (!matchesAnyName(root, rule)) {
-        bool const isPath = rule.ansi_str().find('/') != std::string::npos;
-        printNote(isPath ? "Rules are for single names, without '/'." : "No file or folder has such a name yet.");
+        printNote("No file or folder has such a name yet.");
+    }
+    if (std::size_t const count = countMatches(controlledFiles(root), rule)) {
+        printNote(
+            "The rule is for new files: it does not apply to " + counted(count, "committed or staged file") +
+            " with such a name.");
     }
 }
 
 void addRule(common::RootPath const& root, std::string const& typed, bool dryRun)
 {
-    OdString const rule = ruleFor(typed);
+    failForPath(typed);
+    OdString const rule = newRuleFor(typed, root);
     if (!add(root, rule, dryRun)) {
         report("The rule '" + shown(rule) + "' was there already.\n");
         return;
     }
     report("Names that match '" + shown(rule) + (dryRun ? "' would be ignored.\n" : "' are ignored from now on.\n"));
-    noteUselessRule(root, rule);
+    noteEffect(root, rule);
 }
 
 bool remove(common::RootPath const& root, OdString const& rule, bool dryRun)
@@ -62,10 +110,20 @@ bool remove(common::RootPath const& root, OdString const& rule, bool dryRun)
     return removeIgnoreRule(root, rule);
 }
 
-/// A rule as it stands in the file goes before what a wildcard means.
+/// A rule as it stands in the file goes before what a wildcard or a name means.
+OdString existingRuleFor(std::string const& typed, common::RootPath const& root)
+{
+    for (OdString const& rule : {fromUtf8(typed), ruleFor(typed), ruleForName(typed)}) {
+        if (isInEffect(root, rule)) {
+            return rule;
+        }
+    }
+    return ruleFor(typed);
+}
+
 void removeRule(common::RootPath const& root, std::string const& typed, bool dryRun)
 {
-    OdString const rule = isInEffect(root, fromUtf8(typed)) ? fromUtf8(typed) : ruleFor(typed);
+    OdString const rule = existingRuleFor(typed, root);
     if (!remove(root, rule, dryRun)) {
         throw Failure("There is no rule '" + rule.ansi_str() + "'.", "Run 'tav ignore' to see the rules.");
     }

@@ -36,4 +36,14 @@ OdString ruleFor(std::string const& typed)
     return fromUtf8(rule + "$");
 }
 
+OdString ruleForName(std::string const& name)
+{
+    std::string rule = "^";
+    for (char const c : name) {
+        rule += std::string("\\^$.[]{}()|+*?").find(c) == std::string::npos ? "" : "\\";
+        rule += c;
+    }
+    return fromUtf8(rule + "$");
+}
+
 } // namespace tav

@@ -13,4 +13,7 @@ namespace tav {
 /// that is not hidden anyway.
 OdString ruleFor(std::string const& typed);
 
+/// The rule that matches this one name, whatever characters it has.
+OdString ruleForName(std::string const& name);
+
 } // namespace tav

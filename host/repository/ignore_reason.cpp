@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <climits>
 #include <filesystem>
+#include <functional>
 #include <regex>
 #include <string>
 #include <utility>
@@ -53,6 +54,17 @@ std::string withoutPropertiesFolder(std::string const& path)
     return path.compare(0, folder.size(), folder) == 0 ? path.substr(folder.size()) : path;
 }
 
+bool hasName(common::RootPath const& root, std::function<bool(std::string const& name)> const& isMeant)
+{
+    auto const isMatch = [&](OdString const& path) {
+        return isMeant(std::filesystem::path(path.ansi_str()).filename().string());
+    };
+    common::CollectOptions const everything(true, true, false, {});
+    common::DirContents const contents = common::collectDirContents(root.path(), everything);
+    return std::any_of(contents.files.begin(), contents.files.end(), isMatch) ||
+           std::any_of(contents.dirs.begin(), contents.dirs.end(), isMatch);
+}
+
 } // namespace
 
 std::optional<IgnoreReason> whyIgnored(common::RootPath const& root, OdString const& path)
@@ -69,13 +81,23 @@ std::optional<IgnoreReason> whyIgnored(common::RootPath const& root, OdString co
 bool matchesAnyName(common::RootPath const& root, OdString const& rule)
 {
     std::regex const expression = common::RepoIgnore::compile(rule);
-    auto const isMatch = [&](OdString const& path) {
-        return std::regex_match(std::filesystem::path(path.ansi_str()).filename().string(), expression);
-    };
-    common::CollectOptions const everything(true, true, false, {});
-    common::DirContents const contents = common::collectDirContents(root.path(), everything);
-    return std::any_of(contents.files.begin(), contents.files.end(), isMatch) ||
-           std::any_of(contents.dirs.begin(), contents.dirs.end(), isMatch);
+    return hasName(root, [&](std::string const& name) { return std::regex_match(name, expression); });
+}
+
+bool isAnyName(common::RootPath const& root, std::string const& name)
+{
+    return hasName(root, [&](std::string const& other) { return other == name; });
+}
+
+std::size_t countMatches(std::vector<OdString> const& paths, OdString const& rule)
+{
+    std::regex const expression = common::RepoIgnore::compile(rule);
+    return static_cast<std::size_t>(std::count_if(paths.begin(), paths.end(), [&](OdString const& path) {
+        std::filesystem::path const parts = withoutPropertiesFolder(path.ansi_str());
+        return std::any_of(parts.begin(), parts.end(), [&](std::filesystem::path const& part) {
+            return std::regex_match(part.string(), expression);
+        });
+    }));
 }
 
 } // namespace tav

@@ -5,6 +5,8 @@
 
 #include <cstddef>
 #include <optional>
+#include <string>
+#include <vector>
 
 namespace tav {
 
@@ -21,5 +23,11 @@ std::optional<IgnoreReason> whyIgnored(common::RootPath const& root, OdString co
 
 /// Whether a file or folder of the working folder has a name that `rule` matches. Lists the whole folder.
 bool matchesAnyName(common::RootPath const& root, OdString const& rule);
+
+/// Whether a file or folder of the working folder is called `name` exactly. Lists the whole folder.
+bool isAnyName(common::RootPath const& root, std::string const& name);
+
+/// How many of `paths` would be ignored for `rule` if they were new: it matches their name, or that of a folder above.
+std::size_t countMatches(std::vector<OdString> const& paths, OdString const& rule);
 
 } // namespace tav

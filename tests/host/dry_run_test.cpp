@@ -20,6 +20,7 @@ struct DryRunRow {
     char const* name;
     Arguments arguments;
     std::string out;
+    std::string err = {};
 };
 
 /// Two commits of "план.dwg" and "sub/b \"1\".txt", and work that is in neither.
@@ -63,7 +64,7 @@ TEST_P(DryRun, SaysWhatWouldHappenWhileAnotherCommandHoldsTheLockAndChangesNothi
     os::FileLock lock;
     ASSERT_FALSE(lock.acquire(repo.pathTo(".tav/tav.lock"), "'tav commit', process 7", std::chrono::milliseconds(0)));
     std::map<std::string, std::string> const locked = everything();
-    EXPECT_EQ(tav(GetParam().arguments), done(GetParam().out));
+    EXPECT_EQ(tav(GetParam().arguments), (Outcome{0, GetParam().out, GetParam().err}));
     EXPECT_EQ(everything(), locked);
 }
 
@@ -109,7 +110,8 @@ INSTANTIATE_TEST_SUITE_P(
         DryRunRow{
             "IgnoreAdd",
             {"ignore", "--dry-run", "--add", "*.dwg"},
-            "Names that match '^.*\\.dwg$' would be ignored.\n"},
+            "Names that match '^.*\\.dwg$' would be ignored.\n",
+            "tav: The rule is for new files: it does not apply to 2 committed or staged files with such a name.\n"},
         DryRunRow{
             "IgnoreRemove", {"ignore", "--dry-run", "--remove", "*.bak"}, "Would remove the rule '^.*\\.bak$'.\n"}),
     support::rowName);

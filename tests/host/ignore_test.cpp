@@ -218,14 +218,47 @@ INSTANTIATE_TEST_SUITE_P(
         WildcardRow{"ExpressionWithoutAnchors", ".*plt", ".*plt", {"a.plt", "plt"}, {"a.plt.dwg"}}),
     support::rowName);
 
-TEST_F(Ignore, NotesThatRulesAreForSingleNames)
+TEST_F(Ignore, TakesTheNameOfAFileAsItIs)
 {
-    repo.add({"plans/a.plt"});
+    repo.add({"Plan (1).dwg", "plans/a [old/b.dwg", "Plan 1.dwg"});
     EXPECT_EQ(
-        tav({"ignore", "--add", "plans/*.plt"}),
+        tav({"ignore", "--add", "Plan (1).dwg"}),
+        done("Names that match '^Plan \\(1\\)\\.dwg$' are ignored from now on.\n"));
+    EXPECT_EQ(
+        tav({"ignore", "--add", "a [old"}), done("Names that match '^a \\[old$' are ignored from now on.\n"));
+    EXPECT_EQ(tav({"files"}), done("Plan 1.dwg\n.tav/properties/ignore\n"));
+    EXPECT_EQ(tav({"ignore", "--remove", "Plan (1).dwg"}), done("Removed the rule '^Plan \\(1\\)\\.dwg$'.\n"));
+}
+
+TEST_F(Ignore, RefusesARuleForAPath)
+{
+    repo.add({"sub dir/a.dwg"});
+    std::string const message =
+        "' has a '/', and rules are for single names. Give the name of the file or folder alone, as in 'tav ignore "
+        "--add old' for a folder 'plans/old'.\n";
+    for (std::string const typed : {"sub dir/", "sub dir/*.dwg"}) {
+        EXPECT_EQ(tav({"ignore", "--add", typed}), failed("tav: '" + typed + message));
+    }
+    EXPECT_FALSE(repo.has(".tav/properties"));
+}
+
+TEST_F(Ignore, NotesThatANewRuleDoesNotApplyToCommittedAndStagedFiles)
+{
+    repo.add({"a.plt", "b.plt", "c.plt", "plots/d.dwg"});
+    tav({"init"});
+    tav({"add", "a.plt", "plots"});
+    tav({"commit", "-m", "First"});
+    tav({"add", "b.plt"});
+    EXPECT_EQ(
+        tav({"ignore", "--add", "*.plt"}),
         (Outcome{
-            0, "Names that match '^plans/.*\\.plt$' are ignored from now on.\n",
-            "tav: Rules are for single names, without '/'.\n"}));
+            0, "Names that match '^.*\\.plt$' are ignored from now on.\n",
+            "tav: The rule is for new files: it does not apply to 2 committed or staged files with such a name.\n"}));
+    EXPECT_EQ(
+        tav({"ignore", "--add", "plots", "--dry-run"}),
+        (Outcome{
+            0, "Names that match 'plots' would be ignored.\n",
+            "tav: The rule is for new files: it does not apply to 1 committed or staged file with such a name.\n"}));
 }
 
 struct RemoveRow {
