@@ -98,6 +98,33 @@ bool isWithoutCommand(CLI::App const& app, CLI::ParseError const& error)
     return isMissing && app.get_subcommands().empty() && app.remaining().empty();
 }
 
+bool endsWith(std::string const& text, std::string const& end)
+{
+    return text.size() >= end.size() && text.compare(text.size() - end.size(), end.size(), end) == 0;
+}
+
+/// The argument that begins with a dash, and is not an option. The parser leaves only the letters of it that it does
+/// not know.
+std::optional<std::string> unknownOption(CLI::App const& app, std::vector<std::string> const& words)
+{
+    for (std::string const& rest : app.remaining(true)) {
+        auto const word = std::find_if(words.begin(), words.end(), [&](std::string const& each) {
+            return each.size() > 1 && each.front() == '-' && rest.rfind('-', 0) == 0 && endsWith(each, rest.substr(1));
+        });
+        if (word != words.end()) {
+            return *word;
+        }
+    }
+    return std::nullopt;
+}
+
+std::string adviceAfter(CLI::App const& app, std::vector<std::string> const& words)
+{
+    std::string const help = "Run '" + chosenCommand(app) + " --help' to see how it is used.";
+    auto const option = app.get_subcommands().empty() ? std::nullopt : unknownOption(app, words);
+    return option ? help + " Write './" + *option + "', or '--' before it, for a name that begins with '-'." : help;
+}
+
 /// Runs the command, or prints the help that was asked for.
 void parse(CLI::App& app, std::vector<std::string> const& words)
 {
@@ -189,7 +216,7 @@ int runCommand(CLI::App& app, std::vector<std::string> const& words)
         if (isWithoutCommand(app, error)) {
             printErrorText(app.help());
         } else {
-            printError(complaint(app, error), "Run '" + chosenCommand(app) + " --help' to see how it is used.");
+            printError(complaint(app, error), adviceAfter(app, words));
         }
         return kMisused;
     } catch (Failure const& failure) {

@@ -225,12 +225,28 @@ INSTANTIATE_TEST_SUITE_P(
         MisuseRow{
             "UnknownOption",
             {"add", "a.dwg", "--frob"},
-            "tav: The following argument was not expected: --frob. Run 'tav add --help' to see how it is used.\n"},
+            "tav: The following argument was not expected: --frob. Run 'tav add --help' to see how it is used. Write "
+            "'./--frob', or '--' before it, for a name that begins with '-'.\n"},
+        MisuseRow{
+            "NameWithDashForOneOfSeveral",
+            {"add", "a.dwg", "-leading.dwg"},
+            "tav: The following argument was not expected: -leading.dwg. Run 'tav add --help' to see how it is used. "
+            "Write './-leading.dwg', or '--' before it, for a name that begins with '-'.\n"},
+        MisuseRow{
+            "OnlyANameWithDash",
+            {"rm", "-leading.dwg"},
+            "tav: NAME is required. Run 'tav rm --help' to see how it is used. Write './-leading.dwg', or '--' before "
+            "it, for a name that begins with '-'.\n"},
+        MisuseRow{
+            "NameThatBeginsWithAKnownOption",
+            {"rm", "-quay.dwg"},
+            "tav: NAME is required. Run 'tav rm --help' to see how it is used. Write './-quay.dwg', or '--' before "
+            "it, for a name that begins with '-'.\n"},
         MisuseRow{
             "UnknownOptionWithEscapes",
             {"add", "a.dwg", "--\x1b[31m\n\xff"},
             "tav: The following argument was not expected: --\\x1B[31m \\xFF. Run 'tav add --help' to see how it is "
-            "used.\n"},
+            "used. Write './--\\x1B[31m \\xFF', or '--' before it, for a name that begins with '-'.\n"},
         MisuseRow{
             "SurplusNameInBrackets",
             {"init", "x", "[y]"},
