@@ -32,6 +32,8 @@ Commands:
   mv                          Rename a file or folder, and stage that
   rm                          Remove committed files, and stage that
   commit, ci                  Keep what is staged, removed and renamed as a new commit
+  revert                      Make a commit that does the opposite of another one
+  stash, shelve               Put unfinished work aside, and bring it back
   log                         Show the history, newest first
   show                        Show a commit and what it changed, or a file of it
   cat                         Print a file as a commit has it

@@ -224,8 +224,7 @@ TEST_F(Ignore, TakesTheNameOfAFileAsItIs)
     EXPECT_EQ(
         tav({"ignore", "--add", "Plan (1).dwg"}),
         done("Names that match '^Plan \\(1\\)\\.dwg$' are ignored from now on.\n"));
-    EXPECT_EQ(
-        tav({"ignore", "--add", "a [old"}), done("Names that match '^a \\[old$' are ignored from now on.\n"));
+    EXPECT_EQ(tav({"ignore", "--add", "a [old"}), done("Names that match '^a \\[old$' are ignored from now on.\n"));
     EXPECT_EQ(tav({"files"}), done("Plan 1.dwg\n.tav/properties/ignore\n"));
     EXPECT_EQ(tav({"ignore", "--remove", "Plan (1).dwg"}), done("Removed the rule '^Plan \\(1\\)\\.dwg$'.\n"));
 }
