@@ -148,20 +148,20 @@ private:
                 "'" + path.ansi_str() + "' is not a regular file.", "Nothing has been written; move it away first.");
         }
         auto const digest = fileDigest(root_.pathTo(path));
-        if (!digest && discard_ != Discard::everything) {
+        if (!digest) {
             throw Failure(
-                "'" + path.ansi_str() + "' cannot be read, and may hold changes that are in no commit.",
-                "Nothing has been written; check the disk and your permissions for the file.");
+                "'" + path.ansi_str() + "' cannot be read, so it could not be brought back.",
+                "Nothing has been written; make it readable or move it away.");
         }
-        OdString url = digest ? expectedUrlOf(path, *digest) : OdString();
+        OdString url = expectedUrlOf(path, *digest);
         bool const isExpected = !url.isEmpty();
-        if (digest && wanted && digest == digestOf(*wanted)) {
+        if (wanted && digest == digestOf(*wanted)) {
             if (!isExpected) {
                 update_.others.emplace(path, *wanted);
             }
             return Finding::isAsWanted;
         }
-        if (digest && !isExpected && discard_ != Discard::nothing) {
+        if (!isExpected && discard_ != Discard::nothing) {
             url = database_.committedUrlOf(*digest);
         }
         if (url.isEmpty()) {
@@ -229,16 +229,13 @@ private:
     std::vector<std::string> inTheWay_;
 };
 
-/// Keeps contents that nobody has committed. A file that cannot be read is given up with its content.
-void storeDiscarded(
-    common::RootPath const& root, LocalStorage& storage, std::vector<OdString> const& paths, TreeUpdate& update)
+/// Keeps contents that nobody has committed.
+void storeDiscarded(LocalStorage& storage, std::vector<OdString> const& paths, TreeUpdate& update)
 {
     std::vector<OdString> urls;
     for (OdString const& path : paths) {
-        if (fileDigest(root.pathTo(path))) {
-            urls.push_back(valueOrFail(storage.store(path), kNothingYet));
-            update.others[path] = urls.back();
-        }
+        urls.push_back(valueOrFail(storage.store(path), kNothingYet));
+        update.others[path] = urls.back();
     }
     valueOrFail(storage.flush(), kNothingYet);
     for (OdString const& url : urls) {
@@ -464,7 +461,7 @@ void checkUpdate(
         progress.advance();
     }
     if (!check.discarded().empty()) {
-        storeDiscarded(root, storage, check.discarded(), update);
+        storeDiscarded(storage, check.discarded(), update);
     }
 }
 
