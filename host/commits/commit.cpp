@@ -260,7 +260,7 @@ void failIfNothingIsLeft(Draft const& draft, CommitRecord const& replaced)
     if (replaced.parents.size() < 2 && draft.files == before) {
         throw Failure(
             "Commit " + std::to_string(replaced.number) + " would change nothing any more.",
-            "Nothing has been committed; take the commit back with 'tav undo'.");
+            "Nothing has been committed; leave out --amend for a new commit that takes it back.");
     }
 }
 
@@ -503,10 +503,11 @@ Committed commit(common::RootPath const& root, LocalDatabase& database, CommitOr
     }
     planMissing(plan, state, formerPathsOfMoves(renames, database, root), order.missing, root);
     if (plan.empty()) {
-        if (auto const last = lastCommitIfOf(order, database)) {
+        auto const last = lastCommitIfOf(order, database);
+        if (last && !hasChanges(changes)) {
             return {*last, false};
         }
-        if (!order.replaced) {
+        if (last || !order.replaced) {
             failForNothing(changes, root);
         }
     }

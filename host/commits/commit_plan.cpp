@@ -88,12 +88,16 @@ std::vector<PlannedFile> planCommit(
     return files;
 }
 
+bool hasChanges(common::RepoChanges const& changes)
+{
+    return !changes.modified.empty() || !changes.untracked.empty();
+}
+
 void failForNothing(common::RepoChanges const& changes, common::RootPath const& root)
 {
     // The library has the words for a folder without any change.
-    bool const hasChanges = !changes.modified.empty() || !changes.untracked.empty();
     auto const staged = common::RepoFileExplorer(changes, root).stagedFiles();
-    if (!hasChanges && !staged.hasValue()) {
+    if (!hasChanges(changes) && !staged.hasValue()) {
         throw Failure(staged.error(), "Change something first.");
     }
     throw Failure("Nothing is staged.", "Use 'tav add NAME' or 'tav add --all' to stage what to commit.");

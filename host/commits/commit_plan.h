@@ -21,6 +21,9 @@ std::vector<PlannedFile> planCommit(
     common::State const& state, common::RepoChanges const& changes, Renames const& found, Tree const& base,
     common::RootPath const& root);
 
+/// Whether there are changed or new files, staged or not.
+bool hasChanges(common::RepoChanges const& changes);
+
 /// Throws a `Failure` that says why there is nothing to commit.
 [[noreturn]] void failForNothing(common::RepoChanges const& changes, common::RootPath const& root);
 

@@ -174,14 +174,26 @@ TEST_F(Amend, ThatRepeatsTheCommitChangesNothing)
     EXPECT_THAT(numbers(), ElementsAre("2", "1"));
 }
 
+TEST_F(Amend, OfAChangeThatNobodyHasStagedSaysSo)
+{
+    repo.write("屋根.dwg", "better roof");
+    Outcome const nothing =
+        failed("tav: Nothing is staged. Use 'tav add NAME' or 'tav add --all' to stage what to commit.\n");
+    EXPECT_EQ(tav({"commit", "--amend", "--no-edit"}), nothing);
+    EXPECT_EQ(tav({"commit", "-m", "second", "--author", "ann@studio"}), nothing);
+    EXPECT_THAT(numbers(), ElementsAre("2", "1"));
+}
+
 TEST_F(Amend, RefusesToLeaveNothingOfTheCommit)
 {
     working({"rm", "屋根.dwg"});
     EXPECT_EQ(
         tav({"commit", "--amend", "--no-edit"}),
-        failed("tav: Commit 2 would change nothing any more. Nothing has been committed; take the commit back with "
-               "'tav undo'.\n"));
+        failed("tav: Commit 2 would change nothing any more. Nothing has been committed; leave out --amend for a new "
+               "commit that takes it back.\n"));
     EXPECT_THAT(numbers(), ElementsAre("2", "1"));
+    working({"commit", "-m", "third"});
+    EXPECT_THAT(working({"show"}), HasSubstr("removed:  屋根.dwg"));
 }
 
 TEST_F(Amend, LeavesACommitThatATagNames)
