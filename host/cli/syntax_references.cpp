@@ -72,7 +72,8 @@ std::shared_ptr<UndoOptions> addTurning(CLI::App& command, char const* dryRunHel
 
 void addUndo(CLI::App& app)
 {
-    CLI::App* const command = app.add_subcommand("undo", "Take back the last command");
+    CLI::App* const command =
+        app.add_subcommand("undo", "Take back the last command that changed files, what is staged, or commits");
     auto const options = addTurning(*command, "Show what would be taken back");
     CLI::Option* const list =
         command->add_flag("--list", options->list, "List the commands that can be taken back, the last one first");

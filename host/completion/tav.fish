@@ -84,7 +84,7 @@ __tav_command compare 'Show two versions of a drawing as pictures, and what diff
 __tav_command restore 'Bring files back as a commit has them' $commands
 __tav_command checkout 'Make the working folder what it was at a commit' $commands
 __tav_command switch 'Continue on another branch' $commands
-__tav_command undo 'Take back the last command' $commands
+__tav_command undo 'Take back the last command that changed files, what is staged, or commits' $commands
 __tav_command redo "Do again what 'tav undo' has taken back" $commands
 __tav_command branch 'List the branches, or make one' $commands
 __tav_command tag 'List the tags, or make one' $commands

@@ -44,7 +44,7 @@ Commands:
   restore                     Bring files back as a commit has them
   checkout, co                Make the working folder what it was at a commit
   switch                      Continue on another branch
-  undo                        Take back the last command
+  undo                        Take back the last command that changed files, what is staged, or commits
   redo                        Do again what 'tav undo' has taken back
   branch                      List the branches, or create, rename or delete one
   tag                         List the tags, or create or delete one
