@@ -246,6 +246,10 @@ CheckedOut checkOutCommit(
     course.update = course.whole;
     LocalStorage storage(root);
     checkUpdate(root, database, storage, staged, discard, course.update);
+    bool const stays = here.commit == destination.commit && here.branch == destination.branch;
+    if (stays && begun.empty() && course.update.writes.empty() && course.update.removals.empty()) {
+        return {0, 0, unsaved}; // There is nothing to take back.
+    }
     from.push_back(std::move(current));
     Operation operation;
     operation.kind = Kind::move;

@@ -247,10 +247,9 @@ BroughtBack bringBack(
     stageAll(staging, shelf.files, after);
     entry.operation().files = replacedFiles(update, root);
     std::int64_t operation = 0;
-    Updated const updated = carryOut(root, storage, update, order.start, [&] {
-        entry.write(after, [&](std::int64_t id) { operation = id; });
-        entry.keep();
-    });
+    Updated const updated = carryOut(
+        root, storage, update, order.start, [&] { entry.write(after, [&](std::int64_t id) { operation = id; }); },
+        [&] { entry.keep(); });
     changeState(root, [&](common::Cache& cache) { stageAll(staging, shelf.files, cache.write()); });
     WriteTransaction transaction(database.database());
     if (afterwards == Shelved::goes) {

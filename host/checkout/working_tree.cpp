@@ -336,18 +336,21 @@ void requireAllUnchanged(os::Batch& batch, TreeUpdate const& update)
     }
 }
 
-void placeAll(os::Batch& batch, TreeUpdate const& update, Restored const& restored)
+void placeAll(
+    os::Batch& batch, TreeUpdate const& update, Restored const& restored, std::function<void()> const& changed)
 {
     constexpr char const* kWhole = "Everything written so far is complete; run the command again.";
     for (auto const& [path, url] : update.removals) {
         requireUnchanged(batch, update, path, kWhole);
         requireDone(batch.remove(path.ansi_str()), path, kAgain);
+        changed();
         batch.removeEmptyFoldersOf(path.ansi_str());
     }
     std::size_t number = 0;
     for (auto const& [path, url] : update.writes) {
         requireUnchanged(batch, update, path, kWhole);
         requireDone(batch.place(restored.pathOf(number++), path.ansi_str()), path, kAgain);
+        changed();
     }
 }
 
@@ -512,7 +515,7 @@ std::vector<OdString> pathsOf(std::vector<FileContents> const& files)
 
 Updated carryOut(
     common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start,
-    std::function<void()> const& begin)
+    std::function<void()> const& begin, std::function<void()> const& changed)
 {
     os::Batch batch(root.path().ansi_str());
     Restored const restored(root);
@@ -520,7 +523,8 @@ Updated carryOut(
     requireDone(batch.flush(), kRestoring, kNothingYet);
     requireAllUnchanged(batch, update);
     begin();
-    placeAll(batch, update, restored);
+    placeAll(batch, update, restored, changed);
+    changed();
     requireDone(batch.flush(), root.path(), kAgain);
     Updated updated;
     for (auto const& [path, stamp] : stamps) {

@@ -78,12 +78,13 @@ struct Updated {
 
 /// Carries out an update that has been checked. Every file is complete before it is renamed into place, and when this
 /// returns all of them are safe on the disk. Folders that become empty are removed. `begin` is called when all contents
-/// are ready and the working folder is still unchanged. A file that was changed after the check is left as it is, and
-/// ends the update. Throws `Failure`; what was written until then remains, and repeating the update completes it. The
-/// caller has held the lock of the repository since `start`.
+/// are ready and the working folder is still unchanged, and `changed` when each file has been written or removed, and
+/// in the end: a failure before its first call leaves the working folder unchanged. A file that was changed after the
+/// check is left as it is, and ends the update. Throws `Failure`; what was written until then remains, and repeating
+/// the update completes it. The caller has held the lock of the repository since `start`.
 Updated carryOut(
     common::RootPath const& root, LocalStorage& storage, TreeUpdate const& update, std::uint64_t start,
-    std::function<void()> const& begin = [] {});
+    std::function<void()> const& begin = [] {}, std::function<void()> const& changed = [] {});
 
 /// Writes the content of `file` to the path `target`. Throws `Failure`, whose next step depends on whether the content
 /// is damaged or the disk is full.

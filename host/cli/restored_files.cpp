@@ -128,10 +128,8 @@ writeRestored(RestoredFiles const& restored, Discard discard, OdString const& co
     LogEntry entry(session.database(), command, after);
     enterFiles(files, base, {}, after);
     entry.operation().files = replacedFiles(update);
-    Updated const updated = carryOut(root, storage, update, session.start(), [&] {
-        entry.write(after);
-        entry.keep(); // What is written from here on stays.
-    });
+    Updated const updated = carryOut(
+        root, storage, update, session.start(), [&] { entry.write(after); }, [&] { entry.keep(); });
     changeState(root, [&](common::Cache& cache) { enterFiles(files, base, updated.times, cache.write()); });
     keepVerified(updated.verified, session.database());
     return update.writes.size();

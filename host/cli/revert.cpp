@@ -108,10 +108,8 @@ void changeFiles(WriteSession& session, Opposite const& opposite, CommitRecord c
     LogEntry entry(session.database(), fromUtf8("revert " + std::to_string(commit.number)), after);
     stageOpposite(opposite, after);
     entry.operation().files = replacedFiles(opposite, update, root);
-    Updated const updated = carryOut(root, storage, update, session.start(), [&] {
-        entry.write(after);
-        entry.keep(); // What is written from here on stays.
-    });
+    Updated const updated = carryOut(
+        root, storage, update, session.start(), [&] { entry.write(after); }, [&] { entry.keep(); });
     changeState(root, [&](common::Cache& cache) { stageOpposite(opposite, cache.write()); });
     keepVerified(updated.verified, session.database());
 }

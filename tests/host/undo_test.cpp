@@ -127,6 +127,15 @@ TEST_F(Undo, GoesBackToTheCommitWithWhatWasDiscarded)
     EXPECT_THAT(status(), HasSubstr("modified: plan.dwg"));
 }
 
+TEST_F(Undo, DoesNotCountAMoveToWhereOneIs)
+{
+    std::vector<std::string> const before = commands();
+    working({"switch", "master"});
+    working({"switch", "--force", "master"});
+    working({"checkout", "1"});
+    EXPECT_EQ(commands(), before);
+}
+
 TEST_F(Undo, OverwritesOnlyByForceAndKeepsThatToo)
 {
     working({"rm", "plan.dwg"});
