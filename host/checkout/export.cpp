@@ -11,8 +11,6 @@
 #include "platform/os/os_files.h"
 #include "platform/os/os_open_file.h"
 
-#include <unistd.h>
-
 #include <filesystem>
 #include <iterator>
 #include <vector>
@@ -118,16 +116,14 @@ exportFiles(common::RootPath const& root, LocalDatabase const& database, Tree co
 
 void exportFile(
     common::RootPath const& root, LocalDatabase const& database, Tree::value_type const& file,
-    std::string const& target, bool replaces)
+    std::string const& target)
 {
     LocalStorage storage(root);
     requireHere({file}, database, storage);
-    std::string const place =
-        replaces ? fs::path(target).parent_path().string() + "/.tav-export-" + std::to_string(getpid()) : target;
-    extract(storage, file, place);
-    if (std::error_code const error = replaces ? os::replaceFileBy(target, place) : flushNew(place)) {
+    extract(storage, file, target);
+    if (std::error_code const error = flushNew(target)) {
         std::error_code ignored;
-        fs::remove(place, ignored);
+        fs::remove(target, ignored);
         throw Failure("'" + target + "' cannot be written: " + error.message() + ".", "Name another file.");
     }
 }

@@ -15,10 +15,10 @@ namespace tav {
 std::size_t
 exportFiles(common::RootPath const& root, LocalDatabase const& database, Tree const& files, std::string const& target);
 
-/// Writes one of the files of a commit to the path `target`, in bytes, whose folder exists. A file there is replaced as
-/// a whole if `replaces` is set, else left as it is. Safe on the disk then. Throws `Failure`; `target` is as before.
+/// Writes one of the files of a commit to the path `target`, in bytes, whose folder exists. A file there is left as it
+/// is. Safe on the disk then. Throws `Failure`; `target` is as before.
 void exportFile(
     common::RootPath const& root, LocalDatabase const& database, Tree::value_type const& file,
-    std::string const& target, bool replaces);
+    std::string const& target);
 
 } // namespace tav

@@ -59,6 +59,36 @@ std::optional<OdString> pathInside(std::string const& target, common::RootPath c
     return target.compare(0, top.size(), top) == 0 ? std::optional(fromUtf8(target.substr(top.size()))) : std::nullopt;
 }
 
+bool isOwnFolder(fs::path const& path)
+{
+    std::error_code ignored;
+    return path.filename() == ".tav" || fs::exists(path / "server.db", ignored);
+}
+
+/// A history or a storage that a drawing has overwritten is lost, and nothing here could bring it back.
+void requireNotInOwnFolder(std::string const& target)
+{
+    for (fs::path path = target; path.has_relative_path(); path = path.parent_path()) {
+        if (isOwnFolder(path)) {
+            throw Failure(
+                "'" + path.string() + "' belongs to a repository or a server.",
+                "Nothing has been written; name another path.");
+        }
+    }
+}
+
+/// What is overwritten in the repository can be brought back; nothing else is.
+void requireFree(std::string const& target, bool isInside, bool force)
+{
+    if (!fs::exists(fs::symlink_status(target)) || (isInside && force)) {
+        return;
+    }
+    throw Failure(
+        "'" + target + "' is there already.",
+        isInside ? "Name another path, or overwrite it with --force."
+                 : "Outside of the repository nothing is overwritten; name another path, or move or remove it first.");
+}
+
 /// One file, and another place for it.
 struct Copy {
     RestoredFiles restored;
@@ -74,9 +104,8 @@ Copy findCopy(RestoreOptions const& options, common::RootPath const& root, Local
             "Use 'tav export' for the files of a commit.");
     }
     std::string const target = targetOf(*options.target, restored.files.begin()->first);
-    if (!options.force && fs::exists(fs::symlink_status(target))) {
-        throw Failure("'" + target + "' is there already.", "Name another path, or overwrite it with --force.");
-    }
+    requireNotInOwnFolder(target);
+    requireFree(target, pathInside(target, root).has_value(), options.force);
     return {std::move(restored), target};
 }
 
@@ -106,7 +135,7 @@ void copyOutside(Copy const& copy, RestoreOptions const& options, common::RootPa
         print("Would write " + described(copy));
         return;
     }
-    exportFile(root, LocalDatabase::open(root), *copy.restored.files.begin(), copy.target, options.force);
+    exportFile(root, LocalDatabase::open(root), *copy.restored.files.begin(), copy.target);
     report("Wrote " + described(copy));
 }
 

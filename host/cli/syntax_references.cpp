@@ -23,7 +23,8 @@ void addRestore(CLI::App& app)
         ->type_name("COMMIT");
     command->add_option("--to", options->target, "Write one file to this path, and leave the file itself as it is")
         ->type_name("PATH");
-    command->add_flag("--force", options->force, "Overwrite uncommitted changes, or with --to an existing file");
+    command->add_flag(
+        "--force", options->force, "Overwrite uncommitted changes, or with --to an existing file of the repository");
     command->add_flag("--dry-run", options->dryRun, "Only show what would be written");
     addExamples(
         *command, "  tav restore plans/roof.dwg                         discard what you have changed\n"

@@ -1,9 +1,13 @@
 // Earlier versions beside the files that they are of.
 #include "tests/host/history_test.h"
+#include "tests/host/run_here.h"
 #include "tests/support/temp_folder.h"
+
+#include "platform/os/os_calls.h"
 
 #include <gmock/gmock.h>
 
+#include <cerrno>
 #include <filesystem>
 
 namespace host_tests {
@@ -36,6 +40,13 @@ protected:
         return "Wrote 'план.dwg' of commit 1 to '" + target + "'.\n";
     }
 
+    static Outcome belongs(std::string const& folder)
+    {
+        return failed(
+            "tav: '" + folder +
+            "' belongs to a repository or a server. Nothing has been written; name another path.\n");
+    }
+
     support::TempFolder const elsewhere;
 };
 
@@ -61,20 +72,30 @@ TEST_F(RestoreTo, WritesOutsideOfTheRepository)
 TEST_F(RestoreTo, OverwritesNothingUnlessForced)
 {
     repo.write("own.dwg", "own");
-    elsewhere.write("own.dwg", "own");
-    for (std::string const& target : {repo.pathTo("own.dwg"), elsewhere.pathTo("own.dwg")}) {
-        EXPECT_EQ(
-            restoreTo(target),
-            failed("tav: '" + target + "' is there already. Name another path, or overwrite it with --force.\n"));
-    }
+    std::string const target = repo.pathTo("own.dwg");
+    EXPECT_EQ(
+        restoreTo(target),
+        failed("tav: '" + target + "' is there already. Name another path, or overwrite it with --force.\n"));
     EXPECT_EQ(repo.read("own.dwg"), "own");
-    EXPECT_EQ(elsewhere.read("own.dwg"), "own");
-    for (std::string const& target : {repo.pathTo("own.dwg"), elsewhere.pathTo("own.dwg")}) {
-        EXPECT_EQ(restoreTo(target, {"--force"}), done(wrote(target)));
-    }
+    EXPECT_EQ(restoreTo(target, {"--force"}), done(wrote(target)));
     EXPECT_EQ(repo.read("own.dwg"), "one");
-    EXPECT_EQ(elsewhere.read("own.dwg"), "one");
-    EXPECT_EQ(elsewhere.list(), std::vector<std::string>{"own.dwg"});
+}
+
+TEST_F(RestoreTo, OverwritesNothingOutsideOfTheRepository)
+{
+    elsewhere.write("own.dwg", "own");
+    fs::create_symlink("nowhere.dwg", elsewhere.pathTo("link.dwg"));
+    for (char const* const name : {"own.dwg", "link.dwg"}) {
+        std::string const target = elsewhere.pathTo(name);
+        Outcome const refused = failed(
+            "tav: '" + target +
+            "' is there already. Outside of the repository nothing is overwritten; name "
+            "another path, or move or remove it first.\n");
+        EXPECT_EQ(restoreTo(target), refused);
+        EXPECT_EQ(restoreTo(target, {"--force"}), refused);
+    }
+    EXPECT_EQ(elsewhere.read("own.dwg"), "own");
+    EXPECT_THAT(elsewhere.list(), testing::UnorderedElementsAre("own.dwg", "link.dwg"));
 }
 
 TEST_F(RestoreTo, KeepsWhatItOverwritesInTheFolder)
@@ -83,6 +104,24 @@ TEST_F(RestoreTo, KeepsWhatItOverwritesInTheFolder)
     restoreTo("own.dwg", {"--force"});
     EXPECT_EQ(tav({"undo"}).code, 0);
     EXPECT_EQ(repo.read("own.dwg"), "own");
+}
+
+TEST_F(RestoreTo, ThatWritesNothingIsNoCommandToTakeBack)
+{
+    std::string const before = tav({"undo", "--list"}).out;
+    Process process(setting(), [] {
+        static os::Calls const real = os::calls();
+        os::calls().renameat = [](int fromFolder, char const* from, int toFolder, char const* to) {
+            errno = EACCES;
+            return to == std::string("old.dwg") ? -1 : real.renameat(fromFolder, from, toFolder, to);
+        };
+        return runHere({"restore", "--from", "1", "--to", "old.dwg", "план.dwg"});
+    });
+    EXPECT_EQ(
+        process.wait(), failed("tav: 'old.dwg' cannot be written: Permission denied. Everything written so far is "
+                               "complete; correct that and run the command again.\n"));
+    EXPECT_FALSE(repo.has("old.dwg"));
+    EXPECT_EQ(tav({"undo", "--list"}).out, before);
 }
 
 TEST_F(RestoreTo, KnowsTheFolderBehindALink)
@@ -99,6 +138,22 @@ TEST_F(RestoreTo, WritesNothingIntoTheOwnFolderOfTheRepository)
     EXPECT_EQ(restoreTo(".tav/tav.lock", {"--force"}).code, 1);
     EXPECT_EQ(restoreTo(".tav/new").code, 1);
     EXPECT_FALSE(repo.has(".tav/new"));
+}
+
+TEST_F(RestoreTo, WritesNothingIntoAnotherRepositoryOrAServer)
+{
+    for (support::TempFolder const* const place : {&elsewhere, static_cast<support::TempFolder const*>(&repo)}) {
+        place->write("other/.tav/storage/old", "old");
+        place->write("server/server.db", "history");
+        place->write("server/contents/old", "old");
+        EXPECT_EQ(
+            restoreTo(place->pathTo("other/.tav/storage/old"), {"--force"}), belongs(place->pathTo("other/.tav")));
+        EXPECT_EQ(restoreTo(place->pathTo("other/.tav")), belongs(place->pathTo("other/.tav")));
+        EXPECT_EQ(restoreTo(place->pathTo("server/contents/old"), {"--force"}), belongs(place->pathTo("server")));
+        EXPECT_EQ(restoreTo(place->pathTo("server/server.db"), {"--force"}), belongs(place->pathTo("server")));
+        EXPECT_EQ(place->read("other/.tav/storage/old"), "old");
+        EXPECT_EQ(place->read("server/server.db"), "history");
+    }
 }
 
 TEST_F(RestoreTo, TakesOneFileAndAFolderThatExists)
