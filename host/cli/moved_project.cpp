@@ -8,6 +8,7 @@
 #include "platform/sdk/OdError.h"
 
 #include <algorithm>
+#include <exception>
 #include <filesystem>
 #include <vector>
 
@@ -52,8 +53,9 @@ void followMovedProject()
             follow(*root);
         }
     } catch (Failure const&) {
-        // The list stays as it is.
+        // The list stays as it is: the command itself has succeeded, and says so.
     } catch (OdError const&) {
+    } catch (std::exception const&) { // among them memory that is too short
     }
 }
 
