@@ -15,6 +15,7 @@ void printFile(std::string const& typed)
         printContent(*file, root);
         return;
     }
+    requireCommitOf(typed, database);
     throw Failure(
         "'" + typed + "' does not name a file in a commit.",
         "Type a commit, a colon and a name, as in 'tav cat 12:roof.dwg'.");

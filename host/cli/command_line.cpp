@@ -66,6 +66,17 @@ void takeMarksOff(CLI::App& command)
     }
 }
 
+/// Where a path is expected, an empty text would mean the current folder, or nothing at all.
+void requirePaths(CLI::App& command)
+{
+    for (CLI::Option* const option : command.get_options()) {
+        std::string const type = option->get_positional() ? option->get_name() : option->get_type_name();
+        if (type == "FILE" || type == "FOLDER" || type == "PATH" || type == "TARGET") {
+            option->check([](std::string const& path) { return path.empty() ? "The path is empty" : std::string(); });
+        }
+    }
+}
+
 /// In reverse order, which the parser wants.
 std::vector<std::string> markedArguments(std::vector<std::string> const& words)
 {
@@ -132,6 +143,9 @@ void parse(CLI::App& app, std::vector<std::string> const& words)
         app.parse(markedArguments(words));
         followMovedProject();
     } catch (CLI::Success const& wish) {
+        if (app.get_subcommands().empty() && !app.remaining().empty()) {
+            throw CLI::ExtrasError(app.remaining());
+        }
         std::ostringstream help;
         app.exit(wish, help, help);
         print(help.str());
@@ -190,6 +204,7 @@ void prepareSyntax(CLI::App& app, std::optional<std::size_t> behindDashes)
     for (CLI::App* const command : app.get_subcommands({})) {
         command->group("Commands");
         takeMarksOff(*command);
+        requirePaths(*command);
     }
 }
 

@@ -3,6 +3,7 @@
 #include "host/cli/current_settings.h"
 #include "host/cli/programs.h"
 #include "host/errors/failure.h"
+#include "host/text/utf8.h"
 
 #include "platform/os/os_files.h"
 #include "platform/os/os_open_file.h"
@@ -78,16 +79,32 @@ std::string readKept(std::string const& path)
     return isFile && !os::readFile(path, text) ? withoutComments(text) : "";
 }
 
+/// A byte that belongs to no character becomes a surrogate of its own.
+bool isUtf8(std::string const& bytes)
+{
+    OdString const text = fromUtf8(bytes);
+    for (std::size_t i = 0; i < text.getLength(); ++i) {
+        if (text.getAt(i) >= 0xDC80 && text.getAt(i) <= 0xDCFF) {
+            return false;
+        }
+    }
+    return true;
+}
+
 } // namespace
 
 std::string readMessage(std::string const& path)
 {
-    if (path == "-") {
-        return trimmed({std::istreambuf_iterator<char>(std::cin), {}});
-    }
     std::string text;
-    if (auto const error = os::readFile(path, text)) {
+    if (path == "-") {
+        text.assign(std::istreambuf_iterator<char>(std::cin), {});
+    } else if (auto const error = os::readFile(path, text)) {
         throw Failure("'" + path + "' cannot be read: " + error.message() + ".", "Nothing has been committed.");
+    }
+    if (!isUtf8(text)) {
+        throw Failure(
+            "The message in " + (path == "-" ? "standard input" : "'" + path + "'") + " is not UTF-8.",
+            "Nothing has been committed; save the message as UTF-8, or give it with -m.");
     }
     return trimmed(text);
 }

@@ -81,6 +81,13 @@ findFileOfCommit(std::string const& typed, LocalDatabase const& database, common
     return std::nullopt;
 }
 
+void requireCommitOf(std::string const& typed, LocalDatabase const& database)
+{
+    if (std::size_t const colon = typed.find(':'); colon != std::string::npos) {
+        findCommit(database, typed.substr(0, colon));
+    }
+}
+
 void printContent(FileOfCommit const& file, common::RootPath const& root)
 {
     if (isTerminal()) {

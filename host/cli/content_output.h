@@ -19,6 +19,9 @@ struct FileOfCommit {
 std::optional<FileOfCommit>
 findFileOfCommit(std::string const& typed, LocalDatabase const& database, common::RootPath const& root);
 
+/// Throws `Failure` when what is before the first colon of `typed` names no commit; not when there is no colon.
+void requireCommitOf(std::string const& typed, LocalDatabase const& database);
+
 /// Prints the content of a file, byte for byte. On a terminal only text is printed, with its control characters
 /// escaped; `Failure` for anything else.
 void printContent(FileOfCommit const& file, common::RootPath const& root);

@@ -18,11 +18,27 @@ namespace {
 FileOfCommit findFile(std::string const& typed, LocalDatabase const& database, common::RootPath const& root)
 {
     auto file = findFileOfCommit(typed, database, root);
-    file = file ? file : findFileOfCommit(":" + typed, database, root);
+    try {
+        file = file ? file : findFileOfCommit(":" + typed, database, root);
+    } catch (Failure const&) {
+        requireCommitOf(typed, database); // A name without a colon has none.
+        throw;
+    }
     if (!file) {
         throw Failure("There is no commit yet.", "Open the file itself.");
     }
     return *file;
+}
+
+void extractCopy(FileOfCommit const& file, std::string const& path, LocalStorage const& storage)
+{
+    auto const done = storage.extract(file.url, path);
+    if (!done.hasValue()) {
+        bool const isDamaged = !storage.verify(file.url).hasValue();
+        valueOrFail(
+            done, isDamaged ? "Run 'tav verify' to see what is damaged."
+                            : "Check the free space for the folder 'tav' in XDG_CACHE_HOME, by default in '~/.cache'.");
+    }
 }
 
 std::string copyOf(FileOfCommit const& file, common::RootPath const& root)
@@ -34,7 +50,7 @@ std::string copyOf(FileOfCommit const& file, common::RootPath const& root)
     }
     std::string const name = std::filesystem::path(file.path.ansi_str()).filename().string();
     return makeReadOnlyCopy(name, "commit " + std::to_string(file.commit), *digest, [&](std::string const& path) {
-        valueOrFail(LocalStorage(root).extract(file.url, path), "Run 'tav verify' to see whether it is damaged.");
+        extractCopy(file, path, LocalStorage(root));
     });
 }
 

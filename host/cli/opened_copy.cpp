@@ -139,6 +139,16 @@ std::vector<std::string> commandFor(std::string const& file)
                : std::vector<std::string>{"sh", "-c", program.value + " \"$@\"", program.value, file};
 }
 
+int runViewer(std::string const& file)
+{
+    try {
+        return runProgram(commandFor(file));
+    } catch (Failure& failure) {
+        failure.next = "Install it, or name another program with 'tav config open.program'.";
+        throw;
+    }
+}
+
 } // namespace
 
 std::string makeReadOnlyCopy(
@@ -173,8 +183,7 @@ void openWithProgram(std::string const& file)
     }
     report("Opening '" + shown(fromUtf8(file)) + "', a read-only copy.\n");
     flushOutput();
-    std::vector<std::string> const command = commandFor(file);
-    if (int const status = runProgram(command); status != 0) {
+    if (runViewer(file) != 0) {
         throw Failure(
             "The program to open '" + file + "' has failed.", "Name another one with 'tav config open.program'.");
     }

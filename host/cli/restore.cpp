@@ -131,6 +131,10 @@ void copyInside(Copy const& copy, OdString const& path, RestoreOptions const& op
 
 void copyOutside(Copy const& copy, RestoreOptions const& options, common::RootPath const& root)
 {
+    std::string const folder = fs::path(copy.target).parent_path().string();
+    if (!fs::is_directory(folder)) {
+        throw Failure("There is no folder '" + folder + "'.", "Make it first.");
+    }
     if (options.dryRun) {
         print("Would write " + described(copy));
         return;

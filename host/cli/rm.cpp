@@ -85,6 +85,9 @@ std::vector<common::StagedFile> removableFiles(
     common::RootPath const& root)
 {
     OdString const typed = pathInRepository(root, name);
+    if (typed == OdString(L".tav")) {
+        throw Failure("'" + name + "' belongs to the repository itself.", "It cannot be removed.");
+    }
     auto const isTyped = [&](auto const& file) { return file.working.path == typed; };
     if (std::any_of(changes.untracked.begin(), changes.untracked.end(), isTyped)) {
         throw Failure(

@@ -98,7 +98,11 @@ std::optional<FileOfCommit>
 fileToShow(ShowOptions const& options, LocalDatabase const& database, common::RootPath const& root)
 {
     bool const isCommit = options.json || findCommitIfAny(database, options.commit);
-    return isCommit ? std::nullopt : findFileOfCommit(options.commit, database, root);
+    auto file = isCommit ? std::nullopt : findFileOfCommit(options.commit, database, root);
+    if (!isCommit && !file) {
+        requireCommitOf(options.commit, database);
+    }
+    return file;
 }
 
 } // namespace

@@ -13,14 +13,6 @@ namespace tav {
 
 namespace {
 
-/// The parser's own check names the whole range of numbers.
-std::string isCount(std::string const& text)
-{
-    bool const hasDigits = !text.empty() && text.size() <= 18 && text.find_first_not_of("0123456789") == text.npos;
-    bool const isPositive = text.find_first_not_of('0') != text.npos;
-    return hasDigits && isPositive ? std::string() : "'" + text + "' is not a number of commits";
-}
-
 void addLog(CLI::App& app, std::optional<std::size_t> behindDashes)
 {
     CLI::App* const command = app.add_subcommand("log", "Show the history, newest first");
@@ -31,7 +23,7 @@ void addLog(CLI::App& app, std::optional<std::size_t> behindDashes)
         "The commit to begin with, by default where you are, and then files or folders whose history is shown");
     command->add_option("-n,--count", options->count, "Show at most this many commits; -5 is the same as -n 5")
         ->type_name("COUNT")
-        ->check(isCount);
+        ->check(whyNoCount);
     command->add_option("--since", options->since, "Show commits made on this date or later")->type_name("DATE");
     command->add_option("--until", options->until, "Show commits made on this date or earlier")->type_name("DATE");
     command->add_option("--author", options->author, "Show commits of authors with this in their name")

@@ -81,7 +81,7 @@ void addUndo(CLI::App& app)
     list->excludes("--dry-run")->excludes("--force");
     command->add_option("-n,--count", options->count, "List so many at most")
         ->type_name("COUNT")
-        ->check(CLI::PositiveNumber)
+        ->check(whyNoCount)
         ->needs(list);
     addExamples(
         *command, "  tav undo            take back the last command\n"

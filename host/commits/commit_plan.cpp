@@ -31,7 +31,7 @@ void failForGone(std::vector<std::string> gone)
     if (!gone.empty()) {
         Failure failure(
             "These new files are staged, but they are gone.",
-            "Bring them back, or take them out of the commit with 'tav unstage NAME':");
+            "Bring them back, or take them out of the commit with 'tav unstage', a file or folder, or --all:");
         failure.details = std::move(gone);
         throw failure;
     }

@@ -217,6 +217,26 @@ INSTANTIATE_TEST_SUITE_P(
             {"statsu", "--json"},
             "tav: There is no command 'statsu'. Run 'tav --help' to see how it is used.\n"},
         MisuseRow{
+            "HelpOfUnknownCommand",
+            {"help", "statsu"},
+            "tav: There is no command 'statsu'. Run 'tav --help' to see how it is used.\n"},
+        MisuseRow{
+            "UnknownCommandWithHelp",
+            {"statsu", "--help"},
+            "tav: There is no command 'statsu'. Run 'tav --help' to see how it is used.\n"},
+        MisuseRow{
+            "EmptyPathOfAnOption",
+            {"restore", "--from", "1", "--to", "", "a.dwg"},
+            "tav: --to: The path is empty. Run 'tav restore --help' to see how it is used.\n"},
+        MisuseRow{
+            "EmptyMessageFile",
+            {"commit", "-F", ""},
+            "tav: --file: The path is empty. Run 'tav commit --help' to see how it is used.\n"},
+        MisuseRow{
+            "UndoListOfNone",
+            {"undo", "-n", "0", "--list"},
+            "tav: --count: '0' is not a number, 1 or more. Run 'tav undo --help' to see how it is used.\n"},
+        MisuseRow{
             "UnknownCommandInBrackets",
             {"[status]"},
             "tav: There is no command '[status]'. Run 'tav --help' to see how it is used.\n"},

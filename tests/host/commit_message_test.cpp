@@ -118,6 +118,15 @@ TEST_F(CommitMessage, ComesFromAFile)
         failed("tav: 'none.txt' cannot be read: No such file or directory. Nothing has been committed.\n"));
 }
 
+TEST_F(CommitMessage, FromAFileIsUtf8)
+{
+    repo.write("message.txt", "Caf\xe9");
+    EXPECT_EQ(
+        tav({"commit", "-F", "message.txt"}),
+        failed("tav: The message in 'message.txt' is not UTF-8. Nothing has been committed; save the message as UTF-8, "
+               "or give it with -m.\n"));
+}
+
 TEST_F(CommitMessage, WithAllTakesChangedFilesAndNoNewOnes)
 {
     tav({"commit", "-m", "First"});

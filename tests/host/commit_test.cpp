@@ -183,7 +183,7 @@ TEST_F(Commit, NamesAllStagedNewFilesThatAreGone)
     EXPECT_EQ(
         tav({"commit", "-m", "drawn"}),
         failed("tav: These new files are staged, but they are gone. Bring them back, or take them out of the commit "
-               "with 'tav unstage NAME':\n  a.dwg\n  b.dwg\n"));
+               "with 'tav unstage', a file or folder, or --all:\n  a.dwg\n  b.dwg\n"));
     tav({"unstage", "a.dwg", "b.dwg"});
     EXPECT_EQ(tav({"commit", "-m", "drawn"}).code, 0);
     EXPECT_THAT(values({"show"}, "path"), ElementsAre("c.dwg"));

@@ -157,10 +157,7 @@ TEST_F(Init, MakesNothingForAServerThatIsNamedByAURL)
 TEST_F(Init, FailsForAnEmptyName)
 {
     EXPECT_EQ(
-        tav({"init", ""}),
-        failed(
-            "tav: Not able to create the version control folder: . Check that the folder is one and that you may write "
-            "there.\n"));
+        tav({"init", ""}), misused("tav: FOLDER: The path is empty. Run 'tav init --help' to see how it is used.\n"));
     EXPECT_TRUE(place.list().empty());
 }
 

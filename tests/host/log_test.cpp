@@ -129,7 +129,7 @@ TEST_F(Log, RefusesANumberOfCommitsThatIsNone)
         EXPECT_EQ(
             tav({"log", "--count=" + count}), misused(
                                                   "tav: --count: '" + count +
-                                                  "' is not a number of commits. Run 'tav log --help' to see how it is "
+                                                  "' is not a number, 1 or more. Run 'tav log --help' to see how it is "
                                                   "used.\n"));
     }
 }

@@ -286,6 +286,11 @@ TEST_F(Mv, LeavesTheFilesOfTheRepositoryItselfWhereTheyAre)
     }
 }
 
+TEST_F(Mv, LikeRmRefusesTheFolderOfTheRepositoryItself)
+{
+    EXPECT_EQ(tav({"rm", ".tav"}), failed("tav: '.tav' belongs to the repository itself. It cannot be removed.\n"));
+}
+
 TEST_F(Mv, FailsForNamesThatTheRepositoryWouldNotKeep)
 {
     repo.add({"a.dwg", "plans/b.dwg"});

@@ -68,6 +68,29 @@ protected:
     support::TempFolder const user;
 };
 
+TEST_F(Open, LikeShowAndCatSaysThatThereIsNoSuchCommit)
+{
+    commitFile("plan.dwg", "one");
+    for (std::string const command : {"open", "show", "cat"}) {
+        EXPECT_EQ(
+            tavHere({command, "9:plan.dwg"}), failed("tav: There is no commit, branch or tag '9'. Run 'tav log' or "
+                                                     "'tav branch' to see them, or 'tav fetch' for those of "
+                                                     "others.\n"));
+    }
+}
+
+TEST_F(Open, NamesTheSettingWhenThereIsNoProgram)
+{
+    commitFile("plan.dwg", "one");
+    tavHere({"config", "--unset", "open.program"});
+    Setting own = setting();
+    own.environment = {"XDG_CONFIG_HOME=" + user.path(), "XDG_CACHE_HOME=" + user.pathTo("cache"), "PATH=/nowhere"};
+    EXPECT_EQ(
+        run(own, {"open", "plan.dwg"}).err,
+        "tav: 'xdg-open' cannot be started: No such file or directory. Install it, or name another program with 'tav "
+        "config open.program'.\n");
+}
+
 TEST_F(Open, ShowsTheVersionOfACommitWhereNobodyElseLooks)
 {
     commitFile("план \"1\".dwg", "one");

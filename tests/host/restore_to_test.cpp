@@ -69,6 +69,14 @@ TEST_F(RestoreTo, WritesOutsideOfTheRepository)
     EXPECT_EQ(status(), kClean);
 }
 
+TEST_F(RestoreTo, MakesNoFolderOutsideOfTheRepository)
+{
+    EXPECT_EQ(
+        restoreTo(elsewhere.pathTo("no/such/a.dwg")),
+        failed("tav: There is no folder '" + elsewhere.pathTo("no/such") + "'. Make it first.\n"));
+    EXPECT_EQ(elsewhere.list(), std::vector<std::string>());
+}
+
 TEST_F(RestoreTo, OverwritesNothingUnlessForced)
 {
     repo.write("own.dwg", "own");
