@@ -22,7 +22,7 @@ mu_test_options(mu_test_headers)
 #
 # Under the sanitizers a program runs in shards, so that two cores are busy to the end. Of a program that is slow as a
 # whole all shards but the first have the label: without them every eighth test is still checked. STARTS_PROGRAMS says
-# that most tests run tav, which takes ten times as long to start then: the second half of the shards has the label.
+# that most tests run tav, which takes ten times as long to start then: all shards but the first have the label.
 function(mu_test name)
     cmake_parse_arguments(TEST "STARTS_PROGRAMS" "" "SOURCES;LINK;SLOW" ${ARGN})
     add_executable(${name} ${TEST_SOURCES})
@@ -52,9 +52,9 @@ function(mu_test_in_shards name slow starts_programs)
     set(checked 4)
     if(slow STREQUAL "*")
         set(shards 8)
+    endif()
+    if(slow STREQUAL "*" OR starts_programs)
         set(checked 1)
-    elseif(starts_programs)
-        set(checked 2)
     endif()
     math(EXPR last "${shards} - 1")
     foreach(shard RANGE ${last})

@@ -41,8 +41,8 @@ std::string comment(std::vector<std::string> const& changes)
 
 std::string trimmed(std::string const& text)
 {
-    std::size_t const first = text.find_first_not_of("\n");
-    return first == std::string::npos ? "" : text.substr(first, text.find_last_not_of("\n") + 1 - first);
+    std::size_t const first = text.find_first_not_of('\n');
+    return first == std::string::npos ? "" : text.substr(first, text.find_last_not_of('\n') + 1 - first);
 }
 
 std::string withoutComments(std::string const& text)

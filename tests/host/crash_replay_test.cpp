@@ -4,7 +4,7 @@
 #include "tests/host/run_here.h"
 #include "tests/host/scene.h"
 #include "tests/host/sqlite_calls.h"
-#include "tests/support/sanitized.h"
+#include "tests/support/stride.h"
 
 #include <gtest/gtest.h>
 
@@ -14,7 +14,7 @@
 namespace host_tests {
 namespace {
 
-constexpr std::size_t kStep = support::kIsSanitized ? 5 : 1;
+std::size_t const kStep = static_cast<std::size_t>(support::stride(3, 5));
 
 class CrashReplay : public testing::TestWithParam<SceneRow> {
 protected:

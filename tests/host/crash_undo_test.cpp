@@ -3,7 +3,7 @@
 #include "tests/host/run_here.h"
 #include "tests/host/scene.h"
 #include "tests/host/sqlite_calls.h"
-#include "tests/support/sanitized.h"
+#include "tests/support/stride.h"
 
 #include <gtest/gtest.h>
 
@@ -13,7 +13,7 @@
 namespace host_tests {
 namespace {
 
-constexpr std::size_t kStep = support::kIsSanitized ? 15 : 3;
+std::size_t const kStep = static_cast<std::size_t>(support::stride(11, 15));
 
 class CrashUndo : public testing::TestWithParam<SceneRow> {
 protected:

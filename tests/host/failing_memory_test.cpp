@@ -3,7 +3,7 @@
 #include "tests/host/run_here.h"
 #include "tests/host/scene.h"
 #include "tests/support/rows.h"
-#include "tests/support/sanitized.h"
+#include "tests/support/stride.h"
 #include "tests/support/temp_repository.h"
 
 #include "common/mu_common_config.h"
@@ -30,12 +30,12 @@ using Lasts = FailingAllocation::Lasts;
 constexpr int kWasEnough = 77;
 constexpr int kEscaped = 78;
 
-/// Every number up to some hundreds, then in growing steps.
+/// Every number up to some hundreds, then in growing steps; fewer unless every step is asked for.
 long next(long n)
 {
-    constexpr long kDense = support::kIsSanitized ? 40 : 150;
-    constexpr long kPart = support::kIsSanitized ? 8 : 40;
-    return n < kDense ? n + 1 : n + n / kPart;
+    static long const dense = support::stride(40, 40) == 1 ? 150 : 40;
+    static long const part = dense / 4;
+    return n < dense ? n + 1 : n + n / part;
 }
 
 void tell(int failures)
